@@ -1,0 +1,33 @@
+# Compiler options shared by every target of the project.
+add_library(lv_options INTERFACE)
+target_include_directories(lv_options INTERFACE ${PROJECT_SOURCE_DIR})
+target_compile_options(lv_options INTERFACE -Wall -Wextra)
+
+option(LV_SANITIZE "Build the host targets with AddressSanitizer and UndefinedBehaviorSanitizer" OFF)
+option(LV_FUZZ "Build the libFuzzer targets (host build with clang only)" OFF)
+
+if(WIN32)
+    target_compile_definitions(lv_options INTERFACE UNICODE _UNICODE NOMINMAX
+        _WIN32_WINNT=0x0601 WINVER=0x0601 _WIN32_IE=0x0800 STRICT_TYPED_ITEMIDS)
+    # Explorer loads the extension from anywhere: the runtime is linked in, not imported.
+    target_link_options(lv_options INTERFACE -static -static-libgcc -static-libstdc++)
+elseif(LV_SANITIZE)
+    target_compile_options(lv_options INTERFACE -fsanitize=address,undefined -fno-sanitize-recover=all
+        -fno-omit-frame-pointer -g)
+    target_link_options(lv_options INTERFACE -fsanitize=address,undefined)
+endif()
+
+# lv_add_test(name sources... [LIBS libs...]): one test executable, one CTest entry.
+function(lv_add_test name)
+    cmake_parse_arguments(ARG "" "" "LIBS" ${ARGN})
+    add_executable(${name} ${ARG_UNPARSED_ARGUMENTS})
+    target_link_libraries(${name} PRIVATE ${ARG_LIBS} lv_options lv_gtest_main)
+    if(WIN32)
+        # Test executables carry the module's resources (string table) so that text lookups
+        # made through the executable's own module find them.
+        target_sources(${name} PRIVATE ${PROJECT_SOURCE_DIR}/res/LVShellExt.rc)
+        add_test(NAME ${name} COMMAND ${PROJECT_SOURCE_DIR}/scripts/wine-run $<TARGET_FILE:${name}>)
+    else()
+        add_test(NAME ${name} COMMAND ${name})
+    endif()
+endfunction()

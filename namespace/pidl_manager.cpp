@@ -1,0 +1,251 @@
+// The item-ID manager over the shell's task allocator.
+#include "namespace/pidl_manager.h"
+
+#include <cstring>
+#include <cwchar>
+
+#include "stations/station_store.h"
+
+namespace {
+
+const uint8_t* Bytes(LPCITEMIDLIST list) noexcept {
+    return reinterpret_cast<const uint8_t*>(list);
+}
+
+}  // namespace
+
+CQuorvelPidlManagerBase::CQuorvelPidlManagerBase() noexcept {
+    // Without an allocator every creation below returns null, which callers already handle.
+    (void)::SHGetMalloc(&allocator_);
+}
+
+CQuorvelPidlManagerBase::~CQuorvelPidlManagerBase() = default;
+
+LPITEMIDLIST CQuorvelPidlManagerBase::GetNextItem(LPCITEMIDLIST list) const noexcept {
+    if (!list)
+        return nullptr;
+    return reinterpret_cast<LPITEMIDLIST>(const_cast<uint8_t*>(Bytes(list)) + list->mkid.cb);
+}
+
+LPITEMIDLIST CQuorvelPidlManagerBase::GetLastItem(LPCITEMIDLIST list) const noexcept {
+    if (!list || list->mkid.cb == 0)
+        return nullptr;
+    LPCITEMIDLIST last = list;
+    for (LPCITEMIDLIST item = list; item->mkid.cb != 0; item = GetNextItem(item))
+        last = item;
+    return const_cast<LPITEMIDLIST>(last);
+}
+
+UINT CQuorvelPidlManagerBase::GetItemCount(LPCITEMIDLIST list) const noexcept {
+    UINT count = 0;
+    for (LPCITEMIDLIST item = list; item && item->mkid.cb != 0; item = GetNextItem(item))
+        ++count;
+    return count;
+}
+
+UINT CQuorvelPidlManagerBase::GetSize(LPCITEMIDLIST list) const noexcept {
+    if (!list)
+        return 0;
+    UINT size = kListTerminatorSize;
+    for (LPCITEMIDLIST item = list; item->mkid.cb != 0; item = GetNextItem(item)) {
+        size += item->mkid.cb;
+    }
+    return size;
+}
+
+LPITEMIDLIST CQuorvelPidlManagerBase::CopyPidl(LPCITEMIDLIST list) const noexcept {
+    if (!list || !allocator_)
+        return nullptr;
+    const UINT size = GetSize(list);
+    auto* copy = static_cast<LPITEMIDLIST>(allocator_->Alloc(size));
+    if (copy)
+        memcpy(copy, list, size);
+    return copy;
+}
+
+LPITEMIDLIST CQuorvelPidlManagerBase::CopyItem(LPCITEMIDLIST list) const noexcept {
+    if (!list || !allocator_)
+        return nullptr;
+    const UINT size = list->mkid.cb;
+    auto* copy = static_cast<uint8_t*>(allocator_->Alloc(size + kListTerminatorSize));
+    if (!copy)
+        return nullptr;
+    memcpy(copy, list, size);
+    memset(copy + size, 0, kListTerminatorSize);
+    return reinterpret_cast<LPITEMIDLIST>(copy);
+}
+
+LPITEMIDLIST CQuorvelPidlManagerBase::CopyParent(LPCITEMIDLIST list) const noexcept {
+    if (GetItemCount(list) < 2 || !allocator_)
+        return nullptr;
+    const UINT size = static_cast<UINT>(Bytes(GetLastItem(list)) - Bytes(list));
+    auto* copy = static_cast<uint8_t*>(allocator_->Alloc(size + kListTerminatorSize));
+    if (!copy)
+        return nullptr;
+    memcpy(copy, list, size);
+    memset(copy + size, 0, kListTerminatorSize);
+    return reinterpret_cast<LPITEMIDLIST>(copy);
+}
+
+LPITEMIDLIST CQuorvelPidlManagerBase::CopyFromIndex(LPCITEMIDLIST list, UINT index) const noexcept {
+    if (!list || index >= GetItemCount(list))
+        return nullptr;
+    LPCITEMIDLIST item = list;
+    for (UINT skipped = 0; skipped < index; ++skipped) {
+        if (item->mkid.cb == 0)
+            return nullptr;
+        item = GetNextItem(item);
+    }
+    return CopyPidl(item);
+}
+
+LPITEMIDLIST CQuorvelPidlManagerBase::ConcatPidls(LPCITEMIDLIST first,
+                                                  LPCITEMIDLIST second) const noexcept {
+    if (!first && !second)
+        return nullptr;
+    if (!first)
+        return CopyPidl(second);
+    if (!second)
+        return CopyPidl(first);
+    if (!allocator_)
+        return nullptr;
+    const UINT firstSize = GetSize(first) - kListTerminatorSize;
+    const UINT secondSize = GetSize(second);
+    auto* joined = static_cast<uint8_t*>(allocator_->Alloc(firstSize + secondSize));
+    if (!joined)
+        return nullptr;
+    memcpy(joined, first, firstSize);
+    memcpy(joined + firstSize, second, secondSize);
+    return reinterpret_cast<LPITEMIDLIST>(joined);
+}
+
+LPITEMIDLIST CQuorvelPidlManagerBase::CreateItem(DWORD kind, const void* data,
+                                                 UINT byteCount) const noexcept {
+    // cb is 16 bits wide: larger names cannot be carried.
+    if (!allocator_ || byteCount + kItemSizeOverhead > 0xFFFF)
+        return nullptr;
+    auto* item = static_cast<uint8_t*>(allocator_->Alloc(ItemAllocationSize(byteCount)));
+    if (!item)
+        return nullptr;
+    WriteItem(item, kind, data, byteCount);
+    return reinterpret_cast<LPITEMIDLIST>(item);
+}
+
+void CQuorvelPidlManagerBase::FreePidl(LPITEMIDLIST list) const noexcept {
+    if (list && allocator_)
+        allocator_->Free(list);
+}
+
+LPITEMIDLIST CPidlMgr::CreateNamedItem(DWORD kind, const std::wstring& name) const noexcept {
+    try {
+        const std::vector<uint8_t> bytes = ItemNameBytes(name);
+        return CreateItem(kind, bytes.data(), static_cast<UINT>(bytes.size()));
+    } catch (...) {
+        return nullptr;
+    }
+}
+
+LPITEMIDLIST CPidlMgr::CreateRootPidl() const {
+    return CreateNamedItem(PT_ROOT, kRootItemName);
+}
+
+LPITEMIDLIST CPidlMgr::CreateItemPidl(const wchar_t* path) const {
+    if (!path)
+        return nullptr;
+    const std::vector<std::wstring> components = SplitPathComponents(path);
+    if (components.empty())
+        return nullptr;
+    if (components.size() > 1)
+        return CreateNamedItem(PT_STATION, components[1]);
+    return CreateNamedItem(PT_ROOT, components[0]);
+}
+
+LPITEMIDLIST CPidlMgr::CreatePidlFromPath(const wchar_t* path) const {
+    if (!path)
+        return nullptr;
+    const std::vector<std::wstring> components = SplitPathComponents(path);
+    if (components.empty())
+        return nullptr;
+    UniquePidl list(CreateNamedItem(PT_ROOT, components[0]));
+    const DWORD kinds[] = {PT_STATION, PT_FILE};
+    for (size_t index = 1; list && index < components.size() && index < 3; ++index) {
+        UniquePidl item(CreateNamedItem(kinds[index - 1], components[index]));
+        if (!item)
+            return nullptr;
+        list.reset(ConcatPidls(list.get(), item.get()));
+    }
+    return list.release();
+}
+
+UINT CPidlMgr::GetParsingPrefix(wchar_t* buffer, UINT capacity) const {
+    constexpr UINT prefixCount = ARRAYSIZE(kParsingPrefix);  // 41, with the NUL
+    if (!buffer || capacity == 0)
+        return prefixCount;
+    const UINT copied = capacity < prefixCount ? capacity : prefixCount;
+    wmemcpy(buffer, kParsingPrefix, copied);
+    return copied;
+}
+
+bool CPidlMgr::IsValid(LPCITEMIDLIST list) const {
+    if (!list)
+        return false;
+    if (ItemKind(Bytes(list)) != PT_STATION)
+        return true;
+    Station station;
+    station.Name = ItemName(Bytes(list));
+    return FindStation(station) == S_OK;
+}
+
+DWORD CPidlMgr::GetLastItemKind(LPCITEMIDLIST list) const noexcept {
+    if (!list)
+        return 0;
+    // An empty list reads its own first bytes, as callers never pass one.
+    LPCITEMIDLIST last = GetLastItem(list);
+    return ItemKind(Bytes(last ? last : list));
+}
+
+std::wstring CPidlMgr::GetItemName(LPCITEMIDLIST item) const {
+    if (!item || item->mkid.cb == 0)
+        return {};
+    return ItemName(Bytes(item));
+}
+
+bool CPidlMgr::IsRoot(LPCITEMIDLIST list) const {
+    return GetLastItemKind(list) == PT_ROOT;
+}
+
+bool CPidlMgr::IsFolder(LPCITEMIDLIST list) const {
+    const DWORD kind = GetLastItemKind(list);
+    return kind == PT_ROOT || kind == PT_STATION;
+}
+
+bool CPidlMgr::IsFile(LPCITEMIDLIST list) const {
+    return GetLastItemKind(list) == PT_FILE;
+}
+
+bool CPidlMgr::IsRootItem(LPCITEMIDLIST list) const {
+    return GetLastItemKind(list) == PT_ROOT;
+}
+
+UINT CPidlMgr::GetPath(LPCITEMIDLIST list, wchar_t* buffer, UINT capacity) const {
+    try {
+        return static_cast<UINT>(BuildListPath(Bytes(list), buffer, capacity));
+    } catch (...) {
+        if (buffer && capacity)
+            buffer[0] = L'\0';
+        return 0;
+    }
+}
+
+int CPidlMgr::ComparePidls(int sign, LPCITEMIDLIST first, LPCITEMIDLIST second) const {
+    if (!first || !second)
+        return 0;
+    if (ItemKind(Bytes(first)) != ItemKind(Bytes(second)))
+        return 0;
+    wchar_t firstPath[kMaximumPath] = {};
+    wchar_t secondPath[kMaximumPath] = {};
+    GetPath(first, firstPath, kMaximumPath);
+    GetPath(second, secondPath, kMaximumPath);
+    const int order = _wcsicmp(firstPath, secondPath);
+    return sign != 0 ? order * sign : order;
+}

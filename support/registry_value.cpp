@@ -1,0 +1,67 @@
+// Bounded registry value access.
+#include "support/registry_value.h"
+
+#include <vector>
+
+#include "support/portable/wide_text.h"
+#include "support/unique_resource.h"
+
+LONG ReadStringValue(HKEY key, const wchar_t* name, DWORD maxBytes, std::wstring& text) {
+    std::vector<BYTE> buffer(maxBytes + sizeof(wchar_t));
+    DWORD type = 0;
+    DWORD size = maxBytes;
+    const LONG status = ::RegQueryValueExW(key, name, nullptr, &type, buffer.data(), &size);
+    if (status != ERROR_SUCCESS)
+        return status;
+    if (type != REG_SZ && type != REG_EXPAND_SZ)
+        return ERROR_UNSUPPORTED_TYPE;
+    const auto* characters = reinterpret_cast<const wchar_t*>(buffer.data());
+    text.assign(characters, BoundedLength(characters, size / sizeof(wchar_t)));
+    return ERROR_SUCCESS;
+}
+
+LONG ReadDwordValue(HKEY key, const wchar_t* name, DWORD& value) {
+    DWORD type = 0;
+    DWORD data = 0;
+    DWORD size = sizeof(data);
+    const LONG status =
+        ::RegQueryValueExW(key, name, nullptr, &type, reinterpret_cast<BYTE*>(&data), &size);
+    if (status != ERROR_SUCCESS)
+        return status;
+    if (type != REG_DWORD || size != sizeof(data))
+        return ERROR_UNSUPPORTED_TYPE;
+    value = data;
+    return ERROR_SUCCESS;
+}
+
+LONG WriteStringValue(HKEY key, const wchar_t* name, const std::wstring& text) {
+    return ::RegSetValueExW(key, name, 0, REG_SZ, reinterpret_cast<const BYTE*>(text.c_str()),
+                            static_cast<DWORD>((text.size() + 1) * sizeof(wchar_t)));
+}
+
+LONG WriteDwordValue(HKEY key, const wchar_t* name, DWORD value) {
+    return ::RegSetValueExW(key, name, 0, REG_DWORD, reinterpret_cast<const BYTE*>(&value),
+                            sizeof(value));
+}
+
+LONG DeleteKeyRecursive(HKEY parent, const wchar_t* subkey) {
+    UniqueRegKey key;
+    LONG status = ::RegOpenKeyExW(parent, subkey, 0, KEY_READ | KEY_WRITE, key.put());
+    if (status != ERROR_SUCCESS)
+        return status;
+    // Always delete index 0: the remaining subkeys move up after each deletion.
+    for (;;) {
+        wchar_t child[256];
+        DWORD length = ARRAYSIZE(child);
+        status = ::RegEnumKeyExW(key.get(), 0, child, &length, nullptr, nullptr, nullptr, nullptr);
+        if (status == ERROR_NO_MORE_ITEMS)
+            break;
+        if (status != ERROR_SUCCESS)
+            return status;
+        status = DeleteKeyRecursive(key.get(), child);
+        if (status != ERROR_SUCCESS)
+            return status;
+    }
+    key.reset();
+    return ::RegDeleteKeyW(parent, subkey);
+}

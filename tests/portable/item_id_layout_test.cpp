@@ -1,0 +1,115 @@
+// Item identifier bytes: the size rule, bounded name reads and display paths.
+#include <gtest/gtest.h>
+
+#include <cstring>
+#include <vector>
+
+#include "namespace/portable/item_id_layout.h"
+
+namespace {
+
+using Bytes = std::vector<uint8_t>;
+
+// A list of items built with the creator's own writer, ended by the terminator.
+Bytes MakeList(std::initializer_list<std::pair<uint32_t, WideString>> items) {
+    Bytes list;
+    for (const auto& [kind, name] : items) {
+        const Bytes data = ItemNameBytes(name);
+        Bytes item(ItemAllocationSize(data.size()));
+        WriteItem(item.data(), kind, data.data(), data.size());
+        list.insert(list.end(), item.begin(), item.end() - kListTerminatorSize);
+    }
+    list.push_back(0);
+    list.push_back(0);
+    return list;
+}
+
+WideString PathOf(const Bytes& list, size_t capacity, size_t* count = nullptr) {
+    std::vector<WideChar> buffer(capacity + 1, WIDE_TEXT('#'));
+    const size_t result = BuildListPath(list.data(), buffer.data(), capacity);
+    if (count)
+        *count = result;
+    return WideString(buffer.data(), BoundedLength(buffer.data(), capacity));
+}
+
+}  // namespace
+
+TEST(ItemLayout, SizeRuleCarriesFiveSlackBytes) {
+    const Bytes data = ItemNameBytes(WIDE_TEXT("A"));
+    ASSERT_EQ(4u, data.size());
+    Bytes item(ItemAllocationSize(data.size()), 0xCC);
+    ASSERT_EQ(25u, item.size());
+    WriteItem(item.data(), PT_STATION, data.data(), data.size());
+
+    EXPECT_EQ(23u, ItemSize(item.data()));
+    EXPECT_EQ(uint32_t{PT_STATION}, ItemKind(item.data()));
+    EXPECT_EQ(WIDE_TEXT("A"), ItemName(item.data()));
+    EXPECT_EQ(0, item[23] | item[24]) << "the list terminator sits at offset cb";
+    EXPECT_EQ('A', item[14]);
+    EXPECT_TRUE(IsWellFormedItem(item.data()));
+}
+
+TEST(ItemLayout, MalformedItemsReadAsEmptyNamesAndAreRejected) {
+    // cb too small to hold a kind: no kind, no name, never read beyond cb.
+    const Bytes tiny = {4, 0, 2, 0, 0, 0};
+    EXPECT_EQ(0u, ItemKind(tiny.data()));
+    EXPECT_TRUE(ItemName(tiny.data()).empty());
+    EXPECT_FALSE(IsWellFormedItem(tiny.data()));
+
+    // A name that runs to the end of cb without a terminator: exactly cb bytes are provided so
+    // that AddressSanitizer catches any read past them.
+    Bytes unterminated(24, 0);
+    unterminated[0] = 24;
+    unterminated[2] = PT_STATION;
+    for (size_t offset = kItemNameOffset; offset < 24; offset += 2)
+        unterminated[offset] = 'X';
+    EXPECT_TRUE(ItemName(unterminated.data()).empty());
+    EXPECT_FALSE(IsWellFormedItem(unterminated.data()));
+
+    // An unknown kind is not one of ours.
+    Bytes strange = MakeList({{7, WIDE_TEXT("S")}});
+    EXPECT_FALSE(IsWellFormedItem(strange.data()));
+    EXPECT_EQ(WIDE_TEXT("S"), ItemName(strange.data()));
+}
+
+TEST(ItemLayout, SplitPathKeepsOnlyNonEmptyComponents) {
+    using Parts = std::vector<WideString>;
+    EXPECT_EQ(Parts({WIDE_TEXT("A"), WIDE_TEXT("B")}),
+              SplitPathComponents(WIDE_TEXT("\\\\A\\\\B\\")));
+    EXPECT_EQ(Parts({WIDE_TEXT("Station 1")}), SplitPathComponents(WIDE_TEXT("Station 1")));
+    EXPECT_TRUE(SplitPathComponents(WIDE_TEXT("")).empty());
+    EXPECT_TRUE(SplitPathComponents(WIDE_TEXT("\\\\\\")).empty());
+}
+
+TEST(ListPath, CapacityQueryCountsEveryNameAndSeparator) {
+    const Bytes list = MakeList({{PT_ROOT, kRootItemName}, {PT_STATION, WIDE_TEXT("S1")}});
+    EXPECT_EQ(26u, BuildListPath(list.data(), nullptr, 0));
+    EXPECT_EQ(0u, BuildListPath(nullptr, nullptr, 0));
+}
+
+TEST(ListPath, JoinsNamesWithoutLeadingOrTrailingSeparator) {
+    const Bytes list = MakeList({{PT_ROOT, kRootItemName},
+                                 {PT_STATION, WIDE_TEXT("Station 1")},
+                                 {PT_FILE, WIDE_TEXT("file1.lv")}});
+    size_t count = 0;
+    EXPECT_EQ(WIDE_TEXT("Quorvel Digital Level\\Station 1\\file1.lv"), PathOf(list, 260, &count));
+    EXPECT_EQ(40u, count);
+
+    const Bytes empty = {0, 0};
+    EXPECT_EQ(WIDE_TEXT(""), PathOf(empty, 260, &count));
+    EXPECT_EQ(0u, count);
+}
+
+TEST(ListPath, SmallBufferIsNeverOverrun) {
+    const Bytes list = MakeList({{PT_ROOT, kRootItemName}, {PT_STATION, WIDE_TEXT("S1")}});
+    for (size_t capacity = 1; capacity < 30; ++capacity) {
+        std::vector<WideChar> buffer(capacity + 4, WIDE_TEXT('#'));
+        BuildListPath(list.data(), buffer.data(), capacity);
+        EXPECT_LT(BoundedLength(buffer.data(), capacity), capacity) << capacity;
+        for (size_t guard = capacity; guard < capacity + 4; ++guard) {
+            EXPECT_EQ(WIDE_TEXT('#'), buffer[guard]) << "capacity " << capacity;
+        }
+    }
+    // Ten characters hold nine and the terminator.
+    EXPECT_EQ(WIDE_TEXT("Quorvel D"), PathOf(list, 10));
+}
