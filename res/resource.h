@@ -1,15 +1,13 @@
-// Resource identifiers shared by the resource script and the code.
+// Resource identifiers shared by the resource scripts and the code, one header per area.
 #pragma once
 
-// String table: station store
-#define IDS_PARITY_NONE 1015
-#define IDS_PARITY_ODD 1016
-#define IDS_PARITY_EVEN 1017
-#define IDS_COPY_OF 1022
-#define IDS_NEW_DIGITAL_LEVEL 1026
-#define IDS_INSTRUCTIONS_LV10 1030
-#define IDS_MODEL_LV10 1032
-#define IDS_MODEL_LV20 1033
-#define IDS_MODEL_LV30 1034
-#define IDS_INSTRUCTIONS_LV20 1038
-#define IDS_INSTRUCTIONS_LV30 1039
+#include "res/ids_stations.h"
+#if __has_include("res/ids_namespace.h")
+#include "res/ids_namespace.h"
+#endif
+#if __has_include("res/ids_serial.h")
+#include "res/ids_serial.h"
+#endif
+#if __has_include("res/ids_download.h")
+#include "res/ids_download.h"
+#endif
