@@ -31,3 +31,12 @@ function(lv_add_test name)
         add_test(NAME ${name} COMMAND ${name})
     endif()
 endfunction()
+
+# lv_add_fuzzer(name sources... LIBS libs...): a libFuzzer target of the host build.
+function(lv_add_fuzzer name)
+    cmake_parse_arguments(ARG "" "" "LIBS" ${ARGN})
+    add_executable(${name} ${ARG_UNPARSED_ARGUMENTS})
+    target_compile_options(${name} PRIVATE -fsanitize=fuzzer,address,undefined -g)
+    target_link_options(${name} PRIVATE -fsanitize=fuzzer,address,undefined)
+    target_link_libraries(${name} PRIVATE ${ARG_LIBS} lv_options)
+endfunction()
