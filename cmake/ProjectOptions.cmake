@@ -11,6 +11,10 @@ if(WIN32)
         _WIN32_WINNT=0x0601 WINVER=0x0601 _WIN32_IE=0x0800 STRICT_TYPED_ITEMIDS)
     # Explorer loads the extension from anywhere: the runtime is linked in, not imported.
     target_link_options(lv_options INTERFACE -static -static-libgcc -static-libstdc++)
+elseif(LV_FUZZ)
+    # Coverage instrumentation for every portable library that a fuzzer links.
+    target_compile_options(lv_options INTERFACE -fsanitize=fuzzer-no-link,address,undefined -g)
+    target_link_options(lv_options INTERFACE -fsanitize=address,undefined)
 elseif(LV_SANITIZE)
     target_compile_options(lv_options INTERFACE -fsanitize=address,undefined -fno-sanitize-recover=all
         -fno-omit-frame-pointer -g)
