@@ -1,0 +1,186 @@
+// CPidlMgr through its slots and list operations.
+#include <windows.h>
+#include <shlobj.h>
+
+#include <gtest/gtest.h>
+
+#include <cstring>
+
+#include "namespace/pidl_manager.h"
+#include "stations/station_store.h"
+#include "tests/support/registry_override.h"
+
+namespace {
+
+class PidlManager : public ::testing::Test {
+protected:
+    UniquePidl Path(const wchar_t* path) { return UniquePidl(manager_.CreatePidlFromPath(path)); }
+
+    std::wstring PathText(LPCITEMIDLIST list, UINT capacity = 260) {
+        std::wstring text(capacity, L'#');
+        const UINT count = manager_.GetPath(list, text.data(), capacity);
+        text.resize(wcsnlen(text.c_str(), capacity));
+        lastCount_ = count;
+        return text;
+    }
+
+    std::vector<DWORD> Kinds(LPCITEMIDLIST list) {
+        std::vector<DWORD> kinds;
+        for (LPCITEMIDLIST item = list; item && item->mkid.cb; item = manager_.GetNextItem(item)) {
+            kinds.push_back(ItemKind(reinterpret_cast<const uint8_t*>(item)));
+        }
+        return kinds;
+    }
+
+    CPidlMgr manager_;
+    UINT lastCount_ = 0;
+};
+
+}  // namespace
+
+TEST_F(PidlManager, ItemsFollowTheSizeRuleAndCarryTheirSlack) {
+    UniquePidl item(manager_.CreateItemPidl(L"Quorvel Digital Level\\A"));
+    ASSERT_TRUE(item);
+    EXPECT_EQ(23u, item.get()->mkid.cb);
+    EXPECT_EQ(25u, manager_.GetSize(item.get()));
+    EXPECT_EQ(1u, manager_.GetItemCount(item.get()));
+    EXPECT_TRUE(manager_.IsFolder(item.get()));
+    EXPECT_EQ(L"A", manager_.GetItemName(item.get()));
+
+    // Copies and joins step by cb, so the five slack bytes travel along.
+    UniquePidl root(manager_.CreateRootPidl());
+    UniquePidl joined(manager_.ConcatPidls(root.get(), item.get()));
+    EXPECT_EQ(root.get()->mkid.cb + 23u + 2u, manager_.GetSize(joined.get()));
+    UniquePidl copy(manager_.CopyPidl(joined.get()));
+    ASSERT_EQ(manager_.GetSize(joined.get()), manager_.GetSize(copy.get()));
+    EXPECT_EQ(0, memcmp(joined.get(), copy.get(), manager_.GetSize(copy.get())));
+}
+
+TEST_F(PidlManager, CreationFromPaths) {
+    UniquePidl full = Path(L"Quorvel Digital Level\\S1\\file1.lv");
+    EXPECT_EQ((std::vector<DWORD>{PT_ROOT, PT_STATION, PT_FILE}), Kinds(full.get()));
+    EXPECT_EQ((std::vector<DWORD>{PT_ROOT}), Kinds(Path(L"Quorvel Digital Level").get()));
+    EXPECT_EQ((std::vector<DWORD>{PT_ROOT, PT_STATION, PT_FILE}),
+              Kinds(Path(L"\\A\\\\B\\C\\D\\E").get()))
+        << "empty components are skipped and a fourth is ignored";
+    EXPECT_FALSE(Path(L""));
+    EXPECT_FALSE(Path(L"\\\\"));
+    EXPECT_FALSE(Path(nullptr));
+
+    UniquePidl station(manager_.CreateItemPidl(L"Quorvel Digital Level\\S1\\file1.lv"));
+    EXPECT_EQ((std::vector<DWORD>{PT_STATION}), Kinds(station.get()));
+    UniquePidl root(manager_.CreateItemPidl(L"\\Quorvel Digital Level"));
+    EXPECT_EQ((std::vector<DWORD>{PT_ROOT}), Kinds(root.get()));
+    EXPECT_EQ(L"Quorvel Digital Level", manager_.GetItemName(root.get()));
+}
+
+TEST_F(PidlManager, KindTestsLookAtTheLastItem) {
+    UniquePidl full = Path(L"Quorvel Digital Level\\S1\\file1.lv");
+    UniquePidl station = Path(L"Quorvel Digital Level\\S1");
+    UniquePidl root = Path(L"Quorvel Digital Level");
+    EXPECT_TRUE(manager_.IsFile(full.get()));
+    EXPECT_FALSE(manager_.IsFolder(full.get()));
+    EXPECT_TRUE(manager_.IsFolder(station.get()));
+    EXPECT_FALSE(manager_.IsRoot(station.get()));
+    EXPECT_TRUE(manager_.IsRoot(root.get()));
+    EXPECT_TRUE(manager_.IsRootItem(root.get()));
+    EXPECT_TRUE(manager_.IsFolder(root.get()));
+    EXPECT_FALSE(manager_.IsFile(nullptr));
+}
+
+TEST_F(PidlManager, PathsJoinNamesAndReportTheNeededCapacity) {
+    UniquePidl station = Path(L"Quorvel Digital Level\\S1");
+    EXPECT_EQ(26u, manager_.GetPath(station.get(), nullptr, 0));
+    EXPECT_EQ(L"Quorvel Digital Level\\S1", PathText(station.get()));
+    EXPECT_EQ(24u, lastCount_);
+    EXPECT_EQ(0u, manager_.GetPath(nullptr, nullptr, 0));
+}
+
+TEST_F(PidlManager, ListOperations) {
+    UniquePidl full = Path(L"Quorvel Digital Level\\S1\\file1.lv");
+    EXPECT_EQ(3u, manager_.GetItemCount(full.get()));
+    EXPECT_EQ(L"file1.lv", manager_.GetItemName(manager_.GetLastItem(full.get())));
+
+    UniquePidl parent(manager_.CopyParent(full.get()));
+    EXPECT_EQ(L"Quorvel Digital Level\\S1", PathText(parent.get()));
+    UniquePidl single(manager_.CopyItem(full.get()));
+    EXPECT_EQ(1u, manager_.GetItemCount(single.get()));
+    EXPECT_FALSE(UniquePidl(manager_.CopyParent(single.get())));
+
+    UniquePidl tail(manager_.CopyFromIndex(full.get(), 1));
+    EXPECT_EQ(L"S1\\file1.lv", PathText(tail.get()));
+    EXPECT_FALSE(UniquePidl(manager_.CopyFromIndex(full.get(), 3)));
+
+    UniquePidl joined(manager_.ConcatPidls(parent.get(), nullptr));
+    EXPECT_EQ(manager_.GetSize(parent.get()), manager_.GetSize(joined.get()));
+    EXPECT_FALSE(UniquePidl(manager_.ConcatPidls(nullptr, nullptr)));
+    EXPECT_EQ(nullptr, manager_.GetLastItem(nullptr));
+    EXPECT_EQ(0u, manager_.GetSize(nullptr));
+
+    const USHORT empty = 0;
+    EXPECT_EQ(2u, manager_.GetSize(reinterpret_cast<LPCITEMIDLIST>(&empty)));
+    EXPECT_EQ(nullptr, manager_.GetLastItem(reinterpret_cast<LPCITEMIDLIST>(&empty)));
+}
+
+TEST_F(PidlManager, ComparisonIgnoresCaseScalesBySignAndEqualsAcrossKinds) {
+    UniquePidl a(manager_.CreateItemPidl(L"Q\\alpha"));
+    UniquePidl b(manager_.CreateItemPidl(L"Q\\Beta"));
+    UniquePidl upperA(manager_.CreateItemPidl(L"Q\\ALPHA"));
+    UniquePidl file = Path(L"Q\\S\\alpha");
+
+    EXPECT_LT(manager_.ComparePidls(0, a.get(), b.get()), 0);
+    EXPECT_GT(manager_.ComparePidls(0, b.get(), a.get()), 0);
+    EXPECT_EQ(0, manager_.ComparePidls(0, a.get(), upperA.get()));
+    EXPECT_EQ(-manager_.ComparePidls(0, a.get(), b.get()),
+              manager_.ComparePidls(-1, a.get(), b.get()));
+    EXPECT_EQ(3 * manager_.ComparePidls(0, a.get(), b.get()),
+              manager_.ComparePidls(3, a.get(), b.get()));
+
+    UniquePidl fileItem(manager_.CopyFromIndex(file.get(), 2));
+    EXPECT_EQ(0, manager_.ComparePidls(0, a.get(), fileItem.get())) << "station against file";
+    EXPECT_EQ(0, manager_.ComparePidls(1, nullptr, a.get()));
+}
+
+TEST_F(PidlManager, ParsingPrefixIsCopiedWithoutTerminatorWhenCut) {
+    EXPECT_EQ(41u, manager_.GetParsingPrefix(nullptr, 0));
+    wchar_t buffer[64];
+    wmemset(buffer, L'#', 64);
+    EXPECT_EQ(10u, manager_.GetParsingPrefix(buffer, 10));
+    EXPECT_EQ(0, wmemcmp(L"::{7D3F2A6#", buffer, 11));
+    EXPECT_EQ(41u, manager_.GetParsingPrefix(buffer, 64));
+    EXPECT_STREQ(L"::{7D3F2A61-4B8E-4c19-9A27-5E0C81B6D4F3}", buffer);
+}
+
+TEST_F(PidlManager, ValidityFollowsTheStore) {
+    RegistryOverride registry;
+    Station station = DefaultStation();
+    station.Name = L"Station 1";
+    ASSERT_EQ(S_OK, AddStation(station));
+
+    UniquePidl stationItem(manager_.CreateItemPidl(L"Quorvel Digital Level\\Station 1"));
+    UniquePidl otherCase(manager_.CreateItemPidl(L"Quorvel Digital Level\\station 1"));
+    UniquePidl file = Path(L"Quorvel Digital Level\\Gone\\file1.lv");
+    UniquePidl fileItem(manager_.CopyFromIndex(file.get(), 2));
+    EXPECT_TRUE(manager_.IsValid(stationItem.get()));
+    EXPECT_FALSE(manager_.IsValid(otherCase.get())) << "the store compares names case-sensitively";
+    EXPECT_TRUE(manager_.IsValid(fileItem.get()));
+    EXPECT_TRUE(manager_.IsValid(file.get())) << "only the first item is looked at";
+
+    ASSERT_EQ(S_OK, DeleteStation(station));
+    EXPECT_FALSE(manager_.IsValid(stationItem.get()));
+}
+
+TEST_F(PidlManager, MalformedItemsFromOutsideAreNeverReadPastTheirSize) {
+    // An item whose cb ends inside the name: the name reads as empty, the item is rejected.
+    struct {
+        USHORT cb = 20;
+        DWORD kind = PT_STATION;
+        BYTE reserved[8] = {};
+        wchar_t name[4] = {L'A', L'B', L'C', 0};
+        USHORT terminator = 0;
+    } __attribute__((packed)) truncated;
+    const auto* list = reinterpret_cast<LPCITEMIDLIST>(&truncated);
+    EXPECT_EQ(L"", manager_.GetItemName(list));
+    EXPECT_FALSE(IsWellFormedItem(reinterpret_cast<const uint8_t*>(list)));
+    EXPECT_EQ(L"", PathText(list)) << "an unnamed item adds only its separator, which is removed";
+}
