@@ -210,6 +210,16 @@ std::wstring CPidlMgr::GetItemName(LPCITEMIDLIST item) const {
     return ItemName(Bytes(item));
 }
 
+bool CPidlMgr::IsWellFormedList(LPCITEMIDLIST list) const noexcept {
+    if (!list || list->mkid.cb == 0)
+        return false;
+    for (LPCITEMIDLIST item = list; item->mkid.cb != 0; item = GetNextItem(item)) {
+        if (!IsWellFormedItem(Bytes(item)))
+            return false;
+    }
+    return true;
+}
+
 bool CPidlMgr::IsRoot(LPCITEMIDLIST list) const {
     return GetLastItemKind(list) == PT_ROOT;
 }

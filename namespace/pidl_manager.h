@@ -75,6 +75,10 @@ public:
     DWORD GetLastItemKind(LPCITEMIDLIST list) const noexcept;
     std::wstring GetItemName(LPCITEMIDLIST item) const;
 
+    // Every item of a non-empty list is well formed (IsWellFormedItem). Lists that the shell hands
+    // back are checked with this before any name in them is read.
+    bool IsWellFormedList(LPCITEMIDLIST list) const noexcept;
+
 private:
     LPITEMIDLIST CreateNamedItem(DWORD kind, const std::wstring& name) const noexcept;
 };
