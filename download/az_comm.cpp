@@ -1,0 +1,118 @@
+// TAZComm: opens and configures the port, then runs the protocol over it.
+#include "download/az_comm.h"
+
+#include <vector>
+
+#include "download/portable/port_setup.h"
+#include "download/portable/serial_protocol.h"
+#include "download/win32_serial_port.h"
+
+namespace {
+// One clock and one text source serve every driver: both are stateless.
+Win32ProtocolClock g_clock;
+const StringTableDriverTexts g_texts;
+}  // namespace
+
+TAZComm::TAZComm(TParserCallBack* callback, TAZCommParams* params)
+    : callback_(callback),
+      params_(params),
+      port_(std::make_unique<Win32SerialPort>()),
+      file_(std::make_unique<Win32ReceiveFile>(params->OutputPath)),
+      protocol_(std::make_unique<SerialProtocol>(*port_, g_clock, *file_, *callback, g_texts,
+                                                 params->Protocol)) {
+    if (OpenPort()) {
+        protocol_->SetPortOpen(true);
+        return;
+    }
+    callback_->ShowMessage(kMessagePortNotOpened, g_texts.Text(DriverText::PortNotOpened).c_str());
+}
+
+TAZComm::~TAZComm() {
+    // Closing follows the handle, not the open flag: a port opened but not configured is closed
+    // here too.
+    if (port_->IsValid()) {
+        port_->Break();
+        port_->Close();
+    }
+}
+
+bool TAZComm::OpenPort() {
+    ApplyDeviceControlFields(MakeDeviceControlFields(params_->Protocol),
+                             params_->DeviceControlBlock);
+    params_->Timeouts = ToCommTimeouts(MakePortTimeouts());
+    const DWORD error =
+        port_->Open(params_->PortName, params_->DeviceControlBlock, params_->Timeouts);
+    if (error == ERROR_SUCCESS)
+        return true;
+    // Only a configuration failure has a system text of its own; a port that did not open
+    // gets the driver's message alone.
+    if (port_->IsValid())
+        callback_->ShowMessage(kMessageError, SystemErrorText(error).c_str());
+    return false;
+}
+
+bool TAZComm::IsPortOpen() const noexcept {
+    return protocol_->IsPortOpen();
+}
+
+uint32_t TAZComm::ReceiveLines() {
+    return protocol_->ReceiveLines();
+}
+
+uint32_t TAZComm::Receive() {
+    return protocol_->Receive();
+}
+
+void TAZComm::Stop() noexcept {
+    protocol_->RequestStop();
+}
+
+uint32_t TAZComm::FileSize() const noexcept {
+    return protocol_->FileSize();
+}
+
+bool TAZComm::IsFileOpened() const noexcept {
+    return protocol_->IsFileOpened();
+}
+
+uint32_t TAZComm::SendYModemHeader(const std::wstring& path) {
+    WIN32_FILE_ATTRIBUTE_DATA attributes{};
+    if (!::GetFileAttributesExW(path.c_str(), GetFileExInfoStandard, &attributes)) {
+        callback_->ShowMessage(kMessageError, SystemErrorText(::GetLastError()).c_str());
+        return 1;
+    }
+    // The name travels as multibyte text of the thread's code page.
+    const wchar_t* name = path.c_str();
+    for (const wchar_t* p = name; *p; ++p)
+        if (*p == L'\\' || *p == L'/' || *p == L':')
+            name = p + 1;
+    char nameBytes[MAX_PATH * 2] = {};
+    const int nameLength = ::WideCharToMultiByte(CP_THREAD_ACP, 0, name, -1, nameBytes,
+                                                 sizeof nameBytes, nullptr, nullptr);
+    ULARGE_INTEGER created;
+    created.LowPart = attributes.ftCreationTime.dwLowDateTime;
+    created.HighPart = attributes.ftCreationTime.dwHighDateTime;
+    // FILETIME counts 100 ns from 1601; the header carries seconds from 1970.
+    const uint64_t unixSeconds = created.QuadPart / 10000000ULL - 11644473600ULL;
+    CrcTable table;
+    BuildCrcTable(table);
+    const YModemBlock block =
+        BuildYModemHeaderBlock(std::string_view(nameBytes, nameLength > 0 ? nameLength - 1 : 0),
+                               attributes.nFileSizeLow, static_cast<uint32_t>(unixSeconds), table);
+    return protocol_->SendYModemHeader(block);
+}
+
+bool TAZComm::CheckInputFile() {
+    UniqueFileHandle input(::CreateFileW(params_->OutputPath.c_str(), GENERIC_READ, FILE_SHARE_READ,
+                                         nullptr, OPEN_EXISTING, FILE_ATTRIBUTE_NORMAL, nullptr));
+    if (!input) {
+        callback_->ShowMessage(kMessageError, SystemErrorText(::GetLastError()).c_str());
+        return false;
+    }
+    std::vector<uint8_t> bytes;
+    uint8_t chunk[4096];
+    DWORD got = 0;
+    while (::ReadFile(input.get(), chunk, sizeof chunk, &got, nullptr) && got > 0)
+        bytes.insert(bytes.end(), chunk, chunk + got);
+    return protocol_->CheckInputFile(bytes.data(), bytes.size());
+}

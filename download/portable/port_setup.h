@@ -1,0 +1,46 @@
+// The port settings the driver applies: device-control fields and time-outs as plain values.
+#pragma once
+
+#include <cstdint>
+
+// DCB flag bits as the driver sets them.
+constexpr uint32_t kDcbBinary = 0x0001;
+constexpr uint32_t kDcbParityCheck = 0x0002;
+constexpr uint32_t kDcbDtrEnabled = 0x0010;
+constexpr uint32_t kDcbTxContinueOnXoff = 0x0080;
+constexpr uint32_t kDcbXonXoffOut = 0x0100;
+constexpr uint32_t kDcbXonXoffIn = 0x0200;
+constexpr uint32_t kDcbRtsEnabled = 0x1000;
+constexpr uint32_t kDcbBaseFlags = 0x1393;
+
+// The fields of the device control block that the driver fills; the caller's BaudRate,
+// ByteSize, Parity and StopBits are kept as they are.
+struct DeviceControlFields {
+    uint32_t Length = 28;
+    uint32_t Flags = kDcbBaseFlags;
+    uint16_t Reserved = 0;
+    uint16_t XonLimit = 1024;
+    uint16_t XoffLimit = 1536;
+    uint8_t XonChar = 0x11;
+    uint8_t XoffChar = 0x13;
+    uint8_t ErrorChar = 0x00;
+    uint8_t EofChar = 0xFF;
+    uint8_t EventChar = 0xFE;
+    uint16_t Reserved1 = 0;
+};
+
+// Software flow control only for the raw stream of selector 0: with every other selector XON
+// and XOFF are data bytes (they occur inside BCC and Y-Modem blocks).
+DeviceControlFields MakeDeviceControlFields(uint32_t protocolSelector) noexcept;
+
+// Milliseconds. A read returns after 50 ms of silence between bytes or after 100 ms plus 1 ms
+// per byte asked for: this interval is the protocol's whole pacing, there is no other wait.
+struct PortTimeouts {
+    uint32_t ReadInterval = 50;
+    uint32_t ReadTotalMultiplier = 1;
+    uint32_t ReadTotalConstant = 100;
+    uint32_t WriteTotalMultiplier = 1;
+    uint32_t WriteTotalConstant = 100;
+};
+
+PortTimeouts MakePortTimeouts() noexcept;

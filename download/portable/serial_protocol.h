@@ -1,0 +1,82 @@
+// SerialProtocol: the driver's receive procedures and sending side over the port interface.
+#pragma once
+
+#include <array>
+#include <atomic>
+#include <cstdint>
+#include <string>
+
+#include "download/portable/block_format.h"
+#include "download/portable/driver_text.h"
+#include "download/portable/parser_callback.h"
+#include "download/portable/protocol_io.h"
+
+// Runs on one thread; only RequestStop may be called from others. Results: 0 success, 1 failure.
+class SerialProtocol {
+public:
+    SerialProtocol(SerialPort& port, ProtocolClock& clock, ReceiveFile& file,
+                   TParserCallBack& callback, const DriverTextSource& texts,
+                   uint32_t protocolSelector) noexcept;
+
+    // Set by the owner once the port is open and configured; cleared when the port is closed.
+    void SetPortOpen(bool open) noexcept {
+        portOpen_ = open;
+        fileOpened_ = open;
+    }
+    bool IsPortOpen() const noexcept { return portOpen_; }
+    bool IsFileOpened() const noexcept { return fileOpened_; }
+    void RequestStop() noexcept { stopRequest_ = true; }
+    uint32_t FileSize() const noexcept { return fileSize_; }
+    const std::string& YModemFileName() const noexcept { return yModemFileName_; }
+    uint32_t ExpectedBlockCount() const noexcept { return expectedBlockCount_; }
+
+    // The line protocol: header "A,01,Z", checked lines each answered ACK or NAK, end "Z,&,".
+    uint32_t ReceiveLines();
+    // The procedure of the selector: 0 and 3 raw stream, 1 BCC blocks, 2 Y-Modem.
+    uint32_t Receive();
+    // Sends a Y-Modem header block once the receiver has sent anything, until acknowledged.
+    uint32_t SendYModemHeader(const YModemBlock& block);
+    // Checks an input file of BCC blocks (see CheckBccBlocks); false only on a BCC mismatch.
+    bool CheckInputFile(const uint8_t* bytes, size_t size);
+
+    // Break, restore and close the port; the protocol is unusable afterwards.
+    void ClosePort() noexcept;
+
+private:
+    // Sends all bytes; gives up when a write moves nothing after 3 s from the start of the send.
+    void SendBytes(const uint8_t* bytes, size_t count);
+    void SendByteWithLineEnd(uint8_t value);
+    void Report(uint32_t code, const WideString& text);
+    // The 60-second wait and the user's cancel (which closes the port); false ends the receive.
+    bool CheckTimeoutAndCancel(int64_t lastProgress);
+    // Reads one burst into the receive buffer (after firstByte when >= 0), validates and writes
+    // its data as the selector says; returns the validation result.
+    uint8_t ReceiveBlock(int firstByte);
+    // Reads one burst without writing; returns the count.
+    size_t ReadBurst(int firstByte);
+    bool CancelSeen();
+
+    uint32_t ReceiveRawStream();
+    uint32_t ReceiveBccBlocks();
+    uint32_t ReceiveYModem();
+
+    SerialPort& port_;
+    ProtocolClock& clock_;
+    ReceiveFile& file_;
+    TParserCallBack& callback_;
+    const DriverTextSource& texts_;
+    const uint32_t selector_;
+
+    std::atomic<bool> stopRequest_{false};
+    bool portOpen_ = false;
+    uint16_t receivedCheck_ = 0;
+    uint32_t expectedBlockCount_ = 0;
+    size_t receiveCount_ = 0;
+    uint32_t fileSize_ = 0;
+    uint32_t bytesWritten_ = 0;
+    bool fileOpened_ = false;
+    uint32_t lastBlockDigit_ = 9;
+    std::array<uint8_t, kBlockCapacity + 1> receiveBuffer_{};
+    CrcTable crcTable_{};
+    std::string yModemFileName_;
+};

@@ -1,0 +1,183 @@
+// The Win32 side of the driver: COM port, clock, output file and string-table texts.
+#include "download/win32_serial_port.h"
+
+#include <ctime>
+
+#include "res/resource.h"
+#include "support/text_lookup.h"
+
+void ApplyDeviceControlFields(const DeviceControlFields& fields, DCB& dcb) noexcept {
+    dcb.DCBlength = fields.Length;
+    dcb.fBinary = (fields.Flags & kDcbBinary) != 0;
+    dcb.fParity = (fields.Flags & kDcbParityCheck) != 0;
+    dcb.fOutxCtsFlow = FALSE;
+    dcb.fOutxDsrFlow = FALSE;
+    dcb.fDtrControl = (fields.Flags & kDcbDtrEnabled) ? DTR_CONTROL_ENABLE : DTR_CONTROL_DISABLE;
+    dcb.fDsrSensitivity = FALSE;
+    dcb.fTXContinueOnXoff = (fields.Flags & kDcbTxContinueOnXoff) != 0;
+    dcb.fOutX = (fields.Flags & kDcbXonXoffOut) != 0;
+    dcb.fInX = (fields.Flags & kDcbXonXoffIn) != 0;
+    dcb.fErrorChar = FALSE;
+    dcb.fNull = FALSE;
+    dcb.fRtsControl = (fields.Flags & kDcbRtsEnabled) ? RTS_CONTROL_ENABLE : RTS_CONTROL_DISABLE;
+    dcb.fAbortOnError = FALSE;
+    dcb.wReserved = fields.Reserved;
+    dcb.XonLim = fields.XonLimit;
+    dcb.XoffLim = fields.XoffLimit;
+    dcb.XonChar = static_cast<char>(fields.XonChar);
+    dcb.XoffChar = static_cast<char>(fields.XoffChar);
+    dcb.ErrorChar = static_cast<char>(fields.ErrorChar);
+    dcb.EofChar = static_cast<char>(fields.EofChar);
+    dcb.EvtChar = static_cast<char>(fields.EventChar);
+    dcb.wReserved1 = fields.Reserved1;
+}
+
+COMMTIMEOUTS ToCommTimeouts(const PortTimeouts& timeouts) noexcept {
+    COMMTIMEOUTS result{};
+    result.ReadIntervalTimeout = timeouts.ReadInterval;
+    result.ReadTotalTimeoutMultiplier = timeouts.ReadTotalMultiplier;
+    result.ReadTotalTimeoutConstant = timeouts.ReadTotalConstant;
+    result.WriteTotalTimeoutMultiplier = timeouts.WriteTotalMultiplier;
+    result.WriteTotalTimeoutConstant = timeouts.WriteTotalConstant;
+    return result;
+}
+
+std::wstring SystemErrorText(DWORD error) {
+    wchar_t* buffer = nullptr;
+    const DWORD length = ::FormatMessageW(
+        FORMAT_MESSAGE_ALLOCATE_BUFFER | FORMAT_MESSAGE_FROM_SYSTEM | FORMAT_MESSAGE_IGNORE_INSERTS,
+        nullptr, error, 0, reinterpret_cast<wchar_t*>(&buffer), 0, nullptr);
+    std::wstring text(buffer ? buffer : L"", length);
+    if (buffer)
+        ::LocalFree(buffer);
+    while (!text.empty() && (text.back() == L'\n' || text.back() == L'\r'))
+        text.pop_back();
+    return text;
+}
+
+Win32SerialPort::~Win32SerialPort() {
+    Close();
+}
+
+DWORD Win32SerialPort::Open(const wchar_t* portName, const DCB& dcb,
+                            const COMMTIMEOUTS& timeouts) noexcept {
+    handle_.reset(::CreateFileW(portName, GENERIC_READ | GENERIC_WRITE, 0, nullptr, OPEN_EXISTING,
+                                0, nullptr));
+    if (!handle_)
+        return ::GetLastError();
+    savedDcb_.DCBlength = sizeof savedDcb_;
+    // A port whose state cannot be read is still configured; Close then puts back zeros, which
+    // SetCommState refuses harmlessly.
+    (void)::GetCommState(handle_.get(), &savedDcb_);
+    DCB applied = dcb;
+    if (!::SetCommState(handle_.get(), &applied))
+        return ::GetLastError();
+    (void)::GetCommTimeouts(handle_.get(), &savedTimeouts_);
+    COMMTIMEOUTS appliedTimeouts = timeouts;
+    if (!::SetCommTimeouts(handle_.get(), &appliedTimeouts))
+        return ::GetLastError();
+    readTotalConstant_ = timeouts.ReadTotalTimeoutConstant;
+    return ERROR_SUCCESS;
+}
+
+size_t Win32SerialPort::Read(uint8_t* buffer, size_t count) {
+    if (!handle_ || count == 0)
+        return 0;
+    const ULONGLONG start = ::GetTickCount64();
+    DWORD got = 0;
+    const BOOL ok = ::ReadFile(handle_.get(), buffer, static_cast<DWORD>(count), &got, nullptr);
+    if (!ok || got == 0) {
+        // A failed read, or a peer that hung up, answers at once; the protocol's pacing assumes
+        // the port waited its total time-out, so wait the rest of it instead of spinning.
+        const ULONGLONG spent = ::GetTickCount64() - start;
+        if (spent < readTotalConstant_)
+            ::Sleep(static_cast<DWORD>(readTotalConstant_ - spent));
+        return 0;
+    }
+    return got;
+}
+
+size_t Win32SerialPort::Write(const uint8_t* bytes, size_t count) {
+    if (!handle_)
+        return 0;
+    DWORD written = 0;
+    if (!::WriteFile(handle_.get(), bytes, static_cast<DWORD>(count), &written, nullptr))
+        return 0;
+    return written;
+}
+
+void Win32SerialPort::Purge(bool transmit, bool receive) {
+    if (!handle_)
+        return;
+    DWORD flags = 0;
+    if (transmit)
+        flags |= PURGE_TXCLEAR;
+    if (receive)
+        flags |= PURGE_RXCLEAR;
+    (void)::PurgeComm(handle_.get(), flags);  // nothing to do when the queue cannot be cleared
+}
+
+void Win32SerialPort::Break() {
+    if (handle_)
+        (void)::EscapeCommFunction(handle_.get(), SETBREAK);  // best effort before closing
+}
+
+void Win32SerialPort::Close() {
+    if (!handle_)
+        return;
+    // Restoring is best effort: the handle is closed whatever the port answers.
+    (void)::SetCommState(handle_.get(), &savedDcb_);
+    (void)::SetCommTimeouts(handle_.get(), &savedTimeouts_);
+    handle_.reset();
+}
+
+int64_t Win32ProtocolClock::WallSeconds() {
+    return static_cast<int64_t>(_time64(nullptr));
+}
+
+uint32_t Win32ProtocolClock::TickMilliseconds() {
+    return ::GetTickCount();
+}
+
+bool Win32ReceiveFile::Create() {
+    handle_.reset(::CreateFileW(path_.c_str(), GENERIC_READ | GENERIC_WRITE, 0, nullptr,
+                                CREATE_ALWAYS, FILE_ATTRIBUTE_NORMAL, nullptr));
+    return static_cast<bool>(handle_);
+}
+
+void Win32ReceiveFile::Write(const uint8_t* bytes, size_t count) {
+    if (!handle_ || count == 0)
+        return;
+    DWORD written = 0;
+    // A full disk shows as a short file; the receive itself goes on as the instrument expects.
+    (void)::WriteFile(handle_.get(), bytes, static_cast<DWORD>(count), &written, nullptr);
+}
+
+uint64_t Win32ReceiveFile::Position() {
+    LARGE_INTEGER position{};
+    if (!handle_ || !::SetFilePointerEx(handle_.get(), LARGE_INTEGER{}, &position, FILE_CURRENT))
+        return 0;
+    return static_cast<uint64_t>(position.QuadPart);
+}
+
+void Win32ReceiveFile::Close() {
+    handle_.reset();
+}
+
+WideString StringTableDriverTexts::Text(DriverText text) const {
+    switch (text) {
+        case DriverText::PortNotOpened:
+            return LoadUiText(IDS_SERIAL_PORT_NOT_OPENED);
+        case DriverText::WaitExpired:
+            return LoadUiText(IDS_SERIAL_WAIT_EXPIRED);
+        case DriverText::InterruptedByUser:
+            return LoadUiText(IDS_SERIAL_INTERRUPTED_BY_USER);
+        case DriverText::BlockImportFailed:
+            return LoadUiText(IDS_SERIAL_BLOCK_IMPORT_FAILED);
+        case DriverText::InputFileBccMismatch:
+            return LoadUiText(IDS_SERIAL_INPUT_FILE_BCC_MISMATCH);
+        case DriverText::YModemFileInfo:
+            return LoadUiText(IDS_SERIAL_YMODEM_FILE_INFO);
+    }
+    return {};
+}

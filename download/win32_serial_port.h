@@ -1,0 +1,72 @@
+// The Win32 side of the driver: the COM port, the clock, the output file and the texts.
+#pragma once
+
+#include <windows.h>
+
+#include <string>
+
+#include "download/portable/driver_text.h"
+#include "download/portable/port_setup.h"
+#include "download/portable/protocol_io.h"
+#include "support/unique_resource.h"
+
+// Writes the driver's fields into a DCB, keeping the caller's BaudRate, ByteSize, Parity and
+// StopBits.
+void ApplyDeviceControlFields(const DeviceControlFields& fields, DCB& dcb) noexcept;
+COMMTIMEOUTS ToCommTimeouts(const PortTimeouts& timeouts) noexcept;
+
+// The system's text for an error code (FormatMessageW, default language), without the line end.
+std::wstring SystemErrorText(DWORD error);
+
+// A COM port opened with CreateFileW and configured with SetCommState/SetCommTimeouts; the
+// settings found are saved and put back by Close.
+class Win32SerialPort final : public SerialPort {
+public:
+    Win32SerialPort() = default;
+    ~Win32SerialPort() override;
+
+    // Opens and configures; on a configuration failure returns the Win32 error (the handle stays
+    // open but unusable, as callers treat the port as not open). ERROR_SUCCESS when ready.
+    [[nodiscard]] DWORD Open(const wchar_t* portName, const DCB& dcb,
+                             const COMMTIMEOUTS& timeouts) noexcept;
+    [[nodiscard]] bool IsValid() const noexcept { return static_cast<bool>(handle_); }
+
+    size_t Read(uint8_t* buffer, size_t count) override;
+    size_t Write(const uint8_t* bytes, size_t count) override;
+    void Purge(bool transmit, bool receive) override;
+    void Break() override;
+    void Close() override;
+
+private:
+    UniqueFileHandle handle_;
+    DCB savedDcb_{};
+    COMMTIMEOUTS savedTimeouts_{};
+    DWORD readTotalConstant_ = 100;
+};
+
+// _time64 for the 60-second wait, GetTickCount for the short ones.
+class Win32ProtocolClock final : public ProtocolClock {
+public:
+    int64_t WallSeconds() override;
+    uint32_t TickMilliseconds() override;
+};
+
+// The output file: created (emptied) for read and write at each receive.
+class Win32ReceiveFile final : public ReceiveFile {
+public:
+    explicit Win32ReceiveFile(std::wstring path) : path_(std::move(path)) {}
+    bool Create() override;
+    void Write(const uint8_t* bytes, size_t count) override;
+    uint64_t Position() override;
+    void Close() override;
+
+private:
+    std::wstring path_;
+    UniqueFileHandle handle_;
+};
+
+// The driver's texts from the module's string table.
+class StringTableDriverTexts final : public DriverTextSource {
+public:
+    WideString Text(DriverText text) const override;
+};
