@@ -1,0 +1,188 @@
+// Byte layouts: line check, CRC-16, BCC and Y-Modem blocks, replies, input-file check, port set-up.
+#include <gtest/gtest.h>
+
+#include <cstring>
+#include <string>
+
+#include "download/portable/block_format.h"
+#include "download/portable/driver_text.h"
+#include "download/portable/port_setup.h"
+
+namespace {
+
+const uint8_t* Data(const std::string& text) {
+    return reinterpret_cast<const uint8_t*>(text.c_str());
+}
+
+TEST(LineCheck, SignedSumRemainderPlusSpaceIsTheCheckCharacter) {
+    // '1' + ',' = 0x31 + 0x2C = 93; 93 % 64 = 29; + 0x20 = 0x3D '='.
+    EXPECT_TRUE(PassesLineCheck(Data("1,=,\r\n"), 7));
+    EXPECT_FALSE(PassesLineCheck(Data("1,>,\r\n"), 7));
+    // The character between the check character and CR is neither summed nor checked.
+    EXPECT_TRUE(PassesLineCheck(Data("1,=X\r\n"), 7));
+}
+
+TEST(LineCheck, HighBitBytesCountNegativeAndKeepTheSignOfTheRemainder) {
+    // 0xC0 is -64, 0x81 is -127: total -191, remainder -63, + 0x20 = -31 = 0xE1.
+    const uint8_t line[] = {0xC0, 0x81, 0xE1, ',', '\r', '\n', 0};
+    EXPECT_TRUE(PassesLineCheck(line, sizeof line));
+    EXPECT_EQ(LineCheckCharacter(line, 2), 0xE1);
+}
+
+TEST(LineCheck, LinesTooShortOrWithoutCarriageReturnAreBounded) {
+    EXPECT_FALSE(PassesLineCheck(Data("\r\n"), 3));
+    EXPECT_FALSE(PassesLineCheck(Data("X\r\n"), 4));
+    EXPECT_TRUE(PassesLineCheck(Data(" ,"), 3));  // check character ' ' for an empty sum
+    const uint8_t noTerminator[4] = {'A', 'B', 'C', 'D'};
+    EXPECT_FALSE(PassesLineCheck(noTerminator, sizeof noTerminator));
+}
+
+TEST(Crc16, MatchesTheStandardCheckValue) {
+    CrcTable table;
+    BuildCrcTable(table);
+    EXPECT_EQ(table[1], 0x1021);
+    EXPECT_EQ(Crc16(table, Data("123456789"), 9), 0x31C3);
+}
+
+TEST(BccBlock, BuiltBlockCarriesDigitBccAndTerminatorAndValidates) {
+    const std::string text = "line one\r\nrest is replaced";
+    const BccBlock block = BuildBccBlock(Data(text), text.size(), 13);
+    EXPECT_EQ(block[0], 0x02);
+    EXPECT_EQ(std::memcmp(block.data() + 1, "line one", 8), 0);
+    EXPECT_EQ(block[9], ' ');  // filled with spaces from the first CR LF
+    EXPECT_EQ(block[128], ' ');
+    EXPECT_EQ(block[129], '3');
+    char digits[4] = {};
+    std::snprintf(digits, sizeof digits, "%03d", ComputeBcc(block.data()));
+    EXPECT_EQ(std::string(reinterpret_cast<const char*>(block.data() + 130), 3), digits);
+    EXPECT_EQ(block[133], 0x03);
+    EXPECT_EQ(block[134], '\r');
+    EXPECT_EQ(block[135], '\n');
+
+    CrcTable table;
+    BuildCrcTable(table);
+    uint16_t check = 0;
+    EXPECT_EQ(ValidateBlock(block.data(), block.size(), table, check), 0x03);
+    EXPECT_EQ(check, ComputeBcc(block.data()));
+    BccBlock damaged = block;
+    damaged[40] ^= 0x20;
+    EXPECT_EQ(ValidateBlock(damaged.data(), damaged.size(), table, check), 0x15);
+}
+
+TEST(YModemBlock, CrcDecidesExceptForAHundredThirtyOneByteBurst) {
+    CrcTable table;
+    BuildCrcTable(table);
+    YModemBlock header = BuildYModemHeaderBlock("survey.lv", 300, 1700000000, table);
+    std::array<uint8_t, kBlockCapacity> buffer{};
+    std::memcpy(buffer.data(), header.data(), header.size());
+    uint16_t check = 0;
+    EXPECT_EQ(ValidateBlock(buffer.data(), 133, table, check), 0x06);
+    buffer[50] ^= 1;
+    EXPECT_EQ(ValidateBlock(buffer.data(), 133, table, check), 0x15);
+    EXPECT_EQ(ValidateBlock(buffer.data(), 131, table, check), 0x06);
+}
+
+TEST(YModemBlock, HeaderRoundTripsNameAndSize) {
+    CrcTable table;
+    BuildCrcTable(table);
+    const YModemBlock header = BuildYModemHeaderBlock("survey.lv", 4321, 17, table);
+    EXPECT_EQ(std::string(reinterpret_cast<const char*>(header.data() + 3), 24),
+              std::string("survey.lv\0"
+                          "4321 17 \0 \0",
+                          21) +
+                  std::string(3, '\0'));
+    std::array<uint8_t, kBlockCapacity> buffer{};
+    std::memcpy(buffer.data(), header.data(), header.size());
+    const YModemHeaderInfo info = ParseYModemHeader(buffer.data());
+    EXPECT_EQ(info.Name, "survey.lv");
+    EXPECT_EQ(info.SizeText, "4321");
+    EXPECT_EQ(info.Size, 4321u);
+}
+
+TEST(YModemBlock, HeaderParseStaysInsideAnUnterminatedBlock) {
+    std::array<uint8_t, kBlockCapacity> buffer;
+    buffer.fill('7');
+    const YModemHeaderInfo info = ParseYModemHeader(buffer.data());
+    EXPECT_EQ(info.Name.size(), kBlockCapacity - 3);
+    EXPECT_TRUE(info.SizeText.empty());
+}
+
+TEST(Replies, BlockProtocolMapping) {
+    EXPECT_EQ(MapBccReply(0x00), 0x15);
+    EXPECT_EQ(MapBccReply(0x03), 0x06);
+    EXPECT_EQ(MapBccReply(0x04), 0x04);
+    EXPECT_EQ(MapBccReply(0x15), 0x15);
+    EXPECT_EQ(MapBccReply(0x41), 0x41);
+    CrcTable table{};
+    uint16_t check = 0;
+    const uint8_t eot[kBlockCapacity] = {0x04};
+    const uint8_t other[kBlockCapacity] = {'Q'};
+    EXPECT_EQ(ValidateBlock(eot, 1, table, check), 0x04);
+    EXPECT_EQ(ValidateBlock(other, 1, table, check), 0x15);
+}
+
+std::vector<uint8_t> BlockFile(int blocks, bool endWithEot) {
+    std::vector<uint8_t> file;
+    for (int i = 0; i < blocks; ++i) {
+        const std::string text = "block " + std::to_string(i);
+        const BccBlock block = BuildBccBlock(Data(text), text.size(), i);
+        file.insert(file.end(), block.begin(), block.end());
+    }
+    if (endWithEot)
+        file.push_back(0x04);
+    return file;
+}
+
+TEST(InputFileCheck, NumberedBlocksEndedByEotAreValid) {
+    const auto file = BlockFile(12, true);  // digits wrap from 9 to 0
+    EXPECT_EQ(CheckBccBlocks(file.data(), file.size()).Result, BccFileCheck::Outcome::Valid);
+}
+
+TEST(InputFileCheck, BccMismatchNamesBlockAndBothValues) {
+    auto file = BlockFile(3, true);
+    file[136 * 1 + 10] ^= 0x01;
+    const BccFileCheck check = CheckBccBlocks(file.data(), file.size());
+    EXPECT_EQ(check.Result, BccFileCheck::Outcome::BccMismatch);
+    EXPECT_EQ(check.Block, 1u);
+    EXPECT_EQ(check.ValueInBlock ^ check.Computed, 0x01u);
+}
+
+TEST(InputFileCheck, WrongDigitKindOrEmptyFileIsAWrongBlock) {
+    auto file = BlockFile(3, true);
+    file[136 * 2 + 129] = '7';
+    EXPECT_EQ(CheckBccBlocks(file.data(), file.size()).Result, BccFileCheck::Outcome::WrongBlock);
+    const uint8_t notBlocks[] = {'h', 'e', 'l', 'l', 'o'};
+    EXPECT_EQ(CheckBccBlocks(notBlocks, sizeof notBlocks).Result,
+              BccFileCheck::Outcome::WrongBlock);
+    EXPECT_EQ(CheckBccBlocks(nullptr, 0).Result, BccFileCheck::Outcome::WrongBlock);
+}
+
+TEST(PortSetup, FlowControlOnlyForSelectorZero) {
+    const DeviceControlFields raw = MakeDeviceControlFields(0);
+    EXPECT_EQ(raw.Flags, 0x1393u);
+    for (uint32_t selector : {1u, 2u, 3u})
+        EXPECT_EQ(MakeDeviceControlFields(selector).Flags, 0x1093u) << selector;
+    EXPECT_EQ(raw.Length, 28u);
+    EXPECT_EQ(raw.XonLimit, 1024);
+    EXPECT_EQ(raw.XoffLimit, 1536);
+    EXPECT_EQ(raw.XonChar, 0x11);
+    EXPECT_EQ(raw.XoffChar, 0x13);
+    EXPECT_EQ(raw.EofChar, 0xFF);
+    EXPECT_EQ(raw.EventChar, 0xFE);
+    const PortTimeouts timeouts = MakePortTimeouts();
+    EXPECT_EQ(timeouts.ReadInterval, 50u);
+    EXPECT_EQ(timeouts.ReadTotalMultiplier, 1u);
+    EXPECT_EQ(timeouts.ReadTotalConstant, 100u);
+    EXPECT_EQ(timeouts.WriteTotalMultiplier, 1u);
+    EXPECT_EQ(timeouts.WriteTotalConstant, 100u);
+}
+
+TEST(DriverTextFormat, ArgumentsFillConversionsInOrderAndMissingOnesAreDropped) {
+    EXPECT_EQ(FormatDriverText(WIDE_TEXT("block %d: %d!=%d, 100%%"),
+                               {WIDE_TEXT("2"), WIDE_TEXT("17"), WIDE_TEXT("18")}),
+              WIDE_TEXT("block 2: 17!=18, 100%"));
+    EXPECT_EQ(FormatDriverText(WIDE_TEXT("%s and %s %"), {WIDE_TEXT("one")}),
+              WIDE_TEXT("one and  %"));
+}
+
+}  // namespace
