@@ -1,0 +1,139 @@
+// Per-item objects from GetUIObjectOf: icon extractor and info tip; the shared icon lists.
+#include "tests/shell_folder/shell_folder_fixture.h"
+
+#include <commctrl.h>
+
+#include "namespace/icon_lists.h"
+#include "support/unique_resource.h"
+
+namespace {
+
+SIZE IconSize(HICON icon) {
+    ICONINFO info{};
+    if (!::GetIconInfo(icon, &info))
+        return {};
+    BITMAP bitmap{};
+    ::GetObjectW(info.hbmColor ? info.hbmColor : info.hbmMask, sizeof(bitmap), &bitmap);
+    if (info.hbmColor)
+        ::DeleteObject(info.hbmColor);
+    if (info.hbmMask)
+        ::DeleteObject(info.hbmMask);
+    return {bitmap.bmWidth, bitmap.bmHeight};
+}
+
+}  // namespace
+
+TEST_F(ShellFolderTest, UIObjectsNeedExactlyOneItem) {
+    ComPtr<IShellFolder> folder = CreateRootFolder();
+    UniquePidl first = StationItem(L"A");
+    UniquePidl second = StationItem(L"B");
+    PCUITEMID_CHILD items[] = {Child(first), Child(second)};
+    for (REFIID iid : {IID_IExtractIconW, IID_IQueryInfo, IID_IDataObject, IID_IUnknown}) {
+        void* object = reinterpret_cast<void*>(1);
+        EXPECT_EQ(E_FAIL, folder->GetUIObjectOf(nullptr, 2, items, iid, nullptr, &object));
+        EXPECT_EQ(nullptr, object);
+        EXPECT_EQ(E_FAIL, folder->GetUIObjectOf(nullptr, 0, items, iid, nullptr, &object));
+    }
+    // An item menu, and for now the data object and drop target, are not handed out.
+    for (REFIID iid : {IID_IContextMenu, IID_IDataObject, IID_IDropTarget, IID_IExtractIconA}) {
+        void* object = reinterpret_cast<void*>(1);
+        EXPECT_EQ(E_NOINTERFACE, folder->GetUIObjectOf(nullptr, 1, items, iid, nullptr, &object));
+        EXPECT_EQ(nullptr, object);
+    }
+}
+
+TEST_F(ShellFolderTest, InfoTipIsThePathOfTheFullIdentifier) {
+    ComPtr<IShellFolder> root = CreateRootFolder();
+    UniquePidl station = StationItem(L"Station 1");
+    PCUITEMID_CHILD item = Child(station);
+    ComPtr<IQueryInfo> info;
+    ASSERT_EQ(S_OK, root->GetUIObjectOf(nullptr, 1, &item, IID_IQueryInfo, nullptr, &info));
+    PWSTR tip = nullptr;
+    ASSERT_EQ(S_OK, info->GetInfoTip(QITIPF_DEFAULT, &tip));
+    EXPECT_STREQ(L"Quorvel Digital Level\\Station 1", tip);
+    ::CoTaskMemFree(tip);
+    DWORD flags = 0;
+    EXPECT_EQ(E_NOTIMPL, info->GetInfoFlags(&flags));
+
+    ComPtr<IShellFolder> stationFolder;
+    ASSERT_EQ(S_OK, root->BindToObject(reinterpret_cast<PCUIDLIST_RELATIVE>(station.get()), nullptr,
+                                       IID_PPV_ARGS(&stationFolder)));
+    UniquePidl file = FileItem(L"file1.hvr");
+    item = Child(file);
+    ASSERT_EQ(S_OK,
+              stationFolder->GetUIObjectOf(nullptr, 1, &item, IID_IQueryInfo, nullptr, &info));
+    // The folder's own copy of the list is gone; the tip object keeps its own.
+    file.reset();
+    ASSERT_EQ(S_OK, info->GetInfoTip(0, &tip));
+    EXPECT_STREQ(L"Quorvel Digital Level\\Station 1\\file1.hvr", tip);
+    ::CoTaskMemFree(tip);
+}
+
+TEST_F(ShellFolderTest, IconLocationByKindOfTheLastItem) {
+    ComPtr<IShellFolder> root = CreateRootFolder();
+    UniquePidl station = StationItem(L"Station 1");
+    UniquePidl rootItem = RootItem();
+    ComPtr<IShellFolder> stationFolder;
+    ASSERT_EQ(S_OK, root->BindToObject(reinterpret_cast<PCUIDLIST_RELATIVE>(station.get()), nullptr,
+                                       IID_PPV_ARGS(&stationFolder)));
+    UniquePidl file = FileItem(L"file1.lv");
+
+    const std::tuple<IShellFolder*, const UniquePidl*, int> cases[] = {
+        {root.Get(), &station, 0}, {stationFolder.Get(), &file, 2}, {root.Get(), &rootItem, 1}};
+    for (const auto& [folder, list, expectedIndex] : cases) {
+        PCUITEMID_CHILD item = Child(*list);
+        ComPtr<IExtractIconW> icon;
+        ASSERT_EQ(S_OK,
+                  folder->GetUIObjectOf(nullptr, 1, &item, IID_IExtractIconW, nullptr, &icon));
+        wchar_t file[MAX_PATH];
+        wcscpy(file, L"untouched");
+        int index = -1;
+        UINT flags = 0;
+        ASSERT_EQ(S_OK, icon->GetIconLocation(GIL_FORSHELL, file, MAX_PATH, &index, &flags));
+        EXPECT_EQ(static_cast<UINT>(GIL_NOTFILENAME), flags);
+        EXPECT_EQ(expectedIndex, index);
+        EXPECT_STREQ(L"untouched", file);
+    }
+}
+
+TEST_F(ShellFolderTest, SharedIconListsFeedTheExtractor) {
+    ComPtr<IShellFolder> root = CreateRootFolder();
+    UniquePidl station = StationItem(L"Station 1");
+    PCUITEMID_CHILD item = Child(station);
+    ComPtr<IExtractIconW> extractor;
+    ASSERT_EQ(S_OK, root->GetUIObjectOf(nullptr, 1, &item, IID_IExtractIconW, nullptr, &extractor));
+
+    DestroySharedIconLists();
+    HICON large = reinterpret_cast<HICON>(1), small = reinterpret_cast<HICON>(1);
+    EXPECT_EQ(E_FAIL, extractor->Extract(L"", 0, &large, &small, 0)) << "no lists, no icons";
+    EXPECT_EQ(nullptr, large);
+    EXPECT_EQ(nullptr, small);
+
+    // The test executable carries the module's resources, icons included.
+    ASSERT_TRUE(BuildSharedIconLists(::GetModuleHandleW(nullptr)));
+    ASSERT_TRUE(BuildSharedIconLists(::GetModuleHandleW(nullptr))) << "rebuilding replaces";
+    for (HIMAGELIST list : {SmallIconList(), LargeIconList()})
+        EXPECT_EQ(3, ::ImageList_GetImageCount(list));
+    int width = 0, height = 0;
+    ASSERT_TRUE(::ImageList_GetIconSize(SmallIconList(), &width, &height));
+    EXPECT_EQ(::GetSystemMetrics(SM_CXSMICON), width);
+    EXPECT_EQ(::GetSystemMetrics(SM_CYSMICON), height);
+    ASSERT_TRUE(::ImageList_GetIconSize(LargeIconList(), &width, &height));
+    EXPECT_EQ(::GetSystemMetrics(SM_CXICON), width);
+
+    for (UINT index : {0u, 1u, 2u}) {
+        ASSERT_EQ(S_OK, extractor->Extract(L"", index, &large, &small, MAKELONG(48, 16)));
+        UniqueHIcon ownedLarge(large), ownedSmall(small);
+        ASSERT_TRUE(ownedLarge && ownedSmall);
+        EXPECT_EQ(::GetSystemMetrics(SM_CXICON), IconSize(large).cx) << "requested size ignored";
+        EXPECT_EQ(::GetSystemMetrics(SM_CXSMICON), IconSize(small).cx);
+    }
+    DestroySharedIconLists();
+}
+
+TEST_F(ShellFolderTest, IconListsAreNotBuiltFromAModuleWithoutTheIcons) {
+    // kernel32 holds none of the group icons 101, 102 and 104: no partial, shifted list is left.
+    EXPECT_FALSE(BuildSharedIconLists(::GetModuleHandleW(L"kernel32.dll")));
+    EXPECT_EQ(nullptr, SmallIconList());
+    EXPECT_EQ(nullptr, LargeIconList());
+}

@@ -1,0 +1,98 @@
+// Shared set-up for the shell object tests: an isolated store, a root folder, item IDs as the
+// shell would hand them back, and a check that every object was released.
+#pragma once
+
+#include <windows.h>
+#include <shlobj.h>
+#include <wrl/client.h>
+
+#include <gtest/gtest.h>
+
+#include <string>
+#include <vector>
+
+#include "namespace/lv_shell_folder.h"
+#include "namespace/pidl_manager.h"
+#include "res/resource.h"
+#include "stations/station_store.h"
+#include "support/class_factory.h"
+#include "support/module_lock.h"
+#include "support/text_lookup.h"
+#include "tests/support/registry_override.h"
+
+using Microsoft::WRL::ComPtr;
+
+inline constexpr wchar_t kPrefix[] = L"::{7D3F2A61-4B8E-4c19-9A27-5E0C81B6D4F3}";
+
+class ShellFolderTest : public ::testing::Test {
+protected:
+    void TearDown() override {
+        // Every object made by a test is a local of the test body and gone by now: a lock left
+        // over is a reference leaked by the code under test.
+        EXPECT_EQ(0, ModuleLockCount());
+    }
+
+    static void AddStationOfModel(const std::wstring& name, UINT modelId = IDS_MODEL_LV10) {
+        Station station = DefaultStation();
+        station.Name = name;
+        station.Model = LoadUiText(modelId);
+        ASSERT_EQ(S_OK, AddStation(station));
+    }
+
+    // The root folder as the shell makes it: through the class's creation function, then
+    // IPersistFolder::Initialize.
+    static ComPtr<IShellFolder> CreateRootFolder() {
+        ComPtr<IShellFolder> folder;
+        EXPECT_EQ(S_OK, CreateComInstance<CLVShellFolder>(IID_PPV_ARGS(&folder)));
+        ComPtr<IPersistFolder> persist;
+        EXPECT_EQ(S_OK, folder.As(&persist));
+        EXPECT_EQ(S_OK, persist->Initialize(nullptr));
+        return folder;
+    }
+
+    UniquePidl StationItem(const std::wstring& name) const {
+        return UniquePidl(manager_.CreateItemPidl((L"Quorvel Digital Level\\" + name).c_str()));
+    }
+    UniquePidl FileItem(const std::wstring& name) const {
+        UniquePidl full(
+            manager_.CreatePidlFromPath((L"Quorvel Digital Level\\S\\" + name).c_str()));
+        return UniquePidl(manager_.CopyFromIndex(full.get(), 2));
+    }
+    UniquePidl RootItem() const { return UniquePidl(manager_.CreateRootPidl()); }
+
+    static PCUITEMID_CHILD Child(const UniquePidl& list) {
+        return reinterpret_cast<PCUITEMID_CHILD>(list.get());
+    }
+
+    static HRESULT DisplayName(IShellFolder* folder, const UniquePidl& item, SHGDNF flags,
+                               std::wstring& name) {
+        STRRET text{};
+        const HRESULT result = folder->GetDisplayNameOf(Child(item), flags, &text);
+        if (SUCCEEDED(result)) {
+            EXPECT_EQ(static_cast<UINT>(STRRET_WSTR), text.uType);
+            name = text.pOleStr;
+            ::CoTaskMemFree(text.pOleStr);
+        }
+        return result;
+    }
+
+    // Kind and name of every item the folder lists for the flags.
+    std::vector<std::pair<DWORD, std::wstring>> Enumerate(IShellFolder* folder, SHCONTF flags) {
+        std::vector<std::pair<DWORD, std::wstring>> items;
+        ComPtr<IEnumIDList> enumerator;
+        EXPECT_EQ(S_OK, folder->EnumObjects(nullptr, flags, &enumerator));
+        if (!enumerator)
+            return items;
+        PITEMID_CHILD item = nullptr;
+        ULONG fetched = 0;
+        while (enumerator->Next(1, &item, &fetched) == S_OK && fetched == 1) {
+            UniquePidl owned(reinterpret_cast<LPITEMIDLIST>(item));
+            items.emplace_back(manager_.GetLastItemKind(owned.get()),
+                               manager_.GetItemName(owned.get()));
+        }
+        return items;
+    }
+
+    RegistryOverride registry_;
+    CPidlMgr manager_;
+};
