@@ -1,0 +1,142 @@
+// CLVDownloadThread: connection record, driver callbacks as posted messages, the receive run.
+#include "download/download_thread.h"
+
+#include <algorithm>
+#include <cwchar>
+#include <string>
+
+#include "res/resource.h"
+#include "support/module_instance.h"
+#include "support/registered_messages.h"
+#include "support/text_lookup.h"
+#include "support/user_interface.h"
+
+namespace {
+
+constexpr DWORD kGeneralFailure = 0x80004005;
+constexpr uint32_t kReceiveFailed = 1;
+constexpr size_t kPortNameLength = 14;
+
+std::atomic<long> g_liveMessageTexts{0};
+
+// The progress text: "%d" becomes the percent and "%%" a percent sign. A translation with any
+// other conversion would be unsafe to hand to a formatter, so it is built here and refused
+// (false) instead.
+bool FormatPercentText(const std::wstring& format, int percent, std::wstring& text) {
+    text.clear();
+    for (size_t index = 0; index < format.size(); ++index) {
+        if (format[index] != L'%') {
+            text.push_back(format[index]);
+            continue;
+        }
+        const wchar_t next = index + 1 < format.size() ? format[index + 1] : L'\0';
+        if (next == L'd')
+            text += std::to_wstring(percent);
+        else if (next == L'%')
+            text.push_back(L'%');
+        else
+            return false;
+        ++index;
+    }
+    return true;
+}
+
+}  // namespace
+
+CLVDownloadThread::CLVDownloadThread(HWND notifyWindow, const Station& station,
+                                     const std::wstring& outputPath)
+    : outputPath_(outputPath),
+      params_(MakeConnectionRecord(station, outputPath)),
+      notifyWindow_(notifyWindow),
+      station_(station) {
+    driver_ = std::make_unique<TAZComm>(this, params_.get());
+    if (!driver_->IsPortOpen())
+        driver_.reset();
+}
+
+CLVDownloadThread::~CLVDownloadThread() {
+    // The worker may still be between its last post and its return; the driver is its own.
+    if (ThreadHandle())
+        ::WaitForSingleObject(ThreadHandle(), INFINITE);
+    driver_.reset();  // before the record it points to
+}
+
+std::unique_ptr<TAZCommParams> CLVDownloadThread::MakeConnectionRecord(
+    const Station& station, const std::wstring& outputPath) {
+    auto params = std::make_unique<TAZCommParams>();
+    // The built-in download always runs at 7 data bits, one stop bit, selector 1 (no XON/XOFF),
+    // whatever the station says about data bits, stop bits, protocol, flow and check sum.
+    params->DeviceControlBlock.BaudRate = station.BaudRate;
+    params->DeviceControlBlock.ByteSize = 7;
+    params->DeviceControlBlock.Parity = static_cast<BYTE>(station.Parity);
+    params->DeviceControlBlock.StopBits = ONESTOPBIT;
+    params->Protocol = kProtocolBccBlocks;
+    const size_t length = std::min(station.Port.size(), kPortNameLength);
+    std::copy_n(station.Port.data(), length, params->PortName);
+    params->PortName[length] = L'\0';
+    params->OutputPath = outputPath;
+    return params;
+}
+
+DWORD CLVDownloadThread::Run() {
+    const DWORD result = driver_ ? driver_->ReceiveLines() : kGeneralFailure;
+    if (result == kReceiveFailed) {
+        // One text for every failed receive (time-out, cancel, refused lines), as users know it.
+        ShowMessageBox(notifyWindow_, LoadUiText(IDS_SERIAL_WAIT_EXPIRED),
+                       LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONEXCLAMATION);
+    }
+    if (result == 0)
+        PostToWindow(g_registeredMessages.downloadThreadFinished, 0, 0);
+    else
+        PostToWindow(WM_CLOSE, 0, 0);
+    return 0;
+}
+
+void CLVDownloadThread::ShowMessage(uint32_t code, const WideChar* text) {
+    if (!::IsWindow(notifyWindow_))
+        return;  // the dialog is gone: no copy, nothing posted
+    const size_t length = text ? std::wcslen(text) : 0;
+    auto* copy = new (std::nothrow) wchar_t[length + 1];
+    if (!copy)
+        return;
+    std::copy_n(text ? text : L"", length + 1, copy);
+    ++g_liveMessageTexts;
+    if (!::PostMessageW(notifyWindow_, g_registeredMessages.downloadThreadMessage, code,
+                        reinterpret_cast<LPARAM>(copy))) {
+        FreeMessageText(reinterpret_cast<LPARAM>(copy));  // never delivered: still ours
+    }
+}
+
+void CLVDownloadThread::SetProgress(uint32_t total, uint32_t current) {
+    if (total == 0)
+        return;  // no measure of progress; the line protocol never passes it
+    const int percent = static_cast<int>(static_cast<double>(current) / total * 99.0);
+    if (percent <= 0)
+        return;
+    std::wstring text;
+    if (!FormatPercentText(LoadUiText(IDS_TRANSFER_PERCENT), percent, text)) {
+        (void)FormatPercentText(LoadText(ThisModule(), IDS_TRANSFER_PERCENT, kEnglishLanguage),
+                                percent, text);
+    }
+    ShowMessage(kMessageInformation, text.c_str());
+}
+
+bool CLVDownloadThread::IsCancelled() {
+    return IsStopRequested();
+}
+
+void CLVDownloadThread::PostToWindow(UINT message, WPARAM wParam, LPARAM lParam) noexcept {
+    if (::IsWindow(notifyWindow_))
+        (void)::PostMessageW(notifyWindow_, message, wParam, lParam);  // nothing to undo if lost
+}
+
+void CLVDownloadThread::FreeMessageText(LPARAM text) noexcept {
+    if (!text)
+        return;
+    delete[] reinterpret_cast<wchar_t*>(text);
+    --g_liveMessageTexts;
+}
+
+long CLVDownloadThread::LiveMessageTexts() noexcept {
+    return g_liveMessageTexts.load();
+}

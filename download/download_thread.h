@@ -1,0 +1,51 @@
+// CLVDownloadThread: one download with the serial driver on a worker thread, reported to a window
+// by posted registered messages.
+#pragma once
+
+#include <windows.h>
+
+#include <atomic>
+#include <cstdint>
+#include <memory>
+#include <string>
+
+#include "download/az_comm.h"
+#include "download/thread.h"
+#include "stations/portable/station.h"
+
+class CLVDownloadThread : public CThread, public TParserCallBack {
+public:
+    // Builds the connection record and opens the port through the driver. When the port cannot
+    // be opened the driver has already reported it to the window, and no driver is kept.
+    CLVDownloadThread(HWND notifyWindow, const Station& station, const std::wstring& outputPath);
+    // Waits for a started worker to be gone, then deletes the driver (which closes the port).
+    ~CLVDownloadThread() override;
+
+    // Receives the file with the line protocol; ends with "Download Thread Finished" or WM_CLOSE
+    // to the window. Always 0.
+    DWORD Run() override;
+
+    // TParserCallBack, called on the worker.
+    void ShowMessage(uint32_t code, const WideChar* text) override;
+    void SetProgress(uint32_t total, uint32_t current) override;
+    bool IsCancelled() override;
+
+    bool HasDriver() const noexcept { return driver_ != nullptr; }
+    const TAZCommParams& ConnectionRecord() const noexcept { return *params_; }
+
+    // The text copies handed over with "Download Thread Message": the receiver frees each one
+    // with FreeMessageText. LiveMessageTexts counts those not yet freed in this process.
+    static void FreeMessageText(LPARAM text) noexcept;
+    static long LiveMessageTexts() noexcept;
+
+private:
+    static std::unique_ptr<TAZCommParams> MakeConnectionRecord(const Station& station,
+                                                               const std::wstring& outputPath);
+    void PostToWindow(UINT message, WPARAM wParam, LPARAM lParam) noexcept;
+
+    std::wstring outputPath_;
+    std::unique_ptr<TAZComm> driver_;
+    std::unique_ptr<TAZCommParams> params_;
+    HWND notifyWindow_;
+    Station station_;
+};

@@ -1,0 +1,99 @@
+// CThread: start, state tracking, suspension and waiting around one worker thread.
+#include "download/thread.h"
+
+#include "support/text_lookup.h"
+
+namespace {
+constexpr DWORD kNotApplicable = 0xFFFFFFFF;
+constexpr DWORD kMaximumSuspendCount = 127;
+}  // namespace
+
+CThread::CThread() noexcept : language_(UiLanguage()) {}
+
+CThread::~CThread() = default;
+
+HANDLE CThread::Start() {
+    const uint32_t state = state_.load();
+    if (state == kRunning || state == kSuspended)
+        return thread_.get();
+    thread_.reset();
+    state_ = kRunning;  // before the worker can finish and set its own state
+    thread_.reset(::CreateThread(nullptr, 0, &CThread::ThreadProcedure, this, 0, nullptr));
+    if (!thread_)
+        state_ = state;
+    return thread_.get();
+}
+
+uint32_t CThread::GetStatus() {
+    if (state_.load() == kRunning) {
+        DWORD exitCode = STILL_ACTIVE;
+        if (::GetExitCodeThread(thread_.get(), &exitCode) && exitCode != STILL_ACTIVE)
+            state_ = kFinished;
+    }
+    return state_.load();
+}
+
+DWORD CThread::Suspend() {
+    const uint32_t state = state_.load();
+    if (state != kRunning && state != kSuspended)
+        return kNotApplicable;
+    const DWORD previous = ::SuspendThread(thread_.get());
+    if (previous < kMaximumSuspendCount)
+        state_ = kSuspended;
+    return previous;
+}
+
+DWORD CThread::Resume() {
+    if (state_.load() != kSuspended)
+        return kNotApplicable;
+    const DWORD previous = ::ResumeThread(thread_.get());
+    // Only the last resume lets the thread run again.
+    if (previous == 1)
+        state_ = kRunning;
+    return previous;
+}
+
+DWORD CThread::Wait(DWORD milliseconds) {
+    if (state_.load() != kRunning)
+        return kNotApplicable;
+    return ::WaitForSingleObject(thread_.get(), milliseconds);
+}
+
+DWORD CThread::StopAndWait(DWORD milliseconds) {
+    Stop();
+    return Wait(milliseconds);
+}
+
+bool CThread::Sleep(DWORD milliseconds, bool alertable) {
+    return ::SleepEx(milliseconds, alertable ? TRUE : FALSE) == WAIT_IO_COMPLETION;
+}
+
+DWORD CThread::GetExitCode() const {
+    DWORD exitCode = 0;
+    if (!::GetExitCodeThread(thread_.get(), &exitCode))
+        return 0;
+    return exitCode;
+}
+
+void CThread::OnStart() {}
+
+void CThread::OnEnd() {}
+
+void CThread::Stop() {
+    stopRequested_ = true;
+}
+
+DWORD CThread::Run() {
+    return kNotApplicable;
+}
+
+DWORD WINAPI CThread::ThreadProcedure(void* parameter) {
+    auto* thread = static_cast<CThread*>(parameter);
+    // Texts loaded on the worker come in the language of the window that started it.
+    (void)SelectThreadUiLanguage(thread->language_);  // a failure leaves the system's language
+    thread->OnStart();
+    const DWORD result = thread->Run();
+    thread->state_ = kFinished;
+    thread->OnEnd();
+    return result;
+}

@@ -1,0 +1,192 @@
+// Text lookup: string table, note cut, the translation-file search order, the cache, the shipped
+// German file, and broken files falling back to English.
+#include "support/text_lookup.h"
+
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <fstream>
+#include <string>
+#include <thread>
+
+#include "res/resource.h"
+#include "support/module_instance.h"
+
+namespace {
+
+constexpr LANGID kGerman = MAKELANGID(LANG_GERMAN, SUBLANG_GERMAN);
+namespace fs = std::filesystem;
+
+void WriteBytes(const fs::path& path, const std::string& bytes) {
+    fs::create_directories(path.parent_path());
+    std::ofstream file(path, std::ios::binary | std::ios::trunc);
+    file.write(bytes.data(), static_cast<std::streamsize>(bytes.size()));
+}
+
+// A UTF-16LE translation file with its byte-order mark.
+void WriteTranslations(const fs::path& path, const std::wstring& text) {
+    std::string bytes = "\xFF\xFE";
+    for (wchar_t character : text) {
+        bytes.push_back(static_cast<char>(character & 0xFF));
+        bytes.push_back(static_cast<char>(character >> 8));
+    }
+    WriteBytes(path, bytes);
+}
+
+// A scratch directory that plays the directory of a module named LVShellExt.dll.
+class TranslationFolder : public ::testing::Test {
+protected:
+    void SetUp() override {
+        wchar_t temp[MAX_PATH] = {};
+        ASSERT_NE(::GetTempPathW(MAX_PATH, temp), 0u);
+        directory_ =
+            fs::path(temp) / (L"lv_text_lookup_" + std::to_wstring(::GetCurrentProcessId()));
+        fs::remove_all(directory_);
+        fs::create_directories(directory_);
+        modulePath_ = (directory_ / L"LVShellExt.dll").wstring();
+        ClearTranslationCache();
+    }
+    void TearDown() override {
+        ClearTranslationCache();
+        std::error_code ignored;
+        fs::remove_all(directory_, ignored);
+    }
+    std::wstring German(const std::wstring& english) {
+        return TranslateTextForModulePath(english, kEnglishLanguage, kGerman, modulePath_);
+    }
+
+    fs::path directory_;
+    std::wstring modulePath_;
+};
+
+}  // namespace
+
+TEST(StringTable, LoadsEnglishTextsAndEmptyForMissingIds) {
+    EXPECT_EQ(LoadEnglishString(ThisModule(), IDS_CANCEL), L"Cancel");
+    EXPECT_EQ(LoadEnglishString(ThisModule(), IDS_TRANSFER_PERCENT),
+              L"Performing file transfer - %d%% done");
+    EXPECT_EQ(LoadEnglishString(ThisModule(), 4095), L"");
+    EXPECT_EQ(LoadText(ThisModule(), 4095, kGerman), L"");
+    EXPECT_EQ(LoadText(ThisModule(), IDS_WAITING_FOR_START, kEnglishLanguage),
+              L"Waiting for start...");
+}
+
+TEST_F(TranslationFolder, NoteIsCutInEnglishAndWhenTheFileLacksTheEntry) {
+    WriteTranslations(directory_ / L"ShellExt.txt", L"[Cancel]\r\n[Abbrechen]\r\n");
+    EXPECT_EQ(TranslateTextForModulePath(L"Start@@the button", kEnglishLanguage, kEnglishLanguage,
+                                         modulePath_),
+              L"Start");
+    EXPECT_EQ(German(L"Start@@the button"), L"Start");
+    EXPECT_EQ(German(L"@@only a note"), L"");
+    EXPECT_EQ(German(L"Cancel"), L"Abbrechen");
+}
+
+TEST_F(TranslationFolder, TranslationIsLookedUpWithTheNoteAndShownAsItStands) {
+    WriteTranslations(directory_ / L"ShellExt.txt",
+                      L"[Start@@the button]\r\n[Los@@geht's]\r\n[Empty]\r\n[]\r\n");
+    EXPECT_EQ(German(L"Start@@the button"), L"Los@@geht's");
+    EXPECT_EQ(German(L"Start"), L"Start");
+    EXPECT_EQ(German(L"Empty@@x"), L"Empty");  // the key differs by its note: not found
+    EXPECT_EQ(German(L"Empty"), L"Empty");     // an empty translation shows the English
+}
+
+TEST_F(TranslationFolder, SearchOrderPrefersLocaleFolderAndModuleName) {
+    const fs::path shared = directory_ / L"ShellExt.txt";
+    const fs::path localeShared = directory_ / L"de-DE" / L"ShellExt.txt";
+    const fs::path moduleNamed = directory_ / L"LVShellExt.txt";
+    const fs::path localeModuleNamed = directory_ / L"de-DE" / L"LVShellExt.txt";
+
+    EXPECT_EQ(FindTranslationFile(modulePath_, kGerman), L"");
+    WriteTranslations(shared, L"[Cancel]\r\n[shared]\r\n");
+    EXPECT_EQ(German(L"Cancel"), L"shared");
+
+    const std::pair<fs::path, const wchar_t*> betterOnes[] = {
+        {localeShared, L"locale shared"},
+        {moduleNamed, L"module named"},
+        {localeModuleNamed, L"locale module named"}};
+    for (const auto& [path, translation] : betterOnes) {
+        WriteTranslations(path, std::wstring(L"[Cancel]\r\n[") + translation + L"]\r\n");
+        ClearTranslationCache();
+        EXPECT_EQ(FindTranslationFile(modulePath_, kGerman), path.wstring());
+        EXPECT_EQ(German(L"Cancel"), translation);
+    }
+    // Another language never sees the German folder.
+    EXPECT_EQ(FindTranslationFile(modulePath_, MAKELANGID(LANG_FRENCH, SUBLANG_FRENCH)),
+              moduleNamed.wstring());
+}
+
+TEST_F(TranslationFolder, FileIsLoadedOncePerProcess) {
+    const fs::path file = directory_ / L"ShellExt.txt";
+    WriteTranslations(file, L"[Cancel]\r\n[Abbrechen]\r\n");
+    EXPECT_EQ(German(L"Cancel"), L"Abbrechen");
+    WriteTranslations(file, L"[Cancel]\r\n[Verwerfen]\r\n");
+    EXPECT_EQ(German(L"Cancel"), L"Abbrechen");
+    ClearTranslationCache();
+    EXPECT_EQ(German(L"Cancel"), L"Verwerfen");
+}
+
+TEST_F(TranslationFolder, EscapedLineBreakShowsAsLineBreak) {
+    WriteTranslations(directory_ / L"ShellExt.txt",
+                      L"[Line one\\r\\nLine two]\r\n[Zeile eins\\r\\nZeile zwei]\r\n");
+    EXPECT_EQ(German(L"Line one\r\nLine two"), L"Zeile eins\r\nZeile zwei");
+}
+
+TEST_F(TranslationFolder, BrokenFilesFallBackToEnglish) {
+    const fs::path file = directory_ / L"ShellExt.txt";
+    TranslationMap map;
+    const std::string cases[] = {
+        std::string(),                                     // empty: cannot even be mapped
+        std::string("\xFF"),                               // one byte
+        std::string("\xFE\xFF\0[\0C\0]", 8),               // big-endian
+        std::string("\xFF\xFE[\0C\0a\0n\0c\0e\0l\0", 16),  // cut in the English line
+        std::string("\xFF\xFE\0\xD8\0\xDC\xFF", 7),        // stray surrogates, odd size
+    };
+    for (const std::string& bytes : cases) {
+        WriteBytes(file, bytes);
+        ClearTranslationCache();
+        EXPECT_EQ(German(L"Cancel@@note"), L"Cancel");
+    }
+    WriteBytes(file, "");
+    EXPECT_EQ(LoadTranslationFile(file.wstring(), map), E_FAIL);
+    EXPECT_EQ(LoadTranslationFile((directory_ / L"missing.txt").wstring(), map),
+              HRESULT_FROM_WIN32(ERROR_FILE_NOT_FOUND));
+    EXPECT_TRUE(map.empty());
+}
+
+TEST(ShippedGermanFile, TranslatesEveryStringOfTheModule) {
+    const std::wstring file = FindTranslationFile(ThisModulePath(), kGerman);
+    ASSERT_NE(file, L"") << "the build copies res/translations beside the test";
+    TranslationMap german;
+    ASSERT_EQ(LoadTranslationFile(file, german), S_OK);
+    int strings = 0;
+    for (UINT id = 0; id < 4096; ++id) {
+        const std::wstring english = LoadEnglishString(ThisModule(), id);
+        if (english.empty())
+            continue;
+        ++strings;
+        const auto entry = german.find(english);
+        EXPECT_TRUE(entry != german.end() && !entry->second.empty())
+            << "string " << id << " has no German text";
+    }
+    EXPECT_GT(strings, 30);
+    ClearTranslationCache();
+    EXPECT_EQ(LoadText(ThisModule(), IDS_CANCEL, kGerman), L"Abbrechen");
+    EXPECT_EQ(LoadText(ThisModule(), IDS_INSTRUCTIONS_LV10, kGerman).substr(0, 24),
+              L"1. Taste [SET] drücken, ");
+}
+
+TEST(UiLanguage, SelectedLanguageIsThisThreadsAndChoosesTheTexts) {
+    const LANGID before = UiLanguage();
+    std::wstring inGerman, inEnglish;
+    std::thread worker([&] {
+        ASSERT_TRUE(SelectUiLanguage(kGerman));
+        EXPECT_EQ(UiLanguage(), kGerman);
+        inGerman = LoadUiText(IDS_CANCEL);
+        ASSERT_TRUE(SelectUiLanguage(kEnglishLanguage));
+        inEnglish = LoadUiText(IDS_CANCEL);
+    });
+    worker.join();
+    EXPECT_EQ(inGerman, L"Abbrechen");
+    EXPECT_EQ(inEnglish, L"Cancel");
+    EXPECT_EQ(UiLanguage(), before);
+}
