@@ -1,0 +1,111 @@
+// CThread: start, state, suspension, waiting, exit code and the worker's UI language.
+#include "download/thread.h"
+
+#include <gtest/gtest.h>
+
+#include "support/text_lookup.h"
+#include "support/unique_resource.h"
+
+namespace {
+
+constexpr LANGID kGerman = MAKELANGID(LANG_GERMAN, SUBLANG_GERMAN);
+
+// Runs until released (or stopped), then returns a known code.
+class GatedThread : public CThread {
+public:
+    GatedThread() : gate_(::CreateEventW(nullptr, TRUE, FALSE, nullptr)) {}
+    void Release() { ::SetEvent(gate_.get()); }
+    DWORD Run() override {
+        language = UiLanguage();
+        while (::WaitForSingleObject(gate_.get(), 10) == WAIT_TIMEOUT && !IsStopRequested()) {
+        }
+        ++runs;
+        return IsStopRequested() ? 7 : 42;
+    }
+    void OnEnd() override { stateAtEnd = GetStatus(); }
+
+    LANGID language = 0;
+    int runs = 0;
+    uint32_t stateAtEnd = 0;
+
+private:
+    UniqueHandle gate_;
+};
+
+}  // namespace
+
+TEST(Thread, StartOnRunningThreadReturnsItsHandleAndStartsNothing) {
+    GatedThread thread;
+    EXPECT_EQ(thread.GetStatus(), CThread::kCreated);
+    const HANDLE first = thread.Start();
+    ASSERT_NE(first, nullptr);
+    EXPECT_EQ(thread.GetStatus(), CThread::kRunning);
+    EXPECT_EQ(thread.Start(), first);
+    thread.Release();
+    EXPECT_EQ(thread.Wait(INFINITE), WAIT_OBJECT_0);
+    EXPECT_EQ(thread.GetStatus(), CThread::kFinished);
+    EXPECT_EQ(thread.stateAtEnd, CThread::kFinished);
+    EXPECT_EQ(thread.GetExitCode(), 42u);
+    EXPECT_EQ(thread.runs, 1);
+    // Not running any more: nothing to wait for.
+    EXPECT_EQ(thread.Wait(0), 0xFFFFFFFFu);
+}
+
+TEST(Thread, FinishedThreadStartsAgain) {
+    GatedThread thread;
+    thread.Release();
+    ASSERT_NE(thread.Start(), nullptr);
+    EXPECT_EQ(thread.Wait(INFINITE), WAIT_OBJECT_0);
+    ASSERT_NE(thread.Start(), nullptr);
+    EXPECT_EQ(thread.Wait(INFINITE), WAIT_OBJECT_0);
+    EXPECT_EQ(thread.runs, 2);
+}
+
+TEST(Thread, StopAndWaitEndsTheWork) {
+    GatedThread thread;
+    ASSERT_NE(thread.Start(), nullptr);
+    EXPECT_EQ(thread.StopAndWait(INFINITE), WAIT_OBJECT_0);
+    EXPECT_EQ(thread.GetExitCode(), 7u);
+}
+
+TEST(Thread, SuspendAndResumeTrackTheCount) {
+    GatedThread thread;
+    EXPECT_EQ(thread.Suspend(), 0xFFFFFFFFu);
+    EXPECT_EQ(thread.Resume(), 0xFFFFFFFFu);
+    ASSERT_NE(thread.Start(), nullptr);
+    EXPECT_EQ(thread.Resume(), 0xFFFFFFFFu);  // running, not suspended
+    EXPECT_EQ(thread.Suspend(), 0u);
+    EXPECT_EQ(thread.GetStatus(), CThread::kSuspended);
+    EXPECT_EQ(thread.Suspend(), 1u);
+    EXPECT_EQ(thread.Wait(0), 0xFFFFFFFFu);  // suspended is not running
+    EXPECT_EQ(thread.Resume(), 2u);
+    EXPECT_EQ(thread.GetStatus(), CThread::kSuspended);
+    EXPECT_EQ(thread.Resume(), 1u);
+    EXPECT_EQ(thread.GetStatus(), CThread::kRunning);
+    thread.Release();
+    EXPECT_EQ(thread.Wait(INFINITE), WAIT_OBJECT_0);
+}
+
+TEST(Thread, DefaultRunEndsWithAllBitsSet) {
+    CThread thread;
+    ASSERT_NE(thread.Start(), nullptr);
+    EXPECT_EQ(thread.Wait(INFINITE), WAIT_OBJECT_0);
+    EXPECT_EQ(thread.GetExitCode(), 0xFFFFFFFFu);
+}
+
+TEST(Thread, WorkerTakesOverTheCreatorsLanguage) {
+    const LANGID before = UiLanguage();
+    ASSERT_TRUE(SelectThreadUiLanguage(kGerman));
+    GatedThread thread;
+    ASSERT_TRUE(SelectThreadUiLanguage(before));
+    thread.Release();
+    ASSERT_NE(thread.Start(), nullptr);
+    EXPECT_EQ(thread.Wait(INFINITE), WAIT_OBJECT_0);
+    EXPECT_EQ(thread.language, kGerman);
+}
+
+TEST(Thread, AlertableSleepReportsCompletion) {
+    EXPECT_FALSE(CThread::Sleep(1, true));
+    ASSERT_NE(::QueueUserAPC([](ULONG_PTR) {}, ::GetCurrentThread(), 0), 0u);
+    EXPECT_TRUE(CThread::Sleep(1000, true));
+}
