@@ -1,0 +1,137 @@
+// Times the station store's operations on bases of 10, 100 and 1,000 stations, each in a scratch
+// registry key, and prints per-operation times and how they grow from 100 to 1,000 stations.
+#include <windows.h>
+#include <objbase.h>
+
+#include <chrono>
+#include <cstdio>
+#include <string>
+#include <vector>
+
+#include "stations/station_store.h"
+#include "support/registry_value.h"
+#include "support/unique_resource.h"
+
+namespace {
+
+using Clock = std::chrono::steady_clock;
+
+struct Figures {
+    double addMicroseconds;
+    double findMicroseconds;
+    double enumerateMicroseconds;  // one whole listing, as the folder makes it
+    double uniqueNameMicroseconds;
+};
+
+double MicrosecondsSince(Clock::time_point start) {
+    return std::chrono::duration<double, std::micro>(Clock::now() - start).count();
+}
+
+// Lists the station names the way the root folder does: every subkey, its "Name" value.
+size_t EnumerateStationNames() {
+    UniqueRegKey stations;
+    if (::RegOpenKeyExW(HKEY_CURRENT_USER, StationsKeyPath().c_str(), 0, KEY_READ,
+                        stations.put()) != ERROR_SUCCESS) {
+        return 0;
+    }
+    size_t count = 0;
+    for (DWORD index = 0;; ++index) {
+        wchar_t subkey[260];
+        DWORD length = ARRAYSIZE(subkey);
+        if (::RegEnumKeyExW(stations.get(), index, subkey, &length, nullptr, nullptr, nullptr,
+                            nullptr) != ERROR_SUCCESS) {
+            break;
+        }
+        UniqueRegKey key;
+        std::wstring name;
+        if (::RegOpenKeyExW(stations.get(), subkey, 0, KEY_READ, key.put()) == ERROR_SUCCESS &&
+            ReadStringValue(key.get(), L"Name", 520, name) == ERROR_SUCCESS) {
+            ++count;
+        }
+    }
+    return count;
+}
+
+Figures Measure(int stationCount) {
+    // Stations named like the folder's own additions: "New digital level", " (2)", " (3)", …
+    const std::wstring base = L"New digital level";
+    std::vector<Station> stations;
+    for (int i = 1; i <= stationCount; ++i) {
+        Station station = DefaultStation();
+        station.Name = i == 1 ? base : base + L" (" + std::to_wstring(i) + L")";
+        stations.push_back(station);
+    }
+
+    Figures figures{};
+    auto start = Clock::now();
+    for (const Station& station : stations) {
+        if (AddStation(station) != S_OK)
+            fprintf(stderr, "add failed\n");
+    }
+    figures.addMicroseconds = MicrosecondsSince(start) / stationCount;
+
+    start = Clock::now();
+    for (const Station& station : stations) {
+        Station found;
+        found.Name = station.Name;
+        if (FindStation(found) != S_OK)
+            fprintf(stderr, "find failed\n");
+    }
+    figures.findMicroseconds = MicrosecondsSince(start) / stationCount;
+
+    const int rounds = 5;
+    start = Clock::now();
+    for (int round = 0; round < rounds; ++round) {
+        if (EnumerateStationNames() != static_cast<size_t>(stationCount)) {
+            fprintf(stderr, "enumeration lost stations\n");
+        }
+    }
+    figures.enumerateMicroseconds = MicrosecondsSince(start) / rounds;
+
+    // Every candidate up to the count is taken, so the name search walks the whole base.
+    start = Clock::now();
+    const std::wstring unique = MakeUniqueStationName(base);
+    figures.uniqueNameMicroseconds = MicrosecondsSince(start);
+    if (unique != base + L" (" + std::to_wstring(stationCount + 1) + L")") {
+        fprintf(stderr, "unexpected unique name\n");
+    }
+    return figures;
+}
+
+}  // namespace
+
+int main() {
+    if (FAILED(::CoInitializeEx(nullptr, COINIT_APARTMENTTHREADED)))
+        return 1;
+    const wchar_t scratch[] = L"Software\\LVShellExt Benchmark";
+    printf("%-9s %12s %12s %14s %18s\n", "stations", "add (us)", "find (us)", "enumerate (us)",
+           "unique name (us)");
+    std::vector<Figures> results;
+    for (int count : {10, 100, 1000}) {
+        UniqueRegKey root;
+        ::RegCreateKeyExW(HKEY_CURRENT_USER, scratch, 0, nullptr, 0, KEY_ALL_ACCESS, nullptr,
+                          root.put(), nullptr);
+        // Each size starts from an empty store of its own.
+        if (::RegOverridePredefKey(HKEY_CURRENT_USER, root.get()) != ERROR_SUCCESS)
+            return 1;
+        const Figures figures = Measure(count);
+        ::RegOverridePredefKey(HKEY_CURRENT_USER, nullptr);
+        root.reset();
+        DeleteKeyRecursive(HKEY_CURRENT_USER, scratch);
+        printf("%-9d %12.1f %12.1f %14.1f %18.1f\n", count, figures.addMicroseconds,
+               figures.findMicroseconds, figures.enumerateMicroseconds,
+               figures.uniqueNameMicroseconds);
+        results.push_back(figures);
+    }
+    const Figures& hundred = results[1];
+    const Figures& thousand = results[2];
+    printf(
+        "growth from 100 to 1,000 stations (per operation): add x%.1f, find x%.1f, enumerate "
+        "x%.1f, unique name x%.1f\n",
+        thousand.addMicroseconds / hundred.addMicroseconds,
+        thousand.findMicroseconds / hundred.findMicroseconds,
+        thousand.enumerateMicroseconds / hundred.enumerateMicroseconds,
+        thousand.uniqueNameMicroseconds / hundred.uniqueNameMicroseconds);
+    ::CoUninitialize();
+    return 0;
+}
