@@ -1,0 +1,148 @@
+// lvrecv: receives an instrument's file over a COM port with the extension's serial driver.
+#include <windows.h>
+
+#include <atomic>
+#include <cstdio>
+#include <cwchar>
+#include <string>
+
+#include "download/az_comm.h"
+
+namespace {
+
+const char kUsage[] =
+    "Usage: lvrecv --port COMn --out FILE [options]\n"
+    "Receives a file from a digital level as the extension does, printing the driver's\n"
+    "messages and progress.\n"
+    "\n"
+    "  --port COMn                    serial port (required)\n"
+    "  --out FILE                     where the received data go (required)\n"
+    "  --baud N                       baud rate (default 9600)\n"
+    "  --parity none|odd|even         parity (default even); 7 data bits, 1 stop bit\n"
+    "  --protocol line|raw|bcc|ymodem receive procedure (default line)\n"
+    "  --quiet                        no progress lines\n"
+    "  --help                         this text\n"
+    "Exit code: 0 when the file is complete; 1 when the receive failed or was stopped with\n"
+    "Ctrl+C; 3 when the port cannot be opened; 2 on bad usage.\n";
+
+std::atomic<bool> g_cancelled{false};
+
+BOOL WINAPI OnConsoleControl(DWORD event) {
+    if (event == CTRL_C_EVENT || event == CTRL_BREAK_EVENT || event == CTRL_CLOSE_EVENT) {
+        // The driver sees it at its next check, reports and closes the port.
+        g_cancelled = true;
+        return TRUE;
+    }
+    return FALSE;
+}
+
+void PrintLine(FILE* stream, const wchar_t* prefix, const wchar_t* text) {
+    std::wstring line = std::wstring(prefix) + text + L"\n";
+    const int bytes = ::WideCharToMultiByte(CP_UTF8, 0, line.c_str(), static_cast<int>(line.size()),
+                                            nullptr, 0, nullptr, nullptr);
+    std::string utf8(bytes, '\0');
+    ::WideCharToMultiByte(CP_UTF8, 0, line.c_str(), static_cast<int>(line.size()), utf8.data(),
+                          bytes, nullptr, nullptr);
+    std::fwrite(utf8.data(), 1, utf8.size(), stream);
+    std::fflush(stream);
+}
+
+class ConsoleCallback final : public TParserCallBack {
+public:
+    explicit ConsoleCallback(bool quiet) : quiet_(quiet) {}
+    void ShowMessage(uint32_t code, const wchar_t* text) override {
+        lastCode = code;
+        lastError = text;
+        PrintLine(code == kMessageInformation ? stdout : stderr,
+                  code == kMessageInformation ? L"lvrecv: " : L"lvrecv: error: ", text);
+    }
+    void SetProgress(uint32_t total, uint32_t current) override {
+        if (quiet_ || total == 0)
+            return;
+        const std::wstring text = std::to_wstring(current) + L" / " + std::to_wstring(total);
+        PrintLine(stdout, L"lvrecv: progress ", text.c_str());
+    }
+    bool IsCancelled() override { return g_cancelled; }
+
+    uint32_t lastCode = 0;
+    std::wstring lastError;
+
+private:
+    bool quiet_;
+};
+
+}  // namespace
+
+int wmain(int argc, wchar_t** argv) {
+    std::wstring port;
+    std::wstring out;
+    std::wstring protocol = L"line";
+    uint32_t baud = 9600;
+    uint32_t parity = 2;
+    bool quiet = false;
+    for (int i = 1; i < argc; ++i) {
+        const std::wstring option = argv[i];
+        const bool hasValue = i + 1 < argc;
+        if (option == L"--help" || option == L"-h") {
+            std::fputs(kUsage, stdout);
+            return 0;
+        } else if (option == L"--quiet") {
+            quiet = true;
+        } else if (option == L"--port" && hasValue) {
+            port = argv[++i];
+        } else if (option == L"--out" && hasValue) {
+            out = argv[++i];
+        } else if (option == L"--baud" && hasValue) {
+            baud = static_cast<uint32_t>(std::wcstoul(argv[++i], nullptr, 10));
+        } else if (option == L"--parity" && hasValue) {
+            const std::wstring name = argv[++i];
+            parity = name == L"none" ? 0 : name == L"odd" ? 1 : 2;
+        } else if (option == L"--protocol" && hasValue) {
+            protocol = argv[++i];
+        } else {
+            std::fprintf(stderr, "lvrecv: bad option %ls\n%s", option.c_str(), kUsage);
+            return 2;
+        }
+    }
+    uint32_t selector = 0;
+    if (protocol == L"bcc")
+        selector = kProtocolBccBlocks;
+    else if (protocol == L"ymodem")
+        selector = kProtocolYModem;
+    else if (protocol == L"raw")
+        selector = kProtocolRawStream;
+    else if (protocol == L"line")
+        selector = kProtocolBccBlocks;  // the download thread's selector: no software flow control
+    else
+        port.clear();
+    if (port.empty() || out.empty() || baud == 0 || port.size() > 10) {
+        std::fputs(kUsage, stderr);
+        return 2;
+    }
+
+    TAZCommParams params;
+    params.DeviceControlBlock.BaudRate = baud;
+    params.DeviceControlBlock.ByteSize = 7;
+    params.DeviceControlBlock.Parity = static_cast<BYTE>(parity);
+    params.DeviceControlBlock.StopBits = 0;
+    // The driver passes the name to CreateFileW as it stands; only the device path form reaches
+    // ports above COM9, and it works for every port.
+    const std::wstring device = port.rfind(L"\\\\.\\", 0) == 0 ? port : L"\\\\.\\" + port;
+    wcsncpy(params.PortName, device.c_str(), 14);
+    params.Protocol = selector;
+    params.OutputPath = out;
+
+    ::SetConsoleCtrlHandler(OnConsoleControl, TRUE);
+    ConsoleCallback callback(quiet);
+    TAZComm driver(&callback, &params);
+    if (!driver.IsPortOpen())
+        return 3;
+    const uint32_t result = protocol == L"line" ? driver.ReceiveLines() : driver.Receive();
+    if (result == 0) {
+        PrintLine(stdout, L"lvrecv: file complete: ", out.c_str());
+        return 0;
+    }
+    if (g_cancelled)
+        PrintLine(stderr, L"lvrecv: ", L"stopped");
+    return 1;
+}

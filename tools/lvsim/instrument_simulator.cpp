@@ -1,0 +1,205 @@
+// InstrumentSimulator: the instrument's side of the line, BCC and Y-Modem protocols.
+#include "tools/lvsim/instrument_simulator.h"
+
+#include <cstdio>
+#include <ctime>
+
+#include "download/portable/block_format.h"
+
+using namespace serial_bytes;
+
+std::string WithCheckCharacter(const std::string& body) {
+    const char check = static_cast<char>(
+        LineCheckCharacter(reinterpret_cast<const uint8_t*>(body.data()), body.size()));
+    return body + check + ",\r\n";
+}
+
+std::vector<std::string> GenerateSurveyLines(uint32_t count, uint32_t length) {
+    std::vector<std::string> lines;
+    double height = 100.0;
+    for (uint32_t i = 1; i <= count; ++i) {
+        char line[256];
+        const double reading = 1.0 + (i * 37 % 2000) / 1000.0;
+        height += (i % 2 ? 1 : -1) * reading / 10.0;
+        int n = std::snprintf(line, sizeof line, "%s,%04u,%07.5f,%08.3f,%06.2f,",
+                              i % 2 ? "RB" : "RF", i, reading, height, 20.0 + i % 30);
+        std::string text(line, n);
+        // Pad with a point-code field so that the whole line (with check, comma and CR LF)
+        // has the asked length.
+        if (length > text.size() + 4 + 2)
+            text += std::string(length - text.size() - 4 - 2, 'P') + ",";
+        lines.push_back(text);
+    }
+    return lines;
+}
+
+bool InstrumentSimulator::SendPaced(const std::string& bytes) {
+    LARGE_INTEGER frequency, start, now;
+    ::QueryPerformanceFrequency(&frequency);
+    ::QueryPerformanceCounter(&start);
+    size_t sent = 0;
+    while (sent < bytes.size()) {
+        const size_t moved =
+            port_.Write(reinterpret_cast<const uint8_t*>(bytes.data()) + sent, bytes.size() - sent);
+        if (moved == 0)
+            return false;
+        sent += moved;
+    }
+    bytesSent_ += bytes.size();
+    // A real line takes its time: wait until the last bit would have left the wire.
+    const double wireSeconds =
+        static_cast<double>(bytes.size()) * options_.BitsPerCharacter / options_.BaudRate;
+    for (;;) {
+        ::QueryPerformanceCounter(&now);
+        const double spent =
+            static_cast<double>(now.QuadPart - start.QuadPart) / frequency.QuadPart;
+        if (spent >= wireSeconds)
+            return true;
+        ::Sleep(static_cast<DWORD>((wireSeconds - spent) * 1000) + 1);
+    }
+}
+
+std::string InstrumentSimulator::ReadAnswer(uint32_t timeoutMs) {
+    std::string answer;
+    const ULONGLONG start = ::GetTickCount64();
+    while (::GetTickCount64() - start < timeoutMs) {
+        uint8_t buffer[64];
+        const size_t got = port_.Read(buffer, sizeof buffer);
+        answer.append(reinterpret_cast<const char*>(buffer), got);
+        bytesReceived_ += got;
+        if (answer.find("\r\n") != std::string::npos || answer.find('C') != std::string::npos ||
+            (!answer.empty() && got == 0))
+            return answer;
+    }
+    return answer;
+}
+
+bool InstrumentSimulator::SendLineUntilAcknowledged(const std::string& line, bool corruptFirst,
+                                                    bool loseFirstAck) {
+    for (uint32_t attempt = 0; attempt <= options_.MaxResends; ++attempt) {
+        std::string sent = line;
+        if (corruptFirst && attempt == 0 && sent.size() >= 4)
+            sent[sent.size() - 4] ^= 0x01;
+        if (!SendPaced(sent))
+            return false;
+        const std::string answer = ReadAnswer(options_.AnswerTimeoutMs);
+        if (options_.Verbose)
+            std::fprintf(stderr, "lvsim: sent %zu bytes, answer %s\n", sent.size(),
+                         answer.empty()                            ? "none"
+                         : static_cast<uint8_t>(answer[0]) == kAck ? "ACK"
+                                                                   : "NAK");
+        if (!answer.empty() && static_cast<uint8_t>(answer[0]) == kAck) {
+            if (loseFirstAck && attempt == 0)
+                continue;  // as if the ACK was lost on the line: the same line goes again
+            return true;
+        }
+    }
+    return false;
+}
+
+int InstrumentSimulator::SendLines(const std::vector<std::string>& dataLines) {
+    if (options_.SilenceSeconds > 0)
+        ::Sleep(options_.SilenceSeconds * 1000);
+    for (uint32_t i = 0; i < options_.NoiseLines; ++i) {
+        if (!SendPaced("?? noise " + std::to_string(i) + "\r\n"))
+            return 1;
+        (void)ReadAnswer(options_.AnswerTimeoutMs);  // each is refused with a NAK line
+    }
+    if (!SendLineUntilAcknowledged("A,01,Z\r\n", false, false))
+        return 1;
+    if (options_.LongLineWithoutEnd) {
+        // Never acknowledged: the receiver waits for CR LF until its time-out.
+        (void)SendPaced(std::string(128, 'L'));
+        (void)ReadAnswer(options_.AnswerTimeoutMs);
+        return 1;
+    }
+    for (uint32_t i = 1; i <= dataLines.size(); ++i) {
+        if (!SendLineUntilAcknowledged(WithCheckCharacter(dataLines[i - 1]),
+                                       i == options_.BadCheckLine, i == options_.LostAckLine))
+            return 1;
+        if (i == options_.DisconnectAfterLine) {
+            port_.Close();
+            return 1;
+        }
+    }
+    return SendLineUntilAcknowledged("Z,&,\r\n", false, false) ? 0 : 1;
+}
+
+int InstrumentSimulator::SendBccBlocks(const std::vector<std::string>& dataLines) {
+    // Wait for the receiver's ENQ.
+    const ULONGLONG start = ::GetTickCount64();
+    for (;;) {
+        const std::string poll = ReadAnswer(1000);
+        if (!poll.empty() && static_cast<uint8_t>(poll[0]) == kEnq)
+            break;
+        if (::GetTickCount64() - start > 60000)
+            return 1;
+    }
+    for (size_t i = 0; i <= dataLines.size();) {
+        std::string block;
+        if (i == dataLines.size()) {
+            block = std::string(1, static_cast<char>(kEot));
+        } else {
+            const BccBlock bcc =
+                BuildBccBlock(reinterpret_cast<const uint8_t*>(dataLines[i].data()),
+                              dataLines[i].size(), static_cast<uint32_t>(i));
+            block.assign(bcc.begin(), bcc.end());
+            if (i + 1 == options_.BadCheckLine)
+                block[5] ^= 0x01;
+        }
+        if (!SendPaced(block))
+            return 1;
+        const std::string answer = ReadAnswer(options_.AnswerTimeoutMs);
+        if (i == dataLines.size())
+            return !answer.empty() && static_cast<uint8_t>(answer[0]) == kAck ? 0 : 1;
+        if (!answer.empty() && static_cast<uint8_t>(answer[0]) == kAck)
+            ++i;
+        else if (i + 1 == options_.BadCheckLine)
+            options_.BadCheckLine = 0;  // the resend is clean
+    }
+    return 0;
+}
+
+int InstrumentSimulator::SendYModem(const std::string& name, const std::string& content) {
+    CrcTable table;
+    BuildCrcTable(table);
+    auto waitFor = [&](uint8_t wanted) {
+        const ULONGLONG start = ::GetTickCount64();
+        while (::GetTickCount64() - start < 60000) {
+            const std::string answer = ReadAnswer(1000);
+            if (answer.find(static_cast<char>(wanted)) != std::string::npos)
+                return true;
+        }
+        return false;
+    };
+    if (!waitFor(kCrcRequest))
+        return 1;
+    const YModemBlock header =
+        BuildYModemHeaderBlock(name, static_cast<uint32_t>(content.size()),
+                               static_cast<uint32_t>(_time64(nullptr)), table);
+    if (!SendPaced(std::string(header.begin(), header.end())) || !waitFor(kAck))
+        return 1;
+    const size_t blocks = (content.size() + 127) / 128;
+    for (size_t i = 0; i < blocks;) {
+        std::string data = content.substr(i * 128, 128);
+        data.resize(128, 0x1A);
+        std::string block = {static_cast<char>(kSoh), static_cast<char>(i + 1),
+                             static_cast<char>(254 - i)};
+        block += data;
+        const uint16_t crc = Crc16(table, reinterpret_cast<const uint8_t*>(data.data()), 128);
+        block += static_cast<char>(crc >> 8);
+        block += static_cast<char>(crc);
+        if (i + 1 == options_.BadCheckLine) {
+            block[10] ^= 0x01;
+            options_.BadCheckLine = 0;
+        }
+        if (!SendPaced(block))
+            return 1;
+        const std::string answer = ReadAnswer(options_.AnswerTimeoutMs);
+        if (!answer.empty() && static_cast<uint8_t>(answer[0]) == kAck)
+            ++i;
+    }
+    if (!SendPaced(std::string(1, static_cast<char>(kEot))))
+        return 1;
+    return waitFor(kAck) ? 0 : 1;
+}
