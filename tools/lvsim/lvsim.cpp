@@ -28,6 +28,7 @@ const char kUsage[] =
     "  --lines N              send N generated lines instead of a file (default 20)\n"
     "  --line-length N        length of generated lines with CR LF (default 60)\n"
     "  --answer-timeout MS    resend a line with no ACK or NAK after MS (default 1000)\n"
+    "  --max-resends N        give up after N resends of one line (default 20)\n"
     "  --start-delay MS       wait before the first byte, to let the receiver start (default 0)\n"
     "Faults:\n"
     "  --bad-check K          line (or block) K goes first with a wrong check character\n"
@@ -107,6 +108,8 @@ int wmain(int argc, wchar_t** argv) {
             lineLength = number();
         } else if (option == L"--answer-timeout") {
             options.AnswerTimeoutMs = number();
+        } else if (option == L"--max-resends") {
+            options.MaxResends = number();
         } else if (option == L"--start-delay") {
             startDelay = number();
         } else if (option == L"--bad-check") {
@@ -168,6 +171,8 @@ int wmain(int argc, wchar_t** argv) {
                      SystemErrorText(error).c_str());
         return 1;
     }
+    // Answers left on the line by an earlier receiver are not meant for this transfer.
+    serial.Purge(true, true);
     if (startDelay)
         ::Sleep(startDelay);
 
