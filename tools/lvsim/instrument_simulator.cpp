@@ -26,8 +26,8 @@ std::vector<std::string> GenerateSurveyLines(uint32_t count, uint32_t length) {
         std::string text(line, n);
         // Pad with a point-code field so that the whole line (with check, comma and CR LF)
         // has the asked length.
-        if (length > text.size() + 4 + 2)
-            text += std::string(length - text.size() - 4 - 2, 'P') + ",";
+        if (length > text.size() + 3 + 2)
+            text += std::string(length - text.size() - 3 - 2, 'P') + ",";
         lines.push_back(text);
     }
     return lines;
