@@ -6,6 +6,7 @@
 #include <cwchar>
 
 #include "stations/portable/station_list_format.h"
+#include "namespace/portable/item_id_layout.h"
 #include "stations/portable/station_names.h"
 #include "support/registry_value.h"
 #include "support/text_lookup.h"
@@ -337,4 +338,13 @@ std::wstring ModelInstructionText(const std::wstring& model) {
 
 bool IsExternalLibraryModel(const std::wstring& model) {
     return model == LoadUiText(IDS_MODEL_LV20) || model == LoadUiText(IDS_MODEL_LV30);
+}
+
+std::wstring StationNameFromPath(const std::wstring& path) {
+    const std::vector<std::wstring> components = SplitPathComponents(path);
+    return components.size() > 1 ? components[1] : std::wstring();
+}
+
+std::wstring StationFileName(const std::wstring& model) {
+    return IsExternalLibraryModel(model) ? L"file1.hvr" : L"file1.lv";
 }

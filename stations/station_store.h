@@ -56,3 +56,11 @@ std::wstring ModelInstructionText(const std::wstring& model);
 
 // True when the model is one of the two served by the external communication library.
 bool IsExternalLibraryModel(const std::wstring& model);
+
+// The station's name in a namespace path (its second non-empty component, after the root's
+// name); empty when the path names no station.
+std::wstring StationNameFromPath(const std::wstring& path);
+
+// The file a station's folder shows: "file1.hvr" for the models of the external library,
+// "file1.lv" for every other model.
+std::wstring StationFileName(const std::wstring& model);

@@ -1,0 +1,95 @@
+// The read-once stream: reads to the end, deletes the file at the short read, and keeps its size.
+#include <windows.h>
+
+#include <gtest/gtest.h>
+
+#include <vector>
+
+#include "support/module_lock.h"
+#include "view/stream2.h"
+
+namespace {
+
+std::wstring WriteTemporaryFile(size_t size) {
+    wchar_t directory[MAX_PATH], path[MAX_PATH];
+    ::GetTempPathW(MAX_PATH, directory);
+    ::GetTempFileNameW(directory, L"TST", 0, path);
+    UniqueFileHandle file(::CreateFileW(path, GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS,
+                                        FILE_ATTRIBUTE_NORMAL, nullptr));
+    std::vector<char> bytes(size);
+    for (size_t i = 0; i < size; ++i)
+        bytes[i] = static_cast<char>('A' + i % 26);
+    DWORD written = 0;
+    EXPECT_TRUE(::WriteFile(file.get(), bytes.data(), static_cast<DWORD>(size), &written, nullptr));
+    return path;
+}
+
+bool FileExists(const std::wstring& path) {
+    return ::GetFileAttributesW(path.c_str()) != INVALID_FILE_ATTRIBUTES;
+}
+
+}  // namespace
+
+TEST(Stream2, ExactMultipleNeedsAThirdReadBeforeTheFileIsGone) {
+    const std::wstring path = WriteTemporaryFile(8192);
+    {
+        auto stream = MakeComObject<CStream2>();
+        ASSERT_EQ(S_OK, stream->Bind(path, true));
+        std::vector<char> buffer(4096);
+        ULONG got = 0;
+        ASSERT_EQ(S_OK, stream->Read(buffer.data(), 4096, &got));
+        EXPECT_EQ(4096u, got);
+        EXPECT_EQ('A', buffer[0]);
+        ASSERT_EQ(S_OK, stream->Read(buffer.data(), 4096, &got));
+        EXPECT_EQ(4096u, got);
+        EXPECT_EQ(static_cast<char>('A' + 4096 % 26), buffer[0]);
+        EXPECT_TRUE(FileExists(path)) << "two full reads do not yet show the end";
+        ASSERT_EQ(S_OK, stream->Read(buffer.data(), 4096, &got));
+        EXPECT_EQ(0u, got);
+        EXPECT_FALSE(FileExists(path));
+
+        // Finished: further reads give nothing, and Stat still knows the size taken at binding.
+        ASSERT_EQ(S_OK, stream->Read(buffer.data(), 4096, &got));
+        EXPECT_EQ(0u, got);
+        STATSTG statistics{};
+        EXPECT_EQ(S_OK, stream->Stat(&statistics, STATFLAG_NONAME));
+        EXPECT_EQ(8192u, statistics.cbSize.QuadPart);
+    }
+    EXPECT_EQ(0, ModuleLockCount());
+}
+
+TEST(Stream2, ReaderThatStopsEarlyLeavesTheFileAndNoDeleteFlagKeepsIt) {
+    const std::wstring path = WriteTemporaryFile(100);
+    {
+        auto stream = MakeComObject<CStream2>();
+        ASSERT_EQ(S_OK, stream->Bind(path, true));
+        char buffer[10];
+        ULONG got = 0;
+        ASSERT_EQ(S_OK, stream->Read(buffer, 10, &got));
+    }
+    EXPECT_TRUE(FileExists(path)) << "destroying the stream closes the file but does not delete it";
+    {
+        auto stream = MakeComObject<CStream2>();
+        ASSERT_EQ(S_OK, stream->Bind(path, false));
+        char buffer[200];
+        ULONG got = 0;
+        ASSERT_EQ(S_OK, stream->Read(buffer, 200, &got));
+        EXPECT_EQ(100u, got);
+    }
+    EXPECT_TRUE(FileExists(path));
+    ::DeleteFileW(path.c_str());
+}
+
+TEST(Stream2, MissingFileHasSizeZeroAndReadGivesTheWin32Code) {
+    auto stream = MakeComObject<CStream2>();
+    ASSERT_EQ(S_OK, stream->Bind(L"C:\\no such folder\\QRV1.tmp", true));
+    STATSTG statistics{};
+    ASSERT_EQ(S_OK, stream->Stat(&statistics, 0));
+    EXPECT_EQ(0u, statistics.cbSize.QuadPart);
+    char buffer[4];
+    ULONG got = 7;
+    EXPECT_EQ(static_cast<HRESULT>(ERROR_PATH_NOT_FOUND), stream->Read(buffer, 4, &got));
+    EXPECT_EQ(0u, got);
+    EXPECT_EQ(E_NOTIMPL, stream->Write(buffer, 4, &got));
+    EXPECT_EQ(S_OK, stream->Seek({}, STREAM_SEEK_SET, nullptr));
+}

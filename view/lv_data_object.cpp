@@ -1,0 +1,357 @@
+// The data object: formats, the virtual file's download, and the drag source.
+#include "view/lv_data_object.h"
+
+#include <shlobj.h>
+
+#include <cstring>
+#include <cwchar>
+
+#include "download/download_progress_dialog.h"
+#include "download/halvek_download_progress_dialog.h"
+#include "stations/station_store.h"
+#include "support/error_handling.h"
+#include "support/unique_resource.h"
+#include "view/enum_format_etc.h"
+#include "view/stream2.h"
+
+namespace {
+
+constexpr UINT kSharedMemoryFlags = GMEM_MOVEABLE | GMEM_ZEROINIT | GMEM_SHARE;
+
+// Registered by name on every use: the system hands back the same number each time.
+CLIPFORMAT Format(const wchar_t* name) noexcept {
+    return static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(name));
+}
+
+CLIPFORMAT FileContentsFormat() noexcept {
+    return Format(CFSTR_FILECONTENTS);
+}
+CLIPFORMAT FileGroupDescriptorFormat() noexcept {
+    return Format(CFSTR_FILEDESCRIPTORW);
+}
+CLIPFORMAT ShellIdListFormat() noexcept {
+    return Format(CFSTR_SHELLIDLIST);
+}
+CLIPFORMAT StationListFormat() noexcept {
+    return Format(L"Quorvel Total Stations");
+}
+CLIPFORMAT PreferredDropEffectFormat() noexcept {
+    return Format(CFSTR_PREFERREDDROPEFFECT);
+}
+
+bool IsHGlobalRequest(const FORMATETC& format, CLIPFORMAT wanted) noexcept {
+    return format.cfFormat == wanted && format.tymed == TYMED_HGLOBAL;
+}
+
+bool IsStreamRequest(const FORMATETC& format) noexcept {
+    return format.cfFormat == FileContentsFormat() && (format.tymed & TYMED_ISTREAM) != 0;
+}
+
+// Hands a filled block to the caller as an HGLOBAL medium.
+HRESULT ReturnHGlobal(UniqueHGlobal block, STGMEDIUM* medium) noexcept {
+    medium->tymed = TYMED_HGLOBAL;
+    medium->hGlobal = block.release();
+    medium->pUnkForRelease = nullptr;
+    return S_OK;
+}
+
+// The path of an item's identifier list as the data object names it: every name and a
+// backslash, until the characters taken reach the path limit; one trailing backslash dropped.
+std::wstring ItemPath(const CPidlMgr& manager, LPCITEMIDLIST list) {
+    std::wstring path;
+    size_t taken = 0;
+    for (LPCITEMIDLIST item = list; item && item->mkid.cb != 0 && taken < kMaximumPath;
+         item = manager.GetNextItem(item)) {
+        const std::wstring name = manager.GetItemName(item);
+        path += name;
+        path += L'\\';
+        taken += name.size() + 1;
+    }
+    if (path.size() >= kMaximumPath)
+        path.resize(kMaximumPath - 1);
+    if (!path.empty() && path.back() == L'\\')
+        path.pop_back();
+    return path;
+}
+
+}  // namespace
+
+CLVDataObject::~CLVDataObject() {
+    EndDragImage();
+}
+
+HRESULT CLVDataObject::SetItem(PCUIDLIST_RELATIVE fullList) {
+    RETURN_HR_IF(E_INVALIDARG, !fullList);
+    try {
+        UniquePidl copy(manager_.CopyPidl(fullList));
+        RETURN_IF_NULL_ALLOC(copy.get());
+        items_.push_back(std::move(copy));
+        return S_OK;
+    }
+    CATCH_RETURN()
+}
+
+void CLVDataObject::SetDragImage(HIMAGELIST images, HWND view, int xOffset, int yOffset) noexcept {
+    dragImages_ = images;
+    dragView_ = view;
+    dragOffsetX_ = xOffset;
+    dragOffsetY_ = yOffset;
+    dragImageStarted_ = false;
+}
+
+IFACEMETHODIMP CLVDataObject::QueryInterface(REFIID iid, void** object) {
+    static const QITAB table[] = {
+        QITABENT(CLVDataObject, IDataObject), QITABENT(CLVDataObject, IDropSource), {}};
+    return QISearch(this, table, iid, object);
+}
+
+HRESULT CLVDataObject::LoadItemStation(LPCITEMIDLIST item, Station& station) const {
+    station = DefaultStation();
+    station.Name = StationNameFromPath(ItemPath(manager_, item));
+    return FindStation(station);
+}
+
+IFACEMETHODIMP CLVDataObject::GetData(FORMATETC* format, STGMEDIUM* medium) {
+    if (!format || !medium)
+        return E_INVALIDARG;
+    try {
+        *medium = {};
+        if (IsHGlobalRequest(*format, PreferredDropEffectFormat())) {
+            return GetPreferredDropEffect(medium);
+        }
+        if (IsHGlobalRequest(*format, FileGroupDescriptorFormat())) {
+            return GetFileGroupDescriptor(medium);
+        }
+        if (IsStreamRequest(*format))
+            return GetFileContents(format->lindex, medium);
+        if (IsHGlobalRequest(*format, ShellIdListFormat()))
+            return GetShellIdListArray(medium);
+        if (IsHGlobalRequest(*format, StationListFormat()))
+            return GetStationList(medium);
+        return E_INVALIDARG;
+    }
+    CATCH_RETURN()
+}
+
+HRESULT CLVDataObject::GetPreferredDropEffect(STGMEDIUM* medium) {
+    UniqueHGlobal block(::GlobalAlloc(kSharedMemoryFlags, sizeof(DWORD)));
+    RETURN_IF_NULL_ALLOC(block.get());
+    {
+        GlobalLockGuard lock(block.get());
+        RETURN_IF_NULL_ALLOC(lock.data());
+        // Taking a file out of an instrument is always a copy, never a move.
+        *static_cast<DWORD*>(lock.data()) = DROPEFFECT_COPY;
+    }
+    return ReturnHGlobal(std::move(block), medium);
+}
+
+HRESULT CLVDataObject::GetFileGroupDescriptor(STGMEDIUM* medium) {
+    if (items_.empty())
+        return S_FALSE;
+    const size_t size = sizeof(UINT) + sizeof(FILEDESCRIPTORW) * items_.size();
+    UniqueHGlobal block(::GlobalAlloc(kSharedMemoryFlags, size));
+    RETURN_IF_NULL_ALLOC(block.get());
+    {
+        GlobalLockGuard lock(block.get());
+        RETURN_IF_NULL_ALLOC(lock.data());
+        auto* group = static_cast<FILEGROUPDESCRIPTORW*>(lock.data());
+        group->cItems = static_cast<UINT>(items_.size());
+        for (size_t index = 0; index < items_.size(); ++index) {
+            Station station;
+            // A station that cannot be loaded still names its file, with the default model's name.
+            const std::wstring name = LoadItemStation(items_[index].get(), station) == S_OK
+                                          ? StationFileName(station.Model)
+                                          : StationFileName(std::wstring());
+            // No size, time or attributes are announced: the file does not exist yet.
+            wcsncpy(group->fgd[index].cFileName, name.c_str(), MAX_PATH - 1);
+        }
+    }
+    return ReturnHGlobal(std::move(block), medium);
+}
+
+HRESULT CLVDataObject::GetFileContents(LONG index, STGMEDIUM* medium) {
+    if (items_.empty() || index < 0 || static_cast<size_t>(index) >= items_.size())
+        return S_FALSE;
+    LPCITEMIDLIST item = items_[index].get();
+    if (!manager_.IsFile(item))
+        return S_FALSE;
+
+    Station station;
+    const HRESULT loaded = LoadItemStation(item, station);
+    if (loaded != S_OK)
+        return loaded;
+
+    // A fresh temporary name for every request: asking twice downloads twice.
+    wchar_t directory[130];
+    const DWORD length = ::GetTempPathW(ARRAYSIZE(directory), directory);
+    if (length == 0 || length >= ARRAYSIZE(directory)) {
+        return static_cast<HRESULT>(length == 0 ? ::GetLastError() : ERROR_BUFFER_OVERFLOW);
+    }
+    wchar_t temporary[MAX_PATH];
+    if (::GetTempFileNameW(directory, L"QRV", 0, temporary) == 0) {
+        return static_cast<HRESULT>(::GetLastError());
+    }
+    // Only the unique name is wanted: the download writes the file (the external library adds
+    // ".txt" of its own), so the placeholder goes and the name loses its extension.
+    (void)::DeleteFileW(temporary);
+    std::wstring target = temporary;
+    const size_t dot = target.rfind(L'.');
+    if (dot != std::wstring::npos && target.find(L'\\', dot) == std::wstring::npos) {
+        target.erase(dot);
+    }
+
+    const bool external = IsExternalLibraryModel(station.Model);
+    // The caller's active window, if any, owns the dialog so that it stays in front of it.
+    const HWND owner = ::GetActiveWindow();
+    INT_PTR answer = IDCANCEL;
+    if (external) {
+        CHalvekDownloadProgressDialog dialog(owner, station, target);
+        answer = dialog.DoModal();
+    } else {
+        CDownloadProgressDialog dialog(owner, station, target);
+        answer = dialog.DoModal();
+    }
+    if (answer == IDCANCEL)
+        return S_FALSE;
+
+    if (external)
+        target += L".txt";
+    auto stream = MakeComObject<CStream2>();
+    RETURN_IF_FAILED(stream->Bind(target, true));
+    medium->tymed = TYMED_ISTREAM;
+    medium->pstm = stream.Detach();
+    medium->pUnkForRelease = nullptr;
+    return S_OK;
+}
+
+HRESULT CLVDataObject::GetShellIdListArray(STGMEDIUM* medium) {
+    if (items_.empty())
+        return S_FALSE;
+    UniquePidl parent(manager_.CopyParent(items_.front().get()));
+    if (!parent)
+        return S_FALSE;
+
+    const UINT parentSize = manager_.GetSize(parent.get());
+    std::vector<UniquePidl> children;
+    size_t size = parentSize + sizeof(UINT) * (items_.size() + 2);
+    for (const UniquePidl& item : items_) {
+        children.emplace_back(manager_.CopyItem(manager_.GetLastItem(item.get())));
+        RETURN_IF_NULL_ALLOC(children.back().get());
+        size += manager_.GetSize(children.back().get());
+    }
+
+    UniqueHGlobal block(::GlobalAlloc(kSharedMemoryFlags, size));
+    RETURN_IF_NULL_ALLOC(block.get());
+    {
+        GlobalLockGuard lock(block.get());
+        RETURN_IF_NULL_ALLOC(lock.data());
+        auto* bytes = static_cast<BYTE*>(lock.data());
+        auto* array = static_cast<CIDA*>(lock.data());
+        array->cidl = static_cast<UINT>(items_.size());
+        UINT offset = static_cast<UINT>(sizeof(UINT) * items_.size() + 8);
+        array->aoffset[0] = offset;
+        memcpy(bytes + offset, parent.get(), parentSize);
+        offset += parentSize;
+        for (const UniquePidl& child : children) {
+            const UINT childSize = manager_.GetSize(child.get());
+            memcpy(bytes + offset, child.get(), childSize);
+            // Every child is written to the same slot, as receivers of this format have always
+            // been given it: correct for one item, the last child's offset for several.
+            array->aoffset[1] = offset;
+            offset += childSize;
+        }
+    }
+    return ReturnHGlobal(std::move(block), medium);
+}
+
+HRESULT CLVDataObject::GetStationList(STGMEDIUM* medium) {
+    std::vector<Station> stations;
+    for (const UniquePidl& item : items_) {
+        Station station;
+        // Stations that no longer load are left out silently.
+        if (LoadItemStation(item.get(), station) == S_OK)
+            stations.push_back(station);
+    }
+    UniqueHGlobal block(SerializeStationList(stations));
+    RETURN_IF_NULL_ALLOC(block.get());
+    return ReturnHGlobal(std::move(block), medium);
+}
+
+IFACEMETHODIMP CLVDataObject::QueryGetData(FORMATETC* format) {
+    if (!format)
+        return E_INVALIDARG;
+    if (IsStreamRequest(*format) || IsHGlobalRequest(*format, FileGroupDescriptorFormat()) ||
+        IsHGlobalRequest(*format, ShellIdListFormat()) ||
+        IsHGlobalRequest(*format, PreferredDropEffectFormat()) ||
+        IsHGlobalRequest(*format, StationListFormat())) {
+        return S_OK;
+    }
+    return S_FALSE;
+}
+
+IFACEMETHODIMP CLVDataObject::SetData(FORMATETC* format, STGMEDIUM*, BOOL) {
+    // Nothing is stored and the medium stays the caller's: the object only offers data.
+    if (format) {
+        wchar_t name[260];
+        (void)::GetClipboardFormatNameW(format->cfFormat, name, ARRAYSIZE(name));
+    }
+    return S_OK;
+}
+
+IFACEMETHODIMP CLVDataObject::EnumFormatEtc(DWORD, IEnumFORMATETC** enumerator) {
+    if (!enumerator)
+        return E_POINTER;
+    *enumerator = nullptr;
+    try {
+        // "Preferred DropEffect" is answered but not listed.
+        const FORMATETC formats[] = {
+            {FileContentsFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_ISTREAM},
+            {FileGroupDescriptorFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL},
+            {ShellIdListFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL},
+            {StationListFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL},
+        };
+        *enumerator = MakeComObject<CEnumFormatEtc>(formats, ARRAYSIZE(formats)).Detach();
+        return S_OK;
+    }
+    CATCH_RETURN()
+}
+
+void CLVDataObject::EndDragImage() noexcept {
+    if (!dragImages_)
+        return;
+    ::ImageList_EndDrag();
+    ::ImageList_DragLeave(dragView_);
+    ::ImageList_Destroy(dragImages_);
+    dragImages_ = nullptr;
+    dragImageStarted_ = false;
+}
+
+IFACEMETHODIMP CLVDataObject::QueryContinueDrag(BOOL escapePressed, DWORD keyState) {
+    if (keyState == 0)
+        EndDragImage();
+    if (escapePressed)
+        return DRAGDROP_S_CANCEL;
+    return (keyState & MK_LBUTTON) ? S_OK : DRAGDROP_S_DROP;
+}
+
+IFACEMETHODIMP CLVDataObject::GiveFeedback(DWORD) {
+    if (!dragImages_)
+        return DRAGDROP_S_USEDEFAULTCURSORS;
+    if (!dragImageStarted_) {
+        ::ImageList_DragEnter(dragView_, 0, 0);
+        ::ImageList_BeginDrag(dragImages_, 0, 0, 0);
+        dragImageStarted_ = true;
+        return DRAGDROP_S_USEDEFAULTCURSORS;
+    }
+    POINT cursor;
+    if (!::GetCursorPos(&cursor))
+        return DRAGDROP_S_USEDEFAULTCURSORS;
+    const HWND under = ::WindowFromPoint(cursor);
+    if (under != dragView_ && !::IsChild(dragView_, under)) {
+        ::ImageList_DragShowNolock(FALSE);
+    } else {
+        ::ImageList_DragMove(dragOffsetX_ + cursor.x, cursor.y + dragOffsetY_);
+        ::ImageList_DragShowNolock(TRUE);
+    }
+    return DRAGDROP_S_USEDEFAULTCURSORS;
+}

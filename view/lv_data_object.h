@@ -1,0 +1,66 @@
+// CLVDataObject: the namespace's items on the clipboard and in drag and drop. Its files are
+// virtual: asking for "FileContents" runs the download there and then.
+#pragma once
+
+#include <windows.h>
+#include <commctrl.h>
+#include <objidl.h>
+#include <oleidl.h>
+#include <shlobj.h>
+
+#include <vector>
+
+#include "namespace/pidl_manager.h"
+#include "stations/portable/station.h"
+#include "support/com_object.h"
+
+class CLVDataObject final : public ComObject<IDataObject, IDropSource> {
+public:
+    CLVDataObject() = default;
+    ~CLVDataObject() override;
+
+    // Appends a copy of one item's internal full identifier (root, station, and file if any).
+    HRESULT SetItem(PCUIDLIST_RELATIVE fullList);
+    HRESULT AddItem(PCUIDLIST_RELATIVE fullList) { return SetItem(fullList); }
+
+    // The drag image that the view's drag start prepared; the object destroys the list when the
+    // drag ends.
+    void SetDragImage(HIMAGELIST images, HWND view, int xOffset, int yOffset) noexcept;
+
+    IFACEMETHODIMP QueryInterface(REFIID iid, void** object) override;
+
+    // IDataObject
+    IFACEMETHODIMP GetData(FORMATETC* format, STGMEDIUM* medium) override;
+    IFACEMETHODIMP GetDataHere(FORMATETC*, STGMEDIUM*) override { return E_NOTIMPL; }
+    IFACEMETHODIMP QueryGetData(FORMATETC* format) override;
+    IFACEMETHODIMP GetCanonicalFormatEtc(FORMATETC*, FORMATETC*) override { return E_NOTIMPL; }
+    IFACEMETHODIMP SetData(FORMATETC* format, STGMEDIUM* medium, BOOL release) override;
+    IFACEMETHODIMP EnumFormatEtc(DWORD direction, IEnumFORMATETC** enumerator) override;
+    IFACEMETHODIMP DAdvise(FORMATETC*, DWORD, IAdviseSink*, DWORD*) override { return E_NOTIMPL; }
+    IFACEMETHODIMP DUnadvise(DWORD) override { return E_NOTIMPL; }
+    IFACEMETHODIMP EnumDAdvise(IEnumSTATDATA**) override { return E_NOTIMPL; }
+
+    // IDropSource
+    IFACEMETHODIMP QueryContinueDrag(BOOL escapePressed, DWORD keyState) override;
+    IFACEMETHODIMP GiveFeedback(DWORD effect) override;
+
+private:
+    HRESULT GetPreferredDropEffect(STGMEDIUM* medium);
+    HRESULT GetFileGroupDescriptor(STGMEDIUM* medium);
+    HRESULT GetFileContents(LONG index, STGMEDIUM* medium);
+    HRESULT GetShellIdListArray(STGMEDIUM* medium);
+    HRESULT GetStationList(STGMEDIUM* medium);
+
+    // The station named by an item's path; the store's status when it cannot be loaded.
+    HRESULT LoadItemStation(LPCITEMIDLIST item, Station& station) const;
+    void EndDragImage() noexcept;
+
+    CPidlMgr manager_;
+    std::vector<UniquePidl> items_;
+
+    HIMAGELIST dragImages_ = nullptr;
+    HWND dragView_ = nullptr;
+    int dragOffsetX_ = 0;
+    int dragOffsetY_ = 0;
+    bool dragImageStarted_ = false;
+};
