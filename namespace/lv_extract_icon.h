@@ -13,7 +13,9 @@ public:
     CLVExtractIcon() noexcept = default;
 
     IFACEMETHODIMP QueryInterface(REFIID iid, void** object) override {
-        static const QITAB table[] = {QITABENT(CLVExtractIcon, IExtractIconW), {}};
+        // MinGW declares no __uuidof for this interface: the entry names its IID itself.
+        static const QITAB table[] = {
+            {&IID_IExtractIconW, OFFSETOFCLASS(IExtractIconW, CLVExtractIcon)}, {}};
         return QISearch(this, table, iid, object);
     }
 

@@ -13,7 +13,9 @@ public:
     CLVQueryInfo() noexcept = default;
 
     IFACEMETHODIMP QueryInterface(REFIID iid, void** object) override {
-        static const QITAB table[] = {QITABENT(CLVQueryInfo, IQueryInfo), {}};
+        // MinGW declares no __uuidof for this interface: the entry names its IID itself.
+        static const QITAB table[] = {{&IID_IQueryInfo, OFFSETOFCLASS(IQueryInfo, CLVQueryInfo)},
+                                      {}};
         return QISearch(this, table, iid, object);
     }
 };

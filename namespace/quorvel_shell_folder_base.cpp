@@ -94,10 +94,12 @@ HRESULT CQuorvelShellFolderBase::ParseDisplayName(HWND, IBindCtx*, LPWSTR name, 
         return E_INVALIDARG;
     try {
         wchar_t fullPath[kMaximumPath] = {};
-        (void)GetFolderPath(fullPath, ARRAYSIZE(fullPath), false);
-        // A name too long for the path buffer cannot name an item of ours.
-        if (!AppendToPath(fullPath, ARRAYSIZE(fullPath), true, name))
+        // A cut folder path would name items of an ancestor (a file name parsed as a station),
+        // and a name too long for the buffer cannot name an item of ours.
+        if (!GetFolderPath(fullPath, ARRAYSIZE(fullPath), false) ||
+            !AppendToPath(fullPath, ARRAYSIZE(fullPath), true, name)) {
             return E_INVALIDARG;
+        }
         UniquePidl fullList(manager_.CreatePidlFromPath(fullPath));
         if (!fullList)
             return E_INVALIDARG;

@@ -19,12 +19,13 @@ public:
             return E_POINTER;
         *enumerator = nullptr;
         try {
-            wchar_t folderPath[kMaximumPath] = {};
-            // A path that does not fit is enumerated as far as it goes.
-            (void)GetFolderPath(folderPath, ARRAYSIZE(folderPath), false);
             auto list = MakeComObject<EnumIDList>();
-            // The enumerator is released here when filling fails.
-            RETURN_HR_IF(E_OUTOFMEMORY, FAILED(list->Fill(folderPath, flags)));
+            wchar_t folderPath[kMaximumPath] = {};
+            // A folder whose path does not fit lists nothing: the cut path would be an
+            // ancestor's, whose items are not this folder's. The enumerator is released here
+            // when filling fails.
+            if (GetFolderPath(folderPath, ARRAYSIZE(folderPath), false))
+                RETURN_HR_IF(E_OUTOFMEMORY, FAILED(list->Fill(folderPath, flags)));
             return list->QueryInterface(IID_PPV_ARGS(enumerator));
         }
         CATCH_RETURN()

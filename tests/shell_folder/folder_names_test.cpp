@@ -30,13 +30,14 @@ TEST_F(ShellFolderTest, DisplayNameFlagRules) {
         std::wstring name = L"(none)";
         EXPECT_EQ(test.result, DisplayName(folder.Get(), station, test.flags, name))
             << "flags 0x" << std::hex << test.flags;
-        if (test.result == S_OK)
+        if (test.result == S_OK) {
             EXPECT_EQ(test.name, name) << "flags 0x" << std::hex << test.flags;
+        }
     }
 }
 
 TEST_F(ShellFolderTest, DisplayNamesOfLongNamesStayWithinThePathLength) {
-    // A station whose name fills the registry's limit: its folder path no longer fits.
+    // A station whose name is near the registry's limit: its folder path no longer fits.
     const std::wstring longName(255, L'L');
     ComPtr<IShellFolder> root = CreateRootFolder();
     UniquePidl station = StationItem(longName);
@@ -57,6 +58,9 @@ TEST_F(ShellFolderTest, DisplayNamesOfLongNamesStayWithinThePathLength) {
     EXPECT_EQ(E_INVALIDARG, stationFolder->ParseDisplayName(nullptr, nullptr, fileName.data(),
                                                             nullptr, &parsed, nullptr));
     EXPECT_EQ(nullptr, parsed);
+    // Nor does it list the root's stations as its own items.
+    AddStationOfModel(L"Station 1");
+    EXPECT_TRUE(Enumerate(stationFolder.Get(), SHCONTF_FOLDERS | SHCONTF_NONFOLDERS).empty());
 }
 
 TEST_F(ShellFolderTest, AttributesByKindAndValidation) {
