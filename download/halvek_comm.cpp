@@ -1,0 +1,138 @@
+// The external-library adapter: loading, object creation, points buffer, port number, texts.
+#include "download/halvek_comm.h"
+
+#include <cstring>
+#include <new>
+
+#include "res/resource.h"
+#include "support/module_instance.h"
+#include "support/text_lookup.h"
+
+namespace {
+
+constexpr size_t kFilePathBytes = 260;
+
+std::wstring ModuleDirectory() {
+    const std::wstring path = ThisModulePath();
+    const size_t slash = path.find_last_of(L"\\/");
+    return slash == std::wstring::npos ? std::wstring() : path.substr(0, slash + 1);
+}
+
+std::wstring FormatSystemText(DWORD code, const std::wstring& insert) {
+    DWORD_PTR arguments[1] = {reinterpret_cast<DWORD_PTR>(insert.c_str())};
+    wchar_t* buffer = nullptr;
+    const DWORD length = ::FormatMessageW(
+        FORMAT_MESSAGE_ALLOCATE_BUFFER | FORMAT_MESSAGE_FROM_SYSTEM | FORMAT_MESSAGE_ARGUMENT_ARRAY,
+        nullptr, code, 0, reinterpret_cast<wchar_t*>(&buffer), 0,
+        reinterpret_cast<va_list*>(arguments));
+    std::wstring text;
+    if (length != 0 && buffer)
+        text.assign(buffer, length);
+    if (buffer)
+        ::LocalFree(buffer);
+    while (!text.empty() && (text.back() == L'\n' || text.back() == L'\r' || text.back() == L' '))
+        text.pop_back();
+    return text;
+}
+
+}  // namespace
+
+std::wstring SystemResultText(HRESULT result, const std::wstring& insert) {
+    std::wstring text = FormatSystemText(static_cast<DWORD>(result), insert);
+    // Some systems keep their texts under the bare Win32 code only.
+    if (text.empty() && HRESULT_FACILITY(result) == FACILITY_WIN32)
+        text = FormatSystemText(HRESULT_CODE(result), insert);
+    if (text.empty()) {
+        wchar_t fallback[32] = {};
+        ::wsprintfW(fallback, L"0x%08X", static_cast<unsigned>(result));
+        text = fallback;
+        if (!insert.empty())
+            text += L" (" + insert + L")";
+    }
+    return text;
+}
+
+HRESULT CreateHalvekObject(UniqueHalvekObject& object, std::wstring& errorText) {
+    object.reset();
+    const std::wstring libraryPath = ModuleDirectory() + L"HalvekComm.dll";
+    // Deliberately never freed: the library keeps threads and state of its own.
+    const HMODULE library = ::LoadLibraryW(libraryPath.c_str());
+    if (!library) {
+        const HRESULT result = HRESULT_FROM_WIN32(::GetLastError());
+        errorText = SystemResultText(result, libraryPath);
+        return result;
+    }
+    const auto createInstance = reinterpret_cast<HalvekCreateInstanceFunction>(
+        reinterpret_cast<void*>(::GetProcAddress(library, "CreateInstance")));
+    if (!createInstance) {
+        const HRESULT result = HRESULT_FROM_WIN32(::GetLastError());
+        errorText = SystemResultText(result);
+        return result;
+    }
+    object.reset(createInstance());
+    if (!object) {
+        errorText = SystemResultText(E_OUTOFMEMORY);
+        return E_OUTOFMEMORY;
+    }
+    (void)object->Initialize();  // its result means nothing to this system
+    return S_OK;
+}
+
+std::unique_ptr<uint8_t[]> MakeHalvekPointsBuffer() {
+    // The rest of each record is the library's to fill: left as it comes.
+    std::unique_ptr<uint8_t[]> buffer(new (std::nothrow) uint8_t[kHalvekPointsBufferSize]);
+    if (!buffer)
+        return buffer;
+    const int32_t marker = -1;
+    for (size_t half = 0; half < kHalvekPointsBufferSize / kHalvekPointHalfSize; ++half)
+        std::memcpy(buffer.get() + half * kHalvekPointHalfSize + kHalvekPointMarkerOffset, &marker,
+                    sizeof marker);
+    return buffer;
+}
+
+int32_t HalvekPortNumber(WideStringView port) noexcept {
+    size_t index = 0;
+    while (index < port.size() && (port[index] < '0' || port[index] > '9'))
+        ++index;
+    int32_t number = 0;
+    for (; index < port.size() && port[index] >= '0' && port[index] <= '9'; ++index) {
+        const int32_t digit = port[index] - '0';
+        if (number > (INT32_MAX - digit) / 10)
+            break;
+        number = number * 10 + digit;
+    }
+    return number;
+}
+
+std::string HalvekFilePath(const std::wstring& path) {
+    char buffer[kFilePathBytes] = {};
+    // A path that does not fit is cut; the library then fails to create it and says so.
+    if (::WideCharToMultiByte(CP_THREAD_ACP, 0, path.c_str(), -1, buffer, kFilePathBytes, nullptr,
+                              nullptr) == 0) {
+        buffer[kFilePathBytes - 1] = '\0';
+    }
+    return std::string(buffer, strnlen(buffer, kFilePathBytes));
+}
+
+std::wstring HalvekResultText(int32_t code) {
+    switch (code) {
+        case 0:
+            return LoadUiText(IDS_HALVEK_NO_ERROR);
+        case -101:
+            return LoadUiText(IDS_SERIAL_WAIT_EXPIRED);
+        case -102:
+            return LoadUiText(IDS_SERIAL_INTERRUPTED_BY_USER);
+        case -201:
+        case -202:
+        case -203:
+            return LoadUiText(IDS_HALVEK_CANNOT_CREATE_FILE);
+        case -204:
+            return LoadUiText(IDS_HALVEK_CHECKSUM_WRONG);
+        case -301:
+            return LoadUiText(IDS_HALVEK_TEMPORARY_FILE_ERROR);
+        case -302:
+            return LoadUiText(IDS_HALVEK_POINT_NAME_WRONG);
+        default:
+            return LoadUiText(IDS_HALVEK_UNKNOWN_ERROR);
+    }
+}
