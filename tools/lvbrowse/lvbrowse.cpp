@@ -1,0 +1,207 @@
+// lvbrowse: the folder "Quorvel Digital Levels" as Explorer sees it, through the shell namespace
+// only (desktop folder, My Computer, the registered extension), never through the store itself.
+#include <windows.h>
+#include <shlobj.h>
+#include <shlwapi.h>
+#include <wrl/client.h>
+
+#include <cstdio>
+#include <string>
+
+#include "support/unique_resource.h"
+
+using Microsoft::WRL::ComPtr;
+
+namespace {
+
+const wchar_t kFolderPath[] =
+    L"::{20D04FE0-3AEA-1069-A2D8-08002B30309D}\\::{7D3F2A61-4B8E-4c19-9A27-5E0C81B6D4F3}";
+
+const wchar_t kUsage[] =
+    L"Usage:\n"
+    L"  lvbrowse           the folder under My Computer, its stations and their files\n"
+    L"  lvbrowse STATION   one station and its file\n";
+
+// Console output as UTF-8, so that names outside the console's code page survive a pipe.
+void Print(const std::wstring& text) {
+    const int bytes = ::WideCharToMultiByte(CP_UTF8, 0, text.c_str(), static_cast<int>(text.size()),
+                                            nullptr, 0, nullptr, nullptr);
+    std::string utf8(bytes, '\0');
+    ::WideCharToMultiByte(CP_UTF8, 0, text.c_str(), static_cast<int>(text.size()), utf8.data(),
+                          bytes, nullptr, nullptr);
+    std::fwrite(utf8.data(), 1, utf8.size(), stdout);
+}
+
+std::wstring Hex(DWORD value) {
+    wchar_t text[16];
+    std::swprintf(text, 16, L"0x%08lX", static_cast<unsigned long>(value));
+    return text;
+}
+
+std::wstring DescribeAttributes(SFGAOF attributes) {
+    static const struct {
+        SFGAOF bit;
+        const wchar_t* name;
+    } names[] = {{SFGAO_FOLDER, L"folder"},          {SFGAO_HASSUBFOLDER, L"has subfolders"},
+                 {SFGAO_DROPTARGET, L"drop target"}, {SFGAO_CANCOPY, L"can copy"},
+                 {SFGAO_CANMOVE, L"can move"},       {SFGAO_CANRENAME, L"can rename"},
+                 {SFGAO_CANDELETE, L"can delete"},   {SFGAO_FILESYSTEM, L"file system"}};
+    std::wstring text = Hex(attributes);
+    std::wstring list;
+    for (const auto& name : names) {
+        if (attributes & name.bit)
+            list += (list.empty() ? L"" : L", ") + std::wstring(name.name);
+    }
+    return text + L" (" + (list.empty() ? L"none" : list) + L")";
+}
+
+std::wstring DisplayName(IShellFolder* folder, PCUITEMID_CHILD item, SHGDNF flags) {
+    STRRET text{};
+    if (FAILED(folder->GetDisplayNameOf(item, flags, &text)))
+        return L"?";
+    wchar_t* name = nullptr;
+    if (FAILED(::StrRetToStrW(&text, item, &name)))
+        return L"?";
+    std::wstring result = name;
+    ::CoTaskMemFree(name);
+    return result;
+}
+
+std::wstring InfoTip(IShellFolder* folder, PCUITEMID_CHILD item) {
+    ComPtr<IQueryInfo> info;
+    if (FAILED(folder->GetUIObjectOf(nullptr, 1, &item, IID_IQueryInfo, nullptr,
+                                     reinterpret_cast<void**>(info.GetAddressOf()))))
+        return L"(none)";
+    wchar_t* tip = nullptr;
+    if (FAILED(info->GetInfoTip(0, &tip)) || !tip)
+        return L"(none)";
+    std::wstring result = tip;
+    ::CoTaskMemFree(tip);
+    return L"\"" + result + L"\"";
+}
+
+std::wstring IconIndex(IShellFolder* folder, PCUITEMID_CHILD item) {
+    ComPtr<IExtractIconW> extract;
+    if (FAILED(folder->GetUIObjectOf(nullptr, 1, &item, IID_IExtractIconW, nullptr,
+                                     reinterpret_cast<void**>(extract.GetAddressOf()))))
+        return L"?";
+    wchar_t file[MAX_PATH] = L"";
+    int index = -1;
+    UINT flags = 0;
+    if (FAILED(extract->GetIconLocation(0, file, MAX_PATH, &index, &flags)))
+        return L"?";
+    return std::to_wstring(index);
+}
+
+void PrintItem(IShellFolder* folder, PCUITEMID_CHILD item, const std::wstring& indent) {
+    SFGAOF attributes = 0xFFFFFFFF;
+    if (FAILED(folder->GetAttributesOf(1, &item, &attributes)))
+        attributes = 0;
+    Print(indent + DisplayName(folder, item, SHGDN_INFOLDER) + L"\n");
+    Print(indent + L"    parsing name: " + DisplayName(folder, item, SHGDN_FORPARSING) + L"\n");
+    Print(indent + L"    attributes:   " + DescribeAttributes(attributes) + L"\n");
+    Print(indent + L"    icon index:   " + IconIndex(folder, item) + L"\n");
+    Print(indent + L"    info tip:     " + InfoTip(folder, item) + L"\n");
+}
+
+// Lists a folder's items; each folder item is entered once more when recursing.
+HRESULT ListFolder(IShellFolder* folder, const std::wstring& indent, bool recurse) {
+    ComPtr<IEnumIDList> items;
+    const HRESULT result =
+        folder->EnumObjects(nullptr, SHCONTF_FOLDERS | SHCONTF_NONFOLDERS, &items);
+    if (result != S_OK || !items)
+        return FAILED(result) ? result : S_OK;
+    int count = 0;
+    for (;;) {
+        PITEMID_CHILD raw = nullptr;
+        if (items->Next(1, &raw, nullptr) != S_OK)
+            break;
+        UniqueCoTaskMem item(raw);
+        ++count;
+        PrintItem(folder, raw, indent);
+        SFGAOF attributes = SFGAO_FOLDER;
+        PCUITEMID_CHILD child = raw;
+        if (recurse && SUCCEEDED(folder->GetAttributesOf(1, &child, &attributes)) &&
+            (attributes & SFGAO_FOLDER)) {
+            ComPtr<IShellFolder> subfolder;
+            if (SUCCEEDED(folder->BindToObject(raw, nullptr, IID_PPV_ARGS(&subfolder))))
+                ListFolder(subfolder.Get(), indent + L"        ", false);
+        }
+    }
+    if (count == 0)
+        Print(indent + L"(empty)\n");
+    return S_OK;
+}
+
+int Browse(const wchar_t* station) {
+    ComPtr<IShellFolder> desktop;
+    if (FAILED(::SHGetDesktopFolder(&desktop)))
+        return 1;
+    std::wstring path = kFolderPath;
+    PIDLIST_RELATIVE raw = nullptr;
+    HRESULT result =
+        desktop->ParseDisplayName(nullptr, nullptr, path.data(), nullptr, &raw, nullptr);
+    UniqueCoTaskMem list(raw);
+    if (FAILED(result)) {
+        Print(L"The folder is not under My Computer (" + Hex(result) +
+              L"): register LVShellExt.dll with regsvr32 first.\n");
+        return 1;
+    }
+    // The folder's entry in My Computer: its name, and the attributes the registry gives it.
+    ComPtr<IShellFolder> myComputer;
+    PCUITEMID_CHILD entry = nullptr;
+    if (SUCCEEDED(::SHBindToParent(reinterpret_cast<PCIDLIST_ABSOLUTE>(raw),
+                                   IID_PPV_ARGS(&myComputer), &entry))) {
+        SFGAOF attributes = SFGAO_FOLDER | SFGAO_HASSUBFOLDER;
+        if (FAILED(myComputer->GetAttributesOf(1, &entry, &attributes)))
+            attributes = 0;
+        Print(L"My Computer\\" + DisplayName(myComputer.Get(), entry, SHGDN_INFOLDER) + L"\n");
+        Print(L"    parsing name: " + DisplayName(myComputer.Get(), entry, SHGDN_FORPARSING) +
+              L"\n");
+        Print(L"    attributes:   " + DescribeAttributes(attributes) + L"\n");
+    }
+
+    ComPtr<IShellFolder> root;
+    result = desktop->BindToObject(raw, nullptr, IID_PPV_ARGS(&root));
+    if (FAILED(result)) {
+        Print(L"Cannot open the folder (" + Hex(result) + L").\n");
+        return 1;
+    }
+    if (!station) {
+        return SUCCEEDED(ListFolder(root.Get(), L"    ", true)) ? 0 : 1;
+    }
+
+    std::wstring name = station;
+    PIDLIST_RELATIVE stationRaw = nullptr;
+    result = root->ParseDisplayName(nullptr, nullptr, name.data(), nullptr, &stationRaw, nullptr);
+    UniqueCoTaskMem stationList(stationRaw);
+    SFGAOF attributes = SFGAO_VALIDATE;
+    PCUITEMID_CHILD child = reinterpret_cast<PCUITEMID_CHILD>(stationRaw);
+    if (FAILED(result) || FAILED(root->GetAttributesOf(1, &child, &attributes))) {
+        Print(L"No station named \"" + name + L"\".\n");
+        return 1;
+    }
+    PrintItem(root.Get(), child, L"    ");
+    ComPtr<IShellFolder> folder;
+    result = root->BindToObject(stationRaw, nullptr, IID_PPV_ARGS(&folder));
+    if (FAILED(result)) {
+        Print(L"Cannot open the station (" + Hex(result) + L").\n");
+        return 1;
+    }
+    return SUCCEEDED(ListFolder(folder.Get(), L"        ", false)) ? 0 : 1;
+}
+
+}  // namespace
+
+int wmain(int argc, wchar_t** argv) {
+    if (argc > 2 ||
+        (argc == 2 && (std::wstring(argv[1]) == L"-h" || std::wstring(argv[1]) == L"--help"))) {
+        Print(kUsage);
+        return 2;
+    }
+    if (FAILED(::CoInitializeEx(nullptr, COINIT_APARTMENTTHREADED)))
+        return 1;
+    const int status = Browse(argc == 2 ? argv[1] : nullptr);
+    ::CoUninitialize();
+    return status;
+}
