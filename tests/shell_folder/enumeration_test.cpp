@@ -27,11 +27,6 @@ TEST_F(ShellFolderTest, RootListsStationsOnlyForFolders) {
     EXPECT_EQ(Items{}, Enumerate(folder.Get(), SHCONTF_NONFOLDERS));
 }
 
-TEST_F(ShellFolderTest, EmptyStoreListsNothing) {
-    ComPtr<IShellFolder> folder = CreateRootFolder();
-    EXPECT_EQ(Items{}, Enumerate(folder.Get(), SHCONTF_FOLDERS | SHCONTF_INCLUDEHIDDEN));
-}
-
 TEST_F(ShellFolderTest, StationFolderListsOneFileNamedByModel) {
     AddStationOfModel(L"Level 10", IDS_MODEL_LV10);
     AddStationOfModel(L"Level 20", IDS_MODEL_LV20);
