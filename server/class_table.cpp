@@ -8,10 +8,11 @@
 #include "namespace/lv_query_info.h"
 #include "namespace/lv_shell_folder.h"
 #include "res/registry/ids_registry.h"
+#include "view/lv_data_object.h"
 
 namespace {
 
-// Classes whose implementation arrives with the folder view and transfer work.
+// Classes without a creatable object here carry a null creation function.
 constexpr CLSID kDataObjectClassId = {
     0x4F9A7D26, 0xE3B1, 0x4C58, {0x8D, 0x0F, 0x72, 0xA5, 0xB1, 0xE6, 0xC3, 0x90}};
 constexpr CLSID kShellViewClassId = {
@@ -30,7 +31,7 @@ constexpr CLSID kQueryInfoClassId = {
 
 constexpr ClassTableEntry kClassTable[] = {
     {&CLSID_LVShellFolder, IDR_LVSHELLFOLDER, &CreateComInstance<CLVShellFolder>},
-    {&kDataObjectClassId, IDR_LVDATAOBJECT, nullptr},
+    {&kDataObjectClassId, IDR_LVDATAOBJECT, &CreateComInstance<CLVDataObject>},
     {&kEnumIdListClassId, IDR_LVENUMIDLIST, &CreateComInstance<CLVEnumIDList>},
     {&kExtractIconClassId, IDR_LVEXTRACTICON, &CreateComInstance<CLVExtractIcon>},
     {&kQueryInfoClassId, IDR_AZQUERYINFO, &CreateComInstance<CLVQueryInfo>},

@@ -34,8 +34,8 @@ TEST_F(ShellFolderTest, UIObjectsNeedExactlyOneItem) {
         EXPECT_EQ(nullptr, object);
         EXPECT_EQ(E_FAIL, folder->GetUIObjectOf(nullptr, 0, items, iid, nullptr, &object));
     }
-    // An item menu, and for now the data object and drop target, are not handed out.
-    for (REFIID iid : {IID_IContextMenu, IID_IDataObject, IID_IDropTarget, IID_IExtractIconA}) {
+    // An item menu, and for now the drop target, are not handed out.
+    for (REFIID iid : {IID_IContextMenu, IID_IDropTarget, IID_IExtractIconA}) {
         void* object = reinterpret_cast<void*>(1);
         EXPECT_EQ(E_NOINTERFACE, folder->GetUIObjectOf(nullptr, 1, items, iid, nullptr, &object));
         EXPECT_EQ(nullptr, object);
@@ -135,4 +135,25 @@ TEST_F(ShellFolderTest, IconListsAreNotBuiltFromAModuleWithoutTheIcons) {
     EXPECT_FALSE(BuildSharedIconLists(::GetModuleHandleW(L"kernel32.dll")));
     EXPECT_EQ(nullptr, SmallIconList());
     EXPECT_EQ(nullptr, LargeIconList());
+}
+
+TEST_F(ShellFolderTest, DataObjectOfAStationsFileNamesItByTheStationsModel) {
+    AddStationOfModel(L"Tripod", IDS_MODEL_LV20);
+    ComPtr<IShellFolder> root = CreateRootFolder();
+    UniquePidl station = StationItem(L"Tripod");
+    ComPtr<IShellFolder> stationFolder;
+    ASSERT_EQ(S_OK, root->BindToObject(Child(station), nullptr, IID_PPV_ARGS(&stationFolder)));
+    UniquePidl file = FileItem(L"file1.hvr");
+    PCUITEMID_CHILD item = Child(file);
+    ComPtr<IDataObject> data;
+    ASSERT_EQ(S_OK,
+              stationFolder->GetUIObjectOf(nullptr, 1, &item, IID_IDataObject, nullptr, &data));
+    FORMATETC format = {static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(CFSTR_FILEDESCRIPTORW)),
+                        nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
+    UniqueStgMedium medium;
+    ASSERT_EQ(S_OK, data->GetData(&format, medium.put()));
+    GlobalLockGuard lock(medium.get().hGlobal);
+    const auto* group = static_cast<const FILEGROUPDESCRIPTORW*>(lock.data());
+    ASSERT_EQ(1u, group->cItems);
+    EXPECT_STREQ(L"file1.hvr", group->fgd[0].cFileName);
 }
