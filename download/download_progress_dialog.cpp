@@ -34,7 +34,10 @@ BOOL CDownloadProgressDialog::OnInitDialog() {
     status_ = LoadUiText(IDS_WAITING_FOR_START);
     ::SetWindowTextW(Window(), LoadUiText(IDS_DOWNLOAD_TITLE).c_str());
     UpdateControls();
-    return TRUE;
+    // The focus goes to Start, the one thing to press: on the instructions, the system would
+    // select their whole text.
+    ::SetFocus(::GetDlgItem(Window(), IDC_START));
+    return FALSE;
 }
 
 bool CDownloadProgressDialog::OnCommand(WORD controlId, WORD notification) {

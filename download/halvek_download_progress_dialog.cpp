@@ -50,7 +50,10 @@ BOOL CHalvekDownloadProgressDialog::OnInitDialog() {
     SetControlText(IDC_START, LoadUiText(IDS_START));
     SetControlText(IDCANCEL, LoadUiText(IDS_CANCEL));
     ::SetWindowTextW(Window(), LoadUiText(IDS_HALVEK_DOWNLOAD_TITLE).c_str());
-    return TRUE;
+    // The focus goes to Start, the one thing to press: on the instructions, the system would
+    // select their whole text.
+    ::SetFocus(::GetDlgItem(Window(), IDC_START));
+    return FALSE;
 }
 
 void CHalvekDownloadProgressDialog::OnCancel() {

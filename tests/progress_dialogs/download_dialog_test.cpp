@@ -38,10 +38,13 @@ std::string ReadAll(const fs::path& path) {
 // The simulator on its own thread, playing the instrument on the other end of the cable.
 class Instrument {
 public:
-    Instrument(uint32_t baudRate, std::vector<std::string> lines) : lines_(std::move(lines)) {
+    // The instrument repeats an unanswered line every half second, maxResends times: long
+    // enough for the receiver to start, short enough to give up soon after a cancel.
+    Instrument(uint32_t baudRate, std::vector<std::string> lines, uint32_t maxResends = 20)
+        : lines_(std::move(lines)) {
         options_.BaudRate = baudRate;
         options_.AnswerTimeoutMs = 500;
-        options_.MaxResends = 40;
+        options_.MaxResends = maxResends;
     }
     ~Instrument() {
         if (thread_.joinable())
@@ -190,7 +193,7 @@ TEST_F(DownloadDialog, TransferFromTheInstrumentEndsWithOkAndTheExactFile) {
 }
 
 TEST_F(DownloadDialog, CancelDuringTransferWaitsForTheDriverToStop) {
-    Instrument instrument(1200, GenerateSurveyLines(200, 60));
+    Instrument instrument(1200, GenerateSurveyLines(200, 60), 3);
     ASSERT_TRUE(instrument.Open()) << "no virtual cable: run through run_dialog_tests";
     std::string partial;
     {
@@ -230,6 +233,7 @@ TEST_F(DownloadDialog, DISABLED_HoldForScreenshots) {
     station_.Name = L"Leveling line A - benchmark BM1";
     Instrument instrument(1200, GenerateSurveyLines(200, 60));
     ASSERT_TRUE(instrument.Open());
+    const std::wstring downloading = LoadUiText(IDS_DOWNLOADING);  // in this thread's language
     CDownloadProgressDialog dialog(nullptr, station_, output_.wstring());
     RunDialog(dialog, [&](DialogDriver& driver) {
         ASSERT_NE(driver.WaitForDialog(), nullptr);
@@ -238,7 +242,7 @@ TEST_F(DownloadDialog, DISABLED_HoldForScreenshots) {
         ::Sleep(pause);
         driver.Press(IDC_START);
         instrument.Play();
-        ASSERT_TRUE(driver.WaitForText(IDC_STATUS_TEXT, LoadUiText(IDS_DOWNLOADING), 10000));
+        ASSERT_TRUE(driver.WaitForText(IDC_STATUS_TEXT, downloading, 10000));
         std::printf("SCREENSHOT transfer\n");
         std::fflush(stdout);
         ::Sleep(pause);
