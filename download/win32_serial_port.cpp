@@ -61,8 +61,15 @@ Win32SerialPort::~Win32SerialPort() {
 
 DWORD Win32SerialPort::Open(const wchar_t* portName, const DCB& dcb,
                             const COMMTIMEOUTS& timeouts) noexcept {
-    handle_.reset(::CreateFileW(portName, GENERIC_READ | GENERIC_WRITE, 0, nullptr, OPEN_EXISTING,
-                                0, nullptr));
+    // "COM10" and above open only through the device namespace; "\\.\COM1" works for every
+    // port, so the station's plain name is given that prefix unless it already has one.
+    wchar_t device[MAX_PATH];
+    const bool prefixed = wcsncmp(portName, L"\\\\.\\", 4) == 0;
+    if (swprintf(device, ARRAYSIZE(device), prefixed ? L"%ls" : L"\\\\.\\%ls", portName) < 0) {
+        return ERROR_INVALID_NAME;
+    }
+    handle_.reset(
+        ::CreateFileW(device, GENERIC_READ | GENERIC_WRITE, 0, nullptr, OPEN_EXISTING, 0, nullptr));
     if (!handle_)
         return ::GetLastError();
     savedDcb_.DCBlength = sizeof savedDcb_;
