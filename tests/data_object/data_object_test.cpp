@@ -170,17 +170,18 @@ TEST_F(DataObject, PreferredDropEffectIsAlwaysCopy) {
 TEST_F(DataObject, FileGroupDescriptorNamesFilesByModel) {
     ComPtr<IDataObject> data =
         Over({L"Quorvel Digital Level\\North\\file1.lv", L"Quorvel Digital Level\\South\\file1.hvr",
-              L"Quorvel Digital Level\\Deleted\\file1.hvr"});
+              L"Quorvel Digital Level\\Deleted\\file1.hvr", L"Quorvel Digital Level"});
     FORMATETC format = Request(CFSTR_FILEDESCRIPTORW, TYMED_HGLOBAL);
     UniqueStgMedium medium;
     ASSERT_EQ(S_OK, data->GetData(&format, medium.put()));
     GlobalLockGuard lock(medium.get().hGlobal);
-    ASSERT_GE(lock.size(), sizeof(UINT) + 3 * sizeof(FILEDESCRIPTORW));
+    ASSERT_GE(lock.size(), sizeof(UINT) + 4 * sizeof(FILEDESCRIPTORW));
     const auto* group = static_cast<const FILEGROUPDESCRIPTORW*>(lock.data());
-    ASSERT_EQ(3u, group->cItems);
+    ASSERT_EQ(4u, group->cItems);
     EXPECT_STREQ(L"file1.lv", group->fgd[0].cFileName);
     EXPECT_STREQ(L"file1.hvr", group->fgd[1].cFileName);
     EXPECT_STREQ(L"file1.lv", group->fgd[2].cFileName) << "a station that cannot be loaded";
+    EXPECT_STREQ(L"file1.lv", group->fgd[3].cFileName) << "a list without a station";
     EXPECT_EQ(0u, group->fgd[0].dwFlags) << "no size, time or attributes are announced";
 
     ComPtr<IDataObject> empty = Over({});

@@ -49,15 +49,17 @@ TEST(StationListFormat, FlatRecordHasTheInteroperableFieldOrder) {
     ASSERT_EQ(44u, FlatStationRecordSize(station));
 
     const std::vector<uint8_t> block = SerializeStationRecords({station});
+    // clang-format off: one row a field group
     const std::vector<uint8_t> expected = {
         1,    0,    0,    0,                          // count
         44,   0,    0,    0,                          // record size
         'A',  0,    0,    0,    'C',  0,    0,    0,  // Name, Port
-        0x11, 0x11, 0x11, 0x11, 0x22, 0x22, 0x22, 0x22, 0x33, 0x33, 0x33, 0x33, 0x44,
-        0x44, 0x44, 0x44,                             // BaudRate, StopBits, Parity, DataBits
+        0x11, 0x11, 0x11, 0x11, 0x22, 0x22, 0x22, 0x22, 0x33, 0x33, 0x33, 0x33,
+        0x44, 0x44, 0x44, 0x44,                       // BaudRate, StopBits, Parity, DataBits
         0,    0,    'M',  0,    0,    0,    0,    0,  // Manufacturer, Model, Software
         0x55, 0x55, 0x55, 0x55, 0x66, 0x66, 0x66, 0x66, 0x77, 0x77, 0x77, 0x77};  // Protocol, Flow,
-                                                                                  // CheckSum
+    // clang-format on
+    // CheckSum
     EXPECT_EQ(expected, block);
 }
 
