@@ -68,7 +68,8 @@ int wmain(int argc, wchar_t** argv) {
                            simulatorPort + L" --baud 9600 --parity even --lines " +
                            std::to_wstring(lines) + L" --line-length " +
                            std::to_wstring(lineLength);
-    STARTUPINFOW startup{sizeof startup};
+    STARTUPINFOW startup{};
+    startup.cb = sizeof startup;
     PROCESS_INFORMATION process{};
     LARGE_INTEGER frequency, start, end;
     ::QueryPerformanceFrequency(&frequency);

@@ -49,7 +49,8 @@ DWORD RunRegsvr32(bool unregister) {
     if (unregister)
         commandLine += L"/u ";
     commandLine += L"\"" + ExtensionDllPath() + L"\"";
-    STARTUPINFOW startup{sizeof startup};
+    STARTUPINFOW startup{};
+    startup.cb = sizeof startup;
     PROCESS_INFORMATION process{};
     if (!::CreateProcessW(program.c_str(), commandLine.data(), nullptr, nullptr, FALSE, 0, nullptr,
                           nullptr, &startup, &process))
