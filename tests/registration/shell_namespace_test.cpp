@@ -68,8 +68,9 @@ protected:
         EXPECT_EQ(S_OK, desktop->ParseDisplayName(nullptr, nullptr, name.data(), nullptr,
                                                   &list.list, nullptr));
         ComPtr<IShellFolder> folder;
-        if (list.list)
+        if (list.list) {
             EXPECT_EQ(S_OK, desktop->BindToObject(list.list, nullptr, IID_PPV_ARGS(&folder)));
+        }
         return folder;
     }
 

@@ -35,8 +35,9 @@ void CreateKeyWithValue(const wchar_t* path, const wchar_t* name, const wchar_t*
     UniqueRegKey key;
     ASSERT_EQ(ERROR_SUCCESS, ::RegCreateKeyExW(HKEY_CURRENT_USER, path, 0, nullptr, 0,
                                                KEY_ALL_ACCESS, nullptr, key.put(), nullptr));
-    if (name)
+    if (name) {
         ASSERT_EQ(ERROR_SUCCESS, WriteStringValue(key.get(), name, text));
+    }
 }
 
 const wchar_t kScript[] =
