@@ -237,6 +237,31 @@ std::wstring MakeUniqueStationName(const std::wstring& base) {
     return MakeUniqueName(base, IsStationNameTaken);
 }
 
+std::vector<std::wstring> ListStationNames() {
+    std::vector<std::wstring> names;
+    UniqueRegKey stations;
+    if (::RegOpenKeyExW(HKEY_CURRENT_USER, StationsKeyPath().c_str(), 0, KEY_READ,
+                        stations.put()) != ERROR_SUCCESS) {
+        return names;
+    }
+    for (DWORD index = 0;; ++index) {
+        wchar_t subkeyName[kKeyNameCapacity];
+        DWORD length = kKeyNameCapacity;
+        if (::RegEnumKeyExW(stations.get(), index, subkeyName, &length, nullptr, nullptr, nullptr,
+                            nullptr) != ERROR_SUCCESS) {
+            break;
+        }
+        UniqueRegKey subkey;
+        std::wstring name;
+        if (::RegOpenKeyExW(stations.get(), subkeyName, 0, KEY_READ, subkey.put()) ==
+                ERROR_SUCCESS &&
+            ReadText(subkey.get(), L"Name", name) == ERROR_SUCCESS) {
+            names.push_back(std::move(name));
+        }
+    }
+    return names;
+}
+
 std::wstring MakePastedStationName(const std::wstring& name) {
     return MakePastedName(name, LoadUiText(IDS_COPY_OF), IsStationNameTaken);
 }

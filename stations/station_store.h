@@ -36,6 +36,10 @@ void SaveStationValues(const Station& station, HKEY stationKey);
 
 std::wstring MakeUniqueStationName(const std::wstring& base);
 
+// The names of the stored stations in the registry's own order (as the folder lists them);
+// station keys without a readable "Name" are left out.
+std::vector<std::wstring> ListStationNames();
+
 // The name a pasted station gets: "Copy of " put in front until no station has it.
 std::wstring MakePastedStationName(const std::wstring& name);
 

@@ -9,7 +9,7 @@
 #include <vector>
 
 #include "stations/station_store.h"
-#include "support/registry_value.h"
+#include "support/registry_value.h"  // DeleteKeyRecursive
 #include "support/unique_resource.h"
 
 namespace {
@@ -25,31 +25,6 @@ struct Figures {
 
 double MicrosecondsSince(Clock::time_point start) {
     return std::chrono::duration<double, std::micro>(Clock::now() - start).count();
-}
-
-// Lists the station names the way the root folder does: every subkey, its "Name" value.
-size_t EnumerateStationNames() {
-    UniqueRegKey stations;
-    if (::RegOpenKeyExW(HKEY_CURRENT_USER, StationsKeyPath().c_str(), 0, KEY_READ,
-                        stations.put()) != ERROR_SUCCESS) {
-        return 0;
-    }
-    size_t count = 0;
-    for (DWORD index = 0;; ++index) {
-        wchar_t subkey[260];
-        DWORD length = ARRAYSIZE(subkey);
-        if (::RegEnumKeyExW(stations.get(), index, subkey, &length, nullptr, nullptr, nullptr,
-                            nullptr) != ERROR_SUCCESS) {
-            break;
-        }
-        UniqueRegKey key;
-        std::wstring name;
-        if (::RegOpenKeyExW(stations.get(), subkey, 0, KEY_READ, key.put()) == ERROR_SUCCESS &&
-            ReadStringValue(key.get(), L"Name", 520, name) == ERROR_SUCCESS) {
-            ++count;
-        }
-    }
-    return count;
 }
 
 Figures Measure(int stationCount) {
@@ -82,7 +57,7 @@ Figures Measure(int stationCount) {
     const int rounds = 5;
     start = Clock::now();
     for (int round = 0; round < rounds; ++round) {
-        if (EnumerateStationNames() != static_cast<size_t>(stationCount)) {
+        if (ListStationNames().size() != static_cast<size_t>(stationCount)) {
             fprintf(stderr, "enumeration lost stations\n");
         }
     }

@@ -9,6 +9,7 @@
 #include <string>
 
 #include "support/unique_resource.h"
+#include "tools/common/console_output.h"
 
 using Microsoft::WRL::ComPtr;
 
@@ -21,16 +22,6 @@ const wchar_t kUsage[] =
     L"Usage:\n"
     L"  lvbrowse           the folder under My Computer, its stations and their files\n"
     L"  lvbrowse STATION   one station and its file\n";
-
-// Console output as UTF-8, so that names outside the console's code page survive a pipe.
-void Print(const std::wstring& text) {
-    const int bytes = ::WideCharToMultiByte(CP_UTF8, 0, text.c_str(), static_cast<int>(text.size()),
-                                            nullptr, 0, nullptr, nullptr);
-    std::string utf8(bytes, '\0');
-    ::WideCharToMultiByte(CP_UTF8, 0, text.c_str(), static_cast<int>(text.size()), utf8.data(),
-                          bytes, nullptr, nullptr);
-    std::fwrite(utf8.data(), 1, utf8.size(), stdout);
-}
 
 std::wstring Hex(DWORD value) {
     wchar_t text[16];
@@ -97,11 +88,11 @@ void PrintItem(IShellFolder* folder, PCUITEMID_CHILD item, const std::wstring& i
     SFGAOF attributes = 0xFFFFFFFF;
     if (FAILED(folder->GetAttributesOf(1, &item, &attributes)))
         attributes = 0;
-    Print(indent + DisplayName(folder, item, SHGDN_INFOLDER) + L"\n");
-    Print(indent + L"    parsing name: " + DisplayName(folder, item, SHGDN_FORPARSING) + L"\n");
-    Print(indent + L"    attributes:   " + DescribeAttributes(attributes) + L"\n");
-    Print(indent + L"    icon index:   " + IconIndex(folder, item) + L"\n");
-    Print(indent + L"    info tip:     " + InfoTip(folder, item) + L"\n");
+    PrintUtf8(indent + DisplayName(folder, item, SHGDN_INFOLDER) + L"\n");
+    PrintUtf8(indent + L"    parsing name: " + DisplayName(folder, item, SHGDN_FORPARSING) + L"\n");
+    PrintUtf8(indent + L"    attributes:   " + DescribeAttributes(attributes) + L"\n");
+    PrintUtf8(indent + L"    icon index:   " + IconIndex(folder, item) + L"\n");
+    PrintUtf8(indent + L"    info tip:     " + InfoTip(folder, item) + L"\n");
 }
 
 // Lists a folder's items; each folder item is entered once more when recursing.
@@ -129,7 +120,7 @@ HRESULT ListFolder(IShellFolder* folder, const std::wstring& indent, bool recurs
         }
     }
     if (count == 0)
-        Print(indent + L"(empty)\n");
+        PrintUtf8(indent + L"(empty)\n");
     return S_OK;
 }
 
@@ -143,8 +134,8 @@ int Browse(const wchar_t* station) {
         desktop->ParseDisplayName(nullptr, nullptr, path.data(), nullptr, &raw, nullptr);
     UniqueCoTaskMem list(raw);
     if (FAILED(result)) {
-        Print(L"The folder is not under My Computer (" + Hex(result) +
-              L"): register LVShellExt.dll with regsvr32 first.\n");
+        PrintUtf8(L"The folder is not under My Computer (" + Hex(result) +
+                  L"): register LVShellExt.dll with regsvr32 first.\n");
         return 1;
     }
     // The folder's entry in My Computer: its name, and the attributes the registry gives it.
@@ -155,16 +146,16 @@ int Browse(const wchar_t* station) {
         SFGAOF attributes = SFGAO_FOLDER | SFGAO_HASSUBFOLDER;
         if (FAILED(myComputer->GetAttributesOf(1, &entry, &attributes)))
             attributes = 0;
-        Print(L"My Computer\\" + DisplayName(myComputer.Get(), entry, SHGDN_INFOLDER) + L"\n");
-        Print(L"    parsing name: " + DisplayName(myComputer.Get(), entry, SHGDN_FORPARSING) +
-              L"\n");
-        Print(L"    attributes:   " + DescribeAttributes(attributes) + L"\n");
+        PrintUtf8(L"My Computer\\" + DisplayName(myComputer.Get(), entry, SHGDN_INFOLDER) + L"\n");
+        PrintUtf8(L"    parsing name: " + DisplayName(myComputer.Get(), entry, SHGDN_FORPARSING) +
+                  L"\n");
+        PrintUtf8(L"    attributes:   " + DescribeAttributes(attributes) + L"\n");
     }
 
     ComPtr<IShellFolder> root;
     result = desktop->BindToObject(raw, nullptr, IID_PPV_ARGS(&root));
     if (FAILED(result)) {
-        Print(L"Cannot open the folder (" + Hex(result) + L").\n");
+        PrintUtf8(L"Cannot open the folder (" + Hex(result) + L").\n");
         return 1;
     }
     if (!station) {
@@ -178,14 +169,14 @@ int Browse(const wchar_t* station) {
     SFGAOF attributes = SFGAO_VALIDATE;
     PCUITEMID_CHILD child = reinterpret_cast<PCUITEMID_CHILD>(stationRaw);
     if (FAILED(result) || FAILED(root->GetAttributesOf(1, &child, &attributes))) {
-        Print(L"No station named \"" + name + L"\".\n");
+        PrintUtf8(L"No station named \"" + name + L"\".\n");
         return 1;
     }
     PrintItem(root.Get(), child, L"    ");
     ComPtr<IShellFolder> folder;
     result = root->BindToObject(stationRaw, nullptr, IID_PPV_ARGS(&folder));
     if (FAILED(result)) {
-        Print(L"Cannot open the station (" + Hex(result) + L").\n");
+        PrintUtf8(L"Cannot open the station (" + Hex(result) + L").\n");
         return 1;
     }
     return SUCCEEDED(ListFolder(folder.Get(), L"        ", false)) ? 0 : 1;
@@ -196,7 +187,7 @@ int Browse(const wchar_t* station) {
 int wmain(int argc, wchar_t** argv) {
     if (argc > 2 ||
         (argc == 2 && (std::wstring(argv[1]) == L"-h" || std::wstring(argv[1]) == L"--help"))) {
-        Print(kUsage);
+        PrintUtf8(kUsage);
         return 2;
     }
     if (FAILED(::CoInitializeEx(nullptr, COINIT_APARTMENTTHREADED)))

@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "support/unique_resource.h"
+#include "tools/common/console_output.h"
 
 using Microsoft::WRL::ComPtr;
 
@@ -25,19 +26,10 @@ const wchar_t kUsage[] =
 const wchar_t kFolderPath[] =
     L"::{20D04FE0-3AEA-1069-A2D8-08002B30309D}\\::{7D3F2A61-4B8E-4c19-9A27-5E0C81B6D4F3}";
 
-void Print(const std::wstring& text) {
-    const int bytes =
-        ::WideCharToMultiByte(CP_UTF8, 0, text.c_str(), -1, nullptr, 0, nullptr, nullptr);
-    std::string utf8(bytes > 0 ? bytes - 1 : 0, '\0');
-    ::WideCharToMultiByte(CP_UTF8, 0, text.c_str(), -1, utf8.data(), bytes, nullptr, nullptr);
-    fputs(utf8.c_str(), stdout);
-    fflush(stdout);
-}
-
 int Fail(const std::wstring& what, HRESULT result) {
     wchar_t code[32];
     swprintf(code, ARRAYSIZE(code), L" (0x%08lX)\n", static_cast<unsigned long>(result));
-    Print(L"lvcopy: " + what + code);
+    PrintUtf8(L"lvcopy: " + what + code);
     return 2;
 }
 
@@ -108,7 +100,7 @@ int Copy(const std::wstring& station, const std::wstring& folder) {
     UniqueStgMedium contents;
     result = data->GetData(&contentsFormat, contents.put());
     if (result == S_FALSE) {
-        Print(L"The download was cancelled; nothing was written.\n");
+        PrintUtf8(L"The download was cancelled; nothing was written.\n");
         return 1;
     }
     if (result != S_OK || contents.get().tymed != TYMED_ISTREAM) {
@@ -143,7 +135,7 @@ int Copy(const std::wstring& station, const std::wstring& folder) {
     wchar_t summary[512];
     swprintf(summary, ARRAYSIZE(summary), L"Copied %ls: %llu bytes in %.1f s\n", target.c_str(),
              total, seconds);
-    Print(summary);
+    PrintUtf8(summary);
     return 0;
 }
 
@@ -151,7 +143,7 @@ int Copy(const std::wstring& station, const std::wstring& folder) {
 
 int wmain(int argc, wchar_t** argv) {
     if (argc < 2 || argc > 3 || argv[1] == std::wstring(L"--help")) {
-        Print(kUsage);
+        PrintUtf8(kUsage);
         return argc == 2 ? 0 : 2;
     }
     std::wstring folder = argc == 3 ? argv[2] : L".";
