@@ -64,21 +64,21 @@ LPITEMIDLIST CQuorvelPidlManagerBase::CopyPidl(LPCITEMIDLIST list) const noexcep
 }
 
 LPITEMIDLIST CQuorvelPidlManagerBase::CopyItem(LPCITEMIDLIST list) const noexcept {
-    if (!list || !allocator_)
+    if (!list)
         return nullptr;
-    const UINT size = list->mkid.cb;
-    auto* copy = static_cast<uint8_t*>(allocator_->Alloc(size + kListTerminatorSize));
-    if (!copy)
-        return nullptr;
-    memcpy(copy, list, size);
-    memset(copy + size, 0, kListTerminatorSize);
-    return reinterpret_cast<LPITEMIDLIST>(copy);
+    return CopyLeadingBytes(list, list->mkid.cb);
 }
 
 LPITEMIDLIST CQuorvelPidlManagerBase::CopyParent(LPCITEMIDLIST list) const noexcept {
-    if (GetItemCount(list) < 2 || !allocator_)
+    if (GetItemCount(list) < 2)
         return nullptr;
-    const UINT size = static_cast<UINT>(Bytes(GetLastItem(list)) - Bytes(list));
+    return CopyLeadingBytes(list, static_cast<UINT>(Bytes(GetLastItem(list)) - Bytes(list)));
+}
+
+LPITEMIDLIST CQuorvelPidlManagerBase::CopyLeadingBytes(LPCITEMIDLIST list,
+                                                       UINT size) const noexcept {
+    if (!allocator_)
+        return nullptr;
     auto* copy = static_cast<uint8_t*>(allocator_->Alloc(size + kListTerminatorSize));
     if (!copy)
         return nullptr;

@@ -29,6 +29,9 @@ public:
     void FreePidl(LPITEMIDLIST list) const noexcept;
 
 protected:
+    // The first size bytes of a list (whole items) as a new list with its terminator.
+    LPITEMIDLIST CopyLeadingBytes(LPCITEMIDLIST list, UINT size) const noexcept;
+
     Microsoft::WRL::ComPtr<IMalloc> allocator_;
 };
 

@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <cstring>
 #include <cwchar>
+#include <string_view>
 
 #include "stations/portable/station_list_format.h"
 #include "namespace/portable/item_id_layout.h"
@@ -41,6 +42,28 @@ LONG ReadNumber(HKEY key, const wchar_t* name, uint32_t& field) {
     return status;
 }
 
+// Hands each station key that has a readable "Name", in the registry's order, to visit until it
+// answers true; true when it did. The end of the list and any enumeration failure end the walk.
+template <typename Visit>
+bool VisitStationKeys(HKEY stations, REGSAM access, Visit&& visit) {
+    for (DWORD index = 0;; ++index) {
+        wchar_t subkeyName[kKeyNameCapacity];
+        DWORD length = kKeyNameCapacity;
+        if (::RegEnumKeyExW(stations, index, subkeyName, &length, nullptr, nullptr, nullptr,
+                            nullptr) != ERROR_SUCCESS) {
+            return false;
+        }
+        UniqueRegKey subkey;
+        std::wstring name;
+        if (::RegOpenKeyExW(stations, subkeyName, 0, access, subkey.put()) != ERROR_SUCCESS ||
+            ReadText(subkey.get(), L"Name", name) != ERROR_SUCCESS) {
+            continue;
+        }
+        if (visit(std::wstring_view(subkeyName, length), subkey.get(), name))
+            return true;
+    }
+}
+
 bool IsStationNameTaken(const std::wstring& name) {
     Station probe;
     probe.Name = name;
@@ -67,33 +90,22 @@ HRESULT FindStation(Station& station, wchar_t* keyName, DWORD* keyNameCapacity) 
     UniqueRegKey stations = OpenStationsKey();
     if (!stations)
         return E_FAIL;
-
-    for (DWORD index = 0;; ++index) {
-        wchar_t subkeyName[kKeyNameCapacity];
-        DWORD length = kKeyNameCapacity;
-        if (::RegEnumKeyExW(stations.get(), index, subkeyName, &length, nullptr, nullptr, nullptr,
-                            nullptr) != ERROR_SUCCESS) {
-            return E_FAIL;  // the end of the list included: not found
-        }
-        UniqueRegKey subkey;
-        if (::RegOpenKeyExW(stations.get(), subkeyName, 0, KEY_ALL_ACCESS, subkey.put()) !=
-            ERROR_SUCCESS) {
-            continue;
-        }
-        std::wstring name;
-        if (ReadText(subkey.get(), L"Name", name) != ERROR_SUCCESS || name != station.Name) {
-            continue;
-        }
-        // The load's own status is not passed on: a half-written station is still found.
-        (void)LoadStationValues(station, subkey.get());
-        if (keyName && keyNameCapacity && *keyNameCapacity > 0) {
-            const size_t copied = std::min<size_t>(length, *keyNameCapacity - 1);
-            wmemcpy(keyName, subkeyName, copied);
-            keyName[copied] = L'\0';
-            *keyNameCapacity = static_cast<DWORD>(copied + 1);
-        }
-        return S_OK;
-    }
+    const bool found = VisitStationKeys(
+        stations.get(), KEY_ALL_ACCESS,
+        [&](std::wstring_view subkeyName, HKEY subkey, const std::wstring& name) {
+            if (name != station.Name)
+                return false;
+            // The load's own status is not passed on: a half-written station is still found.
+            (void)LoadStationValues(station, subkey);
+            if (keyName && keyNameCapacity && *keyNameCapacity > 0) {
+                const size_t copied = std::min<size_t>(subkeyName.size(), *keyNameCapacity - 1);
+                wmemcpy(keyName, subkeyName.data(), copied);
+                keyName[copied] = L'\0';
+                *keyNameCapacity = static_cast<DWORD>(copied + 1);
+            }
+            return true;
+        });
+    return found ? S_OK : E_FAIL;
 }
 
 HRESULT AddStation(const Station& station) {
@@ -244,21 +256,11 @@ std::vector<std::wstring> ListStationNames() {
                         stations.put()) != ERROR_SUCCESS) {
         return names;
     }
-    for (DWORD index = 0;; ++index) {
-        wchar_t subkeyName[kKeyNameCapacity];
-        DWORD length = kKeyNameCapacity;
-        if (::RegEnumKeyExW(stations.get(), index, subkeyName, &length, nullptr, nullptr, nullptr,
-                            nullptr) != ERROR_SUCCESS) {
-            break;
-        }
-        UniqueRegKey subkey;
-        std::wstring name;
-        if (::RegOpenKeyExW(stations.get(), subkeyName, 0, KEY_READ, subkey.put()) ==
-                ERROR_SUCCESS &&
-            ReadText(subkey.get(), L"Name", name) == ERROR_SUCCESS) {
-            names.push_back(std::move(name));
-        }
-    }
+    VisitStationKeys(stations.get(), KEY_READ,
+                     [&](std::wstring_view, HKEY, const std::wstring& name) {
+                         names.push_back(name);
+                         return false;
+                     });
     return names;
 }
 
