@@ -117,6 +117,9 @@ TEST_F(DownloadThread, ConnectionRecordAlwaysUsesSevenDataBitsOneStopBitSelector
     EXPECT_EQ(record.Protocol, 1u);
     EXPECT_EQ(std::wstring(record.PortName), L"\\\\.\\COM1234567");  // 14 characters
     EXPECT_EQ(record.OutputPath, L"C:\\out.lv");
+    EXPECT_FALSE(thread.IsCancelled());
+    thread.Stop();
+    EXPECT_TRUE(thread.IsCancelled()) << "cancel is the stop request";
     window.Pump();
 }
 
@@ -207,13 +210,4 @@ TEST_F(DownloadThread, EveryPostedTextIsFreedOverTenThousandMessages) {
     EXPECT_EQ(window.received.size(), 10000u);
     EXPECT_EQ(CLVDownloadThread::LiveMessageTexts(), live);
     EXPECT_EQ(live, 0);
-}
-
-TEST_F(DownloadThread, CancelIsTheStopRequest) {
-    NotifyWindow window;
-    CLVDownloadThread thread(window.get(), MissingPortStation(), L"C:\\out.lv");
-    EXPECT_FALSE(thread.IsCancelled());
-    thread.Stop();
-    EXPECT_TRUE(thread.IsCancelled());
-    window.Pump();
 }

