@@ -67,52 +67,35 @@ TEST(StationListFormat, RoundTripKeepsEveryFieldAndTheOrder) {
     const std::vector<Station> stations = {SampleStation(WIDE_TEXT("North")), Station{},
                                            SampleStation(WIDE_TEXT("Süd \u00e9"))};
     EXPECT_EQ(stations, Parse(SerializeStationRecords(stations)));
-}
-
-TEST(StationListFormat, EmptyListIsFourZeroBytes) {
     EXPECT_EQ(std::vector<uint8_t>(4, 0), SerializeStationRecords({}));
-    EXPECT_TRUE(Parse(std::vector<uint8_t>(4, 0)).empty());
 }
 
-TEST(StationListFormat, ZeroOrNegativeCountParsesToNothing) {
-    std::vector<uint8_t> block = SerializeStationRecords({SampleStation(WIDE_TEXT("X"))});
-    WriteU32(block.data(), 0xFFFFFFFF);  // -1
-    EXPECT_TRUE(Parse(block).empty());
-    WriteU32(block.data(), 0x80000000);
-    EXPECT_TRUE(Parse(block).empty());
-    WriteU32(block.data(), 0);
-    EXPECT_TRUE(Parse(block).empty());
-}
-
-TEST(StationListFormat, LyingCountStopsAtTheBlockEnd) {
-    std::vector<uint8_t> block =
+TEST(StationListFormat, LyingCountsAndSizesStopWithTheCompleteRecordsBefore) {
+    const std::vector<uint8_t> two =
         SerializeStationRecords({SampleStation(WIDE_TEXT("A")), SampleStation(WIDE_TEXT("B"))});
-    WriteU32(block.data(), 1000000);
-    const std::vector<Station> parsed = Parse(block);
-    ASSERT_EQ(2u, parsed.size());
-    EXPECT_EQ(WIDE_TEXT("B"), parsed[1].Name);
-}
-
-TEST(StationListFormat, LyingRecordSizeStopsWithTheRecordsBefore) {
-    std::vector<uint8_t> block =
-        SerializeStationRecords({SampleStation(WIDE_TEXT("A")), SampleStation(WIDE_TEXT("B"))});
-    const size_t secondSizeOffset = 4 + 4 + FlatStationRecordSize(SampleStation(WIDE_TEXT("A")));
-    WriteU32(block.data() + secondSizeOffset, 0x7FFFFFF0);
-    const std::vector<Station> parsed = Parse(block);
-    ASSERT_EQ(1u, parsed.size());
-    EXPECT_EQ(WIDE_TEXT("A"), parsed[0].Name);
-}
-
-TEST(StationListFormat, RecordSizeTooSmallForItsFieldsEndsTheParse) {
-    std::vector<uint8_t> block = SerializeStationRecords({SampleStation(WIDE_TEXT("A"))});
-    WriteU32(block.data() + 4, 10);  // the strings' terminators now lie outside the record
-    EXPECT_TRUE(Parse(block).empty());
-}
-
-TEST(StationListFormat, StringWithoutTerminatorEndsTheParse) {
+    const size_t secondSize = 4 + 4 + FlatStationRecordSize(SampleStation(WIDE_TEXT("A")));
+    const struct {
+        size_t offset;
+        uint32_t value;
+        size_t parsed;
+    } cases[] = {
+        {0, 0xFFFFFFFF, 0},           // count -1
+        {0, 0x80000000, 0},           // most negative count
+        {0, 0, 0},                    // no records
+        {0, 1000000, 2},              // more records than the block holds
+        {secondSize, 0x7FFFFFF0, 1},  // a record size past the block
+        {4, 10, 0},                   // a size too small for the strings' terminators
+    };
+    for (const auto& test : cases) {
+        std::vector<uint8_t> block = two;
+        WriteU32(block.data() + test.offset, test.value);
+        const std::vector<Station> parsed = Parse(block);
+        ASSERT_EQ(test.parsed, parsed.size()) << test.offset << " " << test.value;
+        for (size_t i = 0; i < parsed.size(); ++i)
+            EXPECT_EQ(i ? WIDE_TEXT("B") : WIDE_TEXT("A"), parsed[i].Name);
+    }
     // One record whose name fills the whole block with no terminator.
-    std::vector<uint8_t> block = {1, 0, 0, 0, 8, 0, 0, 0, 'N', 0, 'N', 0, 'N', 0, 'N', 0};
-    EXPECT_TRUE(Parse(block).empty());
+    EXPECT_TRUE(Parse({1, 0, 0, 0, 8, 0, 0, 0, 'N', 0, 'N', 0, 'N', 0, 'N', 0}).empty());
 }
 
 TEST(StationListFormat, EveryTruncationYieldsOnlyCompleteRecords) {

@@ -26,13 +26,10 @@ TEST(StationNames, UniqueNameSkipsOneAndCountsOnFromTwo) {
 
 TEST(StationNames, UniqueNameCountsPastTen) {
     std::set<WideString> taken = {WIDE_TEXT("S")};
-    for (int n = 2; n <= 11; ++n) {
-        WideString name = WIDE_TEXT("S (");
-        if (n >= 10)
-            name += static_cast<WideChar>(WIDE_TEXT('0') + n / 10);
-        name += static_cast<WideChar>(WIDE_TEXT('0') + n % 10);
-        taken.insert(name + WIDE_TEXT(")"));
-    }
+    for (const WideChar* number :
+         {WIDE_TEXT("2"), WIDE_TEXT("3"), WIDE_TEXT("4"), WIDE_TEXT("5"), WIDE_TEXT("6"),
+          WIDE_TEXT("7"), WIDE_TEXT("8"), WIDE_TEXT("9"), WIDE_TEXT("10"), WIDE_TEXT("11")})
+        taken.insert(WIDE_TEXT("S (") + WideString(number) + WIDE_TEXT(")"));
     EXPECT_EQ(WIDE_TEXT("S (12)"), MakeUniqueName(WIDE_TEXT("S"), TakenAmong(taken)));
 }
 
