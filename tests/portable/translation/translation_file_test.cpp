@@ -40,12 +40,14 @@ TEST(TranslationFile, PairsFollowingBracketedLinesAcrossLineEndings) {
     EXPECT_EQ(map.at(WIDE_TEXT("Status:")), WIDE_TEXT("Status:"));
 }
 
-TEST(TranslationFile, TextRunsToTheLastBracketAndTrailingTextIsIgnored) {
+TEST(TranslationFile, TextRunsToTheLastBracketKeepsTheNoteAndTrailingTextIsIgnored) {
     const TranslationMap map =
         Parse(Utf16File(WIDE_TEXT("[Push [SET] key]   ; the key's name stays\r\n"
-                                  "[[SET]-Taste drücken] ; translated\r\n")));
-    ASSERT_EQ(map.size(), 1u);
+                                  "[[SET]-Taste drücken] ; translated\r\n"
+                                  "[Start@@button, at most 10 letters]\r\n[Starten]\r\n")));
+    ASSERT_EQ(map.size(), 2u);
     EXPECT_EQ(map.at(WIDE_TEXT("Push [SET] key")), WIDE_TEXT("[SET]-Taste drücken"));
+    EXPECT_EQ(map.at(WIDE_TEXT("Start@@button, at most 10 letters")), WIDE_TEXT("Starten"));
 }
 
 TEST(TranslationFile, CommentsBetweenPairAreSkippedButBlankLineDropsLoneEnglish) {
@@ -73,22 +75,13 @@ TEST(TranslationFile, FirstPairOfAnEnglishTextWinsAndEmptyTranslationIsKept) {
     EXPECT_EQ(map.count(WIDE_TEXT("")), 0u);
 }
 
-TEST(TranslationFile, EscapesAreDecodedInBothTexts) {
+TEST(TranslationFile, EscapesAreDecodedInBothTextsOneKindAfterTheOther) {
     const TranslationMap map =
         Parse(Utf16File(WIDE_TEXT("[a\\nb\\tc\\rd\\\\e]\r\n[A\\nB\\\\C]\r\n")));
     EXPECT_EQ(map.at(WIDE_TEXT("a\nb\tc\rd\\e")), WIDE_TEXT("A\nB\\C"));
-}
-
-TEST(TranslationFile, EscapesAreReplacedOneKindAfterTheOther) {
     EXPECT_EQ(DecodeTranslationEscapes(WIDE_TEXT("C:\\\\new")), WIDE_TEXT("C:\\\new"));
     EXPECT_EQ(DecodeTranslationEscapes(WIDE_TEXT("50\\\\%")), WIDE_TEXT("50\\%"));
     EXPECT_EQ(DecodeTranslationEscapes(WIDE_TEXT("\\x\\")), WIDE_TEXT("\\x\\"));
-}
-
-TEST(TranslationFile, KeepsTheTranslatorsNoteInTheKey) {
-    const TranslationMap map =
-        Parse(Utf16File(WIDE_TEXT("[Start@@button, at most 10 letters]\r\n[Starten]\r\n")));
-    EXPECT_EQ(map.at(WIDE_TEXT("Start@@button, at most 10 letters")), WIDE_TEXT("Starten"));
 }
 
 TEST(TranslationFile, ReadsUtf8AndUnmarkedUtf16) {
