@@ -147,19 +147,6 @@ TEST_F(ShellNamespace, TheDesktopParsesAStationAndBindsIntoItsOneFile) {
     EXPECT_EQ(L"file1.lv", files[0].name);
     EXPECT_EQ(static_cast<SFGAOF>(SFGAO_CANCOPY), files[0].attributes);
     EXPECT_TRUE(List(folder.Get(), SHCONTF_FOLDERS).empty());
-
-    // The model of station 2 names its file differently; reached by BindToObject from the root.
-    ComPtr<IShellFolder> root = BindPath(kFolderPath);
-    ASSERT_TRUE(root);
-    ItemList station2;
-    std::wstring name = L"Station 2";
-    ASSERT_EQ(S_OK, root->ParseDisplayName(nullptr, nullptr, name.data(), nullptr, &station2.list,
-                                           nullptr));
-    ComPtr<IShellFolder> folder2;
-    ASSERT_EQ(S_OK, root->BindToObject(station2.list, nullptr, IID_PPV_ARGS(&folder2)));
-    files = List(folder2.Get(), SHCONTF_NONFOLDERS);
-    ASSERT_EQ(1u, files.size());
-    EXPECT_EQ(L"file1.hvr", files[0].name);
 }
 
 TEST_F(ShellNamespace, ADeletedStationFailsOnlyWhenValidated) {

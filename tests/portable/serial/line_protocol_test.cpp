@@ -230,7 +230,13 @@ TEST_F(LineProtocolTest, FullLineWithoutLineEndIsNeverAcceptedAndTimesOut) {
               WIDE_TEXT("The waiting time of the data has expired."));
 }
 
-TEST_F(LineProtocolTest, SilenceEndsAfterMoreThanSixtySeconds) {
+TEST_F(LineProtocolTest, ClosedPortFailsAtOnceAndSilenceEndsAfterMoreThanSixtySeconds) {
+    protocol.SetPortOpen(false);
+    EXPECT_EQ(protocol.ReceiveLines(), 1u);
+    EXPECT_EQ(rig.file.creates, 0);
+    EXPECT_EQ(rig.port.readCalls, 0);
+
+    protocol.SetPortOpen(true);
     const int64_t start = rig.clock.WallSeconds();
     EXPECT_EQ(protocol.ReceiveLines(), 1u);
     EXPECT_EQ(rig.clock.WallSeconds() - start, 61);
@@ -268,13 +274,6 @@ TEST_F(LineProtocolTest, StopRequestEndsWithoutAMessage) {
     EXPECT_EQ(protocol.ReceiveLines(), 1u);
     EXPECT_TRUE(rig.callback.messages.empty());
     EXPECT_EQ(rig.port.closes, 0);
-}
-
-TEST_F(LineProtocolTest, PortNotOpenFailsAtOnce) {
-    protocol.SetPortOpen(false);
-    EXPECT_EQ(protocol.ReceiveLines(), 1u);
-    EXPECT_EQ(rig.file.creates, 0);
-    EXPECT_EQ(rig.port.readCalls, 0);
 }
 
 TEST_F(LineProtocolTest, BytesAfterALineAreDroppedByThePurge) {
