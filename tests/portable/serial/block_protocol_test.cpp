@@ -60,9 +60,8 @@ TEST_F(BlockProtocolTest, RawStreamWithoutEotTimesOut) {
     rig.port.Deliver(ToBytes("no end"));
     EXPECT_EQ(protocol->Receive(), 1u);
     EXPECT_EQ(rig.file.Text(), "no end");
-    ASSERT_EQ(rig.callback.messages.size(), 1u);
-    EXPECT_EQ(rig.callback.messages[0].text,
-              WIDE_TEXT("The waiting time of the data has expired."));
+    EXPECT_EQ(rig.callback.messages,
+              OnlyMessage(4, WIDE_TEXT("The waiting time of the data has expired.")));
     EXPECT_FALSE(rig.file.open);
 }
 
@@ -161,10 +160,8 @@ TEST_F(BlockProtocolTest, FiveNaksInARowEndTheBlockProtocol) {
     instrument.Attach(rig.port);
     EXPECT_EQ(protocol->Receive(), 1u);
     EXPECT_EQ(std::count(rig.port.writes.begin(), rig.port.writes.end(), kNakLine), 4);
-    ASSERT_EQ(rig.callback.messages.size(), 1u);
-    EXPECT_EQ(rig.callback.messages[0].code, 4u);
-    EXPECT_EQ(rig.callback.messages[0].text,
-              WIDE_TEXT("AZ doesn't respond or error in importing block"));
+    EXPECT_EQ(rig.callback.messages,
+              OnlyMessage(4, WIDE_TEXT("AZ doesn't respond or error in importing block")));
     EXPECT_EQ(rig.file.content.size(), 2 * 128u);
 }
 
@@ -191,9 +188,8 @@ TEST_F(BlockProtocolTest, CancelAfterANakClosesThePort) {
     int asked = 0;
     rig.callback.cancelWhen = [&] { return ++asked > 1; };
     EXPECT_EQ(protocol->Receive(), 1u);
-    ASSERT_EQ(rig.callback.messages.size(), 1u);
-    EXPECT_EQ(rig.callback.messages[0].text,
-              WIDE_TEXT("The communication's process is interrupted by the user"));
+    EXPECT_EQ(rig.callback.messages,
+              OnlyMessage(4, WIDE_TEXT("The communication's process is interrupted by the user")));
     EXPECT_EQ(rig.port.closes, 1);
     EXPECT_FALSE(protocol->IsPortOpen());
 }
@@ -260,10 +256,8 @@ TEST_F(BlockProtocolTest, YModemReceivesTheAnnouncedSizeAndReportsTheHeader) {
     EXPECT_EQ(protocol->FileSize(), 300u);
     EXPECT_EQ(protocol->YModemFileName(), "survey.lv");
     EXPECT_EQ(protocol->ExpectedBlockCount(), 3u);
-    ASSERT_EQ(rig.callback.messages.size(), 1u);
-    EXPECT_EQ(rig.callback.messages[0].code, 1u);
-    EXPECT_EQ(rig.callback.messages[0].text,
-              WIDE_TEXT("Y-Modem File Info: survey.lv (size=300 byte)"));
+    EXPECT_EQ(rig.callback.messages,
+              OnlyMessage(1, WIDE_TEXT("Y-Modem File Info: survey.lv (size=300 byte)")));
     EXPECT_EQ(rig.port.writes.back(), (Bytes{0x18, 0x18}));
     EXPECT_EQ(rig.callback.progress.back(), std::make_pair(300u, 299u));
 }

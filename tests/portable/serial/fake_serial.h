@@ -119,7 +119,13 @@ public:
 struct RecordedMessage {
     uint32_t code;
     WideString text;
+    bool operator==(const RecordedMessage&) const = default;
 };
+
+// What a run that shows exactly one message must have recorded.
+inline std::vector<RecordedMessage> OnlyMessage(uint32_t code, const WideString& text) {
+    return {{code, text}};
+}
 
 class RecordingCallback final : public TParserCallBack {
 public:

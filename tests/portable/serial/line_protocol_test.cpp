@@ -159,10 +159,8 @@ TEST_F(LineProtocolTest, RefusedLinesDoNotPostponeTheTimeOut) {
     EXPECT_EQ(protocol.ReceiveLines(), 1u);
     EXPECT_GT(rig.clock.WallSeconds() - start, 60);
     EXPECT_LT(rig.clock.WallSeconds() - start, 70);
-    ASSERT_EQ(rig.callback.messages.size(), 1u);
-    EXPECT_EQ(rig.callback.messages[0].code, 4u);
-    EXPECT_EQ(rig.callback.messages[0].text,
-              WIDE_TEXT("The waiting time of the data has expired."));
+    EXPECT_EQ(rig.callback.messages,
+              OnlyMessage(4, WIDE_TEXT("The waiting time of the data has expired.")));
     EXPECT_EQ(rig.file.Text(), instrument.lines[0] + instrument.lines[1]);
 }
 
@@ -225,9 +223,8 @@ TEST_F(LineProtocolTest, FullLineWithoutLineEndIsNeverAcceptedAndTimesOut) {
 
     EXPECT_EQ(protocol.ReceiveLines(), 1u);
     EXPECT_EQ(rig.file.Text(), "A,01,Z\r\n");
-    ASSERT_EQ(rig.callback.messages.size(), 1u);
-    EXPECT_EQ(rig.callback.messages[0].text,
-              WIDE_TEXT("The waiting time of the data has expired."));
+    EXPECT_EQ(rig.callback.messages,
+              OnlyMessage(4, WIDE_TEXT("The waiting time of the data has expired.")));
 }
 
 TEST_F(LineProtocolTest, ClosedPortFailsAtOnceAndSilenceEndsAfterMoreThanSixtySeconds) {
@@ -251,10 +248,8 @@ TEST_F(LineProtocolTest, CancelReportsClosesThePortAndLeavesTheDriverUnusable) {
     rig.callback.cancelWhen = [&] { return rig.file.content.size() > 20; };
 
     EXPECT_EQ(protocol.ReceiveLines(), 1u);
-    ASSERT_EQ(rig.callback.messages.size(), 1u);
-    EXPECT_EQ(rig.callback.messages[0].code, 4u);
-    EXPECT_EQ(rig.callback.messages[0].text,
-              WIDE_TEXT("The communication's process is interrupted by the user"));
+    EXPECT_EQ(rig.callback.messages,
+              OnlyMessage(4, WIDE_TEXT("The communication's process is interrupted by the user")));
     EXPECT_EQ(rig.port.breaks, 1);
     EXPECT_EQ(rig.port.closes, 1);
     EXPECT_FALSE(protocol.IsPortOpen());
