@@ -2,18 +2,13 @@
 #include "download/download_progress_dialog.h"
 
 #include "res/resource.h"
-#include "stations/station_store.h"
 #include "support/registered_messages.h"
 #include "support/text_lookup.h"
 #include "support/user_interface.h"
 
 CDownloadProgressDialog::CDownloadProgressDialog(HWND parent, const Station& station,
                                                  const std::wstring& outputPath)
-    : CModalDialog(IDD_DOWNLOAD_PROGRESS, parent), station_(station), outputPath_(outputPath) {
-    BindText(IDC_INSTRUCTIONS, instructions_);
-    BindText(IDC_STATUS_TEXT, status_);
-    BindText(IDC_STATION_NAME, name_);
-}
+    : CProgressDialogBase(parent, station, outputPath) {}
 
 CDownloadProgressDialog::~CDownloadProgressDialog() {
     if (thread_) {
@@ -24,20 +19,9 @@ CDownloadProgressDialog::~CDownloadProgressDialog() {
 }
 
 BOOL CDownloadProgressDialog::OnInitDialog() {
-    instructions_ = ModelInstructionText(station_.Model);
-    ::SendDlgItemMessageW(Window(), IDC_INSTRUCTIONS, WM_SETFONT,
-                          reinterpret_cast<WPARAM>(::GetStockObject(DEFAULT_GUI_FONT)), TRUE);
-    SetControlText(IDC_STATUS_LABEL, LoadUiText(IDS_STATUS_LABEL));
-    SetControlText(IDC_FILE_NAME_LABEL, LoadUiText(IDS_FILE_NAME_LABEL));
-    SetControlText(IDCANCEL, LoadUiText(IDS_CANCEL));
-    name_ = station_.Name;
-    status_ = LoadUiText(IDS_WAITING_FOR_START);
-    ::SetWindowTextW(Window(), LoadUiText(IDS_DOWNLOAD_TITLE).c_str());
-    UpdateControls();
-    // The focus goes to Start, the one thing to press: on the instructions, the system would
-    // select their whole text.
-    ::SetFocus(::GetDlgItem(Window(), IDC_START));
-    return FALSE;
+    // The Start button keeps its template text.
+    ShowInitialTexts(IDS_DOWNLOAD_TITLE);
+    return FALSE;  // the focus was set
 }
 
 bool CDownloadProgressDialog::OnCommand(WORD controlId, WORD notification) {
@@ -56,7 +40,7 @@ bool CDownloadProgressDialog::OnMessage(UINT message, WPARAM wParam, LPARAM lPar
         return true;
     }
     if (message == g_registeredMessages.downloadThreadFinished) {
-        OnThreadFinished();
+        FinishTransfer();
         result = 0;
         return true;
     }
@@ -75,7 +59,7 @@ void CDownloadProgressDialog::OnDestroy() {
 void CDownloadProgressDialog::OnStart() {
     // The thread opens the port now; a port that cannot be opened is reported by message and
     // the thread then closes this dialog.
-    thread_ = std::make_unique<CLVDownloadThread>(Window(), station_, outputPath_);
+    thread_ = std::make_unique<CLVDownloadThread>(Window(), station(), OutputPath());
     thread_->Start();
     EnableControl(IDC_START, false);
     SetStatus(IDS_WAITING_FOR_DOWNLOAD);
@@ -97,14 +81,4 @@ void CDownloadProgressDialog::OnThreadMessage(WPARAM code, LPARAM text) {
     // The progress text only switches the status line; its percent is not shown.
     CLVDownloadThread::FreeMessageText(text);
     SetStatus(IDS_DOWNLOADING);
-}
-
-void CDownloadProgressDialog::OnThreadFinished() {
-    ::PostMessageW(Window(), WM_COMMAND, IDOK, 0);
-    SetStatus(IDS_FINISHING_DOWNLOAD);
-}
-
-void CDownloadProgressDialog::SetStatus(UINT textId) {
-    status_ = LoadUiText(textId);
-    UpdateControls();
 }

@@ -7,12 +7,12 @@
 #include <string>
 
 #include "download/download_thread.h"
-#include "stations/portable/station.h"
-#include "support/modal_dialog.h"
+#include "download/progress_dialog_base.h"
 
-class CDownloadProgressDialog : public CModalDialog {
+class CDownloadProgressDialog : public CProgressDialogBase {
 public:
-    // parent may be null. DoModal gives IDOK when outputPath holds the complete file.
+    // parent may be null. DoModal gives IDOK, with TransferCompleted, when outputPath holds the
+    // complete file.
     CDownloadProgressDialog(HWND parent, const Station& station, const std::wstring& outputPath);
     // Stops the download thread and waits for it without limit, then deletes it.
     ~CDownloadProgressDialog() override;
@@ -26,13 +26,6 @@ protected:
 private:
     void OnStart();
     void OnThreadMessage(WPARAM code, LPARAM text);
-    void OnThreadFinished();
-    void SetStatus(UINT textId);
 
-    Station station_;
-    std::wstring instructions_;  // control 214
-    std::wstring status_;        // control 215
-    std::wstring name_;          // control 217
-    std::wstring outputPath_;
     std::unique_ptr<CLVDownloadThread> thread_;
 };

@@ -85,11 +85,15 @@ DWORD CLVDownloadThread::Run() {
         ShowMessageBox(notifyWindow_, LoadUiText(IDS_SERIAL_WAIT_EXPIRED),
                        LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONEXCLAMATION);
     }
-    if (result == 0)
+    received_ = result == 0;
+    return 0;
+}
+
+void CLVDownloadThread::OnEnd() {
+    if (received_)
         PostToWindow(g_registeredMessages.downloadThreadFinished, 0, 0);
     else
         PostToWindow(WM_CLOSE, 0, 0);
-    return 0;
 }
 
 void CLVDownloadThread::ShowMessage(uint32_t code, const WideChar* text) {

@@ -21,9 +21,11 @@ public:
     // Waits for a started worker to be gone, then deletes the driver (which closes the port).
     ~CLVDownloadThread() override;
 
-    // Receives the file with the line protocol; ends with "Download Thread Finished" or WM_CLOSE
-    // to the window. Always 0.
+    // Receives the file with the line protocol. Always 0.
     DWORD Run() override;
+    // Tells the window how the receive ended: "Download Thread Finished" for a complete file,
+    // WM_CLOSE for anything else (a Run that threw included).
+    void OnEnd() override;
 
     // TParserCallBack, called on the worker.
     void ShowMessage(uint32_t code, const WideChar* text) override;
@@ -48,4 +50,5 @@ private:
     std::unique_ptr<TAZCommParams> params_;
     HWND notifyWindow_;
     Station station_;
+    bool received_ = false;  // written and read on the worker only
 };

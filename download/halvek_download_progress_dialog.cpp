@@ -2,7 +2,6 @@
 #include "download/halvek_download_progress_dialog.h"
 
 #include "res/resource.h"
-#include "stations/station_store.h"
 #include "support/registered_messages.h"
 #include "support/text_lookup.h"
 #include "support/user_interface.h"
@@ -17,11 +16,7 @@ constexpr int32_t kTimeout = 30;
 
 CHalvekDownloadProgressDialog::CHalvekDownloadProgressDialog(HWND parent, const Station& station,
                                                              const std::wstring& outputPath)
-    : CModalDialog(IDD_DOWNLOAD_PROGRESS, parent), station_(station), outputPath_(outputPath) {
-    BindText(IDC_INSTRUCTIONS, instructions_);
-    BindText(IDC_STATUS_TEXT, status_);
-    BindText(IDC_STATION_NAME, name_);
-}
+    : CProgressDialogBase(parent, station, outputPath) {}
 
 CHalvekDownloadProgressDialog::~CHalvekDownloadProgressDialog() {
     library_.reset();  // before the buffer the library may still point to
@@ -37,23 +32,10 @@ void CHalvekDownloadProgressDialog::CompletionCallback(int32_t result) {
 }
 
 BOOL CHalvekDownloadProgressDialog::OnInitDialog() {
-    CModalDialog::OnInitDialog();
-    ::SendDlgItemMessageW(Window(), IDC_INSTRUCTIONS, WM_SETFONT,
-                          reinterpret_cast<WPARAM>(::GetStockObject(DEFAULT_GUI_FONT)), TRUE);
     g_halvekDialogWindow = Window();
-    instructions_ = ModelInstructionText(station_.Model);
-    name_ = station_.Name;
-    status_ = LoadUiText(IDS_WAITING_FOR_START);
-    UpdateControls();
-    SetControlText(IDC_STATUS_LABEL, LoadUiText(IDS_STATUS_LABEL));
-    SetControlText(IDC_FILE_NAME_LABEL, LoadUiText(IDS_FILE_NAME_LABEL));
+    ShowInitialTexts(IDS_HALVEK_DOWNLOAD_TITLE);
     SetControlText(IDC_START, LoadUiText(IDS_START));
-    SetControlText(IDCANCEL, LoadUiText(IDS_CANCEL));
-    ::SetWindowTextW(Window(), LoadUiText(IDS_HALVEK_DOWNLOAD_TITLE).c_str());
-    // The focus goes to Start, the one thing to press: on the instructions, the system would
-    // select their whole text.
-    ::SetFocus(::GetDlgItem(Window(), IDC_START));
-    return FALSE;
+    return FALSE;  // the focus was set
 }
 
 void CHalvekDownloadProgressDialog::OnCancel() {
@@ -93,7 +75,7 @@ void CHalvekDownloadProgressDialog::OnStart() {
         FailWith(errorText);
         return;
     }
-    if (library_->SetFilePath(HalvekFilePath(outputPath_).c_str()) != 0) {
+    if (library_->SetFilePath(HalvekFilePath(OutputPath()).c_str()) != 0) {
         FailWith(LoadUiText(IDS_UNABLE_TO_SET_FILE_PATH));
         return;
     }
@@ -111,10 +93,10 @@ void CHalvekDownloadProgressDialog::OnStart() {
         return;
     }
     if (library_->SetCommParams(
-            HalvekPortNumber(station_.Port), static_cast<int32_t>(station_.BaudRate),
-            static_cast<int32_t>(station_.Parity), static_cast<int32_t>(station_.StopBits),
-            static_cast<int32_t>(station_.Flow), static_cast<int32_t>(station_.DataBits),
-            static_cast<int32_t>(station_.CheckSum)) != 0) {
+            HalvekPortNumber(station().Port), static_cast<int32_t>(station().BaudRate),
+            static_cast<int32_t>(station().Parity), static_cast<int32_t>(station().StopBits),
+            static_cast<int32_t>(station().Flow), static_cast<int32_t>(station().DataBits),
+            static_cast<int32_t>(station().CheckSum)) != 0) {
         FailWith(LoadUiText(IDS_UNABLE_TO_SET_COMM_PARAMS));
         return;
     }
@@ -133,16 +115,10 @@ void CHalvekDownloadProgressDialog::OnLibraryResult(int32_t code) {
         FailWith(HalvekResultText(code));
         return;
     }
-    ::PostMessageW(Window(), WM_COMMAND, IDOK, 0);
-    SetStatus(IDS_FINISHING_DOWNLOAD);
+    FinishTransfer();
 }
 
 void CHalvekDownloadProgressDialog::FailWith(const std::wstring& text) {
     ShowMessageBox(Window(), text, LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONEXCLAMATION);
     EndDialog(IDCANCEL);
-}
-
-void CHalvekDownloadProgressDialog::SetStatus(UINT textId) {
-    status_ = LoadUiText(textId);
-    UpdateControls();
 }

@@ -91,9 +91,20 @@ DWORD WINAPI CThread::ThreadProcedure(void* parameter) {
     auto* thread = static_cast<CThread*>(parameter);
     // Texts loaded on the worker come in the language of the window that started it.
     (void)SelectThreadUiLanguage(thread->language_);  // a failure leaves the system's language
-    thread->OnStart();
-    const DWORD result = thread->Run();
+    // An exception leaving a thread procedure ends the whole process, the shell with it: the
+    // work fails instead, and OnEnd still runs so that whoever waits for the worker hears of it.
+    DWORD result = kThreadFailed;
+    try {
+        thread->OnStart();
+        result = thread->Run();
+    } catch (...) {
+        result = kThreadFailed;
+    }
     thread->state_ = kFinished;
-    thread->OnEnd();
+    try {
+        thread->OnEnd();
+    } catch (...) {
+        result = kThreadFailed;
+    }
     return result;
 }

@@ -11,6 +11,8 @@
 class CThread {
 public:
     enum State : uint32_t { kCreated = 0, kRunning = 1, kSuspended = 2, kFinished = 3 };
+    // The exit code of a worker whose OnStart, Run or OnEnd threw (E_FAIL's bits).
+    static constexpr DWORD kThreadFailed = 0x80004005;
 
     // Remembers the creating thread's UI language for the worker.
     CThread() noexcept;
@@ -37,7 +39,7 @@ public:
 
     // Runs first on the worker thread.
     virtual void OnStart();
-    // Runs last on the worker thread, after the state became finished.
+    // Runs last on the worker thread, after the state became finished, also when Run threw.
     virtual void OnEnd();
     // Asks the work to end; the work reads the request through IsStopRequested.
     virtual void Stop();

@@ -257,5 +257,5 @@ int CPidlMgr::ComparePidls(int sign, LPCITEMIDLIST first, LPCITEMIDLIST second) 
     GetPath(first, firstPath, kMaximumPath);
     GetPath(second, secondPath, kMaximumPath);
     const int order = _wcsicmp(firstPath, secondPath);
-    return sign != 0 ? order * sign : order;
+    return ScaleComparison(order, sign);
 }

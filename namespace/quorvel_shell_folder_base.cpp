@@ -150,25 +150,29 @@ HRESULT CQuorvelShellFolderBase::GetAttributesOf(UINT count, PCUITEMID_CHILD_ARR
         if (!manager_.IsWellFormedList(items[index]))
             return E_INVALIDARG;
     }
-    for (UINT index = 0; index < count; ++index) {
-        // No item value carries SFGAO_VALIDATE, so after the first item the bit is gone.
-        if (validate && index == 0 && !manager_.IsValid(items[index]))
-            return E_FAIL;
-        DWORD value = 0;
-        switch (manager_.GetLastItemKind(items[index])) {
-            case PT_STATION:
-                value = kStationAttributes;
-                break;
-            case PT_FILE:
-                value = kFileAttributes;
-                break;
-            default:
-                value = 0;
-                break;
+    try {
+        for (UINT index = 0; index < count; ++index) {
+            // No item value carries SFGAO_VALIDATE, so after the first item the bit is gone.
+            // The validation reads the store, which allocates.
+            if (validate && index == 0 && !manager_.IsValid(items[index]))
+                return E_FAIL;
+            DWORD value = 0;
+            switch (manager_.GetLastItemKind(items[index])) {
+                case PT_STATION:
+                    value = kStationAttributes;
+                    break;
+                case PT_FILE:
+                    value = kFileAttributes;
+                    break;
+                default:
+                    value = 0;
+                    break;
+            }
+            *attributes &= value;
         }
-        *attributes &= value;
+        return S_OK;
     }
-    return S_OK;
+    CATCH_RETURN()
 }
 
 HRESULT CQuorvelShellFolderBase::GetDisplayNameOf(PCUITEMID_CHILD item, SHGDNF flags,

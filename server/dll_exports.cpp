@@ -12,15 +12,17 @@ HMODULE g_module = nullptr;
 }
 
 BOOL WINAPI DllMain(HINSTANCE instance, DWORD reason, LPVOID reserved) {
+    // Only what is safe under the loader lock: the start-up work waits for the first export.
     switch (reason) {
         case DLL_PROCESS_ATTACH:
             g_module = instance;
             ::DisableThreadLibraryCalls(instance);
-            CModuleApp::InitInstance(instance);
             break;
         case DLL_PROCESS_DETACH:
-            // A non-null reserved pointer means the process is ending, not FreeLibrary.
-            CModuleApp::ExitInstance(reserved != nullptr);
+            // A non-null reserved pointer means the process is ending, not FreeLibrary: the
+            // process takes memory and handles with it, and other modules may be gone already.
+            if (!reserved)
+                CModuleApp::ExitInstance();
             break;
         default:
             break;
@@ -29,6 +31,7 @@ BOOL WINAPI DllMain(HINSTANCE instance, DWORD reason, LPVOID reserved) {
 }
 
 STDAPI DllGetClassObject(REFCLSID classId, REFIID iid, void** object) {
+    CModuleApp::EnsureStarted(g_module);
     return GetClassObject(classId, iid, object);
 }
 
@@ -37,6 +40,7 @@ STDAPI DllCanUnloadNow() {
 }
 
 STDAPI DllRegisterServer() {
+    CModuleApp::EnsureStarted(g_module);
     return RegisterServer(g_module);
 }
 

@@ -331,9 +331,12 @@ bool LoadDisplaySettings() {
     }
     BYTE data[16] = {};
     DWORD size = sizeof(data);
-    if (::RegQueryValueExW(root.get(), L"Display Settings", nullptr, nullptr, data, &size) !=
+    DWORD type = REG_NONE;
+    // A value too short, too long for the buffer, or not binary at all is not ours to read:
+    // text read as widths would give columns millions of pixels wide.
+    if (::RegQueryValueExW(root.get(), L"Display Settings", nullptr, &type, data, &size) !=
             ERROR_SUCCESS ||
-        size < 8) {
+        type != REG_BINARY || size < 8) {
         return false;
     }
     memcpy(&g_displayColumnWidths[0], data, 4);

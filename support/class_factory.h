@@ -22,11 +22,27 @@ HRESULT CreateComInstance(REFIID iid, void** object) noexcept {
     CATCH_RETURN()
 }
 
-// Factories are cached for the module's life, so they do not hold the module lock themselves;
-// only LockServer moves it.
+// Factories are cached for the module's life with one reference of the cache's own. That
+// reference does not hold the module (or it could never unload); every reference beyond it is a
+// client's, and while any is held the module stays loaded, so that a client may keep a factory
+// without LockServer and still call it.
 class ClassFactory final : public ComObjectImpl<false, IClassFactory> {
 public:
     explicit ClassFactory(CreateInstanceFunction create) noexcept : create_(create) {}
+
+    IFACEMETHODIMP_(ULONG) AddRef() override {
+        const ULONG count = ComObjectImpl::AddRef();
+        if (count == kCacheReferences + 1)
+            LockModule();  // the first client reference
+        return count;
+    }
+
+    IFACEMETHODIMP_(ULONG) Release() override {
+        const ULONG count = ComObjectImpl::Release();  // may have deleted this: members are gone
+        if (count == kCacheReferences)
+            UnlockModule();  // the last client reference
+        return count;
+    }
 
     IFACEMETHODIMP QueryInterface(REFIID iid, void** object) override {
         static const QITAB table[] = {QITABENT(ClassFactory, IClassFactory), {}};
@@ -52,5 +68,7 @@ public:
     }
 
 private:
+    static constexpr ULONG kCacheReferences = 1;
+
     CreateInstanceFunction create_;
 };

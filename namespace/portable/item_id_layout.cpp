@@ -114,3 +114,9 @@ size_t BuildListPath(const uint8_t* list, WideChar* buffer, size_t capacity) {
     }
     return count;
 }
+
+int32_t ScaleComparison(int32_t order, int32_t sign) noexcept {
+    if (sign == 0)
+        return order;
+    return static_cast<int32_t>(static_cast<uint32_t>(order) * static_cast<uint32_t>(sign));
+}

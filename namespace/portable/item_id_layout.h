@@ -69,3 +69,9 @@ std::vector<WideString> SplitPathComponents(WideStringView path);
 // The display path of a list: its names joined by "\". Without a buffer, the capacity a caller
 // needs; with one, the text (appends bounded by the capacity) and its counted length.
 size_t BuildListPath(const uint8_t* list, WideChar* buffer, size_t capacity);
+
+// The folder's item comparison scaled by the shell's column argument: the order itself for 0,
+// else order × sign. The argument carries SHCIDS bits (0x80000000, 0x10000000), so the product
+// is taken modulo 2^32 as the processor's multiplication gives it: the same result for every
+// product that fits, and defined arithmetic for every other.
+int32_t ScaleComparison(int32_t order, int32_t sign) noexcept;

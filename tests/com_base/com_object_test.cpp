@@ -60,7 +60,13 @@ TEST(ComObject, QueryInterfaceAnswersItsTableAndIUnknownWithOneIdentity) {
 TEST(ClassFactory, CreatesRefusesAggregationAndMovesTheLockOnLockServer) {
     const LONG before = ModuleLockCount();
     auto factory = MakeComObject<ClassFactory>(&CreateComInstance<TwoInterfaces>);
-    EXPECT_EQ(before, ModuleLockCount()) << "a cached factory must not keep the module loaded";
+    EXPECT_EQ(before, ModuleLockCount()) << "the cache's own reference must not hold the module";
+    {
+        Microsoft::WRL::ComPtr<IClassFactory> client = factory;
+        Microsoft::WRL::ComPtr<IClassFactory> second = factory;
+        EXPECT_EQ(before + 1, ModuleLockCount()) << "clients' references hold it once";
+    }
+    EXPECT_EQ(before, ModuleLockCount());
 
     Microsoft::WRL::ComPtr<IPersist> persist;
     ASSERT_EQ(S_OK, factory->CreateInstance(nullptr, IID_PPV_ARGS(&persist)));

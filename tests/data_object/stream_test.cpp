@@ -3,6 +3,7 @@
 
 #include <gtest/gtest.h>
 
+#include <cstring>
 #include <vector>
 
 #include "support/module_lock.h"
@@ -58,37 +59,51 @@ TEST(Stream2, ExactMultipleNeedsAThirdReadBeforeTheFileIsGone) {
     EXPECT_EQ(0, ModuleLockCount());
 }
 
-TEST(Stream2, ReaderThatStopsEarlyLeavesTheFileAndNoDeleteFlagKeepsIt) {
-    const std::wstring path = WriteTemporaryFile(100);
-    {
-        auto stream = MakeComObject<CStream2>();
-        ASSERT_EQ(S_OK, stream->Bind(path, true));
-        char buffer[10];
-        ULONG got = 0;
-        ASSERT_EQ(S_OK, stream->Read(buffer, 10, &got));
+TEST(Stream2, ReaderThatStopsEarlyTakesTheFileWithItUnlessTheStreamMayNotDeleteIt) {
+    for (const bool mayDelete : {true, false}) {
+        const std::wstring path = WriteTemporaryFile(100);
+        {
+            auto stream = MakeComObject<CStream2>();
+            ASSERT_EQ(S_OK, stream->Bind(path, mayDelete));
+            char buffer[10];
+            ULONG got = 0;
+            ASSERT_EQ(S_OK, stream->Read(buffer, 10, &got));
+            EXPECT_TRUE(FileExists(path));
+        }
+        EXPECT_EQ(!mayDelete, FileExists(path)) << "a download nobody will finish reading goes";
+        ::DeleteFileW(path.c_str());
     }
-    EXPECT_TRUE(FileExists(path)) << "destroying the stream closes the file but does not delete it";
-    {
-        auto stream = MakeComObject<CStream2>();
-        ASSERT_EQ(S_OK, stream->Bind(path, false));
-        char buffer[200];
-        ULONG got = 0;
-        ASSERT_EQ(S_OK, stream->Read(buffer, 200, &got));
-        EXPECT_EQ(100u, got);
-    }
-    EXPECT_TRUE(FileExists(path));
-    ::DeleteFileW(path.c_str());
 }
 
-TEST(Stream2, MissingFileHasSizeZeroAndReadGivesTheWin32Code) {
+TEST(Stream2, StatFillsTheWholeRecordAndNamesTheFileOnlyWhenAsked) {
+    const std::wstring path = WriteTemporaryFile(300);
+    auto stream = MakeComObject<CStream2>();
+    ASSERT_EQ(S_OK, stream->Bind(path, true));
+    STATSTG statistics;
+    memset(&statistics, 0xCD, sizeof statistics);
+    ASSERT_EQ(S_OK, stream->Stat(&statistics, STATFLAG_NONAME));
+    EXPECT_EQ(nullptr, statistics.pwcsName);
+    EXPECT_EQ(static_cast<DWORD>(STGTY_STREAM), statistics.type);
+    EXPECT_EQ(300u, statistics.cbSize.QuadPart);
+    EXPECT_EQ(0u, statistics.mtime.dwLowDateTime);
+    EXPECT_EQ(0u, statistics.grfLocksSupported);
+
+    ASSERT_EQ(S_OK, stream->Stat(&statistics, STATFLAG_DEFAULT));
+    ASSERT_NE(nullptr, statistics.pwcsName);
+    EXPECT_EQ(path.substr(path.rfind(L'\\') + 1), statistics.pwcsName);
+    ::CoTaskMemFree(statistics.pwcsName);  // what a caller does: the copy must be its own
+}
+
+TEST(Stream2, MissingFileHasSizeZeroAndReadFailsWithTheWin32ErrorAsAnHresult) {
     auto stream = MakeComObject<CStream2>();
     ASSERT_EQ(S_OK, stream->Bind(L"C:\\no such folder\\QRV1.tmp", true));
     STATSTG statistics{};
-    ASSERT_EQ(S_OK, stream->Stat(&statistics, 0));
+    ASSERT_EQ(S_OK, stream->Stat(&statistics, STATFLAG_NONAME));
     EXPECT_EQ(0u, statistics.cbSize.QuadPart);
     char buffer[4];
     ULONG got = 7;
-    EXPECT_EQ(static_cast<HRESULT>(ERROR_PATH_NOT_FOUND), stream->Read(buffer, 4, &got));
+    EXPECT_EQ(HRESULT_FROM_WIN32(ERROR_PATH_NOT_FOUND), stream->Read(buffer, 4, &got))
+        << "the bare code 3 would read as success";
     EXPECT_EQ(0u, got);
     EXPECT_EQ(E_NOTIMPL, stream->Write(buffer, 4, &got));
     EXPECT_EQ(S_OK, stream->Seek({}, STREAM_SEEK_SET, nullptr));

@@ -3,6 +3,8 @@
 
 #include <gtest/gtest.h>
 
+#include <stdexcept>
+
 #include "support/text_lookup.h"
 #include "support/unique_resource.h"
 
@@ -92,4 +94,25 @@ TEST(Thread, AlertableSleepReportsCompletion) {
     EXPECT_FALSE(CThread::Sleep(1, true));
     ASSERT_NE(::QueueUserAPC([](ULONG_PTR) {}, ::GetCurrentThread(), 0), 0u);
     EXPECT_TRUE(CThread::Sleep(1000, true));
+}
+
+namespace {
+
+class ThrowingThread : public CThread {
+public:
+    DWORD Run() override { throw std::runtime_error("the work failed"); }
+    void OnEnd() override { endRan = true; }
+    bool endRan = false;
+};
+
+}  // namespace
+
+TEST(Thread, WorkThatThrowsEndsTheThreadNotTheProcess) {
+    ThrowingThread thread;
+    ASSERT_NE(nullptr, thread.Start());
+    for (int waited = 0; thread.GetExitCode() == STILL_ACTIVE && waited < 1000; ++waited)
+        ::Sleep(10);
+    EXPECT_EQ(CThread::kThreadFailed, thread.GetExitCode());
+    EXPECT_TRUE(thread.endRan) << "whoever waits for the worker still hears of its end";
+    EXPECT_EQ(CThread::kFinished, thread.GetStatus());
 }

@@ -90,6 +90,12 @@ TEST_F(PidlManager, ListOperations) {
     EXPECT_EQ(1u, manager_.GetItemCount(single.get()));
     EXPECT_FALSE(UniquePidl(manager_.CopyParent(single.get())));
 
+    // A buffer that cuts the path holds what fits, terminated; the count is of the names taken.
+    EXPECT_EQ(L"Quorvel D", PathText(full.get(), 10));
+    EXPECT_EQ(22u, lastCount_);
+    EXPECT_EQ(L"Quorvel Digital Level\\S1", PathText(full.get(), 25));
+    EXPECT_EQ(25u, lastCount_);
+
     UniquePidl tail(manager_.CopyFromIndex(full.get(), 1));
     EXPECT_EQ(L"S1\\file1.lv", PathText(tail.get()));
     EXPECT_FALSE(UniquePidl(manager_.CopyFromIndex(full.get(), 3)));

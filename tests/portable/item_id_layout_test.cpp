@@ -1,6 +1,7 @@
 // Item identifier bytes: the size rule, bounded name reads and display paths.
 #include <gtest/gtest.h>
 
+#include <cstdint>
 #include <cstring>
 #include <vector>
 
@@ -108,4 +109,28 @@ TEST(ListPath, SmallBufferIsNeverOverrun) {
     }
     // Ten characters hold nine and the terminator.
     EXPECT_EQ(WIDE_TEXT("Quorvel D"), PathOf(list, 10));
+}
+
+TEST(ItemComparison, ScalesByTheColumnArgumentWithDefinedArithmeticForShellBits) {
+    struct Case {
+        int32_t order;
+        uint32_t column;
+        int32_t expected;
+    } const cases[] = {
+        {-3, 0, -3},
+        {5, 1, 5},
+        {-1, 2, -2},
+        {7, 0xFFFFFFFFu, -7},
+        // SHCIDS_CANONICALONLY (0x10000000) and SHCIDS_ALLFIELDS (0x80000000): the product is
+        // taken modulo 2^32 instead of overflowing an int.
+        {1, 0x10000000u, 0x10000000},
+        {16, 0x10000000u, 0},
+        {1, 0x80000000u, INT32_MIN},
+        {-1, 0x80000000u, INT32_MIN},
+        {-2, 0x80000001u, -2},
+    };
+    for (const Case& test : cases) {
+        EXPECT_EQ(test.expected, ScaleComparison(test.order, static_cast<int32_t>(test.column)))
+            << test.order << " x " << std::hex << test.column;
+    }
 }

@@ -234,3 +234,58 @@ TEST(HalvekAdapter, FilePathIsCutToTheLibrarysLimit) {
     EXPECT_EQ(HalvekFilePath(L"C:\\Temp\\QRV1.tmp"), "C:\\Temp\\QRV1.tmp");
     EXPECT_LT(HalvekFilePath(std::wstring(400, L'a')).size(), 260u);
 }
+
+namespace {
+
+// A library object whose table is written here slot by slot, as the library's maker documents
+// it, independently of the header that the adapter and the substitute share: each entry records
+// its own slot number.
+struct SlotRecorder {
+    const void* const* table;
+    int calledSlot = -1;
+};
+
+template <int Slot>
+intptr_t RecordSlot(SlotRecorder* self) {  // the arguments after this one are not read
+    self->calledSlot = Slot;
+    return 0;
+}
+
+const void* const kDocumentedTable[] = {
+    reinterpret_cast<const void*>(&RecordSlot<0>),  reinterpret_cast<const void*>(&RecordSlot<1>),
+    reinterpret_cast<const void*>(&RecordSlot<2>),  reinterpret_cast<const void*>(&RecordSlot<3>),
+    reinterpret_cast<const void*>(&RecordSlot<4>),  reinterpret_cast<const void*>(&RecordSlot<5>),
+    reinterpret_cast<const void*>(&RecordSlot<6>),  reinterpret_cast<const void*>(&RecordSlot<7>),
+    reinterpret_cast<const void*>(&RecordSlot<8>),  reinterpret_cast<const void*>(&RecordSlot<9>),
+    reinterpret_cast<const void*>(&RecordSlot<10>), reinterpret_cast<const void*>(&RecordSlot<11>),
+    reinterpret_cast<const void*>(&RecordSlot<12>), reinterpret_cast<const void*>(&RecordSlot<13>),
+};
+
+}  // namespace
+
+TEST(HalvekAdapter, EachOperationCallsTheLibrarysDocumentedSlot) {
+    struct Case {
+        const char* operation;
+        int slot;
+        void (*call)(IHalvekCommObject& library);
+    } const cases[] = {
+        {"destructor", 0, [](IHalvekCommObject& library) { library.DeleteObject(1); }},
+        {"SetCommParams", 2,
+         [](IHalvekCommObject& library) { library.SetCommParams(3, 9600, 2, 0, 0, 7, 0); }},
+        {"Initialize", 3, [](IHalvekCommObject& library) { library.Initialize(); }},
+        {"StartDownload", 4, [](IHalvekCommObject& library) { library.StartDownload(20, 1); }},
+        {"SetPoints", 6, [](IHalvekCommObject& library) { library.SetPoints(nullptr); }},
+        {"Cancel", 8, [](IHalvekCommObject& library) { library.Cancel(); }},
+        {"SetFilePath", 9, [](IHalvekCommObject& library) { library.SetFilePath("C:\\f"); }},
+        {"SetTimeout", 10, [](IHalvekCommObject& library) { library.SetTimeout(30); }},
+        {"SetCallback", 13, [](IHalvekCommObject& library) { library.SetCallback(nullptr); }},
+    };
+    for (const Case& test : cases) {
+        SlotRecorder object{kDocumentedTable};
+        // Seen through the adapter's declaration, as the library's own object is: a pointer to
+        // a table of functions, nothing more.
+        void* address = &object;
+        test.call(*static_cast<IHalvekCommObject*>(address));
+        EXPECT_EQ(test.slot, object.calledSlot) << test.operation;
+    }
+}

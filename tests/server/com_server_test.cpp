@@ -6,6 +6,7 @@
 #include <gtest/gtest.h>
 
 #include <cstring>
+#include <vector>
 
 #include "stations/station_store.h"
 #include "tests/server/extension_module.h"
@@ -35,7 +36,11 @@ TEST(ComServer, EachClassHasOneCachedFactory) {
 
     ComPtr<IStream> stream;
     EXPECT_EQ(E_NOINTERFACE, module.GetClassObject(kShellFolderClassId, IID_PPV_ARGS(&stream)));
-    EXPECT_EQ(S_OK, module.CanUnloadNow()) << "cached factories do not keep the module";
+    EXPECT_EQ(S_FALSE, module.CanUnloadNow()) << "a factory in a client's hands keeps the module";
+    first.Reset();
+    second.Reset();
+    other.Reset();
+    EXPECT_EQ(S_OK, module.CanUnloadNow()) << "the cache alone does not";
 }
 
 TEST(ComServer, EachCreatableClassAnswersItsInterface) {
@@ -66,21 +71,24 @@ TEST(ComServer, CanUnloadNowOnlyAfterTheLastObjectAndServerLockAreGone) {
     ExtensionModule module;
     ComPtr<IClassFactory> factory;
     ASSERT_EQ(S_OK, module.GetClassObject(kShellFolderClassId, IID_PPV_ARGS(&factory)));
-    EXPECT_EQ(S_OK, module.CanUnloadNow());
-
     ComPtr<IShellFolder> folder;
     ASSERT_EQ(S_OK, factory->CreateInstance(nullptr, IID_PPV_ARGS(&folder)));
     ComPtr<IPersistFolder> sameObject;
     ASSERT_EQ(S_OK, folder.As(&sameObject));
+    factory.Reset();
     EXPECT_EQ(S_FALSE, module.CanUnloadNow());
     folder.Reset();
     EXPECT_EQ(S_FALSE, module.CanUnloadNow()) << "a second interface still holds the object";
     sameObject.Reset();
     EXPECT_EQ(S_OK, module.CanUnloadNow());
 
+    ASSERT_EQ(S_OK, module.GetClassObject(kShellFolderClassId, IID_PPV_ARGS(&factory)));
     ASSERT_EQ(S_OK, factory->LockServer(TRUE));
-    EXPECT_EQ(S_FALSE, module.CanUnloadNow());
+    factory.Reset();
+    EXPECT_EQ(S_FALSE, module.CanUnloadNow()) << "the server lock outlives the factory reference";
+    ASSERT_EQ(S_OK, module.GetClassObject(kShellFolderClassId, IID_PPV_ARGS(&factory)));
     ASSERT_EQ(S_OK, factory->LockServer(FALSE));
+    factory.Reset();
     EXPECT_EQ(S_OK, module.CanUnloadNow());
 }
 
@@ -100,7 +108,29 @@ TEST(ComServer, StartUpBuildsTheIconListsThatItemIconsComeFrom) {
     }
 }
 
-TEST(ComServer, LoadReadsTheDisplaySettingsAndUnloadSavesThem) {
+namespace {
+
+// The "Display Settings" value as it is stored; empty when there is none.
+std::vector<BYTE> StoredDisplaySettings() {
+    UniqueRegKey root;
+    if (::RegOpenKeyExW(HKEY_CURRENT_USER, StationRootKeyPath().c_str(), 0, KEY_READ,
+                        root.put()) != ERROR_SUCCESS) {
+        return {};
+    }
+    std::vector<BYTE> data(32);
+    DWORD size = static_cast<DWORD>(data.size()), type = 0;
+    if (::RegQueryValueExW(root.get(), L"Display Settings", nullptr, &type, data.data(), &size) !=
+            ERROR_SUCCESS ||
+        type != REG_BINARY) {
+        return {};
+    }
+    data.resize(size);
+    return data;
+}
+
+}  // namespace
+
+TEST(ComServer, StartUpWaitsForTheFirstClassObjectAndUnloadSavesWhatItLoaded) {
     RegistryOverride registry;
     {
         UniqueRegKey root;
@@ -112,21 +142,25 @@ TEST(ComServer, LoadReadsTheDisplaySettingsAndUnloadSavesThem) {
                   ::RegSetValueExW(root.get(), L"Display Settings", 0, REG_BINARY,
                                    reinterpret_cast<const BYTE*>(widths), sizeof widths));
     }
-    ExtensionModule module;
-    ASSERT_TRUE(module.get());
-    module.Unload();
+    const std::vector<BYTE> written = StoredDisplaySettings();
+    ASSERT_EQ(8u, written.size());
+    {
+        // Loading alone does nothing under the loader lock, so unloading has nothing to save.
+        ExtensionModule module;
+        ASSERT_TRUE(module.get());
+    }
+    EXPECT_EQ(written, StoredDisplaySettings());
 
-    UniqueRegKey root;
-    ASSERT_EQ(ERROR_SUCCESS, ::RegOpenKeyExW(HKEY_CURRENT_USER, StationRootKeyPath().c_str(), 0,
-                                             KEY_READ, root.put()));
-    BYTE data[32] = {};
-    DWORD size = sizeof data, type = 0;
-    ASSERT_EQ(ERROR_SUCCESS,
-              ::RegQueryValueExW(root.get(), L"Display Settings", nullptr, &type, data, &size));
+    {
+        ExtensionModule module;
+        ComPtr<IClassFactory> factory;
+        ASSERT_EQ(S_OK, module.GetClassObject(kShellFolderClassId, IID_PPV_ARGS(&factory)));
+    }
     // The module rewrote the value in its own 12-byte form with the widths it had loaded.
-    EXPECT_EQ(12u, size);
+    const std::vector<BYTE> saved = StoredDisplaySettings();
+    ASSERT_EQ(12u, saved.size());
     DWORD widths[2] = {};
-    std::memcpy(widths, data, sizeof widths);
+    std::memcpy(widths, saved.data(), sizeof widths);
     EXPECT_EQ(300u, widths[0]);
     EXPECT_EQ(150u, widths[1]);
 }

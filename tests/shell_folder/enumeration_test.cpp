@@ -19,9 +19,22 @@ TEST_F(ShellFolderTest, RootListsStationsOnlyForFolders) {
               ::RegCreateKeyExW(HKEY_CURRENT_USER, (StationsKeyPath() + L"\\Stray").c_str(), 0,
                                 nullptr, 0, KEY_ALL_ACCESS, nullptr, stray.put(), nullptr));
     ASSERT_EQ(ERROR_SUCCESS, WriteDwordValue(stray.get(), L"Name", 7));
+    // Names written by other tools: an empty one makes the path of the root itself, a backslash
+    // ends the station's part of the path.
+    for (const auto& [key, name] : {std::pair<const wchar_t*, const wchar_t*>{L"Station 8", L""},
+                                    {L"Station 9", L"North\\South"}}) {
+        UniqueRegKey written;
+        ASSERT_EQ(ERROR_SUCCESS,
+                  ::RegCreateKeyExW(HKEY_CURRENT_USER, (StationsKeyPath() + L"\\" + key).c_str(),
+                                    0, nullptr, 0, KEY_ALL_ACCESS, nullptr, written.put(), nullptr));
+        ASSERT_EQ(ERROR_SUCCESS, WriteStringValue(written.get(), L"Name", name));
+    }
 
     ComPtr<IShellFolder> folder = CreateRootFolder();
-    const Items expected = {{PT_STATION, L"Station 1"}, {PT_STATION, L"Station 2"}};
+    const Items expected = {{PT_STATION, L"Station 1"},
+                            {PT_STATION, L"Station 2"},
+                            {PT_ROOT, L"Quorvel Digital Level"},
+                            {PT_STATION, L"North"}};
     EXPECT_EQ(expected, Enumerate(folder.Get(), SHCONTF_FOLDERS));
     EXPECT_EQ(expected, Enumerate(folder.Get(), SHCONTF_FOLDERS | SHCONTF_NONFOLDERS));
     EXPECT_EQ(Items{}, Enumerate(folder.Get(), SHCONTF_NONFOLDERS));

@@ -1,6 +1,8 @@
 // The folder's answers about items: display names by flags, attributes, comparison.
 #include "tests/shell_folder/shell_folder_fixture.h"
+#include "tests/support/allocation_failure.h"
 
+#include <cstdint>
 #include <cstring>
 
 TEST_F(ShellFolderTest, DisplayNameFlagRules) {
@@ -104,6 +106,21 @@ TEST_F(ShellFolderTest, AttributesByKindAndValidation) {
     EXPECT_EQ(E_FAIL, attributes({&station}, SFGAO_VALIDATE, result));
 }
 
+TEST_F(ShellFolderTest, AllocationFailureWhileValidatingIsAResultNotAnException) {
+    AddStationOfModel(L"Station 1");
+    ComPtr<IShellFolder> folder = CreateRootFolder();
+    UniquePidl station = StationItem(L"Station 1");
+    PCUITEMID_CHILD item = Child(station);
+    SFGAOF attributes = SFGAO_VALIDATE;
+    HRESULT result = S_OK;
+    {
+        // The validation reads the store, which allocates.
+        ScopedAllocationFailure failing;
+        result = folder->GetAttributesOf(1, &item, &attributes);
+    }
+    EXPECT_EQ(E_OUTOFMEMORY, result);
+}
+
 TEST_F(ShellFolderTest, MalformedItemsAreRefusedBeforeTheirNamesAreRead) {
     ComPtr<IShellFolder> folder = CreateRootFolder();
     UniquePidl unterminated = StationItem(L"AB");
@@ -149,4 +166,9 @@ TEST_F(ShellFolderTest, CompareIDsReturnsTheSignedOrderUnfolded) {
     EXPECT_EQ(order, compare(static_cast<LPARAM>(0x700000000LL), alpha, beta))
         << "only the low 32 bits of the column count";
     EXPECT_EQ(0, compare(0, alpha, file)) << "items of different kinds compare equal";
+    // The shell's SHCIDS bits arrive in the column too; the product wraps instead of overflowing.
+    EXPECT_EQ(static_cast<HRESULT>(static_cast<uint32_t>(order) * 0x10000000u),
+              compare(SHCIDS_CANONICALONLY, alpha, beta));
+    EXPECT_EQ(static_cast<HRESULT>(static_cast<uint32_t>(order) * 0x80000000u),
+              compare(static_cast<LPARAM>(SHCIDS_ALLFIELDS), alpha, beta));
 }

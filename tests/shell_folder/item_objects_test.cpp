@@ -120,6 +120,14 @@ TEST_F(ShellFolderTest, SharedIconListsFeedTheExtractor) {
         EXPECT_EQ(::GetSystemMetrics(SM_CXICON), IconSize(large).cx) << "requested size ignored";
         EXPECT_EQ(::GetSystemMetrics(SM_CXSMICON), IconSize(small).cx);
     }
+    // An index past the lists (the shell passes back whatever GetIconLocation gave, but nothing
+    // stops another caller) makes no icon rather than reading past them.
+    for (UINT index : {3u, 0x7FFFFFFFu}) {
+        large = small = reinterpret_cast<HICON>(1);
+        EXPECT_EQ(S_OK, extractor->Extract(L"", index, &large, &small, 0));
+        EXPECT_EQ(nullptr, large) << index;
+        EXPECT_EQ(nullptr, small) << index;
+    }
     DestroySharedIconLists();
 }
 

@@ -19,6 +19,11 @@ TEST_F(ShellFolderTest, RootAndStationFolderPathsWithAndWithoutPrefix) {
     ASSERT_EQ(S_OK, root->Initialize(nullptr));
     EXPECT_EQ(L"\\Quorvel Digital Level", FolderPath(*root.Get(), false));
     EXPECT_EQ(kPrefix, FolderPath(*root.Get(), true));
+    // Whatever identifier the shell passes, the folder it initialises is the root.
+    auto elsewhere = MakeComObject<CLVShellFolder>();
+    UniquePidl other = StationItem(L"Elsewhere");
+    ASSERT_EQ(S_OK, elsewhere->Initialize(reinterpret_cast<PCIDLIST_ABSOLUTE>(other.get())));
+    EXPECT_EQ(L"\\Quorvel Digital Level", FolderPath(*elsewhere.Get(), false));
 
     auto station = MakeComObject<CLVShellFolder>();
     UniquePidl item = StationItem(L"Station 1");
@@ -93,6 +98,17 @@ TEST_F(ShellFolderTest, BindToStationThenParseAndNameItsFile) {
     EXPECT_EQ(std::wstring(kPrefix) + L"\\Station 1\\file1.lv", text);
     ASSERT_EQ(S_OK, DisplayName(stationFolder.Get(), file, SHGDN_NORMAL, text));
     EXPECT_EQ(L"file1.lv", text);
+
+    // Two names in a station folder: the station itself and a file named by the first, the rest
+    // ignored (the whole path can hold a root, a station and a file, nothing more).
+    std::wstring two = L"A\\B";
+    ASSERT_EQ(S_OK, stationFolder->ParseDisplayName(nullptr, nullptr, two.data(), nullptr, &parsed,
+                                                    nullptr));
+    UniquePidl pair(reinterpret_cast<LPITEMIDLIST>(parsed));
+    ASSERT_EQ(2u, manager_.GetItemCount(pair.get()));
+    EXPECT_EQ(L"Station 1", manager_.GetItemName(pair.get()));
+    EXPECT_EQ(static_cast<DWORD>(PT_FILE), manager_.GetLastItemKind(pair.get()));
+    EXPECT_EQ(L"A", manager_.GetItemName(manager_.GetLastItem(pair.get())));
 }
 
 TEST_F(ShellFolderTest, BindToObjectRefusesFilesAndMalformedItems) {

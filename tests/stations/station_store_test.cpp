@@ -259,14 +259,13 @@ TEST_F(StationStore, SerialPortListStopsAtTheFirstNonTextValue) {
     UniqueRegKey key;
     ASSERT_EQ(ERROR_SUCCESS, ::RegOpenKeyExW(HKEY_LOCAL_MACHINE, L"HARDWARE\\DEVICEMAP\\SERIALCOMM",
                                              0, KEY_ALL_ACCESS, key.put()));
-    ASSERT_EQ(ERROR_SUCCESS, WriteDwordValue(key.get(), L"\\Device\\Weird", 5));
+    ASSERT_EQ(ERROR_SUCCESS, WriteDwordValue(key.get(), L"\\Device\\Serial5", 5));
     ASSERT_EQ(ERROR_SUCCESS, WriteStringValue(key.get(), L"\\Device\\Serial9", L"COM9"));
     std::vector<std::wstring> ports;
-    EnumerateSerialPorts(ports);
-    // Enumeration order is the registry's own; whatever follows the DWORD value is not listed.
-    ASSERT_FALSE(ports.empty());
-    EXPECT_EQ(L"COM3", ports.front());
-    EXPECT_EQ(ports.end(), std::find(ports.begin(), ports.end(), L"")) << "no empty port name";
+    // COM9 comes after the DWORD value both in the order of writing (Windows) and in the order
+    // of names (Wine).
+    EXPECT_EQ(1u, EnumerateSerialPorts(ports));
+    EXPECT_EQ(std::vector<std::wstring>{L"COM3"}, ports);
 }
 
 TEST_F(StationStore, StationListBlockRoundTripsAndIsBoundByItsRealSize) {
@@ -291,25 +290,57 @@ TEST_F(StationStore, StationListBlockRoundTripsAndIsBoundByItsRealSize) {
     EXPECT_TRUE(parsed.empty());
 }
 
-TEST_F(StationStore, DisplaySettingsDefaultToOneHundredAndRoundTrip) {
+TEST_F(StationStore, DisplaySettingsAreTwelveBinaryBytesAndOnlyAValidValueIsRead) {
     g_displayColumnWidths[0] = 5;
     EXPECT_FALSE(LoadDisplaySettings());
     EXPECT_EQ(100, g_displayColumnWidths[0]);
     EXPECT_EQ(100, g_displayColumnWidths[1]);
     g_displayColumnWidths[0] = 240;
-    g_displayColumnWidths[1] = 77;
+    g_displayColumnWidths[1] = 0x1234;
     ASSERT_TRUE(SaveDisplaySettings());
     UniqueRegKey root;
     ASSERT_EQ(ERROR_SUCCESS, ::RegOpenKeyExW(HKEY_CURRENT_USER, StationRootKeyPath().c_str(), 0,
-                                             KEY_READ, root.put()));
-    DWORD size = 0;
-    ASSERT_EQ(ERROR_SUCCESS, ::RegQueryValueExW(root.get(), L"Display Settings", nullptr, nullptr,
-                                                nullptr, &size));
-    EXPECT_EQ(12u, size);
+                                             KEY_ALL_ACCESS, root.put()));
+    BYTE data[32] = {};
+    DWORD size = sizeof data, type = REG_NONE;
+    ASSERT_EQ(ERROR_SUCCESS,
+              ::RegQueryValueExW(root.get(), L"Display Settings", nullptr, &type, data, &size));
+    EXPECT_EQ(static_cast<DWORD>(REG_BINARY), type);
+    const std::vector<BYTE> expected = {240, 0, 0, 0, 0x34, 0x12, 0, 0, 0, 0, 0, 0};
+    EXPECT_EQ(expected, std::vector<BYTE>(data, data + size));
     g_displayColumnWidths[0] = g_displayColumnWidths[1] = 0;
     EXPECT_TRUE(LoadDisplaySettings());
     EXPECT_EQ(240, g_displayColumnWidths[0]);
-    EXPECT_EQ(77, g_displayColumnWidths[1]);
+    EXPECT_EQ(0x1234, g_displayColumnWidths[1]);
+
+    // Values that are not the module's own leave both widths at 100.
+    const BYTE eight[8] = {50, 0, 0, 0, 60, 0, 0, 0};
+    const BYTE longer[20] = {50, 0, 0, 0, 60, 0, 0, 0};
+    struct Case {
+        const char* what;
+        DWORD type;
+        const BYTE* bytes;
+        DWORD size;
+    } const cases[] = {
+        {"short", REG_BINARY, eight, 7},
+        {"longer than the 16-byte buffer", REG_BINARY, longer, sizeof longer},
+        {"text", REG_SZ, reinterpret_cast<const BYTE*>(L"2000000"), 16},
+        {"a number", REG_QWORD, eight, 8},
+    };
+    for (const Case& test : cases) {
+        ASSERT_EQ(ERROR_SUCCESS, ::RegSetValueExW(root.get(), L"Display Settings", 0, test.type,
+                                                  test.bytes, test.size));
+        g_displayColumnWidths[0] = g_displayColumnWidths[1] = 0;
+        EXPECT_FALSE(LoadDisplaySettings()) << test.what;
+        EXPECT_EQ(100, g_displayColumnWidths[0]) << test.what;
+        EXPECT_EQ(100, g_displayColumnWidths[1]) << test.what;
+    }
+    // Exactly eight binary bytes are enough.
+    ASSERT_EQ(ERROR_SUCCESS, ::RegSetValueExW(root.get(), L"Display Settings", 0, REG_BINARY,
+                                              eight, sizeof eight));
+    EXPECT_TRUE(LoadDisplaySettings());
+    EXPECT_EQ(50, g_displayColumnWidths[0]);
+    EXPECT_EQ(60, g_displayColumnWidths[1]);
 }
 
 TEST_F(StationStore, InstructionTextsAndTheExternalLibraryFollowTheModel) {

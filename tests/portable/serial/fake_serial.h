@@ -64,6 +64,12 @@ public:
     }
 
     size_t Write(const uint8_t* bytes, size_t count) override {
+        if (refuseWrites) {
+            // A stalled line: the write time-out passes and no byte moves.
+            ++refusedWrites;
+            clock_.Advance(100);
+            return 0;
+        }
         const Bytes chunk(bytes, bytes + count);
         written.insert(written.end(), chunk.begin(), chunk.end());
         writes.push_back(chunk);
@@ -82,6 +88,8 @@ public:
 
     std::function<void(const Bytes& written, FakePort& port)> onWrite;
     std::function<void(FakePort& port)> onSilence;
+    bool refuseWrites = false;
+    int refusedWrites = 0;
     Bytes written;
     std::vector<Bytes> writes;
     int readCalls = 0;

@@ -123,6 +123,16 @@ TEST_F(LineProtocolTest, ProgressStopsAtHundredFromTheThirtiethLine) {
     EXPECT_EQ(progress.back().second, 100u);
 }
 
+TEST_F(LineProtocolTest, AReplyThatMovesNoByteIsGivenUpAfterThreeSeconds) {
+    rig.port.Deliver(Transfer(1).front());  // the header, then nothing more
+    rig.port.refuseWrites = true;
+    EXPECT_EQ(protocol.ReceiveLines(), 1u) << "the instrument never hears the ACK and goes silent";
+    // Each refused write costs 100 ms: the reply stops at the first attempt past 3000 ms, and
+    // the receive goes on to its own time-out instead of spinning on the dead line.
+    EXPECT_EQ(31, rig.port.refusedWrites);
+    EXPECT_TRUE(rig.port.written.empty());
+}
+
 TEST_F(LineProtocolTest, WrongCheckCharacterIsRefusedNotWrittenAndTheResendAccepted) {
     instrument.lines = Transfer(3);
     instrument.sendAs = [](size_t index, int attempt, const std::string& line) {

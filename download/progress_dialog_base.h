@@ -1,0 +1,46 @@
+// CProgressDialogBase: what the two download dialogs share, and the rule that only a completed
+// transfer ends them with IDOK.
+#pragma once
+
+#include <windows.h>
+
+#include <string>
+
+#include "stations/portable/station.h"
+#include "support/modal_dialog.h"
+
+class CProgressDialogBase : public CModalDialog {
+public:
+    // True once the transfer reported a complete file. An IDOK result means nothing without it:
+    // the caller hands the shell a file only when both hold.
+    bool TransferCompleted() const noexcept { return completed_; }
+    const std::wstring& OutputPath() const noexcept { return outputPath_; }
+
+protected:
+    // parent may be null (the data object runs the dialog without one).
+    CProgressDialogBase(HWND parent, const Station& station, const std::wstring& outputPath);
+
+    // The texts both dialogs show when they open: instructions for the station's model in the
+    // default GUI font, the station's name, "Waiting for start...", the labels, Cancel and the
+    // title; the focus goes to Start.
+    void ShowInitialTexts(UINT titleId);
+    // The transfer is complete: remember it, say "Finishing download..." and end with IDOK
+    // through a posted command, so that pending messages are handled first.
+    void FinishTransfer();
+    void SetStatus(UINT textId);
+
+    // An IDOK that did not come from FinishTransfer is ignored: on Windows, Enter in the
+    // multi-line instructions (no ES_WANTRETURN) sends one, and a stray command must not pass a
+    // missing file off as a download.
+    void OnOK() override;
+
+    const Station& station() const noexcept { return station_; }
+
+private:
+    Station station_;
+    std::wstring instructions_;  // control 214
+    std::wstring status_;        // control 215
+    std::wstring name_;          // control 217
+    std::wstring outputPath_;
+    bool completed_ = false;
+};

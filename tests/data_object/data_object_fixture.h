@@ -1,0 +1,99 @@
+// The data-object fixture: an isolated station store with three stations, data objects over
+// items given by their namespace paths, and dialogs answered without a display.
+#pragma once
+
+#include <windows.h>
+#include <shlobj.h>
+
+#include <gtest/gtest.h>
+
+#include <string>
+#include <vector>
+
+#include "namespace/pidl_manager.h"
+#include "stations/station_store.h"
+#include "support/module_lock.h"
+#include "support/unique_resource.h"
+#include "support/user_interface.h"
+#include "tests/support/registry_override.h"
+#include "view/lv_data_object.h"
+
+// Answers every modal dialog at once without showing it, and counts the runs.
+class ScriptedDialogs : public UserInterface {
+public:
+    explicit ScriptedDialogs(INT_PTR answer) : answer_(answer) {}
+    int ShowMessageBox(HWND, const std::wstring&, const std::wstring&, UINT) override {
+        return IDOK;
+    }
+    INT_PTR RunModalDialog(HINSTANCE, UINT, HWND, DLGPROC, LPARAM) override {
+        ++runs;
+        return answer_;
+    }
+    int runs = 0;
+
+private:
+    INT_PTR answer_;
+};
+
+inline CLIPFORMAT Format(const wchar_t* name) {
+    return static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(name));
+}
+
+inline FORMATETC Request(const wchar_t* name, DWORD tymed, LONG index = -1) {
+    return {Format(name), nullptr, DVASPECT_CONTENT, index, tymed};
+}
+
+inline std::vector<std::wstring> TemporaryDownloads() {
+    wchar_t directory[MAX_PATH];
+    ::GetTempPathW(MAX_PATH, directory);
+    std::vector<std::wstring> names;
+    WIN32_FIND_DATAW found;
+    HANDLE search = ::FindFirstFileW((std::wstring(directory) + L"QRV*").c_str(), &found);
+    if (search == INVALID_HANDLE_VALUE)
+        return names;
+    do {
+        names.push_back(found.cFileName);
+    } while (::FindNextFileW(search, &found));
+    ::FindClose(search);
+    return names;
+}
+
+class DataObject : public ::testing::Test {
+protected:
+    void SetUp() override {
+        ASSERT_TRUE(SUCCEEDED(::OleInitialize(nullptr)));
+        AddStationNamed(L"North", L"Quorvel LV-10");
+        AddStationNamed(L"South", L"Quorvel LV-30");
+        AddStationNamed(L"East", L"Quorvel LV-10");
+    }
+
+    void TearDown() override {
+        ::OleUninitialize();
+        EXPECT_EQ(0, ModuleLockCount()) << "a reference was leaked";
+    }
+
+    void AddStationNamed(const std::wstring& name, const std::wstring& model) {
+        Station station = DefaultStation();
+        station.Name = name;
+        station.Model = model;
+        station.Port = L"COM" + std::to_wstring(name.size());
+        ASSERT_EQ(S_OK, AddStation(station));
+    }
+
+    // A data object over items given by their paths inside the namespace.
+    Microsoft::WRL::ComPtr<IDataObject> Over(std::initializer_list<const wchar_t*> paths) {
+        auto object = MakeComObject<CLVDataObject>();
+        for (const wchar_t* path : paths) {
+            UniquePidl list(manager_.CreatePidlFromPath(path));
+            EXPECT_EQ(S_OK, object->SetItem(reinterpret_cast<PCUIDLIST_RELATIVE>(list.get())));
+        }
+        Microsoft::WRL::ComPtr<IDataObject> data;
+        EXPECT_EQ(S_OK, object.As(&data));
+        return data;
+    }
+
+    // The local machine too: an empty serial-port list leaves the stored ports as they are.
+    RegistryOverride registry_{RegistryOverride::Hives::CurrentUserAndLocalMachine};
+    CPidlMgr manager_;
+};
+
