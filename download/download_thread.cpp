@@ -3,7 +3,9 @@
 
 #include <algorithm>
 #include <cwchar>
+#include <mutex>
 #include <string>
+#include <unordered_map>
 
 #include "res/resource.h"
 #include "support/module_instance.h"
@@ -17,7 +19,20 @@ constexpr DWORD kGeneralFailure = 0x80004005;
 constexpr uint32_t kReceiveFailed = 1;
 constexpr size_t kPortNameLength = 14;
 
-std::atomic<long> g_liveMessageTexts{0};
+// The texts handed over with "Download Thread Message" that nobody has freed yet, with the
+// thread that posted each. The receiver frees a text when it handles it, but a modal dialog's
+// loop drops what it takes after EndDialog (a Cancel sent from another thread ends it between
+// two posted texts), and a window that is gone receives nothing: what is left over goes with
+// the thread that posted it, which outlives its window.
+struct LiveTexts {
+    std::mutex lock;
+    std::unordered_map<wchar_t*, const CLVDownloadThread*> owners;
+};
+
+LiveTexts& PostedTexts() {
+    static LiveTexts texts;
+    return texts;
+}
 
 // The progress text: "%d" becomes the percent and "%%" a percent sign. A translation with any
 // other conversion would be unsafe to hand to a formatter, so it is built here and refused
@@ -59,6 +74,16 @@ CLVDownloadThread::~CLVDownloadThread() {
     if (ThreadHandle())
         ::WaitForSingleObject(ThreadHandle(), INFINITE);
     driver_.reset();  // before the record it points to
+    LiveTexts& texts = PostedTexts();
+    std::lock_guard<std::mutex> guard(texts.lock);
+    for (auto entry = texts.owners.begin(); entry != texts.owners.end();) {
+        if (entry->second == this) {
+            delete[] entry->first;
+            entry = texts.owners.erase(entry);
+        } else {
+            ++entry;
+        }
+    }
 }
 
 std::unique_ptr<TAZCommParams> CLVDownloadThread::MakeConnectionRecord(
@@ -104,7 +129,14 @@ void CLVDownloadThread::ShowMessage(uint32_t code, const WideChar* text) {
     if (!copy)
         return;
     std::copy_n(text ? text : L"", length + 1, copy);
-    ++g_liveMessageTexts;
+    try {
+        LiveTexts& texts = PostedTexts();
+        std::lock_guard<std::mutex> guard(texts.lock);
+        texts.owners.emplace(copy, this);
+    } catch (...) {
+        delete[] copy;  // no room to keep track of it: the message is not sent
+        return;
+    }
     if (!::PostMessageW(notifyWindow_, g_registeredMessages.downloadThreadMessage, code,
                         reinterpret_cast<LPARAM>(copy))) {
         FreeMessageText(reinterpret_cast<LPARAM>(copy));  // never delivered: still ours
@@ -137,10 +169,16 @@ void CLVDownloadThread::PostToWindow(UINT message, WPARAM wParam, LPARAM lParam)
 void CLVDownloadThread::FreeMessageText(LPARAM text) noexcept {
     if (!text)
         return;
-    delete[] reinterpret_cast<wchar_t*>(text);
-    --g_liveMessageTexts;
+    auto* copy = reinterpret_cast<wchar_t*>(text);
+    LiveTexts& texts = PostedTexts();
+    std::lock_guard<std::mutex> guard(texts.lock);
+    // A text its thread already reclaimed is not freed twice.
+    if (texts.owners.erase(copy) != 0)
+        delete[] copy;
 }
 
 long CLVDownloadThread::LiveMessageTexts() noexcept {
-    return g_liveMessageTexts.load();
+    LiveTexts& texts = PostedTexts();
+    std::lock_guard<std::mutex> guard(texts.lock);
+    return static_cast<long>(texts.owners.size());
 }

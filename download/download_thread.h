@@ -18,7 +18,8 @@ public:
     // Builds the connection record and opens the port through the driver. When the port cannot
     // be opened the driver has already reported it to the window, and no driver is kept.
     CLVDownloadThread(HWND notifyWindow, const Station& station, const std::wstring& outputPath);
-    // Waits for a started worker to be gone, then deletes the driver (which closes the port).
+    // Waits for a started worker to be gone, then deletes the driver (which closes the port) and
+    // the texts it posted that no receiver freed.
     ~CLVDownloadThread() override;
 
     // Receives the file with the line protocol. Always 0.
@@ -36,7 +37,8 @@ public:
     const TAZCommParams& ConnectionRecord() const noexcept { return *params_; }
 
     // The text copies handed over with "Download Thread Message": the receiver frees each one
-    // with FreeMessageText. LiveMessageTexts counts those not yet freed in this process.
+    // with FreeMessageText; the thread frees, when it is destroyed, those nobody received.
+    // LiveMessageTexts counts those not yet freed in this process.
     static void FreeMessageText(LPARAM text) noexcept;
     static long LiveMessageTexts() noexcept;
 

@@ -8,6 +8,7 @@
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
+#include <optional>
 #include <sstream>
 #include <thread>
 
@@ -135,6 +136,32 @@ TEST_F(DownloadDialog, ShowsInstructionsNameAndWaitsForStart) {
     });
     EXPECT_EQ(result, IDCANCEL);
     EXPECT_TRUE(user_.MessageBoxes().empty());
+}
+
+TEST_F(DownloadDialog, AStrayOkBeforeStartIsIgnoredAndTextsQueuedAtCloseAreFreed) {
+    CDownloadProgressDialog dialog(nullptr, station_, output_.wstring());
+    Station missing = station_;
+    missing.Port = kMissingPort;
+    // A worker that keeps talking while the user closes the dialog; it outlives the window, as
+    // the dialog's own thread does.
+    std::optional<CLVDownloadThread> talker;
+    const INT_PTR result = RunDialog(dialog, [&](DialogDriver& driver) {
+        const HWND window = driver.WaitForDialog();
+        ASSERT_NE(window, nullptr);
+        // What Enter in the instructions sends on Windows: the dialog must stay.
+        ::SendMessageW(window, WM_COMMAND, IDOK, 0);
+        EXPECT_TRUE(::IsWindow(window));
+        EXPECT_FALSE(dialog.TransferCompleted());
+        // The sent Cancel is handled before the posted texts, which are still queued when the
+        // window goes (and the one the dialog's loop takes right after EndDialog is dropped).
+        talker.emplace(window, missing, output_.wstring());
+        for (int text = 0; text < 10000; ++text)
+            talker->ShowMessage(1, L"line accepted");
+        ::SendMessageW(window, WM_COMMAND, IDCANCEL, 0);
+    });
+    EXPECT_EQ(result, IDCANCEL);
+    talker.reset();
+    EXPECT_EQ(CLVDownloadThread::LiveMessageTexts(), 0) << "every text was freed";
 }
 
 TEST_F(DownloadDialog, ShowsGermanTextsInAGermanUi) {
