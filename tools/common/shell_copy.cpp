@@ -1,0 +1,134 @@
+// Copying a station's file out through the shell: parse, bind, list, data object, contents.
+#include "tools/common/shell_copy.h"
+
+#include <shlobj.h>
+#include <wrl/client.h>
+
+#include <chrono>
+#include <vector>
+
+#include "support/unique_resource.h"
+
+using Microsoft::WRL::ComPtr;
+
+namespace {
+
+const wchar_t kFolderPath[] =
+    L"::{20D04FE0-3AEA-1069-A2D8-08002B30309D}\\::{7D3F2A61-4B8E-4c19-9A27-5E0C81B6D4F3}";
+
+StationFileCopy Failed(const std::wstring& what, HRESULT code) {
+    StationFileCopy copy;
+    copy.result = StationFileCopy::kFailed;
+    copy.failure = what;
+    copy.code = code;
+    return copy;
+}
+
+CLIPFORMAT Format(const wchar_t* name) {
+    return static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(name));
+}
+
+}  // namespace
+
+StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring& folder) {
+    ComPtr<IShellFolder> desktop;
+    HRESULT result = ::SHGetDesktopFolder(&desktop);
+    if (FAILED(result))
+        return Failed(L"the desktop folder is not available", result);
+
+    std::wstring path = std::wstring(kFolderPath) + L"\\" + station;
+    UniqueCoTaskMem stationList;
+    result =
+        desktop->ParseDisplayName(nullptr, nullptr, path.data(), nullptr,
+                                  reinterpret_cast<PIDLIST_RELATIVE*>(stationList.put()), nullptr);
+    if (FAILED(result)) {
+        return Failed(L"\"Quorvel Digital Levels\" has no station \"" + station +
+                        L"\" (is the extension registered?)",
+                    result);
+    }
+    ComPtr<IShellFolder> stationFolder;
+    result = desktop->BindToObject(static_cast<PCUIDLIST_RELATIVE>(stationList.get()), nullptr,
+                                   IID_PPV_ARGS(&stationFolder));
+    if (FAILED(result))
+        return Failed(L"the station folder cannot be opened", result);
+
+    ComPtr<IEnumIDList> items;
+    result = stationFolder->EnumObjects(nullptr, SHCONTF_NONFOLDERS, &items);
+    if (result != S_OK)
+        return Failed(L"the station folder cannot be listed", result);
+    UniqueCoTaskMem file;
+    ULONG fetched = 0;
+    if (items->Next(1, reinterpret_cast<PITEMID_CHILD*>(file.put()), &fetched) != S_OK ||
+        fetched != 1) {
+        return Failed(L"the station folder shows no file", E_FAIL);
+    }
+
+    ComPtr<IDataObject> data;
+    PCUITEMID_CHILD child = static_cast<PCUITEMID_CHILD>(file.get());
+    result = stationFolder->GetUIObjectOf(nullptr, 1, &child, IID_IDataObject, nullptr, &data);
+    if (FAILED(result))
+        return Failed(L"the file cannot be copied", result);
+
+    FORMATETC descriptorFormat = {Format(CFSTR_FILEDESCRIPTORW), nullptr, DVASPECT_CONTENT, -1,
+                                  TYMED_HGLOBAL};
+    UniqueStgMedium descriptor;
+    result = data->GetData(&descriptorFormat, descriptor.put());
+    if (result != S_OK)
+        return Failed(L"the file has no name", result);
+    std::wstring name;
+    {
+        GlobalLockGuard lock(descriptor.get().hGlobal);
+        if (lock.size() < sizeof(FILEGROUPDESCRIPTORW))
+            return Failed(L"bad file descriptor", E_FAIL);
+        const auto* group = static_cast<const FILEGROUPDESCRIPTORW*>(lock.data());
+        name.assign(group->fgd[0].cFileName, wcsnlen(group->fgd[0].cFileName, MAX_PATH));
+    }
+    if (name.empty() || name.find_first_of(L"\\/:") != std::wstring::npos) {
+        return Failed(L"bad file name", E_FAIL);
+    }
+
+    const auto start = std::chrono::steady_clock::now();
+    FORMATETC contentsFormat = {Format(CFSTR_FILECONTENTS), nullptr, DVASPECT_CONTENT, 0,
+                                TYMED_ISTREAM};
+    UniqueStgMedium contents;
+    result = data->GetData(&contentsFormat, contents.put());
+    if (result == S_FALSE) {
+        StationFileCopy cancelled;
+        cancelled.result = StationFileCopy::kCancelled;
+        return cancelled;
+    }
+    if (result != S_OK || contents.get().tymed != TYMED_ISTREAM) {
+        return Failed(L"the download failed", result);
+    }
+
+    const std::wstring target = folder + L"\\" + name;
+    UniqueFileHandle out(::CreateFileW(target.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS,
+                                       FILE_ATTRIBUTE_NORMAL, nullptr));
+    if (!out)
+        return Failed(L"cannot write " + target, HRESULT_FROM_WIN32(::GetLastError()));
+    // Read to the end, as the shell does: the stream removes its temporary file at the end.
+    std::vector<char> buffer(4096);
+    ULONGLONG total = 0;
+    for (;;) {
+        ULONG got = 0;
+        result = contents.get().pstm->Read(buffer.data(), static_cast<ULONG>(buffer.size()), &got);
+        if (result != S_OK)
+            return Failed(L"reading the downloaded data failed", result);
+        if (got == 0)
+            break;
+        DWORD written = 0;
+        if (!::WriteFile(out.get(), buffer.data(), got, &written, nullptr) || written != got) {
+            return Failed(L"cannot write " + target, HRESULT_FROM_WIN32(::GetLastError()));
+        }
+        total += got;
+        if (got < buffer.size())
+            break;
+    }
+    StationFileCopy copied;
+    copied.result = StationFileCopy::kCopied;
+    copied.target = target;
+    copied.bytes = total;
+    copied.seconds =
+        std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
+    return copied;
+}
