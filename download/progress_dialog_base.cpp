@@ -2,7 +2,7 @@
 #include "download/progress_dialog_base.h"
 
 #include "res/resource.h"
-#include "stations/station_store.h"
+#include "stations/station_models.h"
 #include "support/text_lookup.h"
 
 CProgressDialogBase::CProgressDialogBase(HWND parent, const Station& station,

@@ -4,17 +4,9 @@
 #include <string>
 #include <vector>
 
-#include "res/resource.h"
+#include "stations/station_models.h"
 #include "stations/station_store.h"
 #include "support/error_handling.h"
-#include "support/registry_value.h"
-#include "support/unique_resource.h"
-
-namespace {
-
-constexpr DWORD kMaximumNameBytes = 520;
-
-}  // namespace
 
 HRESULT CLVEnumIDList::Next(ULONG count, PITEMID_CHILD* items, ULONG* fetched) {
     std::lock_guard<std::mutex> guard(lock_);
@@ -47,9 +39,9 @@ HRESULT CLVEnumIDList::Fill(const wchar_t* folderPath, SHCONTF flags) noexcept {
             // A station that is gone still shows a file: its download then finds no station.
             Station station;
             station.Name = components[1];
-            const bool hvrModel =
-                FindStation(station) == S_OK && IsExternalLibraryModel(station.Model);
-            const wchar_t* fileName = hvrModel ? L"file1.hvr" : L"file1.lv";
+            const std::wstring fileName = FindStation(station) == S_OK
+                                              ? StationFileName(station.Model)
+                                              : StationFileName(std::wstring());
             const std::vector<uint8_t> name = ItemNameBytes(fileName);
             LPITEMIDLIST item =
                 manager_.CreateItem(PT_FILE, name.data(), static_cast<UINT>(name.size()));
@@ -64,28 +56,8 @@ HRESULT CLVEnumIDList::Fill(const wchar_t* folderPath, SHCONTF flags) noexcept {
 
 HRESULT CLVEnumIDList::AddStations(const std::wstring& rootName) noexcept {
     try {
-        UniqueRegKey stations;
-        // A store that cannot be opened lists no station, silently.
-        if (::RegCreateKeyExW(HKEY_CURRENT_USER, StationsKeyPath().c_str(), 0, nullptr,
-                              REG_OPTION_NON_VOLATILE, KEY_ALL_ACCESS, nullptr, stations.put(),
-                              nullptr) != ERROR_SUCCESS) {
-            return S_OK;
-        }
-        for (DWORD index = 0;; ++index) {
-            wchar_t keyName[256] = {};
-            DWORD keyNameLength = ARRAYSIZE(keyName);
-            if (::RegEnumKeyExW(stations.get(), index, keyName, &keyNameLength, nullptr, nullptr,
-                                nullptr, nullptr) != ERROR_SUCCESS) {
-                break;
-            }
-            UniqueRegKey station;
-            if (::RegOpenKeyExW(stations.get(), keyName, 0, KEY_READ, station.put()) !=
-                ERROR_SUCCESS) {
-                continue;
-            }
-            std::wstring name;
-            if (ReadStringValue(station.get(), L"Name", kMaximumNameBytes, name) != ERROR_SUCCESS)
-                continue;
+        // A store that cannot be read lists no station, silently.
+        for (const std::wstring& name : ListStationNames()) {
             const std::wstring itemPath = rootName + L"\\" + name;
             LPITEMIDLIST item = manager_.CreateItemPidl(itemPath.c_str());
             if (item && !AddToEnumList(item))

@@ -5,7 +5,7 @@
 #include <windows.h>
 #include <shlobj.h>
 
-#include "namespace/pending_shell_objects.h"
+#include "namespace/pending_shell_object.h"
 #include "namespace/quorvel_shell_folder_base.h"
 #include "support/com_object.h"
 #include "support/error_handling.h"

@@ -6,8 +6,8 @@
 #include "namespace/lv_enum_id_list.h"
 #include "namespace/lv_extract_icon.h"
 #include "namespace/lv_query_info.h"
-#include "namespace/lv_shell_folder.h"
 #include "res/registry/ids_registry.h"
+#include "server/lv_shell_folder.h"
 #include "view/lv_data_object.h"
 
 namespace {

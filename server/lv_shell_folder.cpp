@@ -1,5 +1,5 @@
 // The namespace's folder: its interfaces and its class identifier.
-#include "namespace/lv_shell_folder.h"
+#include "server/lv_shell_folder.h"
 
 HRESULT CLVShellFolder::QueryInterface(REFIID iid, void** object) {
     static const QITAB table[] = {

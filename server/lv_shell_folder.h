@@ -1,4 +1,5 @@
-// The namespace's folder: the root folder that the shell creates, and each station folder.
+// The namespace's folder, composed here from the folder framework and the classes of every layer
+// below: the root folder that the shell creates, and each station folder.
 #pragma once
 
 #include <windows.h>
@@ -8,9 +9,10 @@
 #include "namespace/lv_enum_id_list.h"
 #include "namespace/lv_extract_icon.h"
 #include "namespace/lv_query_info.h"
-#include "namespace/pending_shell_objects.h"
 #include "namespace/quorvel_shell_folder_impl.h"
 #include "support/com_object.h"
+#include "view/lv_data_object.h"
+#include "view/pending_view_objects.h"
 
 // {7D3F2A61-4B8E-4C19-9A27-5E0C81B6D4F3}
 inline constexpr CLSID CLSID_LVShellFolder = {

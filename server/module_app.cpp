@@ -3,7 +3,7 @@
 
 #include "namespace/icon_lists.h"
 #include "server/class_table.h"
-#include "stations/station_store.h"
+#include "stations/display_settings.h"
 #include "support/registered_messages.h"
 
 namespace {

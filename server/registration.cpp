@@ -3,7 +3,7 @@
 
 #include <cwchar>
 
-#include "namespace/lv_shell_folder.h"
+#include "server/lv_shell_folder.h"
 #include "server/class_table.h"
 #include "server/registrar.h"
 #include "support/error_handling.h"

@@ -1,19 +1,21 @@
 // The station store: every call opens its own keys under HKEY_CURRENT_USER; nothing is cached.
+// Operations that try many names or key numbers read the store once per call and decide on
+// that one reading, so that they stay linear in the number of stations.
 #include "stations/station_store.h"
 
 #include <algorithm>
-#include <cstring>
 #include <cwchar>
+#include <memory>
 #include <string_view>
+#include <unordered_set>
 
-#include "stations/portable/station_list_format.h"
-#include "namespace/portable/item_id_layout.h"
+#include "res/resource.h"
 #include "stations/portable/station_names.h"
+#include "stations/serial_ports.h"
+#include "stations/station_models.h"
 #include "support/registry_value.h"
 #include "support/text_lookup.h"
 #include "support/unique_resource.h"
-
-int g_displayColumnWidths[2] = {100, 100};
 
 namespace {
 
@@ -64,10 +66,31 @@ bool VisitStationKeys(HKEY stations, REGSAM access, Visit&& visit) {
     }
 }
 
-bool IsStationNameTaken(const std::wstring& name) {
-    Station probe;
-    probe.Name = name;
-    return FindStation(probe) == S_OK;
+// Registry key names compare without regard to case.
+std::wstring KeyNameFolded(std::wstring name) {
+    if (!name.empty())
+        ::CharLowerBuffW(name.data(), static_cast<DWORD>(name.size()));
+    return name;
+}
+
+std::unordered_set<std::wstring> SubkeyNamesFolded(HKEY stations) {
+    std::unordered_set<std::wstring> names;
+    for (DWORD index = 0;; ++index) {
+        wchar_t subkeyName[kKeyNameCapacity];
+        DWORD length = kKeyNameCapacity;
+        if (::RegEnumKeyExW(stations, index, subkeyName, &length, nullptr, nullptr, nullptr,
+                            nullptr) != ERROR_SUCCESS) {
+            return names;
+        }
+        names.insert(KeyNameFolded(std::wstring(subkeyName, length)));
+    }
+}
+
+// Whether a name is taken, by one reading of the store made when the predicate is built.
+NameTakenPredicate TakenInStore() {
+    const std::vector<std::wstring> stored = ListStationNames();
+    auto taken = std::make_shared<std::unordered_set<std::wstring>>(stored.begin(), stored.end());
+    return [taken](const WideString& name) { return taken->count(name) != 0; };
 }
 
 }  // namespace
@@ -82,7 +105,7 @@ std::wstring StationsKeyPath() {
 
 Station DefaultStation() {
     Station station;
-    station.Model = LoadUiText(IDS_MODEL_LV10);
+    station.Model = FirstModelText();
     return station;
 }
 
@@ -118,10 +141,15 @@ HRESULT AddStation(const Station& station) {
     if (!stations)
         return E_FAIL;
 
-    // The lowest free "Station %d" is taken, so a deleted station's number is reused.
+    // The lowest free "Station %d" is taken, so a deleted station's number is reused. Numbers
+    // whose key exists are passed over on one reading of the key names; a key that appears in
+    // between is not overwritten, as creation tells whether it was new.
+    const std::unordered_set<std::wstring> existingKeys = SubkeyNamesFolded(stations.get());
     for (unsigned index = 0;; ++index) {
         wchar_t subkeyName[32];
         swprintf(subkeyName, ARRAYSIZE(subkeyName), L"Station %u", index);
+        if (existingKeys.count(KeyNameFolded(subkeyName)) != 0)
+            continue;
         UniqueRegKey subkey;
         DWORD disposition = 0;
         const LONG status =
@@ -191,11 +219,10 @@ LONG LoadStationValues(Station& station, HKEY stationKey) {
     status = ReadText(stationKey, L"Port", station.Port);
     if (status != ERROR_SUCCESS)
         return status;
-    std::vector<std::wstring> ports;
-    if (EnumerateSerialPorts(ports) > 0 &&
-        std::find(ports.begin(), ports.end(), station.Port) == ports.end()) {
+    // A port the computer no longer has becomes its first one; with no list, it stays.
+    const std::vector<std::wstring> ports = ListSerialPorts();
+    if (!ports.empty() && std::find(ports.begin(), ports.end(), station.Port) == ports.end())
         station.Port = ports.front();
-    }
 
     for (auto [name, field] :
          {std::pair{L"StopBits", &station.StopBits}, std::pair{L"BaudRate", &station.BaudRate},
@@ -213,10 +240,7 @@ LONG LoadStationValues(Station& station, HKEY stationKey) {
     status = ReadText(stationKey, L"Model", station.Model);
     if (status != ERROR_SUCCESS)
         return status;
-    if (station.Model != LoadUiText(IDS_MODEL_LV20) &&
-        station.Model != LoadUiText(IDS_MODEL_LV30)) {
-        station.Model = LoadUiText(IDS_MODEL_LV10);
-    }
+    station.Model = KnownModelOrFirst(station.Model);
 
     status = ReadText(stationKey, L"Software", station.Software);
     if (status != ERROR_SUCCESS)
@@ -245,10 +269,6 @@ void SaveStationValues(const Station& station, HKEY stationKey) {
            WriteDwordValue(stationKey, L"CheckSum", station.CheckSum) == ERROR_SUCCESS);
 }
 
-std::wstring MakeUniqueStationName(const std::wstring& base) {
-    return MakeUniqueName(base, IsStationNameTaken);
-}
-
 std::vector<std::wstring> ListStationNames() {
     std::vector<std::wstring> names;
     UniqueRegKey stations;
@@ -264,117 +284,10 @@ std::vector<std::wstring> ListStationNames() {
     return names;
 }
 
+std::wstring MakeUniqueStationName(const std::wstring& base) {
+    return MakeUniqueName(base, TakenInStore());
+}
+
 std::wstring MakePastedStationName(const std::wstring& name) {
-    return MakePastedName(name, LoadUiText(IDS_COPY_OF), IsStationNameTaken);
-}
-
-size_t EnumerateSerialPorts(std::vector<std::wstring>& ports) {
-    ports.clear();
-    UniqueRegKey key;
-    if (::RegOpenKeyExW(HKEY_LOCAL_MACHINE, L"HARDWARE\\DEVICEMAP\\SERIALCOMM", 0, KEY_READ,
-                        key.put()) != ERROR_SUCCESS) {
-        return 0;
-    }
-    for (DWORD index = 0;; ++index) {
-        wchar_t valueName[64] = {};
-        wchar_t data[64] = {};  // 128 bytes
-        DWORD nameLength = ARRAYSIZE(valueName);
-        DWORD dataBytes = sizeof(data);
-        DWORD type = 0;
-        if (::RegEnumValueW(key.get(), index, valueName, &nameLength, nullptr, &type,
-                            reinterpret_cast<BYTE*>(data), &dataBytes) != ERROR_SUCCESS ||
-            type != REG_SZ) {
-            break;
-        }
-        ports.emplace_back(data, BoundedLength(data, dataBytes / sizeof(wchar_t)));
-    }
-    return ports.size();
-}
-
-HGLOBAL SerializeStationList(const std::vector<Station>& stations) {
-    try {
-        const std::vector<uint8_t> bytes = SerializeStationRecords(stations);
-        UniqueHGlobal block(
-            ::GlobalAlloc(GMEM_MOVEABLE | GMEM_ZEROINIT | GMEM_SHARE, bytes.size()));
-        if (!block)
-            return nullptr;
-        {
-            GlobalLockGuard lock(block.get());
-            if (!lock.data())
-                return nullptr;
-            memcpy(lock.data(), bytes.data(), bytes.size());
-        }
-        return block.release();
-    } catch (...) {
-        return nullptr;  // out of memory: the caller sees no block
-    }
-}
-
-HRESULT ParseStationList(HGLOBAL block, std::vector<Station>& stations) {
-    GlobalLockGuard lock(block);
-    try {
-        stations = ParseStationRecords(static_cast<const uint8_t*>(lock.data()), lock.size());
-    } catch (...) {
-        // Out of memory while decoding: keep the result contract and report an empty list.
-        stations.clear();
-    }
-    return S_OK;
-}
-
-bool LoadDisplaySettings() {
-    g_displayColumnWidths[0] = 100;
-    g_displayColumnWidths[1] = 100;
-    UniqueRegKey root;
-    if (::RegOpenKeyExW(HKEY_CURRENT_USER, StationRootKeyPath().c_str(), 0, KEY_READ, root.put()) !=
-        ERROR_SUCCESS) {
-        return false;
-    }
-    BYTE data[16] = {};
-    DWORD size = sizeof(data);
-    DWORD type = REG_NONE;
-    // A value too short, too long for the buffer, or not binary at all is not ours to read:
-    // text read as widths would give columns millions of pixels wide.
-    if (::RegQueryValueExW(root.get(), L"Display Settings", nullptr, &type, data, &size) !=
-            ERROR_SUCCESS ||
-        type != REG_BINARY || size < 8) {
-        return false;
-    }
-    memcpy(&g_displayColumnWidths[0], data, 4);
-    memcpy(&g_displayColumnWidths[1], data + 4, 4);
-    return true;
-}
-
-bool SaveDisplaySettings() {
-    UniqueRegKey root;
-    if (::RegCreateKeyExW(HKEY_CURRENT_USER, StationRootKeyPath().c_str(), 0, nullptr,
-                          REG_OPTION_NON_VOLATILE, KEY_ALL_ACCESS, nullptr, root.put(),
-                          nullptr) != ERROR_SUCCESS) {
-        return false;
-    }
-    BYTE data[12] = {};  // the last four bytes carry nothing
-    memcpy(data, &g_displayColumnWidths[0], 4);
-    memcpy(data + 4, &g_displayColumnWidths[1], 4);
-    return ::RegSetValueExW(root.get(), L"Display Settings", 0, REG_BINARY, data, sizeof(data)) ==
-           ERROR_SUCCESS;
-}
-
-std::wstring ModelInstructionText(const std::wstring& model) {
-    if (model == LoadUiText(IDS_MODEL_LV20))
-        return LoadUiText(IDS_INSTRUCTIONS_LV20);
-    if (model == LoadUiText(IDS_MODEL_LV30))
-        return LoadUiText(IDS_INSTRUCTIONS_LV30);
-    return LoadUiText(IDS_INSTRUCTIONS_LV10);
-}
-
-bool IsExternalLibraryModel(const std::wstring& model) {
-    return model == LoadUiText(IDS_MODEL_LV20) || model == LoadUiText(IDS_MODEL_LV30);
-}
-
-std::wstring StationNameFromPath(const std::wstring& path) {
-    const std::vector<std::wstring> components = SplitPathComponents(path);
-    return components.size() > 1 ? components[1] : std::wstring();
-}
-
-std::wstring StationFileName(const std::wstring& model) {
-    return IsExternalLibraryModel(model) ? L"file1.hvr" : L"file1.lv";
+    return MakePastedName(name, LoadUiText(IDS_COPY_OF), TakenInStore());
 }

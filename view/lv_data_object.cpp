@@ -8,6 +8,8 @@
 
 #include "download/download_progress_dialog.h"
 #include "download/halvek_download_progress_dialog.h"
+#include "stations/station_list_block.h"
+#include "stations/station_models.h"
 #include "stations/station_store.h"
 #include "support/error_handling.h"
 #include "support/unique_resource.h"
@@ -72,6 +74,35 @@ std::wstring ItemPath(const CPidlMgr& manager, LPCITEMIDLIST list) {
     if (!path.empty() && path.back() == L'\\')
         path.pop_back();
     return path;
+}
+
+// The result for a failed call that set the thread's last error; never a success code, even
+// when the call forgot to set one.
+HRESULT LastErrorResult() noexcept {
+    const DWORD error = ::GetLastError();
+    return error != ERROR_SUCCESS ? HRESULT_FROM_WIN32(error) : E_FAIL;
+}
+
+// A unique "QRV" name in the user's temporary folder, without extension, where no file is: the
+// download writes the file itself.
+HRESULT MakeDownloadTarget(std::wstring& target) {
+    wchar_t directory[130];
+    const DWORD length = ::GetTempPathW(ARRAYSIZE(directory), directory);
+    // Failures are made into HRESULTs: a bare Win32 code would pass for success.
+    if (length == 0)
+        LV_LOG_AND_RETURN(LastErrorResult());
+    if (length >= ARRAYSIZE(directory))
+        LV_LOG_AND_RETURN(HRESULT_FROM_WIN32(ERROR_BUFFER_OVERFLOW));
+    wchar_t temporary[MAX_PATH];
+    if (::GetTempFileNameW(directory, L"QRV", 0, temporary) == 0)
+        LV_LOG_AND_RETURN(LastErrorResult());
+    // Only the unique name is wanted, so the placeholder goes and the name loses its extension.
+    (void)::DeleteFileW(temporary);  // a placeholder left behind is empty and harmless
+    target = temporary;
+    const size_t dot = target.rfind(L'.');
+    if (dot != std::wstring::npos && target.find(L'\\', dot) == std::wstring::npos)
+        target.erase(dot);
+    return S_OK;
 }
 
 }  // namespace
@@ -182,42 +213,37 @@ HRESULT CLVDataObject::GetFileContents(LONG index, STGMEDIUM* medium) {
         return loaded;
 
     // A fresh temporary name for every request: asking twice downloads twice.
-    wchar_t directory[130];
-    const DWORD length = ::GetTempPathW(ARRAYSIZE(directory), directory);
-    if (length == 0 || length >= ARRAYSIZE(directory)) {
-        return static_cast<HRESULT>(length == 0 ? ::GetLastError() : ERROR_BUFFER_OVERFLOW);
-    }
-    wchar_t temporary[MAX_PATH];
-    if (::GetTempFileNameW(directory, L"QRV", 0, temporary) == 0) {
-        return static_cast<HRESULT>(::GetLastError());
-    }
-    // Only the unique name is wanted: the download writes the file (the external library adds
-    // ".txt" of its own), so the placeholder goes and the name loses its extension.
-    (void)::DeleteFileW(temporary);
-    std::wstring target = temporary;
-    const size_t dot = target.rfind(L'.');
-    if (dot != std::wstring::npos && target.find(L'\\', dot) == std::wstring::npos) {
-        target.erase(dot);
-    }
+    std::wstring target;
+    RETURN_IF_FAILED(MakeDownloadTarget(target));
 
     const bool external = IsExternalLibraryModel(station.Model);
+    // The library writes its file under the given name with ".txt" added.
+    const std::wstring file = external ? target + L".txt" : target;
     // The caller's active window, if any, owns the dialog so that it stays in front of it.
     const HWND owner = ::GetActiveWindow();
-    INT_PTR answer = IDCANCEL;
+    INT_PTR answer = -1;
+    bool completed = false;
     if (external) {
         CHalvekDownloadProgressDialog dialog(owner, station, target);
         answer = dialog.DoModal();
+        completed = dialog.TransferCompleted();
     } else {
         CDownloadProgressDialog dialog(owner, station, target);
         answer = dialog.DoModal();
+        completed = dialog.TransferCompleted();
     }
-    if (answer == IDCANCEL)
+    // The dialogs are gone, and with them the download thread: nothing writes the file now.
+    // Only a transfer that reported its end makes a file; an IDOK from anywhere else, a cancel
+    // or a dialog that could not run leaves at most a partial file, which goes.
+    if (answer != IDOK || !completed) {
+        (void)::DeleteFileW(file.c_str());  // usually there is none: nothing to report
+        if (answer == -1)
+            LV_LOG_AND_RETURN(E_FAIL);
         return S_FALSE;
+    }
 
-    if (external)
-        target += L".txt";
     auto stream = MakeComObject<CStream2>();
-    RETURN_IF_FAILED(stream->Bind(target, true));
+    RETURN_IF_FAILED(stream->Bind(file, true));
     medium->tymed = TYMED_ISTREAM;
     medium->pstm = stream.Detach();
     medium->pUnkForRelease = nullptr;
@@ -289,12 +315,16 @@ IFACEMETHODIMP CLVDataObject::QueryGetData(FORMATETC* format) {
     return S_FALSE;
 }
 
-IFACEMETHODIMP CLVDataObject::SetData(FORMATETC* format, STGMEDIUM*, BOOL) {
-    // Nothing is stored and the medium stays the caller's: the object only offers data.
+IFACEMETHODIMP CLVDataObject::SetData(FORMATETC* format, STGMEDIUM* medium, BOOL release) {
+    // Nothing is stored: the object only offers data. The shell tells it "Performed DropEffect"
+    // and "Paste Succeeded" on every paste and hands the medium over with release set; keeping
+    // it would leak one block a paste, so it is released as the contract asks.
     if (format) {
         wchar_t name[260];
         (void)::GetClipboardFormatNameW(format->cfFormat, name, ARRAYSIZE(name));
     }
+    if (release && medium)
+        ::ReleaseStgMedium(medium);
     return S_OK;
 }
 

@@ -1,6 +1,11 @@
 // The read-once file stream behind "FileContents".
 #include "view/stream2.h"
 
+#include <cstring>
+#include <cwchar>
+
+#include "support/error_handling.h"
+
 namespace {
 
 HANDLE OpenForReading(const std::wstring& path) {
@@ -8,7 +13,21 @@ HANDLE OpenForReading(const std::wstring& path) {
                          FILE_ATTRIBUTE_NORMAL, nullptr);
 }
 
+// Never a success code, even when the failed call left no last error.
+HRESULT LastErrorResult() noexcept {
+    const DWORD error = ::GetLastError();
+    return error != ERROR_SUCCESS ? HRESULT_FROM_WIN32(error) : E_FAIL;
+}
+
 }  // namespace
+
+CStream2::~CStream2() {
+    file_.reset();
+    // A reader that lets go before the end (a cancelled copy, a failed write) will never read
+    // the rest: the temporary download goes now rather than stay in the user's temporary folder.
+    if (deleteWhenFinished_ && state_ != kFinished && !path_.empty())
+        (void)::DeleteFileW(path_.c_str());  // nothing to tell anyone from a destructor
+}
 
 HRESULT CStream2::Bind(const std::wstring& path, bool deleteWhenFinished) {
     path_ = path;
@@ -33,16 +52,15 @@ IFACEMETHODIMP CStream2::Read(void* buffer, ULONG wanted, ULONG* got) {
         *got = 0;
     if (state_ == kNotOpened) {
         file_.reset(OpenForReading(path_));
-        // Readers of this stream have always received the bare Win32 code here.
+        // As an HRESULT: the bare Win32 code (2 for a vanished file) would read as success.
         if (!file_)
-            return static_cast<HRESULT>(::GetLastError());
+            return LastErrorResult();
         state_ = kReading;
     }
     if (state_ != kReading)
         return S_OK;
-    if (!::ReadFile(file_.get(), buffer, wanted, &read, nullptr)) {
-        return static_cast<HRESULT>(::GetLastError());
-    }
+    if (!::ReadFile(file_.get(), buffer, wanted, &read, nullptr))
+        return LastErrorResult();
     if (got)
         *got = read;
     if (read == wanted)
@@ -56,9 +74,22 @@ IFACEMETHODIMP CStream2::Read(void* buffer, ULONG wanted, ULONG* got) {
     return S_OK;
 }
 
-IFACEMETHODIMP CStream2::Stat(STATSTG* statistics, DWORD) {
+IFACEMETHODIMP CStream2::Stat(STATSTG* statistics, DWORD flags) {
     if (!statistics)
         return E_POINTER;
+    // The whole record: a caller may free pwcsName whenever it did not pass STATFLAG_NONAME.
+    *statistics = {};
+    statistics->type = STGTY_STREAM;
     statistics->cbSize.QuadPart = size_;
+    statistics->grfMode = STGM_READ | STGM_SHARE_DENY_WRITE;
+    if ((flags & STATFLAG_NONAME) != 0)
+        return S_OK;
+    // The file's own name, without its folder: a copy the caller frees with CoTaskMemFree.
+    const size_t slash = path_.find_last_of(L'\\');
+    const wchar_t* name = path_.c_str() + (slash == std::wstring::npos ? 0 : slash + 1);
+    const size_t bytes = (wcslen(name) + 1) * sizeof(wchar_t);
+    statistics->pwcsName = static_cast<LPOLESTR>(::CoTaskMemAlloc(bytes));
+    RETURN_IF_NULL_ALLOC(statistics->pwcsName);
+    memcpy(statistics->pwcsName, name, bytes);
     return S_OK;
 }

@@ -12,6 +12,8 @@
 class CStream2 final : public ComObject<IStream> {
 public:
     CStream2() = default;
+    // Deletes the file when asked to at binding and it was not read to the end.
+    ~CStream2() override;
 
     // Keeps the path and takes the file's size now (0 when it cannot be opened); the file itself
     // is opened at the first Read. Always succeeds.
@@ -19,8 +21,8 @@ public:
 
     IFACEMETHODIMP QueryInterface(REFIID iid, void** object) override;
 
-    // A short read is the end: the file is closed and, if asked, deleted. Failures give the raw
-    // Win32 error code as the result.
+    // A short read is the end: the file is closed and, if asked, deleted. Failures give the
+    // Win32 error as an HRESULT.
     IFACEMETHODIMP Read(void* buffer, ULONG wanted, ULONG* got) override;
     IFACEMETHODIMP Write(const void*, ULONG, ULONG*) override { return E_NOTIMPL; }
     // The stream only goes forward: seeking is accepted and does nothing.
@@ -35,7 +37,7 @@ public:
     IFACEMETHODIMP UnlockRegion(ULARGE_INTEGER, ULARGE_INTEGER, DWORD) override {
         return E_NOTIMPL;
     }
-    // Only the size, as taken at binding, whatever the flags.
+    // A stream of the size taken at binding; its file name only when the flags ask for a name.
     IFACEMETHODIMP Stat(STATSTG* statistics, DWORD flags) override;
     IFACEMETHODIMP Clone(IStream**) override { return E_NOTIMPL; }
 

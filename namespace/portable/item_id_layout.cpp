@@ -120,3 +120,8 @@ int32_t ScaleComparison(int32_t order, int32_t sign) noexcept {
         return order;
     return static_cast<int32_t>(static_cast<uint32_t>(order) * static_cast<uint32_t>(sign));
 }
+
+WideString StationNameFromPath(WideStringView path) {
+    const std::vector<WideString> components = SplitPathComponents(path);
+    return components.size() > 1 ? components[1] : WideString();
+}

@@ -66,6 +66,10 @@ std::vector<uint8_t> ItemNameBytes(WideStringView name);
 // The non-empty components of a path split at "\".
 std::vector<WideString> SplitPathComponents(WideStringView path);
 
+// The station's name in a namespace path: its second non-empty component, after the root's
+// name; empty when the path names no station.
+WideString StationNameFromPath(WideStringView path);
+
 // The display path of a list: its names joined by "\". Without a buffer, the capacity a caller
 // needs; with one, the text (appends bounded by the capacity) and its counted length.
 size_t BuildListPath(const uint8_t* list, WideChar* buffer, size_t capacity);

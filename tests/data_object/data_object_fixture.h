@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "namespace/pidl_manager.h"
+#include "stations/station_list_block.h"
 #include "stations/station_store.h"
 #include "support/module_lock.h"
 #include "support/unique_resource.h"

@@ -11,7 +11,7 @@
 #include <string>
 #include <vector>
 
-#include "namespace/lv_shell_folder.h"
+#include "server/lv_shell_folder.h"
 #include "namespace/pidl_manager.h"
 #include "res/resource.h"
 #include "stations/station_store.h"

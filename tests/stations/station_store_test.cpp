@@ -6,6 +6,10 @@
 #include <algorithm>
 #include <vector>
 
+#include "stations/display_settings.h"
+#include "stations/serial_ports.h"
+#include "stations/station_list_block.h"
+#include "stations/station_models.h"
 #include "stations/station_store.h"
 #include "support/registry_value.h"
 #include "support/unique_resource.h"
@@ -173,9 +177,7 @@ TEST_F(StationStore, PortFallsBackToTheFirstListedPort) {
     EXPECT_EQ(L"COM9", found.Port);
 
     registry_.SetSerialPorts({L"COM3", L"COM4"});
-    std::vector<std::wstring> ports;
-    EXPECT_EQ(2u, EnumerateSerialPorts(ports));
-    EXPECT_EQ((std::vector<std::wstring>{L"COM3", L"COM4"}), ports);
+    EXPECT_EQ((std::vector<std::wstring>{L"COM3", L"COM4"}), ListSerialPorts());
     ASSERT_EQ(S_OK, FindStation(found));
     EXPECT_EQ(L"COM3", found.Port);
 }
@@ -261,11 +263,9 @@ TEST_F(StationStore, SerialPortListStopsAtTheFirstNonTextValue) {
                                              0, KEY_ALL_ACCESS, key.put()));
     ASSERT_EQ(ERROR_SUCCESS, WriteDwordValue(key.get(), L"\\Device\\Serial5", 5));
     ASSERT_EQ(ERROR_SUCCESS, WriteStringValue(key.get(), L"\\Device\\Serial9", L"COM9"));
-    std::vector<std::wstring> ports;
     // COM9 comes after the DWORD value both in the order of writing (Windows) and in the order
     // of names (Wine).
-    EXPECT_EQ(1u, EnumerateSerialPorts(ports));
-    EXPECT_EQ(std::vector<std::wstring>{L"COM3"}, ports);
+    EXPECT_EQ(std::vector<std::wstring>{L"COM3"}, ListSerialPorts());
 }
 
 TEST_F(StationStore, StationListBlockRoundTripsAndIsBoundByItsRealSize) {
@@ -291,12 +291,12 @@ TEST_F(StationStore, StationListBlockRoundTripsAndIsBoundByItsRealSize) {
 }
 
 TEST_F(StationStore, DisplaySettingsAreTwelveBinaryBytesAndOnlyAValidValueIsRead) {
-    g_displayColumnWidths[0] = 5;
+    SetDisplayColumnWidth(0, 5);
     EXPECT_FALSE(LoadDisplaySettings());
-    EXPECT_EQ(100, g_displayColumnWidths[0]);
-    EXPECT_EQ(100, g_displayColumnWidths[1]);
-    g_displayColumnWidths[0] = 240;
-    g_displayColumnWidths[1] = 0x1234;
+    EXPECT_EQ(100, DisplayColumnWidth(0));
+    EXPECT_EQ(100, DisplayColumnWidth(1));
+    SetDisplayColumnWidth(0, 240);
+    SetDisplayColumnWidth(1, 0x1234);
     ASSERT_TRUE(SaveDisplaySettings());
     UniqueRegKey root;
     ASSERT_EQ(ERROR_SUCCESS, ::RegOpenKeyExW(HKEY_CURRENT_USER, StationRootKeyPath().c_str(), 0,
@@ -308,10 +308,11 @@ TEST_F(StationStore, DisplaySettingsAreTwelveBinaryBytesAndOnlyAValidValueIsRead
     EXPECT_EQ(static_cast<DWORD>(REG_BINARY), type);
     const std::vector<BYTE> expected = {240, 0, 0, 0, 0x34, 0x12, 0, 0, 0, 0, 0, 0};
     EXPECT_EQ(expected, std::vector<BYTE>(data, data + size));
-    g_displayColumnWidths[0] = g_displayColumnWidths[1] = 0;
+    SetDisplayColumnWidth(0, 0);
+    SetDisplayColumnWidth(1, 0);
     EXPECT_TRUE(LoadDisplaySettings());
-    EXPECT_EQ(240, g_displayColumnWidths[0]);
-    EXPECT_EQ(0x1234, g_displayColumnWidths[1]);
+    EXPECT_EQ(240, DisplayColumnWidth(0));
+    EXPECT_EQ(0x1234, DisplayColumnWidth(1));
 
     // Values that are not the module's own leave both widths at 100.
     const BYTE eight[8] = {50, 0, 0, 0, 60, 0, 0, 0};
@@ -330,27 +331,27 @@ TEST_F(StationStore, DisplaySettingsAreTwelveBinaryBytesAndOnlyAValidValueIsRead
     for (const Case& test : cases) {
         ASSERT_EQ(ERROR_SUCCESS, ::RegSetValueExW(root.get(), L"Display Settings", 0, test.type,
                                                   test.bytes, test.size));
-        g_displayColumnWidths[0] = g_displayColumnWidths[1] = 0;
+        SetDisplayColumnWidth(0, 0);
+        SetDisplayColumnWidth(1, 0);
         EXPECT_FALSE(LoadDisplaySettings()) << test.what;
-        EXPECT_EQ(100, g_displayColumnWidths[0]) << test.what;
-        EXPECT_EQ(100, g_displayColumnWidths[1]) << test.what;
+        EXPECT_EQ(100, DisplayColumnWidth(0)) << test.what;
+        EXPECT_EQ(100, DisplayColumnWidth(1)) << test.what;
     }
     // Exactly eight binary bytes are enough.
     ASSERT_EQ(ERROR_SUCCESS, ::RegSetValueExW(root.get(), L"Display Settings", 0, REG_BINARY,
                                               eight, sizeof eight));
     EXPECT_TRUE(LoadDisplaySettings());
-    EXPECT_EQ(50, g_displayColumnWidths[0]);
-    EXPECT_EQ(60, g_displayColumnWidths[1]);
+    EXPECT_EQ(50, DisplayColumnWidth(0));
+    EXPECT_EQ(60, DisplayColumnWidth(1));
 }
 
-TEST_F(StationStore, InstructionTextsAndTheExternalLibraryFollowTheModel) {
-    const std::wstring lv10 = ModelInstructionText(L"Quorvel LV-10");
-    EXPECT_EQ(0u, lv10.find(L"1. Push [SET] key and enter the set mode.\r\n2. Push [DOWN]"));
-    EXPECT_EQ(lv10, ModelInstructionText(L"anything else"));
-    EXPECT_EQ(
-        0u,
-        ModelInstructionText(L"Quorvel LV-30").find(L"1. Push 'Menu' key and select <Job>\r\n"));
-    EXPECT_EQ(ModelInstructionText(L"Quorvel LV-20"), ModelInstructionText(L"Quorvel LV-30"));
-    EXPECT_TRUE(IsExternalLibraryModel(L"Quorvel LV-30"));
-    EXPECT_FALSE(IsExternalLibraryModel(L"Quorvel LV-10"));
+TEST_F(StationStore, ModelRulesFollowTheStringTablesTexts) {
+    // The instructions are the string table's, whatever the model's case or spelling.
+    EXPECT_EQ(0u, ModelInstructionText(L"anything else")
+                      .find(L"1. Push [SET] key and enter the set mode.\r\n2. Push [DOWN]"));
+    EXPECT_EQ(0u, ModelInstructionText(L"Quorvel LV-30")
+                      .find(L"1. Push 'Menu' key and select <Job>\r\n"));
+    EXPECT_TRUE(IsExternalLibraryModel(L"Quorvel LV-20"));
+    EXPECT_FALSE(IsExternalLibraryModel(L"quorvel lv-20"));
+    EXPECT_EQ(L"file1.hvr", StationFileName(L"Quorvel LV-30"));
 }

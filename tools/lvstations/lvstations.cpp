@@ -5,6 +5,8 @@
 #include <string>
 #include <vector>
 
+#include "res/resource.h"
+#include "stations/serial_ports.h"
 #include "stations/station_store.h"
 #include "support/text_lookup.h"
 #include "support/unique_resource.h"
@@ -49,8 +51,8 @@ int List() {
 }
 
 int Ports() {
-    std::vector<std::wstring> ports;
-    if (EnumerateSerialPorts(ports) == 0)
+    const std::vector<std::wstring> ports = ListSerialPorts();
+    if (ports.empty())
         PrintUtf8(L"No serial ports.\n");
     for (const std::wstring& port : ports)
         PrintUtf8(port + L"\n");
@@ -60,8 +62,8 @@ int Ports() {
 int Add(int argc, wchar_t** argv) {
     Station station = DefaultStation();
     station.Name = argv[2];
-    std::vector<std::wstring> ports;
-    if (EnumerateSerialPorts(ports) > 0)
+    const std::vector<std::wstring> ports = ListSerialPorts();
+    if (!ports.empty())
         station.Port = ports.front();
     for (int i = 3; i + 1 < argc; i += 2) {
         const std::wstring option = argv[i];

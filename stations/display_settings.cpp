@@ -1,0 +1,68 @@
+// The view's column widths and their registry value.
+#include "stations/display_settings.h"
+
+#include <windows.h>
+
+#include <atomic>
+#include <cstring>
+
+#include "stations/station_store.h"
+#include "support/unique_resource.h"
+
+namespace {
+
+constexpr int kDefaultWidth = 100;
+std::atomic<int> g_widths[kDisplayColumnCount] = {kDefaultWidth, kDefaultWidth};
+
+}  // namespace
+
+int DisplayColumnWidth(size_t column) noexcept {
+    return column < kDisplayColumnCount ? g_widths[column].load() : 0;
+}
+
+void SetDisplayColumnWidth(size_t column, int width) noexcept {
+    if (column < kDisplayColumnCount)
+        g_widths[column] = width;
+}
+
+bool LoadDisplaySettings() {
+    for (std::atomic<int>& width : g_widths)
+        width = kDefaultWidth;
+    UniqueRegKey root;
+    if (::RegOpenKeyExW(HKEY_CURRENT_USER, StationRootKeyPath().c_str(), 0, KEY_READ, root.put()) !=
+        ERROR_SUCCESS) {
+        return false;
+    }
+    BYTE data[16] = {};
+    DWORD size = sizeof(data);
+    DWORD type = REG_NONE;
+    // A value too short, too long for the buffer, or not binary at all is not ours to read:
+    // text read as widths would give columns millions of pixels wide.
+    if (::RegQueryValueExW(root.get(), L"Display Settings", nullptr, &type, data, &size) !=
+            ERROR_SUCCESS ||
+        type != REG_BINARY || size < 8) {
+        return false;
+    }
+    for (size_t column = 0; column < kDisplayColumnCount; ++column) {
+        int32_t width = 0;
+        memcpy(&width, data + 4 * column, sizeof width);
+        g_widths[column] = width;
+    }
+    return true;
+}
+
+bool SaveDisplaySettings() {
+    UniqueRegKey root;
+    if (::RegCreateKeyExW(HKEY_CURRENT_USER, StationRootKeyPath().c_str(), 0, nullptr,
+                          REG_OPTION_NON_VOLATILE, KEY_ALL_ACCESS, nullptr, root.put(),
+                          nullptr) != ERROR_SUCCESS) {
+        return false;
+    }
+    BYTE data[12] = {};  // the last four bytes carry nothing
+    for (size_t column = 0; column < kDisplayColumnCount; ++column) {
+        const int32_t width = g_widths[column];
+        memcpy(data + 4 * column, &width, sizeof width);
+    }
+    return ::RegSetValueExW(root.get(), L"Display Settings", 0, REG_BINARY, data, sizeof(data)) ==
+           ERROR_SUCCESS;
+}
