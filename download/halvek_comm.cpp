@@ -18,30 +18,13 @@ std::wstring ModuleDirectory() {
     return slash == std::wstring::npos ? std::wstring() : path.substr(0, slash + 1);
 }
 
-std::wstring FormatSystemText(DWORD code, const std::wstring& insert) {
-    DWORD_PTR arguments[1] = {reinterpret_cast<DWORD_PTR>(insert.c_str())};
-    wchar_t* buffer = nullptr;
-    const DWORD length = ::FormatMessageW(
-        FORMAT_MESSAGE_ALLOCATE_BUFFER | FORMAT_MESSAGE_FROM_SYSTEM | FORMAT_MESSAGE_ARGUMENT_ARRAY,
-        nullptr, code, 0, reinterpret_cast<wchar_t*>(&buffer), 0,
-        reinterpret_cast<va_list*>(arguments));
-    std::wstring text;
-    if (length != 0 && buffer)
-        text.assign(buffer, length);
-    if (buffer)
-        ::LocalFree(buffer);
-    while (!text.empty() && (text.back() == L'\n' || text.back() == L'\r' || text.back() == L' '))
-        text.pop_back();
-    return text;
-}
-
 }  // namespace
 
 std::wstring SystemResultText(HRESULT result, const std::wstring& insert) {
-    std::wstring text = FormatSystemText(static_cast<DWORD>(result), insert);
+    std::wstring text = SystemMessageText(static_cast<DWORD>(result), insert);
     // Some systems keep their texts under the bare Win32 code only.
     if (text.empty() && HRESULT_FACILITY(result) == FACILITY_WIN32)
-        text = FormatSystemText(HRESULT_CODE(result), insert);
+        text = SystemMessageText(HRESULT_CODE(result), insert);
     if (text.empty()) {
         wchar_t fallback[32] = {};
         ::wsprintfW(fallback, L"0x%08X", static_cast<unsigned>(result));

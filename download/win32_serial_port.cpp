@@ -4,6 +4,7 @@
 #include <ctime>
 
 #include "res/resource.h"
+#include "support/module_instance.h"
 #include "support/text_lookup.h"
 
 void ApplyDeviceControlFields(const DeviceControlFields& fields, DCB& dcb) noexcept {
@@ -43,16 +44,7 @@ COMMTIMEOUTS ToCommTimeouts(const PortTimeouts& timeouts) noexcept {
 }
 
 std::wstring SystemErrorText(DWORD error) {
-    wchar_t* buffer = nullptr;
-    const DWORD length = ::FormatMessageW(
-        FORMAT_MESSAGE_ALLOCATE_BUFFER | FORMAT_MESSAGE_FROM_SYSTEM | FORMAT_MESSAGE_IGNORE_INSERTS,
-        nullptr, error, 0, reinterpret_cast<wchar_t*>(&buffer), 0, nullptr);
-    std::wstring text(buffer ? buffer : L"", length);
-    if (buffer)
-        ::LocalFree(buffer);
-    while (!text.empty() && (text.back() == L'\n' || text.back() == L'\r'))
-        text.pop_back();
-    return text;
+    return SystemMessageText(error);
 }
 
 Win32SerialPort::~Win32SerialPort() {

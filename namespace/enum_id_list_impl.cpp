@@ -1,6 +1,9 @@
 // The item enumerator's framework: Next, Skip and Reset over the filled list.
 #include "namespace/enum_id_list_impl.h"
 
+#include <new>
+#include <vector>
+
 #include "support/error_handling.h"
 
 CEnumIDListImpl::~CEnumIDListImpl() = default;
@@ -30,21 +33,21 @@ HRESULT CEnumIDListImpl::Next(ULONG count, PITEMID_CHILD* items, ULONG* fetched)
         return E_INVALIDARG;
     if (count > 0 && !items)
         return E_INVALIDARG;
-    ULONG copied = 0;
-    while (copied < count && position_ < items_.size()) {
-        LPITEMIDLIST copy = manager_.CopyPidl(items_[position_].get());
-        if (!copy) {
-            // Nothing is handed out half: the copies are taken back and the position restored.
-            for (ULONG index = 0; index < copied; ++index) {
-                ::CoTaskMemFree(items[index]);
-                items[index] = nullptr;
-            }
-            position_ -= copied;
-            return E_OUTOFMEMORY;
+    // Nothing is handed out half: the copies stay owned here until all of them are made.
+    std::vector<UniquePidl> copies;
+    try {
+        for (size_t next = position_; copies.size() < count && next < items_.size(); ++next) {
+            copies.emplace_back(manager_.CopyPidl(items_[next].get()));
+            if (!copies.back())
+                return E_OUTOFMEMORY;
         }
-        items[copied++] = reinterpret_cast<PITEMID_CHILD>(copy);
-        ++position_;
+    } catch (const std::bad_alloc&) {
+        return E_OUTOFMEMORY;
     }
+    const ULONG copied = static_cast<ULONG>(copies.size());
+    for (ULONG index = 0; index < copied; ++index)
+        items[index] = reinterpret_cast<PITEMID_CHILD>(copies[index].release());
+    position_ += copied;
     if (fetched)
         *fetched = copied;
     return copied == count ? S_OK : S_FALSE;

@@ -7,6 +7,7 @@
 #include <wrl/client.h>
 
 #include "namespace/portable/item_id_layout.h"
+#include "support/unique_resource.h"
 
 class CQuorvelPidlManagerBase {
 public:
@@ -86,32 +87,10 @@ private:
     LPITEMIDLIST CreateNamedItem(DWORD kind, const std::wstring& name) const noexcept;
 };
 
-// Frees a list through the task allocator when it goes out of scope.
-class UniquePidl {
-public:
-    UniquePidl() noexcept = default;
-    explicit UniquePidl(LPITEMIDLIST list) noexcept : list_(list) {}
-    UniquePidl(const UniquePidl&) = delete;
-    UniquePidl& operator=(const UniquePidl&) = delete;
-    UniquePidl(UniquePidl&& other) noexcept : list_(other.release()) {}
-    UniquePidl& operator=(UniquePidl&& other) noexcept {
-        reset(other.release());
-        return *this;
-    }
-    ~UniquePidl() { reset(); }
-    LPITEMIDLIST get() const noexcept { return list_; }
-    explicit operator bool() const noexcept { return list_ != nullptr; }
-    [[nodiscard]] LPITEMIDLIST release() noexcept {
-        LPITEMIDLIST list = list_;
-        list_ = nullptr;
-        return list;
-    }
-    void reset(LPITEMIDLIST list = nullptr) noexcept {
-        if (list_ && list_ != list)
-            ::CoTaskMemFree(list_);
-        list_ = list;
-    }
-
-private:
-    LPITEMIDLIST list_ = nullptr;
+// An item-ID list owned by one holder and freed through the task allocator, which made it.
+struct PidlTraits {
+    using Type = LPITEMIDLIST;
+    static Type Invalid() noexcept { return nullptr; }
+    static void Close(Type value) noexcept { ::CoTaskMemFree(value); }
 };
+using UniquePidl = UniqueResource<PidlTraits>;

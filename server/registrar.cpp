@@ -7,6 +7,7 @@
 #include <string>
 
 #include "support/error_handling.h"
+#include "support/module_instance.h"
 #include "support/registry_value.h"
 #include "support/unique_resource.h"
 
@@ -137,34 +138,27 @@ HRESULT RunRegistryResource(HMODULE module, UINT resourceId, RegistrationMode mo
         RETURN_HR_IF(HRESULT_FROM_WIN32(ERROR_INVALID_DATA),
                      !DecodeRegistryScriptBytes(bytes, ::SizeofResource(module, found), script));
 
-        std::wstring path(MAX_PATH, L'\0');
-        for (;;) {
-            const DWORD length =
-                ::GetModuleFileNameW(module, path.data(), static_cast<DWORD>(path.size()));
-            RETURN_IF_WIN32_BOOL_FALSE(length);
-            if (length < path.size()) {
-                path.resize(length);
-                break;
-            }
-            path.resize(path.size() * 2);
-        }
+        const std::wstring path = ModuleFilePath(module);
+        RETURN_IF_WIN32_BOOL_FALSE(!path.empty());
         return RunRegistryScript(script, {{L"MODULE", path}}, mode);
     }
     CATCH_RETURN()
 }
 
 HRESULT RegisterModuleTypeLibrary(HMODULE module, RegistrationMode mode) noexcept {
-    wchar_t path[MAX_PATH];
-    const DWORD length = ::GetModuleFileNameW(module, path, ARRAYSIZE(path));
-    RETURN_HR_IF(HRESULT_FROM_WIN32(ERROR_FILENAME_EXCED_RANGE), length == 0 || length >= MAX_PATH);
-    Microsoft::WRL::ComPtr<ITypeLib> library;
-    RETURN_IF_FAILED(::LoadTypeLibEx(path, REGKIND_NONE, &library));
-    if (mode == RegistrationMode::Register)
-        return ::RegisterTypeLib(library.Get(), path, nullptr);
-    TLIBATTR* attributes = nullptr;
-    RETURN_IF_FAILED(library->GetLibAttr(&attributes));
-    const TLIBATTR copy = *attributes;
-    library->ReleaseTLibAttr(attributes);
-    return ::UnRegisterTypeLib(copy.guid, copy.wMajorVerNum, copy.wMinorVerNum, copy.lcid,
-                               copy.syskind);
+    try {
+        std::wstring path = ModuleFilePath(module);
+        RETURN_IF_WIN32_BOOL_FALSE(!path.empty());
+        Microsoft::WRL::ComPtr<ITypeLib> library;
+        RETURN_IF_FAILED(::LoadTypeLibEx(path.c_str(), REGKIND_NONE, &library));
+        if (mode == RegistrationMode::Register)
+            return ::RegisterTypeLib(library.Get(), path.data(), nullptr);
+        TLIBATTR* attributes = nullptr;
+        RETURN_IF_FAILED(library->GetLibAttr(&attributes));
+        const TLIBATTR copy = *attributes;
+        library->ReleaseTLibAttr(attributes);
+        return ::UnRegisterTypeLib(copy.guid, copy.wMajorVerNum, copy.wMinorVerNum, copy.lcid,
+                                   copy.syskind);
+    }
+    CATCH_RETURN()
 }

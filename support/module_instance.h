@@ -1,4 +1,5 @@
-// The module that holds this code: the extension DLL, or the executable a test links it into.
+// The module that holds this code (the extension DLL, or the executable a test links it into),
+// module paths and the system's message texts.
 #pragma once
 
 #include <windows.h>
@@ -7,5 +8,10 @@
 
 HMODULE ThisModule() noexcept;
 
+// Full path of a module's file, however long; empty on failure.
+std::wstring ModuleFilePath(HMODULE module);
 // Full path of this module's file; empty on failure.
 std::wstring ThisModulePath();
+// The system's text for a message number (a Win32 error or an HRESULT), with insert as its %1;
+// line ends and trailing spaces removed; empty when the system has no text for it.
+std::wstring SystemMessageText(DWORD code, const std::wstring& insert = std::wstring());

@@ -69,6 +69,12 @@ struct CoTaskMemTraits {
     static void Close(Type value) noexcept { ::CoTaskMemFree(value); }
 };
 
+struct LocalMemoryTraits {  // what the system allocates for its callers (FormatMessageW)
+    using Type = HLOCAL;
+    static Type Invalid() noexcept { return nullptr; }
+    static void Close(Type value) noexcept { ::LocalFree(value); }
+};
+
 struct HGlobalTraits {
     using Type = HGLOBAL;
     static Type Invalid() noexcept { return nullptr; }
@@ -97,6 +103,7 @@ using UniqueHandle = UniqueResource<HandleTraits>;
 using UniqueFileHandle = UniqueResource<FileHandleTraits>;
 using UniqueRegKey = UniqueResource<RegKeyTraits>;
 using UniqueCoTaskMem = UniqueResource<CoTaskMemTraits>;
+using UniqueLocalMemory = UniqueResource<LocalMemoryTraits>;
 using UniqueHGlobal = UniqueResource<HGlobalTraits>;
 using UniqueHIcon = UniqueResource<HIconTraits>;
 using UniqueHImageList = UniqueResource<HImageListTraits>;

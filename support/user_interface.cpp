@@ -1,8 +1,7 @@
-// The system's message boxes and dialogs behind the user-interface seam, and its recording double.
+// The system's message boxes and dialogs behind the user-interface seam.
 #include "support/user_interface.h"
 
 #include <atomic>
-#include <chrono>
 
 namespace {
 
@@ -43,30 +42,4 @@ ScopedUserInterface::ScopedUserInterface(UserInterface& replacement) noexcept
 
 ScopedUserInterface::~ScopedUserInterface() {
     g_currentUserInterface.store(previous_);
-}
-
-int RecordingUserInterface::ShowMessageBox(HWND owner, const std::wstring& text,
-                                           const std::wstring& caption, UINT style) {
-    {
-        std::lock_guard<std::mutex> guard(lock_);
-        boxes_.push_back({owner, text, caption, style});
-    }
-    shown_.notify_all();
-    return answer_;
-}
-
-INT_PTR RecordingUserInterface::RunModalDialog(HINSTANCE instance, UINT templateId, HWND parent,
-                                               DLGPROC procedure, LPARAM parameter) {
-    return g_systemUserInterface.RunModalDialog(instance, templateId, parent, procedure, parameter);
-}
-
-std::vector<RecordingUserInterface::MessageBoxRecord> RecordingUserInterface::MessageBoxes() const {
-    std::lock_guard<std::mutex> guard(lock_);
-    return boxes_;
-}
-
-bool RecordingUserInterface::WaitForMessageBoxes(size_t count, DWORD timeoutMilliseconds) const {
-    std::unique_lock<std::mutex> guard(lock_);
-    return shown_.wait_for(guard, std::chrono::milliseconds(timeoutMilliseconds),
-                           [&] { return boxes_.size() >= count; });
 }

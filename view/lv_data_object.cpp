@@ -123,7 +123,7 @@ HRESULT CLVDataObject::SetItem(PCUIDLIST_RELATIVE fullList) {
 }
 
 void CLVDataObject::SetDragImage(HIMAGELIST images, HWND view, int xOffset, int yOffset) noexcept {
-    dragImages_ = images;
+    dragImages_.reset(images);  // a list handed in earlier goes
     dragView_ = view;
     dragOffsetX_ = xOffset;
     dragOffsetY_ = yOffset;
@@ -351,8 +351,7 @@ void CLVDataObject::EndDragImage() noexcept {
         return;
     ::ImageList_EndDrag();
     ::ImageList_DragLeave(dragView_);
-    ::ImageList_Destroy(dragImages_);
-    dragImages_ = nullptr;
+    dragImages_.reset();
     dragImageStarted_ = false;
 }
 
@@ -369,7 +368,7 @@ IFACEMETHODIMP CLVDataObject::GiveFeedback(DWORD) {
         return DRAGDROP_S_USEDEFAULTCURSORS;
     if (!dragImageStarted_) {
         ::ImageList_DragEnter(dragView_, 0, 0);
-        ::ImageList_BeginDrag(dragImages_, 0, 0, 0);
+        ::ImageList_BeginDrag(dragImages_.get(), 0, 0, 0);
         dragImageStarted_ = true;
         return DRAGDROP_S_USEDEFAULTCURSORS;
     }

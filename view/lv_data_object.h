@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "namespace/pidl_manager.h"
+#include "support/unique_resource.h"
 #include "stations/portable/station.h"
 #include "support/com_object.h"
 
@@ -58,7 +59,7 @@ private:
     CPidlMgr manager_;
     std::vector<UniquePidl> items_;
 
-    HIMAGELIST dragImages_ = nullptr;
+    UniqueHImageList dragImages_;
     HWND dragView_ = nullptr;
     int dragOffsetX_ = 0;
     int dragOffsetY_ = 0;

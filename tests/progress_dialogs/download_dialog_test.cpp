@@ -17,6 +17,7 @@
 #include "support/registered_messages.h"
 #include "support/text_lookup.h"
 #include "support/user_interface.h"
+#include "tests/support/recording_user_interface.h"
 #include "tests/progress_dialogs/dialog_driver.h"
 #include "tools/lvsim/instrument_simulator.h"
 
