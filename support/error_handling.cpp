@@ -38,6 +38,11 @@ void LogFailure(HRESULT result, const char* file, const char* function, int line
     AppendToLog(text);
 }
 
+HRESULT LastErrorResult() noexcept {
+    const DWORD error = ::GetLastError();
+    return error != ERROR_SUCCESS ? HRESULT_FROM_WIN32(error) : E_FAIL;
+}
+
 HRESULT ResultFromCaughtException() noexcept {
     try {
         throw;

@@ -8,6 +8,10 @@
 // Appends "%ls - 0x%08X (%ls, %i)" style entries to the module's error log. Never fails.
 void LogFailure(HRESULT result, const char* file, const char* function, int line) noexcept;
 
+// The thread's last error as an HRESULT; E_FAIL when a failed call left none, so that the
+// result can never read as success.
+HRESULT LastErrorResult() noexcept;
+
 // The HRESULT for the exception being handled (bad_alloc → E_OUTOFMEMORY, anything else E_FAIL).
 HRESULT ResultFromCaughtException() noexcept;
 
@@ -36,7 +40,7 @@ HRESULT ResultFromCaughtException() noexcept;
 #define RETURN_IF_WIN32_BOOL_FALSE(expression)                       \
     do {                                                             \
         if (!(expression))                                           \
-            LV_LOG_AND_RETURN(HRESULT_FROM_WIN32(::GetLastError())); \
+            LV_LOG_AND_RETURN(LastErrorResult());                    \
     } while (0)
 
 #define RETURN_IF_WIN32_ERROR(expression)                     \

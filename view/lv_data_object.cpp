@@ -76,13 +76,6 @@ std::wstring ItemPath(const CPidlMgr& manager, LPCITEMIDLIST list) {
     return path;
 }
 
-// The result for a failed call that set the thread's last error; never a success code, even
-// when the call forgot to set one.
-HRESULT LastErrorResult() noexcept {
-    const DWORD error = ::GetLastError();
-    return error != ERROR_SUCCESS ? HRESULT_FROM_WIN32(error) : E_FAIL;
-}
-
 // A unique "QRV" name in the user's temporary folder, without extension, where no file is: the
 // download writes the file itself.
 HRESULT MakeDownloadTarget(std::wstring& target) {

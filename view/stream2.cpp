@@ -13,12 +13,6 @@ HANDLE OpenForReading(const std::wstring& path) {
                          FILE_ATTRIBUTE_NORMAL, nullptr);
 }
 
-// Never a success code, even when the failed call left no last error.
-HRESULT LastErrorResult() noexcept {
-    const DWORD error = ::GetLastError();
-    return error != ERROR_SUCCESS ? HRESULT_FROM_WIN32(error) : E_FAIL;
-}
-
 }  // namespace
 
 CStream2::~CStream2() {

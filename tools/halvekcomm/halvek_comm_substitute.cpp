@@ -17,6 +17,7 @@
 #include <string>
 
 #include "download/halvek_comm.h"
+#include "support/unique_resource.h"
 
 namespace {
 
@@ -73,8 +74,8 @@ public:
         if (worker_) {
             cancelled_ = true;  // a transfer still running is abandoned, never reported
             callback_ = nullptr;
-            ::WaitForSingleObject(worker_, INFINITE);
-            ::CloseHandle(worker_);
+            ::WaitForSingleObject(worker_.get(), INFINITE);
+            worker_.reset();
         }
         if (flags & 1)
             delete this;
@@ -105,7 +106,7 @@ public:
         delayMilliseconds_ = EnvironmentNumber("HALVEKCOMM_DELAY_MS", 300);
         honourCancel_ = Environment("HALVEKCOMM_IGNORE_CANCEL") != "1";
         cancelDelayMilliseconds_ = EnvironmentNumber("HALVEKCOMM_CANCEL_DELAY_MS", 0);
-        worker_ = ::CreateThread(nullptr, 0, &SubstituteObject::Transfer, this, 0, nullptr);
+        worker_.reset(::CreateThread(nullptr, 0, &SubstituteObject::Transfer, this, 0, nullptr));
         return worker_ ? 0 : -301;
     }
     void Reserved5() override {}
@@ -178,7 +179,7 @@ private:
     bool honourCancel_ = true;
     std::atomic<bool> cancelled_{false};
     std::atomic<HalvekCompletionFunction> callback_{nullptr};
-    HANDLE worker_ = nullptr;
+    UniqueHandle worker_;
 };
 
 }  // namespace

@@ -53,9 +53,8 @@ std::wstring DisplayName(IShellFolder* folder, PCUITEMID_CHILD item, SHGDNF flag
     wchar_t* name = nullptr;
     if (FAILED(::StrRetToStrW(&text, item, &name)))
         return L"?";
-    std::wstring result = name;
-    ::CoTaskMemFree(name);
-    return result;
+    const UniqueCoTaskMem owner(name);
+    return name;
 }
 
 std::wstring InfoTip(IShellFolder* folder, PCUITEMID_CHILD item) {
@@ -66,9 +65,8 @@ std::wstring InfoTip(IShellFolder* folder, PCUITEMID_CHILD item) {
     wchar_t* tip = nullptr;
     if (FAILED(info->GetInfoTip(0, &tip)) || !tip)
         return L"(none)";
-    std::wstring result = tip;
-    ::CoTaskMemFree(tip);
-    return L"\"" + result + L"\"";
+    const UniqueCoTaskMem owner(tip);
+    return L"\"" + std::wstring(tip) + L"\"";
 }
 
 std::wstring IconIndex(IShellFolder* folder, PCUITEMID_CHILD item) {
