@@ -4,6 +4,7 @@
 #include <shlwapi.h>
 
 #include <clocale>
+#include <cstdint>
 #include <map>
 #include <memory>
 #include <mutex>
@@ -39,10 +40,11 @@ struct TranslationCache {
     std::map<std::wstring, std::shared_ptr<const TranslationMap>> mapByFile;
 };
 
+// Made once, on first use from any thread, and never destroyed: callers may still be about at
+// unload. A function-local static rather than std::call_once, whose bookkeeping is
+// thread-local and so allocated anew on every download thread.
 TranslationCache& Cache() {
-    static std::once_flag once;
-    static TranslationCache* cache = nullptr;
-    std::call_once(once, [] { cache = new TranslationCache; });
+    static TranslationCache* const cache = new TranslationCache;
     return *cache;
 }
 
@@ -204,18 +206,29 @@ void ClearTranslationCache() noexcept {
     cache.mapByFile.clear();
 }
 
-// The language chosen on this thread, remembered here as well: not every system reports a
-// language set with SetThreadUILanguage back through GetThreadUILanguage (Wine does not).
-static thread_local LANGID t_selectedLanguage = 0;
+// The language chosen on a thread, remembered here as well: not every system reports a language
+// set with SetThreadUILanguage back through GetThreadUILanguage (Wine does not). It is kept in a
+// system TLS slot, which costs no allocation: a C++ thread_local is allocated for every thread
+// that touches it, every download thread among them, and its clean-up is left to the thread
+// notifications that this module turns off. The slot lives as long as the process.
+DWORD LanguageSlot() noexcept {
+    static const DWORD slot = ::TlsAlloc();
+    return slot;
+}
 
 LANGID UiLanguage() noexcept {
-    return t_selectedLanguage != 0 ? t_selectedLanguage : ::GetThreadUILanguage();
+    const DWORD slot = LanguageSlot();
+    const auto selected = static_cast<LANGID>(
+        slot != TLS_OUT_OF_INDEXES ? reinterpret_cast<uintptr_t>(::TlsGetValue(slot)) : 0);
+    return selected != 0 ? selected : ::GetThreadUILanguage();
 }
 
 bool SelectThreadUiLanguage(LANGID language) noexcept {
     if (::SetThreadUILanguage(language) != language)
         return false;
-    t_selectedLanguage = language;
+    const DWORD slot = LanguageSlot();
+    if (slot != TLS_OUT_OF_INDEXES)
+        (void)::TlsSetValue(slot, reinterpret_cast<void*>(static_cast<uintptr_t>(language)));
     return true;
 }
 

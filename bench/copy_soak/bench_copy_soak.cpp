@@ -7,6 +7,7 @@
 
 #include <algorithm>
 #include <atomic>
+#include <map>
 #include <cstdint>
 #include <cstdarg>
 #include <chrono>
@@ -62,6 +63,24 @@ SIZE_T HeapBytesInUse() {
         ::HeapUnlock(heap);
     }
     return total;
+}
+
+// Busy heap blocks by size, for telling which allocation grows with the copies.
+std::map<SIZE_T, long> HeapBlockSizes() {
+    std::map<SIZE_T, long> sizes;
+    std::vector<HANDLE> heaps(::GetProcessHeaps(0, nullptr) + 16);
+    heaps.resize(::GetProcessHeaps(static_cast<DWORD>(heaps.size()), heaps.data()));
+    for (HANDLE heap : heaps) {
+        if (!::HeapLock(heap))
+            continue;
+        PROCESS_HEAP_ENTRY entry{};
+        while (::HeapWalk(heap, &entry)) {
+            if (entry.wFlags & PROCESS_HEAP_ENTRY_BUSY)
+                ++sizes[entry.cbData];
+        }
+        ::HeapUnlock(heap);
+    }
+    return sizes;
 }
 
 Usage Measure() {
@@ -170,6 +189,8 @@ int wmain(int argc, wchar_t** argv) {
     const int leftBefore = TemporaryDownloads();
     const Usage before = Measure();
     Usage afterFirst;
+    Usage halfway;
+    std::map<SIZE_T, long> halfwayBlocks;
     std::vector<double> seconds;
     int failures = 0;
     unsigned long long bytes = 0;
@@ -191,9 +212,16 @@ int wmain(int argc, wchar_t** argv) {
             }
             if (copy == 0)
                 afterFirst = Measure();
+            if (copy == copies / 2 - 1) {
+                halfway = Measure();
+                halfwayBlocks = HeapBlockSizes();
+            }
         }
     }
     const Usage after = Measure();
+    std::map<SIZE_T, long> growth = HeapBlockSizes();
+    for (const auto& [size, count] : halfwayBlocks)
+        growth[size] -= count;
     const int leftAfter = TemporaryDownloads();
     ::OleUninitialize();
 
@@ -205,12 +233,14 @@ int wmain(int argc, wchar_t** argv) {
     Print(L"copies: %d (%d failed), %llu bytes each\n", copies, failures, bytes);
     Print(L"handles: %lu before, %lu after the first copy, %lu after the last\n",
           before.handles, afterFirst.handles, after.handles);
+    // A leak grows the same in both halves; a cache fills once and stays.
+    const auto kib = [](const Usage& from, const Usage& to) {
+        return (static_cast<double>(to.heapBytes) - static_cast<double>(from.heapBytes)) / 1024.0;
+    };
     Print(L"heap bytes in use: %.2f MiB before, %.2f MiB after the first copy, %.2f MiB after "
-          L"the last (%+.1f KiB over the last %d copies)\n",
+          L"the last; %+.1f KiB over copies 2 to %d, %+.1f KiB over copies %d to %d\n",
           MiB(before.heapBytes), MiB(afterFirst.heapBytes), MiB(after.heapBytes),
-          (static_cast<double>(after.heapBytes) - static_cast<double>(afterFirst.heapBytes)) /
-              1024.0,
-          copies - 1);
+          kib(afterFirst, halfway), copies / 2, kib(halfway, after), copies / 2 + 1, copies);
     if (after.privateBytes == 0) {
         PrintUtf8(L"private bytes: not reported by this system\n");  // Wine leaves them 0
     } else {
@@ -220,6 +250,17 @@ int wmain(int argc, wchar_t** argv) {
     }
     Print(L"working set: %.1f MiB before, %.1f MiB after the first copy, %.1f MiB after the last\n",
           MiB(before.workingSet), MiB(afterFirst.workingSet), MiB(after.workingSet));
+    // Block sizes whose count grew over the second half by at least one per four copies.
+    std::wstring growing;
+    for (const auto& [size, count] : growth) {
+        if (count * 4 >= copies - copies / 2) {
+            wchar_t entry[64];
+            swprintf(entry, ARRAYSIZE(entry), L" %zu bytes x%ld;", static_cast<size_t>(size), count);
+            growing += entry;
+        }
+    }
+    Print(L"heap blocks growing over the second half:%ls\n",
+          growing.empty() ? L" none" : growing.c_str());
     Print(L"QRV files in the temporary folder: %d before, %d after\n", leftBefore, leftAfter);
     Print(L"time per copy: mean %.2f s, median %.2f s, min %.2f s, max %.2f s\n",
           total / copies, sorted[sorted.size() / 2], sorted.front(), sorted.back());
