@@ -7,6 +7,7 @@
 
 #include <gtest/gtest.h>
 
+#include <filesystem>
 #include <string>
 #include <vector>
 
@@ -14,10 +15,14 @@
 #include "stations/station_list_block.h"
 #include "stations/station_store.h"
 #include "support/module_lock.h"
+#include "support/registered_messages.h"
 #include "support/unique_resource.h"
 #include "support/user_interface.h"
 #include "tests/support/registry_override.h"
 #include "view/lv_data_object.h"
+
+constexpr wchar_t kStationList[] = L"Quorvel Total Stations";  // the clipboard format's name
+constexpr wchar_t kNorthFile[] = L"Quorvel Digital Level\\North\\file1.lv";
 
 // Answers every modal dialog at once without showing it, and counts the runs.
 class ScriptedDialogs : public UserInterface {
@@ -44,18 +49,18 @@ inline FORMATETC Request(const wchar_t* name, DWORD tymed, LONG index = -1) {
     return {Format(name), nullptr, DVASPECT_CONTENT, index, tymed};
 }
 
+inline bool FileExists(const std::wstring& path) {
+    return ::GetFileAttributesW(path.c_str()) != INVALID_FILE_ATTRIBUTES;
+}
+
+// The downloads ("QRV" files) in the temporary folder.
 inline std::vector<std::wstring> TemporaryDownloads() {
-    wchar_t directory[MAX_PATH];
-    ::GetTempPathW(MAX_PATH, directory);
     std::vector<std::wstring> names;
-    WIN32_FIND_DATAW found;
-    HANDLE search = ::FindFirstFileW((std::wstring(directory) + L"QRV*").c_str(), &found);
-    if (search == INVALID_HANDLE_VALUE)
-        return names;
-    do {
-        names.push_back(found.cFileName);
-    } while (::FindNextFileW(search, &found));
-    ::FindClose(search);
+    for (const auto& entry :
+         std::filesystem::directory_iterator(std::filesystem::temp_directory_path())) {
+        if (entry.path().filename().wstring().starts_with(L"QRV"))
+            names.push_back(entry.path().filename().wstring());
+    }
     return names;
 }
 
@@ -63,6 +68,7 @@ class DataObject : public ::testing::Test {
 protected:
     void SetUp() override {
         ASSERT_TRUE(SUCCEEDED(::OleInitialize(nullptr)));
+        RegisterWindowMessages();  // the progress dialogs' messages
         AddStationNamed(L"North", L"Quorvel LV-10");
         AddStationNamed(L"South", L"Quorvel LV-30");
         AddStationNamed(L"East", L"Quorvel LV-10");
@@ -93,8 +99,26 @@ protected:
         return data;
     }
 
+    static HRESULT Get(IDataObject* data, const wchar_t* format, DWORD tymed,
+                       UniqueStgMedium& medium, LONG index = -1) {
+        FORMATETC request = Request(format, tymed, index);
+        return data->GetData(&request, medium.put());
+    }
+
+    // "FileContents" of one file item: its download, through whatever user interface is set.
+    HRESULT DownloadFile(const wchar_t* item, UniqueStgMedium& medium) {
+        return Get(Over({item}).Get(), CFSTR_FILECONTENTS, TYMED_ISTREAM, medium, 0);
+    }
+
+    static std::vector<Station> StationsIn(IDataObject* data) {
+        UniqueStgMedium medium;
+        std::vector<Station> stations;
+        EXPECT_EQ(S_OK, Get(data, kStationList, TYMED_HGLOBAL, medium));
+        EXPECT_EQ(S_OK, ParseStationList(medium.get().hGlobal, stations));
+        return stations;
+    }
+
     // The local machine too: an empty serial-port list leaves the stored ports as they are.
     RegistryOverride registry_{RegistryOverride::Hives::CurrentUserAndLocalMachine};
     CPidlMgr manager_;
 };
-

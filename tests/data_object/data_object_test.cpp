@@ -4,14 +4,16 @@
 
 #include <gtest/gtest.h>
 
+#include <utility>
+
 #include "tests/data_object/data_object_fixture.h"
 
 using Microsoft::WRL::ComPtr;
 
 TEST_F(DataObject, QueryGetDataAnswersEachFormatOnlyWithItsTymed) {
-    ComPtr<IDataObject> data = Over({L"Quorvel Digital Level\\North\\file1.lv"});
-    for (const wchar_t* name : {CFSTR_FILEDESCRIPTORW, CFSTR_SHELLIDLIST, L"Quorvel Total Stations",
-                                CFSTR_PREFERREDDROPEFFECT}) {
+    ComPtr<IDataObject> data = Over({kNorthFile});
+    for (const wchar_t* name :
+         {CFSTR_FILEDESCRIPTORW, CFSTR_SHELLIDLIST, kStationList, CFSTR_PREFERREDDROPEFFECT}) {
         FORMATETC format = Request(name, TYMED_HGLOBAL);
         EXPECT_EQ(S_OK, data->QueryGetData(&format)) << name;
         format.tymed = TYMED_HGLOBAL | TYMED_ISTREAM;
@@ -23,12 +25,12 @@ TEST_F(DataObject, QueryGetDataAnswersEachFormatOnlyWithItsTymed) {
     EXPECT_EQ(S_FALSE, data->QueryGetData(&contents));
     FORMATETC text = {CF_UNICODETEXT, nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
     EXPECT_EQ(S_FALSE, data->QueryGetData(&text));
-    STGMEDIUM medium{};
-    EXPECT_EQ(E_INVALIDARG, data->GetData(&text, &medium));
+    UniqueStgMedium medium;
+    EXPECT_EQ(E_INVALIDARG, data->GetData(&text, medium.put()));
 }
 
 TEST_F(DataObject, EnumerationListsFourFormatsButNotTheDropEffectWhichIsAlwaysCopy) {
-    ComPtr<IDataObject> data = Over({L"Quorvel Digital Level\\North\\file1.lv"});
+    ComPtr<IDataObject> data = Over({kNorthFile});
     ComPtr<IEnumFORMATETC> formats;
     ASSERT_EQ(S_OK, data->EnumFormatEtc(DATADIR_SET, &formats));
     FORMATETC entries[10] = {};
@@ -36,7 +38,7 @@ TEST_F(DataObject, EnumerationListsFourFormatsButNotTheDropEffectWhichIsAlwaysCo
     ASSERT_EQ(S_OK, formats->Next(10, entries, &fetched));
     ASSERT_EQ(4u, fetched);
     const wchar_t* names[] = {CFSTR_FILECONTENTS, CFSTR_FILEDESCRIPTORW, CFSTR_SHELLIDLIST,
-                              L"Quorvel Total Stations"};
+                              kStationList};
     for (ULONG i = 0; i < 4; ++i) {
         EXPECT_EQ(Format(names[i]), entries[i].cfFormat) << i;
         EXPECT_EQ(-1, entries[i].lindex);
@@ -57,20 +59,18 @@ TEST_F(DataObject, EnumerationListsFourFormatsButNotTheDropEffectWhichIsAlwaysCo
     ASSERT_EQ(S_OK, formats->Next(1, entries, nullptr));
     EXPECT_EQ(Format(CFSTR_SHELLIDLIST), entries[0].cfFormat);
 
-    FORMATETC effect = Request(CFSTR_PREFERREDDROPEFFECT, TYMED_HGLOBAL);
     UniqueStgMedium medium;
-    ASSERT_EQ(S_OK, data->GetData(&effect, medium.put()));
+    ASSERT_EQ(S_OK, Get(data.Get(), CFSTR_PREFERREDDROPEFFECT, TYMED_HGLOBAL, medium));
     GlobalLockGuard lock(medium.get().hGlobal);
     EXPECT_EQ(static_cast<DWORD>(DROPEFFECT_COPY), *static_cast<DWORD*>(lock.data()));
 }
 
 TEST_F(DataObject, FileGroupDescriptorNamesFilesByModel) {
     ComPtr<IDataObject> data =
-        Over({L"Quorvel Digital Level\\North\\file1.lv", L"Quorvel Digital Level\\South\\file1.hvr",
+        Over({kNorthFile, L"Quorvel Digital Level\\South\\file1.hvr",
               L"Quorvel Digital Level\\Deleted\\file1.hvr", L"Quorvel Digital Level"});
-    FORMATETC format = Request(CFSTR_FILEDESCRIPTORW, TYMED_HGLOBAL);
     UniqueStgMedium medium;
-    ASSERT_EQ(S_OK, data->GetData(&format, medium.put()));
+    ASSERT_EQ(S_OK, Get(data.Get(), CFSTR_FILEDESCRIPTORW, TYMED_HGLOBAL, medium));
     GlobalLockGuard lock(medium.get().hGlobal);
     ASSERT_GE(lock.size(), sizeof(UINT) + 4 * sizeof(FILEDESCRIPTORW));
     const auto* group = static_cast<const FILEGROUPDESCRIPTORW*>(lock.data());
@@ -81,35 +81,63 @@ TEST_F(DataObject, FileGroupDescriptorNamesFilesByModel) {
     EXPECT_STREQ(L"file1.lv", group->fgd[3].cFileName) << "a list without a station";
     EXPECT_EQ(0u, group->fgd[0].dwFlags) << "no size, time or attributes are announced";
 
-    ComPtr<IDataObject> empty = Over({});
     UniqueStgMedium none;
-    EXPECT_EQ(S_FALSE, empty->GetData(&format, none.put()));
+    EXPECT_EQ(S_FALSE, Get(Over({}).Get(), CFSTR_FILEDESCRIPTORW, TYMED_HGLOBAL, none));
 }
 
 TEST_F(DataObject, FileContentsRefusesBadIndexesAndItemsThatAreNotFiles) {
     ScriptedDialogs dialogs(IDOK);
     ScopedUserInterface scope(dialogs);
-    ComPtr<IDataObject> data =
-        Over({L"Quorvel Digital Level\\North\\file1.lv", L"Quorvel Digital Level\\North",
-              L"Quorvel Digital Level\\Gone\\file1.lv"});
-    for (LONG index : {-1L, 3L, 1L}) {
-        FORMATETC format = Request(CFSTR_FILECONTENTS, TYMED_ISTREAM, index);
+    ComPtr<IDataObject> data = Over(
+        {kNorthFile, L"Quorvel Digital Level\\North", L"Quorvel Digital Level\\Gone\\file1.lv"});
+    // Outside the list, a station rather than a file, and a station that cannot be loaded.
+    const std::pair<LONG, HRESULT> cases[] = {
+        {-1, S_FALSE}, {3, S_FALSE}, {1, S_FALSE}, {2, E_FAIL}};
+    for (const auto& [index, expected] : cases) {
         UniqueStgMedium medium;
-        EXPECT_EQ(S_FALSE, data->GetData(&format, medium.put())) << index;
+        EXPECT_EQ(expected, Get(data.Get(), CFSTR_FILECONTENTS, TYMED_ISTREAM, medium, index))
+            << index;
     }
-    FORMATETC gone = Request(CFSTR_FILECONTENTS, TYMED_ISTREAM, 2);
-    UniqueStgMedium medium;
-    EXPECT_EQ(E_FAIL, data->GetData(&gone, medium.put())) << "the store's own status";
     EXPECT_EQ(0, dialogs.runs) << "no download was started";
+}
+
+namespace {
+
+// Counts the releases that a medium's pUnkForRelease receives.
+class ReleaseCounter final : public IUnknown {
+public:
+    IFACEMETHODIMP QueryInterface(REFIID, void** object) override {
+        *object = nullptr;
+        return E_NOINTERFACE;
+    }
+    IFACEMETHODIMP_(ULONG) AddRef() override { return 2; }
+    IFACEMETHODIMP_(ULONG) Release() override { return static_cast<ULONG>(++releases); }
+    int releases = 0;
+};
+
+}  // namespace
+
+TEST_F(DataObject, SetDataReleasesTheMediumOnlyWhenItIsHandedOver) {
+    ComPtr<IDataObject> data = Over({kNorthFile});
+    for (const BOOL handedOver : {FALSE, TRUE}) {
+        ReleaseCounter owner;
+        UniqueHGlobal block(::GlobalAlloc(GMEM_MOVEABLE, sizeof(DWORD)));
+        STGMEDIUM medium{};
+        medium.tymed = TYMED_HGLOBAL;
+        medium.hGlobal = block.get();
+        medium.pUnkForRelease = &owner;  // releasing the medium releases this, not the block
+        FORMATETC format = Request(L"Performed DropEffect", TYMED_HGLOBAL);
+        EXPECT_EQ(S_OK, data->SetData(&format, &medium, handedOver));
+        EXPECT_EQ(handedOver ? 1 : 0, owner.releases) << handedOver;
+    }
 }
 
 TEST_F(DataObject, ShellIdListArrayOfThreeItemsKeepsItsHistoricOffsets) {
     ComPtr<IDataObject> data =
         Over({L"Quorvel Digital Level\\North", L"Quorvel Digital Level\\South",
               L"Quorvel Digital Level\\East"});
-    FORMATETC format = Request(CFSTR_SHELLIDLIST, TYMED_HGLOBAL);
     UniqueStgMedium medium;
-    ASSERT_EQ(S_OK, data->GetData(&format, medium.put()));
+    ASSERT_EQ(S_OK, Get(data.Get(), CFSTR_SHELLIDLIST, TYMED_HGLOBAL, medium));
     GlobalLockGuard lock(medium.get().hGlobal);
     const auto* bytes = static_cast<const BYTE*>(lock.data());
     const auto* array = static_cast<const CIDA*>(lock.data());
@@ -127,49 +155,29 @@ TEST_F(DataObject, ShellIdListArrayOfThreeItemsKeepsItsHistoricOffsets) {
     EXPECT_GE(lock.size(), offsets[1] + manager_.GetSize(child))
         << "the last child lies inside the block";
 
-    ComPtr<IDataObject> rootOnly = Over({L"Quorvel Digital Level"});
     UniqueStgMedium none;
-    EXPECT_EQ(S_FALSE, rootOnly->GetData(&format, none.put())) << "no parent";
+    EXPECT_EQ(S_FALSE,
+              Get(Over({L"Quorvel Digital Level"}).Get(), CFSTR_SHELLIDLIST, TYMED_HGLOBAL, none))
+        << "no parent";
 }
 
-TEST_F(DataObject, StationListCarriesTheLoadableStations) {
+TEST_F(DataObject, StationListOnTheOleClipboardCarriesTheLoadableStations) {
     ComPtr<IDataObject> data =
-        Over({L"Quorvel Digital Level\\South", L"Quorvel Digital Level\\Gone",
-              L"Quorvel Digital Level\\North\\file1.lv"});
-    FORMATETC format = Request(L"Quorvel Total Stations", TYMED_HGLOBAL);
-    UniqueStgMedium medium;
-    ASSERT_EQ(S_OK, data->GetData(&format, medium.put()));
-    std::vector<Station> stations;
-    ASSERT_EQ(S_OK, ParseStationList(medium.get().hGlobal, stations));
+        Over({L"Quorvel Digital Level\\South", L"Quorvel Digital Level\\Gone", kNorthFile});
+    ASSERT_EQ(S_OK, ::OleSetClipboard(data.Get()));
+    data.Reset();
+    ComPtr<IDataObject> pasted;
+    ASSERT_EQ(S_OK, ::OleGetClipboard(&pasted));
+    const std::vector<Station> stations = StationsIn(pasted.Get());
+    pasted.Reset();
+    ASSERT_EQ(S_OK, ::OleSetClipboard(nullptr));
     ASSERT_EQ(2u, stations.size());
     EXPECT_EQ(L"South", stations[0].Name);
     EXPECT_EQ(L"Quorvel LV-30", stations[0].Model);
     EXPECT_EQ(L"COM5", stations[0].Port);
     EXPECT_EQ(L"North", stations[1].Name);
 
-    ComPtr<IDataObject> empty = Over({});
-    UniqueStgMedium block;
-    ASSERT_EQ(S_OK, empty->GetData(&format, block.put()));
-    ASSERT_EQ(S_OK, ParseStationList(block.get().hGlobal, stations));
-    EXPECT_TRUE(stations.empty());
-}
-
-TEST_F(DataObject, TravelsThroughTheOleClipboard) {
-    ComPtr<IDataObject> data = Over({L"Quorvel Digital Level\\South\\file1.hvr"});
-    ASSERT_EQ(S_OK, ::OleSetClipboard(data.Get()));
-    data.Reset();
-    {
-        ComPtr<IDataObject> pasted;
-        ASSERT_EQ(S_OK, ::OleGetClipboard(&pasted));
-        FORMATETC format = Request(L"Quorvel Total Stations", TYMED_HGLOBAL);
-        UniqueStgMedium medium;
-        ASSERT_EQ(S_OK, pasted->GetData(&format, medium.put()));
-        std::vector<Station> stations;
-        ASSERT_EQ(S_OK, ParseStationList(medium.get().hGlobal, stations));
-        ASSERT_EQ(1u, stations.size());
-        EXPECT_EQ(L"South", stations[0].Name);
-    }
-    ASSERT_EQ(S_OK, ::OleSetClipboard(nullptr));
+    EXPECT_TRUE(StationsIn(Over({}).Get()).empty());
 }
 
 TEST_F(DataObject, DropSourceEndsOnButtonRelease) {

@@ -6,28 +6,23 @@
 #include <gtest/gtest.h>
 
 #include <string>
+#include <utility>
 
 #include "download/halvek_download_progress_dialog.h"
 #include "download/progress_dialog_base.h"
 #include "support/registered_messages.h"
 #include "tests/data_object/data_object_fixture.h"
 
-using Microsoft::WRL::ComPtr;
-
 namespace {
 
-enum class Ending { kCompleted, kStrayOkThenCancel };
+constexpr char kContent[] = "A,01,Z\r\n1,0.000,12.5,!,\r\n";
 
 // Runs each progress dialog for real and, once it is up, writes what a download would have
-// written to its output file and ends the transfer as asked.
-class PlayedDialogs : public UserInterface {
+// written to its output file; then reports the transfer's end, or sends a stray IDOK and Cancel.
+class PlayedDialogs : public ScriptedDialogs {
 public:
-    PlayedDialogs(Ending ending, std::string content)
-        : ending_(ending), content_(std::move(content)) {}
+    explicit PlayedDialogs(bool completes) : ScriptedDialogs(-1), completes_(completes) {}
 
-    int ShowMessageBox(HWND, const std::wstring&, const std::wstring&, UINT) override {
-        return IDOK;
-    }
     INT_PTR RunModalDialog(HINSTANCE instance, UINT templateId, HWND parent, DLGPROC procedure,
                            LPARAM parameter) override {
         dialog_ = dynamic_cast<CProgressDialogBase*>(reinterpret_cast<CModalDialog*>(parameter));
@@ -35,116 +30,88 @@ public:
             return -1;
         current_ = this;
         const UINT_PTR timer = ::SetTimer(nullptr, 0, 50, &PlayedDialogs::OnTimer);
-        const INT_PTR result = ::DialogBoxParamW(instance, MAKEINTRESOURCEW(templateId), parent,
-                                                 procedure, parameter);
+        result =
+            ::DialogBoxParamW(instance, MAKEINTRESOURCEW(templateId), parent, procedure, parameter);
         ::KillTimer(nullptr, timer);
-        current_ = nullptr;
         return result;
     }
 
-    std::wstring writtenPath;       // the file the transfer wrote
-    bool openAfterStrayOk = false;  // the dialog was still up after the stray IDOK
+    std::wstring writtenPath;  // the file the transfer wrote
+    INT_PTR result = 0;        // how the dialog ended
 
 private:
     static void CALLBACK OnTimer(HWND, UINT, UINT_PTR, DWORD) {
-        if (current_ && current_->dialog_->Window())
+        if (current_->dialog_->Window() && current_->writtenPath.empty())
             current_->Play(current_->dialog_->Window());
     }
 
     void Play(HWND window) {
+        // The external library writes under the given name with ".txt" added.
         const bool external = dynamic_cast<CHalvekDownloadProgressDialog*>(dialog_) != nullptr;
-        switch (step_++) {
-            case 0: {
-                // The external library writes under the given name with ".txt" added.
-                writtenPath = dialog_->OutputPath() + (external ? L".txt" : L"");
-                UniqueFileHandle file(::CreateFileW(writtenPath.c_str(), GENERIC_WRITE, 0,
-                                                    nullptr, CREATE_ALWAYS, 0, nullptr));
-                DWORD written = 0;
-                EXPECT_TRUE(::WriteFile(file.get(), content_.data(),
-                                        static_cast<DWORD>(content_.size()), &written, nullptr));
-                if (ending_ == Ending::kStrayOkThenCancel) {
-                    ::PostMessageW(window, WM_COMMAND, IDOK, 0);
-                } else if (external) {
-                    ::PostMessageW(window, g_registeredMessages.halvekDownloadMessage, 0, 0);
-                } else {
-                    ::PostMessageW(window, g_registeredMessages.downloadThreadFinished, 0, 0);
-                }
-                break;
-            }
-            case 1:
-                openAfterStrayOk = ::IsWindow(window) != FALSE;
-                ::PostMessageW(window, WM_COMMAND, IDCANCEL, 0);
-                break;
-            default:
-                break;
+        writtenPath = dialog_->OutputPath() + (external ? L".txt" : L"");
+        UniqueFileHandle file(::CreateFileW(writtenPath.c_str(), GENERIC_WRITE, 0, nullptr,
+                                            CREATE_ALWAYS, 0, nullptr));
+        DWORD written = 0;
+        EXPECT_TRUE(::WriteFile(file.get(), kContent, sizeof kContent - 1, &written, nullptr));
+        if (!completes_) {
+            ::PostMessageW(window, WM_COMMAND, IDOK, 0);
+            ::PostMessageW(window, WM_COMMAND, IDCANCEL, 0);
+        } else {
+            ::PostMessageW(window,
+                           external ? g_registeredMessages.halvekDownloadMessage
+                                    : g_registeredMessages.downloadThreadFinished,
+                           0, 0);
         }
     }
 
     static inline PlayedDialogs* current_ = nullptr;
-    const Ending ending_;
-    const std::string content_;
+    const bool completes_;
     CProgressDialogBase* dialog_ = nullptr;
-    int step_ = 0;
 };
 
-std::string ReadToEnd(IStream* stream) {
-    std::string content;
-    char buffer[7];
-    ULONG got = 0;
-    do {
-        EXPECT_EQ(S_OK, stream->Read(buffer, sizeof buffer, &got));
-        content.append(buffer, got);
-    } while (got == sizeof buffer);
-    return content;
-}
-
-bool FileExists(const std::wstring& path) {
-    return ::GetFileAttributesW(path.c_str()) != INVALID_FILE_ATTRIBUTES;
-}
-
-class FileContents : public DataObject {
-protected:
-    void SetUp() override {
-        DataObject::SetUp();
-        RegisterWindowMessages();
-    }
-};
+class FileContents : public DataObject {};
 
 }  // namespace
 
 TEST_F(FileContents, OnlyACompletedTransferGivesAStreamAndNoOutcomeLeavesADownloadBehind) {
     struct Case {
         const wchar_t* item;
-        Ending ending;
-        HRESULT expected;
+        bool completes;            // or a stray IDOK, then Cancel
         const wchar_t* extension;  // of the file the transfer writes
     } const cases[] = {
-        {L"Quorvel Digital Level\\North\\file1.lv", Ending::kCompleted, S_OK, L""},
-        {L"Quorvel Digital Level\\South\\file1.hvr", Ending::kCompleted, S_OK, L".txt"},
-        {L"Quorvel Digital Level\\North\\file1.lv", Ending::kStrayOkThenCancel, S_FALSE, L""},
-        {L"Quorvel Digital Level\\South\\file1.hvr", Ending::kStrayOkThenCancel, S_FALSE, L".txt"},
+        {kNorthFile, true, L""},
+        {L"Quorvel Digital Level\\South\\file1.hvr", true, L".txt"},
+        {kNorthFile, false, L""},
+        {L"Quorvel Digital Level\\South\\file1.hvr", false, L".txt"},
     };
     const std::vector<std::wstring> before = TemporaryDownloads();
     for (const Case& test : cases) {
-        SCOPED_TRACE(testing::Message() << test.item << " ending " << static_cast<int>(test.ending));
-        PlayedDialogs dialogs(test.ending, "A,01,Z\r\n1,0.000,12.5,!,\r\n");
+        SCOPED_TRACE(testing::Message()
+                     << test.item << (test.completes ? " completed" : " cancelled"));
+        PlayedDialogs dialogs(test.completes);
         ScopedUserInterface scope(dialogs);
-        ComPtr<IDataObject> data = Over({test.item});
-        FORMATETC format = Request(CFSTR_FILECONTENTS, TYMED_ISTREAM, 0);
         UniqueStgMedium medium;
-        ASSERT_EQ(test.expected, data->GetData(&format, medium.put()));
+        ASSERT_EQ(test.completes ? S_OK : S_FALSE, DownloadFile(test.item, medium));
+        EXPECT_EQ(test.completes ? IDOK : IDCANCEL, dialogs.result)
+            << "a stray IDOK must not end the download";
 
         // A unique "QRV" name in the temporary folder without an extension of its own.
         const std::wstring name = dialogs.writtenPath.substr(dialogs.writtenPath.rfind(L'\\') + 1);
         EXPECT_EQ(0u, name.find(L"QRV")) << name;
         const size_t dot = name.find(L'.');
         EXPECT_EQ(test.extension, dot == std::wstring::npos ? L"" : name.substr(dot));
-        if (test.expected == S_OK) {
+        if (test.completes) {
             ASSERT_EQ(static_cast<DWORD>(TYMED_ISTREAM), medium.get().tymed);
             EXPECT_EQ(nullptr, medium.get().pUnkForRelease);
-            EXPECT_EQ("A,01,Z\r\n1,0.000,12.5,!,\r\n", ReadToEnd(medium.get().pstm));
+            std::string content;
+            char buffer[7];  // a few bytes a read, up to the short read that ends the file
+            ULONG got = 0;
+            do {
+                EXPECT_EQ(S_OK, medium.get().pstm->Read(buffer, sizeof buffer, &got));
+                content.append(buffer, got);
+            } while (got == sizeof buffer);
+            EXPECT_EQ(kContent, content);
         } else {
-            EXPECT_TRUE(dialogs.openAfterStrayOk) << "a stray IDOK must not end the download";
             EXPECT_EQ(static_cast<DWORD>(TYMED_NULL), medium.get().tymed);
         }
         EXPECT_FALSE(FileExists(dialogs.writtenPath)) << "read to the end, or never handed out";
@@ -154,15 +121,14 @@ TEST_F(FileContents, OnlyACompletedTransferGivesAStreamAndNoOutcomeLeavesADownlo
 
 TEST_F(FileContents, ADialogThatCannotRunIsAFailureAndCancelIsNoFile) {
     const std::vector<std::wstring> before = TemporaryDownloads();
-    const std::pair<INT_PTR, HRESULT> cases[] = {{-1, E_FAIL}, {IDCANCEL, S_FALSE}, {IDOK, S_FALSE}};
+    // IDOK from a dialog whose transfer never reported its end is no file either.
+    const std::pair<INT_PTR, HRESULT> cases[] = {
+        {-1, E_FAIL}, {IDCANCEL, S_FALSE}, {IDOK, S_FALSE}};
     for (const auto& [answer, expected] : cases) {
         ScriptedDialogs dialogs(answer);
         ScopedUserInterface scope(dialogs);
-        ComPtr<IDataObject> data = Over({L"Quorvel Digital Level\\North\\file1.lv"});
-        FORMATETC format = Request(CFSTR_FILECONTENTS, TYMED_ISTREAM, 0);
         UniqueStgMedium medium;
-        // IDOK from a dialog whose transfer never reported its end is no file either.
-        EXPECT_EQ(expected, data->GetData(&format, medium.put())) << answer;
+        EXPECT_EQ(expected, DownloadFile(kNorthFile, medium)) << answer;
         EXPECT_EQ(static_cast<DWORD>(TYMED_NULL), medium.get().tymed);
         EXPECT_EQ(1, dialogs.runs);
     }
@@ -172,58 +138,23 @@ TEST_F(FileContents, ADialogThatCannotRunIsAFailureAndCancelIsNoFile) {
 TEST_F(FileContents, TemporaryFolderFailuresAreFailureResultsAndRunNoDialog) {
     wchar_t saved[MAX_PATH] = {};
     ASSERT_NE(0u, ::GetEnvironmentVariableW(L"TMP", saved, MAX_PATH));
-    struct Case {
-        std::wstring folder;
-        HRESULT expected;  // 0: any failure
-    } const cases[] = {
+    const std::pair<std::wstring, HRESULT> cases[] = {
         // Longer than the 130 characters the temporary path may have.
         {L"C:\\" + std::wstring(140, L'x'), HRESULT_FROM_WIN32(ERROR_BUFFER_OVERFLOW)},
-        {L"C:\\no such folder for downloads", 0},
+        {L"C:\\no such folder for downloads", 0},  // 0: any failure
     };
-    for (const Case& test : cases) {
-        ASSERT_TRUE(::SetEnvironmentVariableW(L"TMP", test.folder.c_str()));
+    for (const auto& [folder, expected] : cases) {
+        ASSERT_TRUE(::SetEnvironmentVariableW(L"TMP", folder.c_str()));
         ScriptedDialogs dialogs(IDOK);
         ScopedUserInterface scope(dialogs);
-        ComPtr<IDataObject> data = Over({L"Quorvel Digital Level\\North\\file1.lv"});
-        FORMATETC format = Request(CFSTR_FILECONTENTS, TYMED_ISTREAM, 0);
         UniqueStgMedium medium;
-        const HRESULT result = data->GetData(&format, medium.put());
-        EXPECT_TRUE(FAILED(result)) << std::hex << result << ": a bare Win32 code passes for success";
-        if (test.expected != 0) {
-            EXPECT_EQ(test.expected, result);
+        const HRESULT result = DownloadFile(kNorthFile, medium);
+        EXPECT_TRUE(FAILED(result))
+            << std::hex << result << ": a bare Win32 code passes for success";
+        if (expected != 0) {
+            EXPECT_EQ(expected, result);
         }
         EXPECT_EQ(0, dialogs.runs);
     }
     ASSERT_TRUE(::SetEnvironmentVariableW(L"TMP", saved));
-}
-
-namespace {
-
-// Counts the releases that a medium's pUnkForRelease receives.
-class ReleaseCounter final : public IUnknown {
-public:
-    IFACEMETHODIMP QueryInterface(REFIID, void** object) override {
-        *object = nullptr;
-        return E_NOINTERFACE;
-    }
-    IFACEMETHODIMP_(ULONG) AddRef() override { return 2; }
-    IFACEMETHODIMP_(ULONG) Release() override { return static_cast<ULONG>(++releases); }
-    int releases = 0;
-};
-
-}  // namespace
-
-TEST_F(DataObject, SetDataReleasesTheMediumOnlyWhenItIsHandedOver) {
-    ComPtr<IDataObject> data = Over({L"Quorvel Digital Level\\North\\file1.lv"});
-    for (const BOOL handedOver : {FALSE, TRUE}) {
-        ReleaseCounter owner;
-        UniqueHGlobal block(::GlobalAlloc(GMEM_MOVEABLE, sizeof(DWORD)));
-        STGMEDIUM medium{};
-        medium.tymed = TYMED_HGLOBAL;
-        medium.hGlobal = block.get();
-        medium.pUnkForRelease = &owner;  // releasing the medium releases this, not the block
-        FORMATETC format = Request(L"Performed DropEffect", TYMED_HGLOBAL);
-        EXPECT_EQ(S_OK, data->SetData(&format, &medium, handedOver));
-        EXPECT_EQ(handedOver ? 1 : 0, owner.releases) << handedOver;
-    }
 }

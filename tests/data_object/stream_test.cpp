@@ -4,29 +4,24 @@
 #include <gtest/gtest.h>
 
 #include <cstring>
+#include <fstream>
 #include <vector>
 
 #include "support/module_lock.h"
+#include "tests/data_object/data_object_fixture.h"
 #include "view/stream2.h"
 
 namespace {
 
+// A temporary file of size bytes "ABC...ZAB...".
 std::wstring WriteTemporaryFile(size_t size) {
     wchar_t directory[MAX_PATH], path[MAX_PATH];
     ::GetTempPathW(MAX_PATH, directory);
     ::GetTempFileNameW(directory, L"TST", 0, path);
-    UniqueFileHandle file(::CreateFileW(path, GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS,
-                                        FILE_ATTRIBUTE_NORMAL, nullptr));
-    std::vector<char> bytes(size);
+    std::ofstream file(std::filesystem::path(path), std::ios::binary);
     for (size_t i = 0; i < size; ++i)
-        bytes[i] = static_cast<char>('A' + i % 26);
-    DWORD written = 0;
-    EXPECT_TRUE(::WriteFile(file.get(), bytes.data(), static_cast<DWORD>(size), &written, nullptr));
+        file.put(static_cast<char>('A' + i % 26));
     return path;
-}
-
-bool FileExists(const std::wstring& path) {
-    return ::GetFileAttributesW(path.c_str()) != INVALID_FILE_ATTRIBUTES;
 }
 
 }  // namespace

@@ -13,103 +13,58 @@
 
 namespace {
 
-constexpr LANGID kGerman = MAKELANGID(LANG_GERMAN, SUBLANG_GERMAN);
-constexpr wchar_t kMissingPort[] = L"COM49";  // never created by the tests' port pairs
-
 struct Received {
     UINT message;
     WPARAM code;
     std::wstring text;
 };
 
-// A message-only window that keeps what arrives and frees each text copy as the dialog does.
-class NotifyWindow {
-public:
-    NotifyWindow() {
-        static const ATOM windowClass = [] {
-            WNDCLASSW description{};
-            description.lpfnWndProc = &NotifyWindow::Procedure;
-            description.hInstance = ::GetModuleHandleW(nullptr);
-            description.lpszClassName = L"LVDownloadThreadTestWindow";
-            return ::RegisterClassW(&description);
-        }();
-        EXPECT_NE(windowClass, 0);
-        window_ = ::CreateWindowExW(0, L"LVDownloadThreadTestWindow", L"", 0, 0, 0, 0, 0,
-                                    HWND_MESSAGE, nullptr, ::GetModuleHandleW(nullptr), this);
-        ::SetWindowLongPtrW(window_, GWLP_USERDATA, reinterpret_cast<LONG_PTR>(this));
+// A thread that reports to a message-only window of this thread, for a station on a port that
+// is never created (COM49): its constructor already posts the port's failure.
+class DownloadThread : public ::testing::Test {
+protected:
+    void SetUp() override {
+        RegisterWindowMessages();
+        window_ = ::CreateWindowExW(0, L"STATIC", L"", 0, 0, 0, 0, 0, HWND_MESSAGE, nullptr,
+                                    nullptr, nullptr);
+        ASSERT_NE(window_, nullptr);
+        station_.Port = L"COM49";
+        station_.BaudRate = 4800;
+        station_.Parity = 1;
+        station_.DataBits = 8;
+        station_.StopBits = 2;
+        station_.Protocol = 2;
     }
-    ~NotifyWindow() { Destroy(); }
-    void Destroy() {
-        if (window_)
-            ::DestroyWindow(window_);
-        window_ = nullptr;
-    }
-    HWND get() const { return window_; }
+    void TearDown() override { ::DestroyWindow(window_); }
 
-    // Dispatches whatever is queued for this thread.
-    void Pump() {
+    // What was posted to the window, each text copy freed as the dialog does.
+    std::vector<Received> Pump() {
+        std::vector<Received> received;
         MSG message;
-        while (::PeekMessageW(&message, nullptr, 0, 0, PM_REMOVE))
-            ::DispatchMessageW(&message);
-    }
-    // Pumps until a message of that kind arrived or the time is up.
-    bool PumpUntil(UINT kind, DWORD milliseconds) {
-        const ULONGLONG end = ::GetTickCount64() + milliseconds;
-        while (::GetTickCount64() < end) {
-            Pump();
-            for (const Received& message : received)
-                if (message.message == kind)
-                    return true;
-            ::MsgWaitForMultipleObjects(0, nullptr, FALSE, 20, QS_ALLINPUT);
+        while (::PeekMessageW(&message, nullptr, 0, 0, PM_REMOVE)) {
+            if (message.message == g_registeredMessages.downloadThreadMessage) {
+                received.push_back({message.message, message.wParam,
+                                    reinterpret_cast<const wchar_t*>(message.lParam)});
+                CLVDownloadThread::FreeMessageText(message.lParam);
+            } else if (message.message == g_registeredMessages.downloadThreadFinished ||
+                       message.message == WM_CLOSE) {
+                received.push_back({message.message, message.wParam, L""});
+            } else {
+                ::DispatchMessageW(&message);
+            }
         }
-        return false;
-    }
-
-    std::vector<Received> received;
-
-private:
-    static LRESULT CALLBACK Procedure(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
-        auto* self = reinterpret_cast<NotifyWindow*>(::GetWindowLongPtrW(window, GWLP_USERDATA));
-        if (self && message == g_registeredMessages.downloadThreadMessage) {
-            self->received.push_back({message, wParam, reinterpret_cast<const wchar_t*>(lParam)});
-            CLVDownloadThread::FreeMessageText(lParam);
-            return 0;
-        }
-        if (self &&
-            (message == g_registeredMessages.downloadThreadFinished || message == WM_CLOSE)) {
-            self->received.push_back({message, wParam, L""});
-            return 0;
-        }
-        return ::DefWindowProcW(window, message, wParam, lParam);
+        return received;
     }
 
     HWND window_ = nullptr;
-};
-
-Station MissingPortStation() {
-    Station station;
-    station.Name = L"Level";
-    station.Port = kMissingPort;
-    station.BaudRate = 4800;
-    station.Parity = 1;
-    station.DataBits = 8;
-    station.StopBits = 2;
-    station.Protocol = 2;
-    return station;
-}
-
-class DownloadThread : public ::testing::Test {
-protected:
-    void SetUp() override { RegisterWindowMessages(); }
+    Station station_;
 };
 
 }  // namespace
 
 TEST_F(DownloadThread, ConnectionRecordAlwaysUsesSevenDataBitsOneStopBitSelectorOne) {
-    NotifyWindow window;
-    Station station = MissingPortStation();
-    station.Port = L"\\\\.\\COM12345678901234";
-    CLVDownloadThread thread(window.get(), station, L"C:\\out.lv");
+    station_.Port = L"\\\\.\\COM12345678901234";
+    CLVDownloadThread thread(window_, station_, L"C:\\out.lv");
     const TAZCommParams& record = thread.ConnectionRecord();
     EXPECT_EQ(record.DeviceControlBlock.BaudRate, 4800u);
     EXPECT_EQ(record.DeviceControlBlock.ByteSize, 7);
@@ -121,94 +76,80 @@ TEST_F(DownloadThread, ConnectionRecordAlwaysUsesSevenDataBitsOneStopBitSelector
     EXPECT_FALSE(thread.IsCancelled());
     thread.Stop();
     EXPECT_TRUE(thread.IsCancelled()) << "cancel is the stop request";
-    window.Pump();
 }
 
 TEST_F(DownloadThread, MissingPortReportsCodeFiftyThenClosesTheWindow) {
-    NotifyWindow window;
     RecordingUserInterface boxes;
     ScopedUserInterface seam(boxes);
-    CLVDownloadThread thread(window.get(), MissingPortStation(), L"C:\\out.lv");
+    CLVDownloadThread thread(window_, station_, L"C:\\out.lv");
     EXPECT_FALSE(thread.HasDriver());
     ASSERT_NE(thread.Start(), nullptr);
-    ASSERT_TRUE(window.PumpUntil(WM_CLOSE, 5000));
-    ASSERT_GE(window.received.size(), 2u);
-    const Received& portMessage = window.received[window.received.size() - 2];
-    EXPECT_EQ(portMessage.code, 50u);
-    EXPECT_EQ(portMessage.text, L"Can not open COM port. Port is already open by another program");
-    EXPECT_EQ(window.received.back().message, static_cast<UINT>(WM_CLOSE));
     // The state turns finished just before the thread's own end: poll the exit code.
     for (int tries = 0; tries < 500 && thread.GetExitCode() == STILL_ACTIVE; ++tries)
         ::Sleep(10);
     EXPECT_EQ(thread.GetStatus(), CThread::kFinished);
     EXPECT_EQ(thread.GetExitCode(), 0u);
+    const std::vector<Received> received = Pump();
+    ASSERT_EQ(received.size(), 2u);
+    EXPECT_EQ(received[0].code, 50u);
+    EXPECT_EQ(received[0].text, L"Can not open COM port. Port is already open by another program");
+    EXPECT_EQ(received[1].message, static_cast<UINT>(WM_CLOSE));
     // Only a failed receive shows the time-out box; no driver is not a receive.
     EXPECT_TRUE(boxes.MessageBoxes().empty());
 }
 
 TEST_F(DownloadThread, ProgressPostsPercentTextsAndNothingAtZero) {
-    NotifyWindow window;
-    CLVDownloadThread thread(window.get(), MissingPortStation(), L"C:\\out.lv");
-    window.Pump();
-    window.received.clear();
+    CLVDownloadThread thread(window_, station_, L"C:\\out.lv");
+    Pump();
     thread.SetProgress(100, 0);
     thread.SetProgress(100, 1);  // 0.99 truncates to 0
-    window.Pump();
-    EXPECT_TRUE(window.received.empty());
+    thread.SetProgress(0, 5);
+    EXPECT_TRUE(Pump().empty());
     thread.SetProgress(100, 3);
     thread.SetProgress(100, 100);
-    thread.SetProgress(0, 5);
-    window.Pump();
-    ASSERT_EQ(window.received.size(), 2u);
-    EXPECT_EQ(window.received[0].code, 1u);
-    EXPECT_EQ(window.received[0].text, L"Performing file transfer - 2% done");
-    EXPECT_EQ(window.received[1].text, L"Performing file transfer - 99% done");
+    const std::vector<Received> received = Pump();
+    ASSERT_EQ(received.size(), 2u);
+    EXPECT_EQ(received[0].code, 1u);
+    EXPECT_EQ(received[0].text, L"Performing file transfer - 2% done");
+    EXPECT_EQ(received[1].text, L"Performing file transfer - 99% done");
 }
 
 TEST_F(DownloadThread, ProgressComesInTheCreatorsLanguage) {
-    NotifyWindow window;
     const LANGID before = UiLanguage();
-    ASSERT_TRUE(SelectThreadUiLanguage(kGerman));
-    CLVDownloadThread thread(window.get(), MissingPortStation(), L"C:\\out.lv");
+    ASSERT_TRUE(SelectThreadUiLanguage(MAKELANGID(LANG_GERMAN, SUBLANG_GERMAN)));
+    CLVDownloadThread thread(window_, station_, L"C:\\out.lv");
     thread.SetProgress(100, 50);
     ASSERT_TRUE(SelectThreadUiLanguage(before));
-    window.Pump();
-    ASSERT_EQ(window.received.size(), 2u);
-    EXPECT_EQ(window.received[0].text,
+    const std::vector<Received> received = Pump();
+    ASSERT_EQ(received.size(), 2u);
+    EXPECT_EQ(received[0].text,
               L"COM-Port kann nicht geöffnet werden. Der Port wird bereits von einem anderen "
               L"Programm verwendet");
-    EXPECT_EQ(window.received[1].text, L"Dateiübertragung läuft - 49% erledigt");
+    EXPECT_EQ(received[1].text, L"Dateiübertragung läuft - 49% erledigt");
 }
 
 TEST_F(DownloadThread, ClosedWindowGetsNothingAndNoCopyIsMade) {
-    NotifyWindow window;
-    CLVDownloadThread thread(window.get(), MissingPortStation(), L"C:\\out.lv");
-    window.Pump();
-    window.received.clear();
-    const long live = CLVDownloadThread::LiveMessageTexts();
-    window.Destroy();
+    CLVDownloadThread thread(window_, station_, L"C:\\out.lv");
+    Pump();
+    ::DestroyWindow(window_);
     thread.ShowMessage(4, L"lost");
     thread.SetProgress(100, 50);
-    EXPECT_EQ(CLVDownloadThread::LiveMessageTexts(), live);
-    ASSERT_NE(thread.Start(), nullptr);
-    EXPECT_EQ(thread.Wait(INFINITE), WAIT_OBJECT_0);
-    window.Pump();
-    EXPECT_TRUE(window.received.empty());
+    EXPECT_EQ(CLVDownloadThread::LiveMessageTexts(), 0);
+    const HANDLE worker = thread.Start();
+    ASSERT_NE(worker, nullptr);
+    ASSERT_EQ(::WaitForSingleObject(worker, INFINITE), WAIT_OBJECT_0);
+    EXPECT_TRUE(Pump().empty());
 }
 
 TEST_F(DownloadThread, EveryPostedTextIsFreedOverTenThousandMessages) {
-    NotifyWindow window;
-    CLVDownloadThread thread(window.get(), MissingPortStation(), L"C:\\out.lv");
-    window.Pump();
-    window.received.clear();
-    const long live = CLVDownloadThread::LiveMessageTexts();
+    CLVDownloadThread thread(window_, station_, L"C:\\out.lv");
+    Pump();
+    size_t received = 0;
     for (int message = 0; message < 10000; ++message) {
         thread.ShowMessage(message % 2 ? 1 : 4, message % 3 ? L"line accepted" : L"");
         if (message % 500 == 499)
-            window.Pump();
+            received += Pump().size();
     }
-    window.Pump();
-    EXPECT_EQ(window.received.size(), 10000u);
-    EXPECT_EQ(CLVDownloadThread::LiveMessageTexts(), live);
-    EXPECT_EQ(live, 0);
+    EXPECT_EQ(received + Pump().size(), 10000u);
+    EXPECT_EQ(CLVDownloadThread::LiveMessageTexts(), 0);
 }

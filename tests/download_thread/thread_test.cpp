@@ -12,12 +12,15 @@ namespace {
 
 constexpr LANGID kGerman = MAKELANGID(LANG_GERMAN, SUBLANG_GERMAN);
 
-// Runs until released (or stopped), then returns a known code.
+// Runs until released (or stopped), then returns a known code; or throws at once.
 class GatedThread : public CThread {
 public:
-    GatedThread() : gate_(::CreateEventW(nullptr, TRUE, FALSE, nullptr)) {}
+    explicit GatedThread(bool throws = false)
+        : throws_(throws), gate_(::CreateEventW(nullptr, TRUE, FALSE, nullptr)) {}
     void Release() { ::SetEvent(gate_.get()); }
     DWORD Run() override {
+        if (throws_)
+            throw std::runtime_error("the work failed");
         language = UiLanguage();
         while (::WaitForSingleObject(gate_.get(), 10) == WAIT_TIMEOUT && !IsStopRequested()) {
         }
@@ -31,6 +34,7 @@ public:
     uint32_t stateAtEnd = 0;
 
 private:
+    const bool throws_;
     UniqueHandle gate_;
 };
 
@@ -43,8 +47,10 @@ TEST(Thread, StartOnRunningThreadReturnsItsHandleAndStartsNothing) {
     ASSERT_NE(first, nullptr);
     EXPECT_EQ(thread.GetStatus(), CThread::kRunning);
     EXPECT_EQ(thread.Start(), first);
+    EXPECT_EQ(thread.Wait(10), static_cast<DWORD>(WAIT_TIMEOUT)) << "the running thread's handle";
     thread.Release();
-    EXPECT_EQ(thread.Wait(INFINITE), WAIT_OBJECT_0);
+    // Not thread.Wait: the worker may already count as finished when it is called.
+    ASSERT_EQ(::WaitForSingleObject(first, INFINITE), WAIT_OBJECT_0);
     EXPECT_EQ(thread.GetStatus(), CThread::kFinished);
     EXPECT_EQ(thread.stateAtEnd, CThread::kFinished);
     EXPECT_EQ(thread.GetExitCode(), 42u);
@@ -59,12 +65,13 @@ TEST(Thread, FinishedThreadStartsAgainInTheCreatorsLanguageAndStopEndsTheWork) {
     GatedThread thread;
     ASSERT_TRUE(SelectThreadUiLanguage(before));
     thread.Release();
-    ASSERT_NE(thread.Start(), nullptr);
-    EXPECT_EQ(thread.Wait(INFINITE), WAIT_OBJECT_0);
-    EXPECT_EQ(thread.language, kGerman);
-    ASSERT_NE(thread.Start(), nullptr);
-    EXPECT_EQ(thread.Wait(INFINITE), WAIT_OBJECT_0);
+    for (int start = 0; start < 2; ++start) {
+        const HANDLE worker = thread.Start();
+        ASSERT_NE(worker, nullptr);
+        ASSERT_EQ(::WaitForSingleObject(worker, INFINITE), WAIT_OBJECT_0);
+    }
     EXPECT_EQ(thread.runs, 2);
+    EXPECT_EQ(thread.language, kGerman);
 
     GatedThread gated;
     ASSERT_NE(gated.Start(), nullptr);
@@ -76,7 +83,8 @@ TEST(Thread, SuspendAndResumeTrackTheCount) {
     GatedThread thread;
     EXPECT_EQ(thread.Suspend(), 0xFFFFFFFFu);
     EXPECT_EQ(thread.Resume(), 0xFFFFFFFFu);
-    ASSERT_NE(thread.Start(), nullptr);
+    const HANDLE worker = thread.Start();
+    ASSERT_NE(worker, nullptr);
     EXPECT_EQ(thread.Resume(), 0xFFFFFFFFu);  // running, not suspended
     EXPECT_EQ(thread.Suspend(), 0u);
     EXPECT_EQ(thread.GetStatus(), CThread::kSuspended);
@@ -87,7 +95,7 @@ TEST(Thread, SuspendAndResumeTrackTheCount) {
     EXPECT_EQ(thread.Resume(), 1u);
     EXPECT_EQ(thread.GetStatus(), CThread::kRunning);
     thread.Release();
-    EXPECT_EQ(thread.Wait(INFINITE), WAIT_OBJECT_0);
+    ::WaitForSingleObject(worker, INFINITE);
 }
 
 TEST(Thread, AlertableSleepReportsCompletion) {
@@ -96,23 +104,13 @@ TEST(Thread, AlertableSleepReportsCompletion) {
     EXPECT_TRUE(CThread::Sleep(1000, true));
 }
 
-namespace {
-
-class ThrowingThread : public CThread {
-public:
-    DWORD Run() override { throw std::runtime_error("the work failed"); }
-    void OnEnd() override { endRan = true; }
-    bool endRan = false;
-};
-
-}  // namespace
-
 TEST(Thread, WorkThatThrowsEndsTheThreadNotTheProcess) {
-    ThrowingThread thread;
+    GatedThread thread(true);
     ASSERT_NE(nullptr, thread.Start());
     for (int waited = 0; thread.GetExitCode() == STILL_ACTIVE && waited < 1000; ++waited)
         ::Sleep(10);
     EXPECT_EQ(CThread::kThreadFailed, thread.GetExitCode());
-    EXPECT_TRUE(thread.endRan) << "whoever waits for the worker still hears of its end";
+    EXPECT_EQ(CThread::kFinished, thread.stateAtEnd)
+        << "whoever waits for the worker still hears of its end";
     EXPECT_EQ(CThread::kFinished, thread.GetStatus());
 }

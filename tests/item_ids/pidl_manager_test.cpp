@@ -1,13 +1,16 @@
-// CPidlMgr through its slots and list operations.
+// CPidlMgr through its slots and list operations. The item bytes, paths and comparison scaling
+// themselves are proved natively by the portable item-layout tests; comparison through
+// CompareIDs by the shell folder tests.
 #include <windows.h>
 #include <shlobj.h>
 
 #include <gtest/gtest.h>
 
 #include <cstring>
+#include <vector>
 
 #include "namespace/pidl_manager.h"
-#include "stations/station_store.h"
+#include "tests/stations/station_builders.h"
 #include "tests/support/registry_override.h"
 
 namespace {
@@ -16,25 +19,26 @@ class PidlManager : public ::testing::Test {
 protected:
     UniquePidl Path(const wchar_t* path) { return UniquePidl(manager_.CreatePidlFromPath(path)); }
 
+    // The text GetPath leaves in a buffer of this capacity; lastCount_ gets what it returned.
     std::wstring PathText(LPCITEMIDLIST list, UINT capacity = 260) {
         std::wstring text(capacity, L'#');
-        const UINT count = manager_.GetPath(list, text.data(), capacity);
+        lastCount_ = manager_.GetPath(list, text.data(), capacity);
         text.resize(wcsnlen(text.c_str(), capacity));
-        lastCount_ = count;
         return text;
     }
 
-    std::vector<DWORD> Kinds(LPCITEMIDLIST list) {
+    std::vector<DWORD> KindsOf(LPCITEMIDLIST list) {
         std::vector<DWORD> kinds;
-        for (LPCITEMIDLIST item = list; item && item->mkid.cb; item = manager_.GetNextItem(item)) {
+        for (LPCITEMIDLIST item = list; item && item->mkid.cb; item = manager_.GetNextItem(item))
             kinds.push_back(ItemKind(reinterpret_cast<const uint8_t*>(item)));
-        }
         return kinds;
     }
 
     CPidlMgr manager_;
     UINT lastCount_ = 0;
 };
+
+using Kinds = std::vector<DWORD>;
 
 }  // namespace
 
@@ -53,26 +57,25 @@ TEST_F(PidlManager, CopiesAndJoinsCarryTheSlackBytes) {
 
 TEST_F(PidlManager, CreationFromPathsAndKindTestsOfTheLastItem) {
     UniquePidl full = Path(L"Quorvel Digital Level\\S1\\file1.lv");
-    EXPECT_EQ((std::vector<DWORD>{PT_ROOT, PT_STATION, PT_FILE}), Kinds(full.get()));
-    EXPECT_EQ((std::vector<DWORD>{PT_ROOT, PT_STATION, PT_FILE}),
-              Kinds(Path(L"\\A\\\\B\\C\\D\\E").get()))
+    UniquePidl station = Path(L"Quorvel Digital Level\\S1");
+    UniquePidl root = Path(L"Quorvel Digital Level");
+    EXPECT_EQ((Kinds{PT_ROOT, PT_STATION, PT_FILE}), KindsOf(full.get()));
+    EXPECT_EQ((Kinds{PT_ROOT}), KindsOf(root.get()));
+    EXPECT_EQ((Kinds{PT_ROOT, PT_STATION, PT_FILE}), KindsOf(Path(L"\\A\\\\B\\C\\D\\E").get()))
         << "empty components are skipped and a fourth is ignored";
-    EXPECT_FALSE(Path(L""));
-    EXPECT_FALSE(Path(L"\\\\"));
-    EXPECT_FALSE(Path(nullptr));
+    for (const wchar_t* nothing : {L"", L"\\\\", static_cast<const wchar_t*>(nullptr)})
+        EXPECT_FALSE(Path(nothing));
 
-    UniquePidl station(manager_.CreateItemPidl(L"Quorvel Digital Level\\S1\\file1.lv"));
-    EXPECT_EQ((std::vector<DWORD>{PT_STATION}), Kinds(station.get()));
+    UniquePidl stationItem(manager_.CreateItemPidl(L"Quorvel Digital Level\\S1\\file1.lv"));
+    EXPECT_EQ((Kinds{PT_STATION}), KindsOf(stationItem.get()));
     UniquePidl rootItem(manager_.CreateItemPidl(L"\\Quorvel Digital Level"));
-    EXPECT_EQ((std::vector<DWORD>{PT_ROOT}), Kinds(rootItem.get()));
+    EXPECT_EQ((Kinds{PT_ROOT}), KindsOf(rootItem.get()));
     EXPECT_EQ(L"Quorvel Digital Level", manager_.GetItemName(rootItem.get()));
 
-    UniquePidl stationPath = Path(L"Quorvel Digital Level\\S1");
-    UniquePidl root = Path(L"Quorvel Digital Level");
     EXPECT_TRUE(manager_.IsFile(full.get()));
     EXPECT_FALSE(manager_.IsFolder(full.get()));
-    EXPECT_TRUE(manager_.IsFolder(stationPath.get()));
-    EXPECT_FALSE(manager_.IsRoot(stationPath.get()));
+    EXPECT_TRUE(manager_.IsFolder(station.get()));
+    EXPECT_FALSE(manager_.IsRoot(station.get()));
     EXPECT_TRUE(manager_.IsRoot(root.get()));
     EXPECT_TRUE(manager_.IsRootItem(root.get()));
     EXPECT_TRUE(manager_.IsFolder(root.get()));
@@ -86,6 +89,7 @@ TEST_F(PidlManager, ListOperations) {
 
     UniquePidl parent(manager_.CopyParent(full.get()));
     EXPECT_EQ(L"Quorvel Digital Level\\S1", PathText(parent.get()));
+    EXPECT_EQ(26u, manager_.GetPath(parent.get(), nullptr, 0)) << "names, separator, terminator";
     UniquePidl single(manager_.CopyItem(full.get()));
     EXPECT_EQ(1u, manager_.GetItemCount(single.get()));
     EXPECT_FALSE(UniquePidl(manager_.CopyParent(single.get())));
@@ -105,29 +109,11 @@ TEST_F(PidlManager, ListOperations) {
     EXPECT_FALSE(UniquePidl(manager_.ConcatPidls(nullptr, nullptr)));
     EXPECT_EQ(nullptr, manager_.GetLastItem(nullptr));
     EXPECT_EQ(0u, manager_.GetSize(nullptr));
+    EXPECT_EQ(0, manager_.ComparePidls(1, nullptr, full.get()));
 
     const USHORT empty = 0;
     EXPECT_EQ(2u, manager_.GetSize(reinterpret_cast<LPCITEMIDLIST>(&empty)));
     EXPECT_EQ(nullptr, manager_.GetLastItem(reinterpret_cast<LPCITEMIDLIST>(&empty)));
-}
-
-TEST_F(PidlManager, ComparisonIgnoresCaseScalesBySignAndEqualsAcrossKinds) {
-    UniquePidl a(manager_.CreateItemPidl(L"Q\\alpha"));
-    UniquePidl b(manager_.CreateItemPidl(L"Q\\Beta"));
-    UniquePidl upperA(manager_.CreateItemPidl(L"Q\\ALPHA"));
-    UniquePidl file = Path(L"Q\\S\\alpha");
-
-    EXPECT_LT(manager_.ComparePidls(0, a.get(), b.get()), 0);
-    EXPECT_GT(manager_.ComparePidls(0, b.get(), a.get()), 0);
-    EXPECT_EQ(0, manager_.ComparePidls(0, a.get(), upperA.get()));
-    EXPECT_EQ(-manager_.ComparePidls(0, a.get(), b.get()),
-              manager_.ComparePidls(-1, a.get(), b.get()));
-    EXPECT_EQ(3 * manager_.ComparePidls(0, a.get(), b.get()),
-              manager_.ComparePidls(3, a.get(), b.get()));
-
-    UniquePidl fileItem(manager_.CopyFromIndex(file.get(), 2));
-    EXPECT_EQ(0, manager_.ComparePidls(0, a.get(), fileItem.get())) << "station against file";
-    EXPECT_EQ(0, manager_.ComparePidls(1, nullptr, a.get()));
 }
 
 TEST_F(PidlManager, ParsingPrefixIsCopiedWithoutTerminatorWhenCut) {
@@ -142,21 +128,18 @@ TEST_F(PidlManager, ParsingPrefixIsCopiedWithoutTerminatorWhenCut) {
 
 TEST_F(PidlManager, ValidityFollowsTheStore) {
     RegistryOverride registry;
-    Station station = DefaultStation();
-    station.Name = L"Station 1";
-    ASSERT_EQ(S_OK, AddStation(station));
-
-    UniquePidl stationItem(manager_.CreateItemPidl(L"Quorvel Digital Level\\Station 1"));
+    AddStationOfModel(L"Station 1");
+    UniquePidl station(manager_.CreateItemPidl(L"Quorvel Digital Level\\Station 1"));
     UniquePidl otherCase(manager_.CreateItemPidl(L"Quorvel Digital Level\\station 1"));
     UniquePidl file = Path(L"Quorvel Digital Level\\Gone\\file1.lv");
     UniquePidl fileItem(manager_.CopyFromIndex(file.get(), 2));
-    EXPECT_TRUE(manager_.IsValid(stationItem.get()));
+    EXPECT_TRUE(manager_.IsValid(station.get()));
     EXPECT_FALSE(manager_.IsValid(otherCase.get())) << "the store compares names case-sensitively";
     EXPECT_TRUE(manager_.IsValid(fileItem.get()));
     EXPECT_TRUE(manager_.IsValid(file.get())) << "only the first item is looked at";
 
-    ASSERT_EQ(S_OK, DeleteStation(station));
-    EXPECT_FALSE(manager_.IsValid(stationItem.get()));
+    ASSERT_EQ(S_OK, DeleteStation(Named(L"Station 1")));
+    EXPECT_FALSE(manager_.IsValid(station.get()));
 }
 
 TEST_F(PidlManager, MalformedItemsFromOutsideAreNeverReadPastTheirSize) {
@@ -170,6 +153,6 @@ TEST_F(PidlManager, MalformedItemsFromOutsideAreNeverReadPastTheirSize) {
     } __attribute__((packed)) truncated;
     const auto* list = reinterpret_cast<LPCITEMIDLIST>(&truncated);
     EXPECT_EQ(L"", manager_.GetItemName(list));
-    EXPECT_FALSE(IsWellFormedItem(reinterpret_cast<const uint8_t*>(list)));
+    EXPECT_FALSE(manager_.IsWellFormedList(list));
     EXPECT_EQ(L"", PathText(list)) << "an unnamed item adds only its separator, which is removed";
 }

@@ -2,7 +2,6 @@
 #include <gtest/gtest.h>
 
 #include <cstdint>
-#include <cstring>
 #include <vector>
 
 #include "namespace/portable/item_id_layout.h"
@@ -20,8 +19,7 @@ Bytes MakeList(std::initializer_list<std::pair<uint32_t, WideString>> items) {
         WriteItem(item.data(), kind, data.data(), data.size());
         list.insert(list.end(), item.begin(), item.end() - kListTerminatorSize);
     }
-    list.push_back(0);
-    list.push_back(0);
+    list.insert(list.end(), {0, 0});
     return list;
 }
 
@@ -78,8 +76,8 @@ TEST(ItemLayout, SplitPathKeepsOnlyNonEmptyComponents) {
     EXPECT_EQ(Parts({WIDE_TEXT("A"), WIDE_TEXT("B")}),
               SplitPathComponents(WIDE_TEXT("\\\\A\\\\B\\")));
     EXPECT_EQ(Parts({WIDE_TEXT("Station 1")}), SplitPathComponents(WIDE_TEXT("Station 1")));
-    EXPECT_TRUE(SplitPathComponents(WIDE_TEXT("")).empty());
-    EXPECT_TRUE(SplitPathComponents(WIDE_TEXT("\\\\\\")).empty());
+    EXPECT_EQ(Parts(), SplitPathComponents(WIDE_TEXT("")));
+    EXPECT_EQ(Parts(), SplitPathComponents(WIDE_TEXT("\\\\\\")));
 }
 
 TEST(ListPath, JoinsNamesWithoutOuterSeparatorsAndCountsTheNeededCapacity) {
@@ -91,9 +89,7 @@ TEST(ListPath, JoinsNamesWithoutOuterSeparatorsAndCountsTheNeededCapacity) {
     EXPECT_EQ(40u, count);
     EXPECT_EQ(42u, BuildListPath(list.data(), nullptr, 0)) << "every name and separator";
     EXPECT_EQ(0u, BuildListPath(nullptr, nullptr, 0));
-
-    const Bytes empty = {0, 0};
-    EXPECT_EQ(WIDE_TEXT(""), PathOf(empty, 260, &count));
+    EXPECT_EQ(WIDE_TEXT(""), PathOf({0, 0}, 260, &count));
     EXPECT_EQ(0u, count);
 }
 
@@ -103,33 +99,29 @@ TEST(ListPath, SmallBufferIsNeverOverrun) {
         std::vector<WideChar> buffer(capacity + 4, WIDE_TEXT('#'));
         BuildListPath(list.data(), buffer.data(), capacity);
         EXPECT_LT(BoundedLength(buffer.data(), capacity), capacity) << capacity;
-        for (size_t guard = capacity; guard < capacity + 4; ++guard) {
-            EXPECT_EQ(WIDE_TEXT('#'), buffer[guard]) << "capacity " << capacity;
-        }
+        EXPECT_EQ(std::vector<WideChar>(4, WIDE_TEXT('#')),
+                  std::vector<WideChar>(buffer.begin() + capacity, buffer.end()))
+            << "capacity " << capacity;
     }
     // Ten characters hold nine and the terminator.
     EXPECT_EQ(WIDE_TEXT("Quorvel D"), PathOf(list, 10));
 }
 
 TEST(ItemComparison, ScalesByTheColumnArgumentWithDefinedArithmeticForShellBits) {
-    struct Case {
+    const struct {
         int32_t order;
         uint32_t column;
         int32_t expected;
-    } const cases[] = {
-        {-3, 0, -3},
-        {5, 1, 5},
-        {-1, 2, -2},
-        {7, 0xFFFFFFFFu, -7},
+    } cases[] = {
+        // clang-format off
+        {-3, 0, -3}, {5, 1, 5}, {-1, 2, -2}, {7, 0xFFFFFFFFu, -7},
         // SHCIDS_CANONICALONLY (0x10000000) and SHCIDS_ALLFIELDS (0x80000000): the product is
         // taken modulo 2^32 instead of overflowing an int.
-        {1, 0x10000000u, 0x10000000},
-        {16, 0x10000000u, 0},
-        {1, 0x80000000u, INT32_MIN},
-        {-1, 0x80000000u, INT32_MIN},
-        {-2, 0x80000001u, -2},
+        {1, 0x10000000u, 0x10000000}, {16, 0x10000000u, 0},
+        {1, 0x80000000u, INT32_MIN}, {-1, 0x80000000u, INT32_MIN}, {-2, 0x80000001u, -2},
+        // clang-format on
     };
-    for (const Case& test : cases) {
+    for (const auto& test : cases) {
         EXPECT_EQ(test.expected, ScaleComparison(test.order, static_cast<int32_t>(test.column)))
             << test.order << " x " << std::hex << test.column;
     }

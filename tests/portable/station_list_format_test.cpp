@@ -9,20 +9,11 @@
 namespace {
 
 Station SampleStation(const WideString& name) {
-    Station station;
-    station.Name = name;
-    station.Port = WIDE_TEXT("COM3");
-    station.Manufacturer = WIDE_TEXT("Maker");
-    station.Model = WIDE_TEXT("Quorvel LV-20");
-    station.Software = WIDE_TEXT("v2");
-    station.BaudRate = 19200;
-    station.StopBits = 2;
-    station.Parity = 1;
-    station.Protocol = 3;
-    station.DataBits = 8;
-    station.Flow = 4;
-    station.CheckSum = 0;
-    return station;
+    // The texts, then BaudRate, StopBits, Parity, Protocol, DataBits, Flow and CheckSum.
+    // clang-format off
+    return {name, WIDE_TEXT("COM3"), WIDE_TEXT("Maker"), WIDE_TEXT("Quorvel LV-20"), WIDE_TEXT("v2"),
+            19200, 2, 1, 3, 8, 4, 0};
+    // clang-format on
 }
 
 std::vector<Station> Parse(const std::vector<uint8_t>& block) {
@@ -34,33 +25,25 @@ std::vector<Station> Parse(const std::vector<uint8_t>& block) {
 }  // namespace
 
 TEST(StationListFormat, FlatRecordHasTheInteroperableFieldOrder) {
-    Station station;
-    station.Name = WIDE_TEXT("A");
-    station.Port = WIDE_TEXT("C");
-    station.Model = WIDE_TEXT("M");
-    station.BaudRate = 0x11111111;
-    station.StopBits = 0x22222222;
-    station.Parity = 0x33333333;
-    station.DataBits = 0x44444444;
-    station.Protocol = 0x55555555;
-    station.Flow = 0x66666666;
-    station.CheckSum = 0x77777777;
-    // 2 × (1 + 1 + 0 + 1 + 0 + 5) + 28
-    ASSERT_EQ(44u, FlatStationRecordSize(station));
-
-    const std::vector<uint8_t> block = SerializeStationRecords({station});
-    // clang-format off: one row a field group
+    // One row a field group.
+    // clang-format off
+    const Station station = {.Name = WIDE_TEXT("A"), .Port = WIDE_TEXT("C"),
+                             .Manufacturer = WIDE_TEXT(""), .Model = WIDE_TEXT("M"),
+                             .Software = WIDE_TEXT(""), .BaudRate = 0x11111111,
+                             .StopBits = 0x22222222, .Parity = 0x33333333, .Protocol = 0x55555555,
+                             .DataBits = 0x44444444, .Flow = 0x66666666, .CheckSum = 0x77777777};
     const std::vector<uint8_t> expected = {
-        1,    0,    0,    0,                          // count
-        44,   0,    0,    0,                          // record size
-        'A',  0,    0,    0,    'C',  0,    0,    0,  // Name, Port
-        0x11, 0x11, 0x11, 0x11, 0x22, 0x22, 0x22, 0x22, 0x33, 0x33, 0x33, 0x33,
-        0x44, 0x44, 0x44, 0x44,                       // BaudRate, StopBits, Parity, DataBits
-        0,    0,    'M',  0,    0,    0,    0,    0,  // Manufacturer, Model, Software
-        0x55, 0x55, 0x55, 0x55, 0x66, 0x66, 0x66, 0x66, 0x77, 0x77, 0x77, 0x77};  // Protocol, Flow,
+        1, 0, 0, 0,  44, 0, 0, 0,                           // count, record size
+        'A', 0, 0, 0,  'C', 0, 0, 0,                        // Name, Port
+        0x11, 0x11, 0x11, 0x11,  0x22, 0x22, 0x22, 0x22,    // BaudRate, StopBits
+        0x33, 0x33, 0x33, 0x33,  0x44, 0x44, 0x44, 0x44,    // Parity, DataBits
+        0, 0,  'M', 0, 0, 0,  0, 0,                         // Manufacturer, Model, Software
+        0x55, 0x55, 0x55, 0x55,  0x66, 0x66, 0x66, 0x66,    // Protocol, Flow
+        0x77, 0x77, 0x77, 0x77};                            // CheckSum
     // clang-format on
-    // CheckSum
-    EXPECT_EQ(expected, block);
+    // 2 × (1 + 1 + 0 + 1 + 0 + 5) + 28
+    EXPECT_EQ(44u, FlatStationRecordSize(station));
+    EXPECT_EQ(expected, SerializeStationRecords({station}));
 }
 
 TEST(StationListFormat, RoundTripKeepsEveryFieldAndTheOrder) {
@@ -71,9 +54,9 @@ TEST(StationListFormat, RoundTripKeepsEveryFieldAndTheOrder) {
 }
 
 TEST(StationListFormat, LyingCountsAndSizesStopWithTheCompleteRecordsBefore) {
-    const std::vector<uint8_t> two =
-        SerializeStationRecords({SampleStation(WIDE_TEXT("A")), SampleStation(WIDE_TEXT("B"))});
-    const size_t secondSize = 4 + 4 + FlatStationRecordSize(SampleStation(WIDE_TEXT("A")));
+    const std::vector<Station> stations = {SampleStation(WIDE_TEXT("A")), Station{}};
+    const std::vector<uint8_t> two = SerializeStationRecords(stations);
+    const size_t secondSize = 4 + 4 + FlatStationRecordSize(stations[0]);
     const struct {
         size_t offset;
         uint32_t value;
@@ -89,10 +72,9 @@ TEST(StationListFormat, LyingCountsAndSizesStopWithTheCompleteRecordsBefore) {
     for (const auto& test : cases) {
         std::vector<uint8_t> block = two;
         WriteU32(block.data() + test.offset, test.value);
-        const std::vector<Station> parsed = Parse(block);
-        ASSERT_EQ(test.parsed, parsed.size()) << test.offset << " " << test.value;
-        for (size_t i = 0; i < parsed.size(); ++i)
-            EXPECT_EQ(i ? WIDE_TEXT("B") : WIDE_TEXT("A"), parsed[i].Name);
+        EXPECT_EQ(std::vector<Station>(stations.begin(), stations.begin() + test.parsed),
+                  Parse(block))
+            << test.offset << " " << test.value;
     }
     // One record whose name fills the whole block with no terminator.
     EXPECT_TRUE(Parse({1, 0, 0, 0, 8, 0, 0, 0, 'N', 0, 'N', 0, 'N', 0, 'N', 0}).empty());
@@ -103,20 +85,15 @@ TEST(StationListFormat, EveryTruncationYieldsOnlyCompleteRecords) {
                                            SampleStation(WIDE_TEXT("Two")),
                                            SampleStation(WIDE_TEXT("Three"))};
     const std::vector<uint8_t> block = SerializeStationRecords(stations);
-    size_t end = 4;
-    std::vector<size_t> recordEnds;
-    for (const Station& station : stations) {
-        end += 4 + FlatStationRecordSize(station);
-        recordEnds.push_back(end);
-    }
+    std::vector<size_t> ends = {4};  // the count, then each record's size field and record
+    for (const Station& station : stations)
+        ends.push_back(ends.back() + 4 + FlatStationRecordSize(station));
     for (size_t length = 0; length <= block.size(); ++length) {
-        const std::vector<uint8_t> prefix(block.begin(), block.begin() + length);
         size_t complete = 0;
-        while (complete < recordEnds.size() && recordEnds[complete] <= length)
+        while (complete < stations.size() && ends[complete + 1] <= length)
             ++complete;
-        const std::vector<Station> parsed = Parse(prefix);
-        ASSERT_EQ(complete, parsed.size()) << "length " << length;
-        for (size_t i = 0; i < complete; ++i)
-            EXPECT_EQ(stations[i], parsed[i]);
+        EXPECT_EQ(std::vector<Station>(stations.begin(), stations.begin() + complete),
+                  Parse(std::vector<uint8_t>(block.begin(), block.begin() + length)))
+            << "length " << length;
     }
 }

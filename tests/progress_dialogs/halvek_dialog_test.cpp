@@ -1,46 +1,27 @@
-// The external-library dialog with the substitute library: success, every result code, set-up
-// failures, cancel before and after Start; the adapter's port number and points buffer.
+// The external-library dialog with the substitute library: success, every failure the library
+// can report, cancel before and after Start, German texts; the adapter's port number, points
+// buffer, file path and the library's table slots.
 #include "download/halvek_download_progress_dialog.h"
 
-#include <gtest/gtest.h>
-
+#include <array>
 #include <cstring>
-#include <filesystem>
-#include <fstream>
+#include <cwchar>
 #include <memory>
-#include <sstream>
+#include <utility>
 
 #include "res/resource.h"
-#include "stations/station_store.h"
-#include "support/registered_messages.h"
 #include "support/text_lookup.h"
-#include "support/user_interface.h"
-#include "tests/support/recording_user_interface.h"
 #include "tests/progress_dialogs/dialog_driver.h"
 
 namespace {
 
 namespace fs = std::filesystem;
 
-std::string ReadAll(const fs::path& path) {
-    std::ifstream file(path, std::ios::binary);
-    std::stringstream content;
-    content << file.rdbuf();
-    return content.str();
-}
-
-class HalvekDialog : public ::testing::Test {
+class HalvekDialog : public DialogTest {
 protected:
     void SetUp() override {
-        RegisterWindowMessages();
-        wchar_t temp[MAX_PATH] = {};
-        ::GetTempPathW(MAX_PATH, temp);
-        const std::wstring stem = L"lv_halvek_" + std::to_wstring(::GetCurrentProcessId());
-        output_ = fs::path(temp) / (stem + L".hvr");
-        log_ = fs::path(temp) / (stem + L".log");
-        fs::remove(output_.wstring() + L".txt");
-        fs::remove(log_);
-        SetVariable(L"HALVEKCOMM_LOG", log_.wstring());
+        DialogTest::SetUp();
+        ::SetEnvironmentVariableW(L"HALVEKCOMM_LOG", log_.c_str());
         station_.Name = L"North benchmark";
         station_.Port = L"COM12";
         station_.Model = LoadUiText(IDS_MODEL_LV20);
@@ -48,41 +29,17 @@ protected:
     void TearDown() override {
         for (const wchar_t* name :
              {L"HALVEKCOMM_LOG", L"HALVEKCOMM_RESULT", L"HALVEKCOMM_START_RESULT",
-              L"HALVEKCOMM_FAIL", L"HALVEKCOMM_DELAY_MS", L"HALVEKCOMM_IGNORE_CANCEL",
-              L"HALVEKCOMM_CANCEL_DELAY_MS"}) {
+              L"HALVEKCOMM_FAIL", L"HALVEKCOMM_DELAY_MS", L"HALVEKCOMM_CANCEL_DELAY_MS"})
             ::SetEnvironmentVariableW(name, nullptr);
-        }
         std::error_code ignored;
-        fs::remove(output_.wstring() + L".txt", ignored);
+        fs::remove(written_, ignored);
         fs::remove(log_, ignored);
-    }
-    static void SetVariable(const wchar_t* name, const std::wstring& value) {
-        ::SetEnvironmentVariableW(name, value.c_str());
-    }
-    // Presses Start and returns the dialog's result.
-    INT_PTR StartAndRun() {
-        CHalvekDownloadProgressDialog dialog(nullptr, station_, output_.wstring());
-        return RunDialog(dialog, [](DialogDriver& driver) {
-            ASSERT_NE(driver.WaitForDialog(), nullptr);
-            driver.Press(IDC_START);
-        });
-    }
-    // The one error box of a failed run.
-    void ExpectOneErrorBox(const std::wstring& text,
-                           const std::wstring& caption = L"Quorvel Digital Levels") {
-        const auto boxes = user_.MessageBoxes();
-        ASSERT_EQ(boxes.size(), 1u);
-        EXPECT_EQ(boxes[0].text, text);
-        EXPECT_EQ(boxes[0].caption, caption);
-        EXPECT_EQ(boxes[0].style, static_cast<UINT>(MB_ICONEXCLAMATION));
-        EXPECT_NE(boxes[0].owner, nullptr);
     }
 
     Station station_;
-    fs::path output_;
-    fs::path log_;
-    RecordingUserInterface user_;
-    ScopedUserInterface seam_{user_};
+    const fs::path output_ = TemporaryFile(L"halvek.hvr");
+    const fs::path written_ = output_.wstring() + L".txt";  // the library adds ".txt"
+    const fs::path log_ = TemporaryFile(L"halvek.log");
 };
 
 }  // namespace
@@ -90,86 +47,67 @@ protected:
 TEST_F(HalvekDialog, StartEndsWithOkAndTheLibraryWroteTheFile) {
     auto dialog =
         std::make_unique<CHalvekDownloadProgressDialog>(nullptr, station_, output_.wstring());
-    const INT_PTR result = RunDialog(*dialog, [&](DialogDriver& driver) {
-        ASSERT_NE(driver.WaitForDialog(), nullptr);
-        EXPECT_EQ(driver.Title(), L"Download file from Digital Level");
-        EXPECT_EQ(driver.Text(IDC_STATUS_TEXT), L"Waiting for start...");
-        EXPECT_EQ(driver.Text(IDC_STATION_NAME), L"North benchmark");
-        EXPECT_EQ(driver.Text(IDC_INSTRUCTIONS), LoadUiText(IDS_INSTRUCTIONS_LV20));
-        driver.Press(IDC_START);
-    });
+    const INT_PTR result = RunDialog(*dialog, [](HWND window) { Press(window, IDC_START); });
     dialog.reset();  // deletes the library object
     EXPECT_EQ(result, IDOK);
     EXPECT_TRUE(user_.MessageBoxes().empty());
-    EXPECT_EQ(ReadAll(output_.wstring() + L".txt").substr(0, 10), "HVR2X,JOB,");
+    EXPECT_EQ(ReadAll(written_).substr(0, 10), "HVR2X,JOB,");
 
     const std::string log = ReadAll(log_);
-    const std::string expected[] = {
-        "CreateInstance\r\nInitialize\r\nSetFilePath ",
-        "SetTimeout 30\r\nSetPoints markers=10000\r\n"
-        "SetCommParams port=12 baud=9600 parity=2 stop=0 flow=0 data=7 checksum=1\r\n"
-        "SetCallback\r\nStartDownload 20 1\r\n",
-        "Completed 0\r\nDeleteObject 1\r\n"};
-    for (const std::string& part : expected)
+    for (const char* part :
+         {"CreateInstance\r\nInitialize\r\nSetFilePath ",
+          "SetTimeout 30\r\nSetPoints markers=10000\r\n"
+          "SetCommParams port=12 baud=9600 parity=2 stop=0 flow=0 data=7 checksum=1\r\n"
+          "SetCallback\r\nStartDownload 20 1\r\n",
+          "Completed 0\r\nDeleteObject 1\r\n"})
         EXPECT_NE(log.find(part), std::string::npos) << part << "\nin\n" << log;
 }
 
-TEST_F(HalvekDialog, EachResultCodeShowsItsTextAndCancels) {
-    const std::pair<int, const wchar_t*> codes[] = {
-        {-101, L"The waiting time of the data has expired."},
-        {-102, L"The communication's process is interrupted by the user"},
-        {-201, L"Unable to create file for saving"},
-        {-202, L"Unable to create file for saving"},
-        {-203, L"Unable to create file for saving"},
-        {-204, L"The checksum is incorrect"},
-        {-301, L"Temporary file open error"},
-        {-302, L"Point name or memo is wrong"},
-        {-7, L"Unknown error"}};
-    for (const auto& [code, text] : codes) {
+TEST_F(HalvekDialog, EachFailureShowsItsTextInOneBoxAndCancelsWithoutAFile) {
+    struct Case {
+        const wchar_t* setting;  // of the substitute library
+        const wchar_t* value;
+        const wchar_t* text;
+    } const cases[] = {
+        // The result the library reports at the end of the transfer.
+        {L"HALVEKCOMM_RESULT", L"-101", L"The waiting time of the data has expired."},
+        {L"HALVEKCOMM_RESULT", L"-102", L"The communication's process is interrupted by the user"},
+        {L"HALVEKCOMM_RESULT", L"-201", L"Unable to create file for saving"},
+        {L"HALVEKCOMM_RESULT", L"-202", L"Unable to create file for saving"},
+        {L"HALVEKCOMM_RESULT", L"-203", L"Unable to create file for saving"},
+        {L"HALVEKCOMM_RESULT", L"-204", L"The checksum is incorrect"},
+        {L"HALVEKCOMM_RESULT", L"-301", L"Temporary file open error"},
+        {L"HALVEKCOMM_RESULT", L"-302", L"Point name or memo is wrong"},
+        {L"HALVEKCOMM_RESULT", L"-7", L"Unknown error"},
+        // A refused start, and each set-up step that fails: the download never starts.
+        {L"HALVEKCOMM_START_RESULT", L"-204", L"The checksum is incorrect"},
+        {L"HALVEKCOMM_FAIL", L"SetFilePath", L"Unable to set file path"},
+        {L"HALVEKCOMM_FAIL", L"SetTimeout", L"Unable to set timeout"},
+        {L"HALVEKCOMM_FAIL", L"SetPoints", L"Unable to set points"},
+        {L"HALVEKCOMM_FAIL", L"SetCommParams", L"Unable to set communication parameters"},
+    };
+    for (const Case& test : cases) {
+        SCOPED_TRACE(testing::Message() << test.setting << "=" << test.value);
         RecordingUserInterface user;
         ScopedUserInterface seam(user);
-        SetVariable(L"HALVEKCOMM_RESULT", std::to_wstring(code));
-        EXPECT_EQ(StartAndRun(), IDCANCEL) << code;
-        const auto boxes = user.MessageBoxes();
-        ASSERT_EQ(boxes.size(), 1u) << code;
-        EXPECT_EQ(boxes[0].text, text) << code;
-        EXPECT_FALSE(fs::exists(output_.wstring() + L".txt")) << code;
+        fs::remove(log_);
+        ::SetEnvironmentVariableW(test.setting, test.value);
+        CHalvekDownloadProgressDialog dialog(nullptr, station_, output_.wstring());
+        EXPECT_EQ(RunDialog(dialog, [](HWND window) { Press(window, IDC_START); }), IDCANCEL);
+        ::SetEnvironmentVariableW(test.setting, nullptr);
+        ExpectOneBox(user, test.text, MB_ICONEXCLAMATION);
+        EXPECT_FALSE(fs::exists(written_));
+        const bool setUpFailed = std::wcscmp(test.setting, L"HALVEKCOMM_FAIL") == 0;
+        EXPECT_EQ(ReadAll(log_).find("StartDownload") == std::string::npos, setUpFailed)
+            << "the steps after a failed one never run";
     }
-    EXPECT_EQ(HalvekResultText(0), L"No error");
-}
-
-TEST_F(HalvekDialog, RefusedStartShowsTheCodesText) {
-    SetVariable(L"HALVEKCOMM_START_RESULT", L"-204");
-    EXPECT_EQ(StartAndRun(), IDCANCEL);
-    ExpectOneErrorBox(L"The checksum is incorrect");
-}
-
-TEST_F(HalvekDialog, EachFailedSetUpStepShowsItsText) {
-    const std::pair<const wchar_t*, const wchar_t*> steps[] = {
-        {L"SetFilePath", L"Unable to set file path"},
-        {L"SetTimeout", L"Unable to set timeout"},
-        {L"SetPoints", L"Unable to set points"},
-        {L"SetCommParams", L"Unable to set communication parameters"}};
-    for (const auto& [operation, text] : steps) {
-        RecordingUserInterface user;
-        ScopedUserInterface seam(user);
-        SetVariable(L"HALVEKCOMM_FAIL", operation);
-        EXPECT_EQ(StartAndRun(), IDCANCEL) << operation;
-        const auto boxes = user.MessageBoxes();
-        ASSERT_EQ(boxes.size(), 1u) << operation;
-        EXPECT_EQ(boxes[0].text, text);
-    }
-    // The steps after a failed one never ran.
-    const std::string log = ReadAll(log_);
-    EXPECT_EQ(log.find("StartDownload"), std::string::npos) << log;
 }
 
 TEST_F(HalvekDialog, CancelBeforeStartEndsAtOnce) {
     CHalvekDownloadProgressDialog dialog(nullptr, station_, output_.wstring());
-    const INT_PTR result = RunDialog(dialog, [](DialogDriver& driver) {
-        ASSERT_NE(driver.WaitForDialog(), nullptr);
-        driver.Press(IDCANCEL);
-        EXPECT_TRUE(driver.WaitUntilClosed(5000));
+    const INT_PTR result = RunDialog(dialog, [](HWND window) {
+        Press(window, IDCANCEL);
+        EXPECT_TRUE(WaitFor([&] { return !::IsWindow(window); }, 5000));
     });
     EXPECT_EQ(result, IDCANCEL);
     EXPECT_TRUE(user_.MessageBoxes().empty());
@@ -178,40 +116,43 @@ TEST_F(HalvekDialog, CancelBeforeStartEndsAtOnce) {
 }
 
 TEST_F(HalvekDialog, CancelAfterStartWaitsForTheLibrarysEnd) {
-    SetVariable(L"HALVEKCOMM_DELAY_MS", L"20000");
-    SetVariable(L"HALVEKCOMM_CANCEL_DELAY_MS", L"1500");
+    ::SetEnvironmentVariableW(L"HALVEKCOMM_DELAY_MS", L"20000");
+    ::SetEnvironmentVariableW(L"HALVEKCOMM_CANCEL_DELAY_MS", L"1500");
     CHalvekDownloadProgressDialog dialog(nullptr, station_, output_.wstring());
     const ULONGLONG started = ::GetTickCount64();
-    const INT_PTR result = RunDialog(dialog, [](DialogDriver& driver) {
-        ASSERT_NE(driver.WaitForDialog(), nullptr);
-        driver.Press(IDC_START);
-        ASSERT_TRUE(driver.WaitForText(IDC_STATUS_TEXT, L"Downloading...", 5000));
-        EXPECT_FALSE(driver.IsEnabled(IDC_START));
+    const INT_PTR result = RunDialog(dialog, [](HWND window) {
+        Press(window, IDC_START);
+        ASSERT_TRUE(WaitForText(window, IDC_STATUS_TEXT, L"Downloading...", 5000));
+        EXPECT_FALSE(IsEnabled(window, IDC_START));
         // The library takes a while to wind down; meanwhile the dialog stays open.
-        driver.Press(IDCANCEL);
-        EXPECT_TRUE(driver.WaitForText(IDC_STATUS_TEXT, L"Terminating connection...", 5000));
+        Press(window, IDCANCEL);
+        EXPECT_TRUE(WaitForText(window, IDC_STATUS_TEXT, L"Terminating connection...", 5000));
     });
     EXPECT_EQ(result, IDCANCEL);
     EXPECT_LT(::GetTickCount64() - started, 15000u);
-    ExpectOneErrorBox(L"The communication's process is interrupted by the user");
+    ExpectOneBox(user_, L"The communication's process is interrupted by the user",
+                 MB_ICONEXCLAMATION);
     EXPECT_NE(ReadAll(log_).find("Cancel\r\nCompleted -102\r\n"), std::string::npos);
 }
 
+// The texts both dialogs open with come from their shared base, in the user interface's language.
 TEST_F(HalvekDialog, ShowsGermanTextsInAGermanUi) {
     const LANGID before = UiLanguage();
     ASSERT_TRUE(SelectThreadUiLanguage(MAKELANGID(LANG_GERMAN, SUBLANG_GERMAN)));
-    SetVariable(L"HALVEKCOMM_RESULT", L"-204");
+    const std::wstring instructions = LoadUiText(IDS_INSTRUCTIONS_LV20);
+    ::SetEnvironmentVariableW(L"HALVEKCOMM_RESULT", L"-204");
     CHalvekDownloadProgressDialog dialog(nullptr, station_, output_.wstring());
-    const INT_PTR result = RunDialog(dialog, [](DialogDriver& driver) {
-        ASSERT_NE(driver.WaitForDialog(), nullptr);
-        EXPECT_EQ(driver.Title(), L"Datei vom Digitalnivellier herunterladen");
-        EXPECT_EQ(driver.Text(IDCANCEL), L"Abbrechen");
-        EXPECT_EQ(driver.Text(IDC_STATUS_TEXT), L"Warten auf Start...");
-        driver.Press(IDC_START);
+    const INT_PTR result = RunDialog(dialog, [&](HWND window) {
+        EXPECT_EQ(Text(window), L"Datei vom Digitalnivellier herunterladen");
+        EXPECT_EQ(Text(window, IDCANCEL), L"Abbrechen");
+        EXPECT_EQ(Text(window, IDC_STATUS_TEXT), L"Warten auf Start...");
+        EXPECT_EQ(Text(window, IDC_INSTRUCTIONS), instructions);
+        Press(window, IDC_START);
     });
     ASSERT_TRUE(SelectThreadUiLanguage(before));
     EXPECT_EQ(result, IDCANCEL);
-    ExpectOneErrorBox(L"Die Prüfsumme ist falsch", L"Quorvel Digitalnivelliere");
+    ExpectOneBox(user_, L"Die Prüfsumme ist falsch", MB_ICONEXCLAMATION,
+                 L"Quorvel Digitalnivelliere");
 }
 
 TEST(HalvekAdapter, PortNumberStartsAtTheFirstDigit) {
@@ -252,15 +193,12 @@ intptr_t RecordSlot(SlotRecorder* self) {  // the arguments after this one are n
     return 0;
 }
 
-const void* const kDocumentedTable[] = {
-    reinterpret_cast<const void*>(&RecordSlot<0>),  reinterpret_cast<const void*>(&RecordSlot<1>),
-    reinterpret_cast<const void*>(&RecordSlot<2>),  reinterpret_cast<const void*>(&RecordSlot<3>),
-    reinterpret_cast<const void*>(&RecordSlot<4>),  reinterpret_cast<const void*>(&RecordSlot<5>),
-    reinterpret_cast<const void*>(&RecordSlot<6>),  reinterpret_cast<const void*>(&RecordSlot<7>),
-    reinterpret_cast<const void*>(&RecordSlot<8>),  reinterpret_cast<const void*>(&RecordSlot<9>),
-    reinterpret_cast<const void*>(&RecordSlot<10>), reinterpret_cast<const void*>(&RecordSlot<11>),
-    reinterpret_cast<const void*>(&RecordSlot<12>), reinterpret_cast<const void*>(&RecordSlot<13>),
-};
+template <int... Slot>
+std::array<const void*, sizeof...(Slot)> DocumentedTable(std::integer_sequence<int, Slot...>) {
+    return {reinterpret_cast<const void*>(&RecordSlot<Slot>)...};
+}
+
+const auto kDocumentedTable = DocumentedTable(std::make_integer_sequence<int, 14>());
 
 }  // namespace
 
@@ -282,7 +220,7 @@ TEST(HalvekAdapter, EachOperationCallsTheLibrarysDocumentedSlot) {
         {"SetCallback", 13, [](IHalvekCommObject& library) { library.SetCallback(nullptr); }},
     };
     for (const Case& test : cases) {
-        SlotRecorder object{kDocumentedTable};
+        SlotRecorder object{kDocumentedTable.data()};
         // Seen through the adapter's declaration, as the library's own object is: a pointer to
         // a table of functions, nothing more.
         void* address = &object;

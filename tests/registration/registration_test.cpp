@@ -2,12 +2,15 @@
 // Registration writes HKEY_CLASSES_ROOT (under Wine: HKLM\Software\Classes only) and
 // HKEY_LOCAL_MACHINE of the private prefix; each test registers and unregisters for itself.
 #include <windows.h>
+#include <process.h>
 
 #include <gtest/gtest.h>
 
+#include <cwchar>
+#include <set>
 #include <string>
+#include <vector>
 
-#include "tests/registration/registry_dump.h"
 #include "tests/server/extension_module.h"
 
 namespace {
@@ -20,13 +23,11 @@ const std::wstring kNameSpaceKey =
     L"Software\\Microsoft\\Windows\\CurrentVersion\\Explorer\\MyComputer\\NameSpace\\"
     L"{7D3F2A61-4B8E-4c19-9A27-5E0C81B6D4F3}";
 
-struct ScriptedClass {
+const struct ScriptedClass {
     const wchar_t* classId;
     const wchar_t* progId;
     const wchar_t* description;
-};
-
-const ScriptedClass kScriptedClasses[] = {
+} kScriptedClasses[] = {
     {L"{4F9A7D26-E3B1-4C58-8D0F-72A5B1E6C390}", L"LVShellExt.LVDataObject", L"LVDataObject Class"},
     {L"{3B8C1F92-A6D5-4E07-9C4B-D21F7A8E3065}", L"LVShellExt.LVEnumIDList", L"LVEnumIDList Class"},
     {L"{9E2B6D14-7C3A-4F85-B1D9-36A8E05C7F21}", L"LVShellExt.LVExtractIcon",
@@ -38,40 +39,75 @@ const ScriptedClass kScriptedClasses[] = {
      L"LVDropTargetOnListView Class"},
 };
 
-const wchar_t kContextMenuKey[] = L"CLSID\\{1C6E9B4A-F5D2-4B73-8E29-A03F6C7D51E4}";
+using RegistryLines = std::set<std::wstring>;
 
-// Runs the system's regsvr32 silently and returns its exit code.
-DWORD RunRegsvr32(bool unregister) {
+// A registry subtree as comparable lines: "path|" for every key (so that empty keys show) and
+// "path|value name|data" for every value, with texts as they are and binary data as hex bytes.
+// Paths are relative to the dumped key, whose own is "".
+void DumpRegistryTree(HKEY parent, const std::wstring& subkey, const std::wstring& relative,
+                      RegistryLines& lines) {
+    UniqueRegKey key;
+    if (::RegOpenKeyExW(parent, subkey.c_str(), 0, KEY_READ, key.put()) != ERROR_SUCCESS)
+        return;
+    lines.insert(relative + L"|");
+    wchar_t name[16384];
+    for (DWORD index = 0;; ++index) {
+        DWORD nameLength = ARRAYSIZE(name), type = 0;
+        BYTE data[4096];
+        DWORD size = sizeof data;
+        if (::RegEnumValueW(key.get(), index, name, &nameLength, nullptr, &type, data, &size) !=
+            ERROR_SUCCESS)
+            break;
+        std::wstring text;
+        if (type == REG_SZ) {
+            text.assign(reinterpret_cast<const wchar_t*>(data), size / sizeof(wchar_t));
+            text.erase(text.find_last_not_of(L'\0') + 1);
+        } else {
+            text = type == REG_BINARY ? L"REG_BINARY" : L"type " + std::to_wstring(type);
+            for (DWORD byte = 0; byte < size; ++byte) {
+                wchar_t hex[4];
+                swprintf(hex, ARRAYSIZE(hex), L" %02X", data[byte]);
+                text += hex;
+            }
+        }
+        lines.insert(relative + L"|" + std::wstring(name, nameLength) + L"|" + text);
+    }
+    for (DWORD index = 0;; ++index) {
+        DWORD nameLength = ARRAYSIZE(name);
+        if (::RegEnumKeyExW(key.get(), index, name, &nameLength, nullptr, nullptr, nullptr,
+                            nullptr) != ERROR_SUCCESS)
+            break;
+        const std::wstring child(name, nameLength);
+        DumpRegistryTree(key.get(), child, relative.empty() ? child : relative + L"\\" + child,
+                         lines);
+    }
+}
+
+RegistryLines Dump(HKEY root, const std::wstring& path) {
+    RegistryLines lines;
+    DumpRegistryTree(root, path, L"", lines);
+    return lines;
+}
+
+// Runs the system's regsvr32 silently and returns its exit code (-1 when it cannot start).
+intptr_t RunRegsvr32(bool unregister) {
     wchar_t system[MAX_PATH];
     ::GetSystemDirectoryW(system, MAX_PATH);
     const std::wstring program = std::wstring(system) + L"\\regsvr32.exe";
-    std::wstring commandLine = L"regsvr32.exe /s ";
+    // The arguments are joined with spaces into one command line: the path is quoted.
+    const std::wstring module = L"\"" + ExtensionDllPath() + L"\"";
+    std::vector<const wchar_t*> arguments = {L"regsvr32.exe", L"/s"};
     if (unregister)
-        commandLine += L"/u ";
-    commandLine += L"\"" + ExtensionDllPath() + L"\"";
-    STARTUPINFOW startup{};
-    startup.cb = sizeof startup;
-    PROCESS_INFORMATION process{};
-    if (!::CreateProcessW(program.c_str(), commandLine.data(), nullptr, nullptr, FALSE, 0, nullptr,
-                          nullptr, &startup, &process))
-        return ::GetLastError() | 0x80000000u;
-    UniqueHandle processHandle(process.hProcess), thread(process.hThread);
-    ::WaitForSingleObject(processHandle.get(), 60000);
-    DWORD exitCode = 0xFFFFFFFF;
-    ::GetExitCodeProcess(processHandle.get(), &exitCode);
-    return exitCode;
+        arguments.push_back(L"/u");
+    arguments.insert(arguments.end(), {module.c_str(), nullptr});
+    return ::_wspawnv(_P_WAIT, program.c_str(), arguments.data());
 }
 
-bool KeyExists(HKEY root, const std::wstring& path) {
-    UniqueRegKey key;
-    return ::RegOpenKeyExW(root, path.c_str(), 0, KEY_READ, key.put()) == ERROR_SUCCESS;
-}
-
+// The folder's entry under the approved shell extensions; empty when there is none.
 std::wstring ApprovedValue() {
-    const RegistryLines lines = DumpRegistryTree(HKEY_LOCAL_MACHINE, kApprovedKey);
     const std::wstring prefix = L"|{7D3F2A61-4B8E-4c19-9A27-5E0C81B6D4F3}|";
-    for (const std::wstring& line : lines) {
-        if (line.compare(0, prefix.size(), prefix) == 0)
+    for (const std::wstring& line : Dump(HKEY_LOCAL_MACHINE, kApprovedKey)) {
+        if (line.starts_with(prefix))
             return line.substr(prefix.size());
     }
     return {};
@@ -79,8 +115,8 @@ std::wstring ApprovedValue() {
 
 class Registration : public testing::Test {
 protected:
-    void SetUp() override { ASSERT_EQ(0u, RunRegsvr32(false)); }
-    void TearDown() override { EXPECT_EQ(0u, RunRegsvr32(true)); }
+    void SetUp() override { ASSERT_EQ(0, RunRegsvr32(false)); }
+    void TearDown() override { EXPECT_EQ(0, RunRegsvr32(true)); }
 };
 
 }  // namespace
@@ -89,19 +125,19 @@ TEST_F(Registration, TheFolderClassKeyHoldsExactlyItsValuesAndTheBinaryAttribute
     const std::wstring module = ExtensionDllPath();
     const RegistryLines expected = {
         L"|",
-        L"||REG_SZ|Quorvel Digital Levels",
-        L"|InfoTip|REG_SZ|Allows you to read files from Quorvel Digital Level",
+        L"||Quorvel Digital Levels",
+        L"|InfoTip|Allows you to read files from Quorvel Digital Level",
         L"DefaultIcon|",
-        L"DefaultIcon||REG_SZ|" + module + L",0",
+        L"DefaultIcon||" + module + L",0",
         L"InprocServer32|",
-        L"InprocServer32||REG_SZ|" + module,
-        L"InprocServer32|ThreadingModel|REG_SZ|Apartment",
+        L"InprocServer32||" + module,
+        L"InprocServer32|ThreadingModel|Apartment",
         L"TypeLib|",
-        L"TypeLib||REG_SZ|" + kTypeLib,
+        L"TypeLib||" + kTypeLib,
         L"ShellFolder|",
-        L"ShellFolder|Attributes|REG_BINARY|00 00 00 A0",
+        L"ShellFolder|Attributes|REG_BINARY 00 00 00 A0",
     };
-    EXPECT_EQ(expected, DumpRegistryTree(HKEY_CLASSES_ROOT, kFolderKey));
+    EXPECT_EQ(expected, Dump(HKEY_CLASSES_ROOT, kFolderKey));
 }
 
 TEST_F(Registration, EveryScriptedClassHasItsProgIdsAndClassKey) {
@@ -109,54 +145,51 @@ TEST_F(Registration, EveryScriptedClassHasItsProgIdsAndClassKey) {
     for (const ScriptedClass& item : kScriptedClasses) {
         const std::wstring progId = item.progId, versioned = progId + L".1";
         const std::wstring description = item.description, classId = item.classId;
-        EXPECT_EQ((RegistryLines{L"|", L"||REG_SZ|" + description, L"CLSID|",
-                                 L"CLSID||REG_SZ|" + classId}),
-                  DumpRegistryTree(HKEY_CLASSES_ROOT, versioned));
+        EXPECT_EQ((RegistryLines{L"|", L"||" + description, L"CLSID|", L"CLSID||" + classId}),
+                  Dump(HKEY_CLASSES_ROOT, versioned));
+        EXPECT_EQ((RegistryLines{L"|", L"||" + description, L"CLSID|", L"CLSID||" + classId,
+                                 L"CurVer|", L"CurVer||" + versioned}),
+                  Dump(HKEY_CLASSES_ROOT, progId));
         EXPECT_EQ(
-            (RegistryLines{L"|", L"||REG_SZ|" + description, L"CLSID|", L"CLSID||REG_SZ|" + classId,
-                           L"CurVer|", L"CurVer||REG_SZ|" + versioned}),
-            DumpRegistryTree(HKEY_CLASSES_ROOT, progId));
-        EXPECT_EQ((RegistryLines{L"|", L"||REG_SZ|" + description, L"ProgID|",
-                                 L"ProgID||REG_SZ|" + versioned, L"VersionIndependentProgID|",
-                                 L"VersionIndependentProgID||REG_SZ|" + progId, L"InprocServer32|",
-                                 L"InprocServer32||REG_SZ|" + module,
-                                 L"InprocServer32|ThreadingModel|REG_SZ|Apartment", L"TypeLib|",
-                                 L"TypeLib||REG_SZ|" + kTypeLib}),
-                  DumpRegistryTree(HKEY_CLASSES_ROOT, L"CLSID\\" + classId));
+            (RegistryLines{L"|", L"||" + description, L"ProgID|", L"ProgID||" + versioned,
+                           L"VersionIndependentProgID|", L"VersionIndependentProgID||" + progId,
+                           L"InprocServer32|", L"InprocServer32||" + module,
+                           L"InprocServer32|ThreadingModel|Apartment", L"TypeLib|",
+                           L"TypeLib||" + kTypeLib}),
+            Dump(HKEY_CLASSES_ROOT, L"CLSID\\" + classId));
     }
-    EXPECT_FALSE(KeyExists(HKEY_CLASSES_ROOT, kContextMenuKey))
+    EXPECT_EQ(RegistryLines{},
+              Dump(HKEY_CLASSES_ROOT, L"CLSID\\{1C6E9B4A-F5D2-4B73-8E29-A03F6C7D51E4}"))
         << "the context-menu script is carried but never run";
 }
 
 TEST_F(Registration, TheFolderIsApprovedAndStandsUnderMyComputer) {
-    EXPECT_EQ(L"REG_SZ|Quorvel Digital Levels", ApprovedValue());
-    EXPECT_EQ((RegistryLines{L"|", L"||REG_SZ|Quorvel Digital Levels"}),
-              DumpRegistryTree(HKEY_LOCAL_MACHINE, kNameSpaceKey));
-    const RegistryLines typeLibrary =
-        DumpRegistryTree(HKEY_CLASSES_ROOT, L"TypeLib\\" + kTypeLib + L"\\1.0\\0\\win64");
-    EXPECT_EQ(1u, typeLibrary.count(L"||REG_SZ|" + ExtensionDllPath()));
+    EXPECT_EQ(L"Quorvel Digital Levels", ApprovedValue());
+    EXPECT_EQ((RegistryLines{L"|", L"||Quorvel Digital Levels"}),
+              Dump(HKEY_LOCAL_MACHINE, kNameSpaceKey));
+    EXPECT_EQ(1u, Dump(HKEY_CLASSES_ROOT, L"TypeLib\\" + kTypeLib + L"\\1.0\\0\\win64")
+                      .count(L"||" + ExtensionDllPath()));
 }
 
 TEST_F(Registration, UnregisterRemovesEverythingButAnEmptyShellFolderKey) {
-    ASSERT_EQ(0u, RunRegsvr32(true));
-
-    EXPECT_EQ((RegistryLines{L"|", L"ShellFolder|"}),
-              DumpRegistryTree(HKEY_CLASSES_ROOT, kFolderKey));
+    ASSERT_EQ(0, RunRegsvr32(true));
+    EXPECT_EQ((RegistryLines{L"|", L"ShellFolder|"}), Dump(HKEY_CLASSES_ROOT, kFolderKey));
     for (const ScriptedClass& item : kScriptedClasses) {
-        EXPECT_FALSE(KeyExists(HKEY_CLASSES_ROOT, item.progId)) << item.progId;
-        EXPECT_FALSE(KeyExists(HKEY_CLASSES_ROOT, std::wstring(item.progId) + L".1"));
-        EXPECT_FALSE(KeyExists(HKEY_CLASSES_ROOT, std::wstring(L"CLSID\\") + item.classId));
+        for (const std::wstring& key :
+             {std::wstring(item.progId), std::wstring(item.progId) + L".1",
+              std::wstring(L"CLSID\\") + item.classId}) {
+            EXPECT_EQ(RegistryLines{}, Dump(HKEY_CLASSES_ROOT, key)) << key;
+        }
     }
     EXPECT_EQ(L"", ApprovedValue());
-    EXPECT_TRUE(KeyExists(HKEY_LOCAL_MACHINE, kApprovedKey)) << "NoRemove";
-    EXPECT_FALSE(KeyExists(HKEY_LOCAL_MACHINE, kNameSpaceKey));
-    EXPECT_FALSE(KeyExists(HKEY_CLASSES_ROOT, L"TypeLib\\" + kTypeLib));
+    EXPECT_EQ(1u, Dump(HKEY_LOCAL_MACHINE, kApprovedKey).count(L"|")) << "NoRemove";
+    EXPECT_EQ(RegistryLines{}, Dump(HKEY_LOCAL_MACHINE, kNameSpaceKey));
+    EXPECT_EQ(RegistryLines{}, Dump(HKEY_CLASSES_ROOT, L"TypeLib\\" + kTypeLib));
 }
 
 TEST(Unregistration, SucceedsWhenNothingIsRegistered) {
     ExtensionModule module;
     EXPECT_EQ(S_OK, module.Unregister());
     EXPECT_EQ(S_OK, module.Unregister());
-    EXPECT_EQ((RegistryLines{L"|", L"ShellFolder|"}),
-              DumpRegistryTree(HKEY_CLASSES_ROOT, kFolderKey));
+    EXPECT_EQ((RegistryLines{L"|", L"ShellFolder|"}), Dump(HKEY_CLASSES_ROOT, kFolderKey));
 }

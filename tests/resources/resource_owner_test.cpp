@@ -32,15 +32,9 @@ HRESULT PassRegistryError(LONG status) {
     return S_OK;
 }
 template <typename Exception>
-HRESULT Throw() {
+HRESULT Throw(const Exception& exception) {
     try {
-        throw Exception("thrown");
-    }
-    CATCH_RETURN()
-}
-HRESULT ThrowBadAlloc() {
-    try {
-        throw std::bad_alloc();
+        throw exception;
     }
     CATCH_RETURN()
 }
@@ -74,6 +68,6 @@ TEST(ResultMacros, FailuresLeaveAsHresultsAndSuccessesPassThrough) {
     EXPECT_EQ(E_FAIL, PassLastError(FALSE, ERROR_SUCCESS)) << "a failure without an error code";
     EXPECT_EQ(HRESULT_FROM_WIN32(ERROR_ACCESS_DENIED), PassRegistryError(ERROR_ACCESS_DENIED));
     EXPECT_EQ(S_OK, PassRegistryError(ERROR_SUCCESS));
-    EXPECT_EQ(E_OUTOFMEMORY, ThrowBadAlloc());
-    EXPECT_EQ(E_FAIL, Throw<std::runtime_error>());
+    EXPECT_EQ(E_OUTOFMEMORY, Throw(std::bad_alloc()));
+    EXPECT_EQ(E_FAIL, Throw(std::runtime_error("thrown")));
 }

@@ -25,9 +25,6 @@ public:
         EXPECT_TRUE(module_) << "LoadLibrary failed: " << ::GetLastError();
     }
 
-    HMODULE get() const noexcept { return module_.get(); }
-    void Unload() noexcept { module_.reset(); }
-
     HRESULT GetClassObject(REFCLSID classId, REFIID iid, void** object) const {
         return Export<HRESULT(STDAPICALLTYPE*)(REFCLSID, REFIID, void**)>("DllGetClassObject")(
             classId, iid, object);
@@ -60,5 +57,3 @@ inline constexpr CLSID kQueryInfoClassId = {
     0x5A91C3E7, 0x2F04, 0x4B6D, {0x8E, 0x13, 0xA7, 0xC2, 0xD9, 0x0F, 0x4B, 0x58}};
 inline constexpr CLSID kEnumIdListClassId = {
     0x3B8C1F92, 0xA6D5, 0x4E07, {0x9C, 0x4B, 0xD2, 0x1F, 0x7A, 0x8E, 0x30, 0x65}};
-inline constexpr CLSID kDataObjectClassId = {
-    0x4F9A7D26, 0xE3B1, 0x4C58, {0x8D, 0x0F, 0x72, 0xA5, 0xB1, 0xE6, 0xC3, 0x90}};

@@ -3,6 +3,7 @@
 
 #include <gtest/gtest.h>
 
+#include <optional>
 #include <string>
 
 #include "server/registrar.h"
@@ -16,28 +17,21 @@ bool KeyExists(const wchar_t* path) {
     return ::RegOpenKeyExW(HKEY_CURRENT_USER, path, 0, KEY_READ, key.put()) == ERROR_SUCCESS;
 }
 
-std::wstring ReadText(const wchar_t* path, const wchar_t* name) {
+// A text value (the key's default value for a null name); none when the key or value is missing.
+std::optional<std::wstring> Text(const wchar_t* path, const wchar_t* name = nullptr) {
     UniqueRegKey key;
     std::wstring text;
-    if (::RegOpenKeyExW(HKEY_CURRENT_USER, path, 0, KEY_READ, key.put()) == ERROR_SUCCESS)
-        ReadStringValue(key.get(), name, 1024, text);
+    if (::RegOpenKeyExW(HKEY_CURRENT_USER, path, 0, KEY_READ, key.put()) != ERROR_SUCCESS ||
+        ReadStringValue(key.get(), name, 1024, text) != ERROR_SUCCESS)
+        return std::nullopt;
     return text;
 }
 
-bool ValueExists(const wchar_t* path, const wchar_t* name) {
+UniqueRegKey CreateKey(const wchar_t* path) {
     UniqueRegKey key;
-    if (::RegOpenKeyExW(HKEY_CURRENT_USER, path, 0, KEY_READ, key.put()) != ERROR_SUCCESS)
-        return false;
-    return ::RegQueryValueExW(key.get(), name, nullptr, nullptr, nullptr, nullptr) == ERROR_SUCCESS;
-}
-
-void CreateKeyWithValue(const wchar_t* path, const wchar_t* name, const wchar_t* text) {
-    UniqueRegKey key;
-    ASSERT_EQ(ERROR_SUCCESS, ::RegCreateKeyExW(HKEY_CURRENT_USER, path, 0, nullptr, 0,
+    EXPECT_EQ(ERROR_SUCCESS, ::RegCreateKeyExW(HKEY_CURRENT_USER, path, 0, nullptr, 0,
                                                KEY_ALL_ACCESS, nullptr, key.put(), nullptr));
-    if (name) {
-        ASSERT_EQ(ERROR_SUCCESS, WriteStringValue(key.get(), name, text));
-    }
+    return key;
 }
 
 const wchar_t kScript[] =
@@ -70,33 +64,32 @@ const std::vector<RegistryScriptReplacement> kModule = {{L"MODULE", L"C:\\x\\LVS
 
 TEST(Registrar, RegisterWritesKeysValuesAndReplacesForceRemoveKeys) {
     RegistryOverride registry;
-    CreateKeyWithValue(L"Software\\Forced\\Stale", nullptr, nullptr);
+    CreateKey(L"Software\\Forced\\Stale");
     ASSERT_EQ(S_OK, RunRegistryScript(kScript, kModule, RegistrationMode::Register));
 
-    EXPECT_EQ(L"mine", ReadText(L"Software\\Shared", L"Ours"));
-    EXPECT_EQ(L"C:\\x\\LVShellExt.dll", ReadText(L"Software\\Product", nullptr));
-    EXPECT_EQ(L"F", ReadText(L"Software\\Forced", nullptr));
+    EXPECT_EQ(L"mine", Text(L"Software\\Shared", L"Ours"));
+    EXPECT_EQ(L"C:\\x\\LVShellExt.dll", Text(L"Software\\Product"));
+    EXPECT_EQ(L"F", Text(L"Software\\Forced"));
     EXPECT_TRUE(KeyExists(L"Software\\Forced\\Inner"));
     EXPECT_FALSE(KeyExists(L"Software\\Forced\\Stale")) << "ForceRemove starts from a clean key";
 
-    UniqueRegKey sub;
-    ASSERT_EQ(ERROR_SUCCESS, ::RegOpenKeyExW(HKEY_CURRENT_USER, L"Software\\Product\\Sub", 0,
-                                             KEY_READ, sub.put()));
     DWORD count = 0;
-    ASSERT_EQ(ERROR_SUCCESS, ReadDwordValue(sub.get(), L"Count", count));
+    EXPECT_EQ(ERROR_SUCCESS,
+              ReadDwordValue(CreateKey(L"Software\\Product\\Sub").get(), L"Count", count));
     EXPECT_EQ(7u, count);
 }
 
 TEST(Registrar, UnregisterRemovesWhatTheScriptMadeAndKeepsWhatOthersOwn) {
     RegistryOverride registry;
-    CreateKeyWithValue(L"Software\\Shared", L"Theirs", L"other");
+    ASSERT_EQ(ERROR_SUCCESS,
+              WriteStringValue(CreateKey(L"Software\\Shared").get(), L"Theirs", L"other"));
     ASSERT_EQ(S_OK, RunRegistryScript(kScript, kModule, RegistrationMode::Register));
-    CreateKeyWithValue(L"Software\\Forced\\Later", nullptr, nullptr);
+    CreateKey(L"Software\\Forced\\Later");
 
     ASSERT_EQ(S_OK, RunRegistryScript(kScript, kModule, RegistrationMode::Unregister));
     EXPECT_TRUE(KeyExists(L"Software\\Shared")) << "NoRemove";
-    EXPECT_FALSE(ValueExists(L"Software\\Shared", L"Ours"));
-    EXPECT_EQ(L"other", ReadText(L"Software\\Shared", L"Theirs"));
+    EXPECT_EQ(std::nullopt, Text(L"Software\\Shared", L"Ours"));
+    EXPECT_EQ(L"other", Text(L"Software\\Shared", L"Theirs"));
     EXPECT_FALSE(KeyExists(L"Software\\Product"));
     EXPECT_FALSE(KeyExists(L"Software\\Forced")) << "ForceRemove takes foreign subkeys along";
     EXPECT_TRUE(KeyExists(L"Software"));
@@ -108,7 +101,7 @@ TEST(Registrar, UnregisterRemovesWhatTheScriptMadeAndKeepsWhatOthersOwn) {
 TEST(Registrar, UnregisterLeavesAPlainKeyThatStillHoldsForeignSubkeys) {
     RegistryOverride registry;
     ASSERT_EQ(S_OK, RunRegistryScript(kScript, kModule, RegistrationMode::Register));
-    CreateKeyWithValue(L"Software\\Product\\Foreign", nullptr, nullptr);
+    CreateKey(L"Software\\Product\\Foreign");
     ASSERT_EQ(S_OK, RunRegistryScript(kScript, kModule, RegistrationMode::Unregister));
     EXPECT_TRUE(KeyExists(L"Software\\Product\\Foreign"));
     EXPECT_FALSE(KeyExists(L"Software\\Product\\Sub"));

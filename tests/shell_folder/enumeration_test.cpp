@@ -4,31 +4,16 @@
 #include "namespace/lv_enum_id_list.h"
 #include "support/registry_value.h"
 
-namespace {
-
-using Items = std::vector<std::pair<DWORD, std::wstring>>;
-
-}  // namespace
-
 TEST_F(ShellFolderTest, RootListsStationsOnlyForFolders) {
     AddStationOfModel(L"Station 1");
     AddStationOfModel(L"Station 2", IDS_MODEL_LV30);
     // A subkey without a readable name is skipped silently.
-    UniqueRegKey stray;
-    ASSERT_EQ(ERROR_SUCCESS,
-              ::RegCreateKeyExW(HKEY_CURRENT_USER, (StationsKeyPath() + L"\\Stray").c_str(), 0,
-                                nullptr, 0, KEY_ALL_ACCESS, nullptr, stray.put(), nullptr));
-    ASSERT_EQ(ERROR_SUCCESS, WriteDwordValue(stray.get(), L"Name", 7));
+    ASSERT_EQ(ERROR_SUCCESS, WriteDwordValue(StationKey(L"Stray").get(), L"Name", 7));
     // Names written by other tools: an empty one makes the path of the root itself, a backslash
     // ends the station's part of the path.
-    for (const auto& [key, name] : {std::pair<const wchar_t*, const wchar_t*>{L"Station 8", L""},
-                                    {L"Station 9", L"North\\South"}}) {
-        UniqueRegKey written;
-        ASSERT_EQ(ERROR_SUCCESS,
-                  ::RegCreateKeyExW(HKEY_CURRENT_USER, (StationsKeyPath() + L"\\" + key).c_str(),
-                                    0, nullptr, 0, KEY_ALL_ACCESS, nullptr, written.put(), nullptr));
-        ASSERT_EQ(ERROR_SUCCESS, WriteStringValue(written.get(), L"Name", name));
-    }
+    ASSERT_EQ(ERROR_SUCCESS, WriteStringValue(StationKey(L"Station 8").get(), L"Name", L""));
+    ASSERT_EQ(ERROR_SUCCESS,
+              WriteStringValue(StationKey(L"Station 9").get(), L"Name", L"North\\South"));
 
     ComPtr<IShellFolder> folder = CreateRootFolder();
     const Items expected = {{PT_STATION, L"Station 1"},
@@ -51,10 +36,8 @@ TEST_F(ShellFolderTest, StationFolderListsOneFileNamedByModel) {
         {L"level 30", L"file1.lv"},  // station names are matched case-sensitively
     };
     for (const auto& [station, file] : cases) {
-        UniquePidl item = StationItem(station);
-        ComPtr<IShellFolder> folder;
-        ASSERT_EQ(S_OK, root->BindToObject(reinterpret_cast<PCUIDLIST_RELATIVE>(item.get()),
-                                           nullptr, IID_PPV_ARGS(&folder)));
+        ComPtr<IShellFolder> folder = Bind(root.Get(), StationItem(station));
+        ASSERT_TRUE(folder);
         EXPECT_EQ((Items{{PT_FILE, file}}), Enumerate(folder.Get(), SHCONTF_NONFOLDERS))
             << testing::PrintToString(station);
         EXPECT_EQ(Items{}, Enumerate(folder.Get(), SHCONTF_FOLDERS));
@@ -67,25 +50,27 @@ TEST_F(ShellFolderTest, NextSkipAndResetFollowTheEnumerationRules) {
     ComPtr<IShellFolder> folder = CreateRootFolder();
     ComPtr<IEnumIDList> list;
     ASSERT_EQ(S_OK, folder->EnumObjects(nullptr, SHCONTF_FOLDERS, &list));
-
-    auto freeAll = [](PITEMID_CHILD* items, ULONG count) {
-        for (ULONG index = 0; index < count; ++index)
-            ::CoTaskMemFree(items[index]);
-    };
     PITEMID_CHILD items[5] = {};
     ULONG fetched = 99;
+    // The names of the items fetched, which are freed.
+    auto names = [&](ULONG count) {
+        std::vector<std::wstring> fetchedNames;
+        for (ULONG index = 0; index < count; ++index) {
+            fetchedNames.push_back(manager_.GetItemName(items[index]));
+            ::CoTaskMemFree(items[index]);
+        }
+        return fetchedNames;
+    };
+    using Names = std::vector<std::wstring>;
+
     // Two or more without a count to report: refused, and nothing moves.
     EXPECT_EQ(E_INVALIDARG, list->Next(2, items, nullptr));
     EXPECT_EQ(S_OK, list->Next(1, items, nullptr));
-    EXPECT_EQ(L"A", manager_.GetItemName(items[0]));
-    freeAll(items, 1);
+    EXPECT_EQ(Names{L"A"}, names(1));
 
     ASSERT_EQ(S_OK, list->Reset());
     EXPECT_EQ(S_FALSE, list->Next(5, items, &fetched));
-    ASSERT_EQ(3u, fetched);
-    EXPECT_EQ(L"A", manager_.GetItemName(items[0]));
-    EXPECT_EQ(L"C", manager_.GetItemName(items[2]));
-    freeAll(items, fetched);
+    EXPECT_EQ((Names{L"A", L"B", L"C"}), names(fetched));
     EXPECT_EQ(S_FALSE, list->Next(5, items, &fetched));
     EXPECT_EQ(0u, fetched);
 
@@ -93,8 +78,7 @@ TEST_F(ShellFolderTest, NextSkipAndResetFollowTheEnumerationRules) {
     EXPECT_EQ(S_OK, list->Skip(0));
     EXPECT_EQ(S_OK, list->Skip(2));
     EXPECT_EQ(S_OK, list->Next(1, items, &fetched));
-    EXPECT_EQ(L"C", manager_.GetItemName(items[0]));
-    freeAll(items, fetched);
+    EXPECT_EQ(Names{L"C"}, names(fetched));
     ASSERT_EQ(S_OK, list->Reset());
     EXPECT_EQ(S_OK, list->Skip(3)) << "passing exactly the last item is not running out";
     EXPECT_EQ(S_FALSE, list->Skip(1));
@@ -111,16 +95,15 @@ TEST_F(ShellFolderTest, FillingFromPaths) {
     auto list = MakeComObject<CLVEnumIDList>();
     // A path of separators only has no first component: the folder reports this as no memory.
     EXPECT_TRUE(FAILED(list->Fill(L"\\\\\\", SHCONTF_FOLDERS)));
-    // An empty path is the root.
-    ASSERT_EQ(S_OK, list->Fill(L"", SHCONTF_FOLDERS));
     PITEMID_CHILD item = nullptr;
-    ASSERT_EQ(S_OK, list->Next(1, &item, nullptr));
-    UniquePidl first(reinterpret_cast<LPITEMIDLIST>(item));
-    EXPECT_EQ(L"Station 1", manager_.GetItemName(first.get()));
-    // Filling again starts over.
-    ASSERT_EQ(S_OK, list->Fill(L"Quorvel Digital Level\\Station 1", SHCONTF_NONFOLDERS));
-    ASSERT_EQ(S_OK, list->Next(1, &item, nullptr));
-    UniquePidl file(reinterpret_cast<LPITEMIDLIST>(item));
-    EXPECT_EQ(L"file1.hvr", manager_.GetItemName(file.get()));
+    // An empty path is the root; filling again starts over.
+    for (const auto& [path, flags, name] :
+         {std::tuple{L"", SHCONTF_FOLDERS, L"Station 1"},
+          std::tuple{L"Quorvel Digital Level\\Station 1", SHCONTF_NONFOLDERS, L"file1.hvr"}}) {
+        ASSERT_EQ(S_OK, list->Fill(path, flags));
+        ASSERT_EQ(S_OK, list->Next(1, &item, nullptr));
+        EXPECT_EQ(name,
+                  manager_.GetItemName(UniquePidl(reinterpret_cast<LPITEMIDLIST>(item)).get()));
+    }
     EXPECT_EQ(S_FALSE, list->Next(1, &item, nullptr));
 }

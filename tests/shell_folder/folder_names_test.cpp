@@ -8,58 +8,51 @@
 TEST_F(ShellFolderTest, DisplayNameFlagRules) {
     ComPtr<IShellFolder> folder = CreateRootFolder();
     UniquePidl station = StationItem(L"Station 1");
-    struct Case {
+    const std::wstring full = std::wstring(kPrefix) + L"\\Station 1";
+    const struct {
         SHGDNF flags;
         HRESULT result;
         std::wstring name;
-    };
-    const std::wstring full = std::wstring(kPrefix) + L"\\Station 1";
-    const Case cases[] = {
+    } cases[] = {
         {SHGDN_NORMAL, S_OK, L"Station 1"},
         {SHGDN_FORADDRESSBAR | SHGDN_INFOLDER, S_OK, L"Station 1"},
         {SHGDN_FORPARSING, S_OK, full},
         {SHGDN_FORPARSING | SHGDN_INFOLDER, S_OK, L"Station 1"},
         {SHGDN_FORPARSING | 2, S_OK, L""},
-        {SHGDN_FORPARSING | SHGDN_FORADDRESSBAR, E_INVALIDARG, L""},
-        {SHGDN_FOREDITING | SHGDN_FORPARSING, E_INVALIDARG, L""},
-        {2, E_INVALIDARG, L""},
-        {SHGDN_FORADDRESSBAR | 2, E_INVALIDARG, L""},
+        {SHGDN_FORPARSING | SHGDN_FORADDRESSBAR, E_INVALIDARG, L"(none)"},
+        {SHGDN_FOREDITING, E_INVALIDARG, L"(none)"},
+        {SHGDN_FOREDITING | SHGDN_FORPARSING, E_INVALIDARG, L"(none)"},
+        {2, E_INVALIDARG, L"(none)"},
+        {SHGDN_FORADDRESSBAR | 2, E_INVALIDARG, L"(none)"},
     };
-    for (const Case& test : cases) {
+    for (const auto& test : cases) {
         std::wstring name = L"(none)";
         EXPECT_EQ(test.result, DisplayName(folder.Get(), station, test.flags, name))
             << "flags 0x" << std::hex << test.flags;
-        if (test.result == S_OK) {
-            EXPECT_EQ(test.name, name) << "flags 0x" << std::hex << test.flags;
-        }
+        EXPECT_EQ(test.name, name) << "flags 0x" << std::hex << test.flags;
     }
 }
 
 TEST_F(ShellFolderTest, DisplayNamesOfLongNamesStayWithinThePathLength) {
     // A station whose name is near the registry's limit: its folder path no longer fits.
-    const std::wstring longName(255, L'L');
     ComPtr<IShellFolder> root = CreateRootFolder();
-    UniquePidl station = StationItem(longName);
+    UniquePidl station = StationItem(std::wstring(255, L'L'));
     std::wstring name;
     ASSERT_EQ(S_OK, DisplayName(root.Get(), station, SHGDN_FORPARSING, name));
     EXPECT_LT(name.size(), 260u);
     EXPECT_EQ(0u, name.find(kPrefix));
 
-    ComPtr<IShellFolder> stationFolder;
-    ASSERT_EQ(S_OK, root->BindToObject(reinterpret_cast<PCUIDLIST_RELATIVE>(station.get()), nullptr,
-                                       IID_PPV_ARGS(&stationFolder)));
-    UniquePidl file = FileItem(L"file1.lv");
-    ASSERT_EQ(S_OK, DisplayName(stationFolder.Get(), file, SHGDN_FORPARSING, name));
+    ComPtr<IShellFolder> stationFolder = Bind(root.Get(), station);
+    ASSERT_TRUE(stationFolder);
+    ASSERT_EQ(S_OK,
+              DisplayName(stationFolder.Get(), FileItem(L"file1.lv"), SHGDN_FORPARSING, name));
     EXPECT_LT(name.size(), 260u);
     // Parsing in a folder whose own path does not fit fails instead of naming something else.
-    std::wstring fileName = L"file1.lv";
-    PIDLIST_RELATIVE parsed = nullptr;
-    EXPECT_EQ(E_INVALIDARG, stationFolder->ParseDisplayName(nullptr, nullptr, fileName.data(),
-                                                            nullptr, &parsed, nullptr));
-    EXPECT_EQ(nullptr, parsed);
+    UniquePidl parsed;
+    EXPECT_EQ(E_INVALIDARG, Parse(stationFolder.Get(), L"file1.lv", parsed));
     // Nor does it list the root's stations as its own items.
     AddStationOfModel(L"Station 1");
-    EXPECT_TRUE(Enumerate(stationFolder.Get(), SHCONTF_FOLDERS | SHCONTF_NONFOLDERS).empty());
+    EXPECT_EQ(Items{}, Enumerate(stationFolder.Get(), SHCONTF_FOLDERS | SHCONTF_NONFOLDERS));
 }
 
 TEST_F(ShellFolderTest, AttributesByKindAndValidation) {
@@ -68,42 +61,35 @@ TEST_F(ShellFolderTest, AttributesByKindAndValidation) {
     UniquePidl station = StationItem(L"Station 1");
     UniquePidl deleted = StationItem(L"Gone");
     UniquePidl file = FileItem(L"file1.lv");
-    UniquePidl root = RootItem();
-
-    auto attributes = [&](std::initializer_list<const UniquePidl*> items, SFGAOF requested,
-                          SFGAOF& result) {
-        std::vector<PCUITEMID_CHILD> array;
-        for (const UniquePidl* item : items)
-            array.push_back(Child(*item));
+    UniquePidl root(manager_.CreateRootPidl());
+    SFGAOF result = 0;
+    auto attributes = [&](std::vector<PCUITEMID_CHILD> items, SFGAOF requested) {
         result = requested;
-        return folder->GetAttributesOf(static_cast<UINT>(array.size()), array.data(), &result);
+        return folder->GetAttributesOf(static_cast<UINT>(items.size()), items.data(), &result);
     };
 
-    SFGAOF result = 0;
-    EXPECT_EQ(S_OK, attributes({}, 0, result));
+    EXPECT_EQ(S_OK, attributes({}, 0));
     EXPECT_EQ(0xFFFFFFFFu, result);
-    EXPECT_EQ(S_OK, attributes({&station}, SFGAO_CANCOPY, result));
+    EXPECT_EQ(S_OK, attributes({Child(station)}, SFGAO_CANCOPY));
     EXPECT_EQ(0x20000100u, result) << "the request does not limit the result";
-    EXPECT_EQ(S_OK, attributes({&file}, 0, result));
+    EXPECT_EQ(S_OK, attributes({Child(file)}, 0));
     EXPECT_EQ(static_cast<SFGAOF>(SFGAO_CANCOPY), result);
-    EXPECT_EQ(S_OK, attributes({&root}, 0, result));
+    EXPECT_EQ(S_OK, attributes({Child(root)}, 0));
     EXPECT_EQ(0u, result);
-    EXPECT_EQ(S_OK, attributes({&station, &file}, 0, result));
+    EXPECT_EQ(S_OK, attributes({Child(station), Child(file)}, 0));
     EXPECT_EQ(0u, result) << "stations and files share no attribute";
 
     // Validation: a deleted station fails only when asked to validate, and only as first item.
-    EXPECT_EQ(S_OK, attributes({&station}, SFGAO_VALIDATE, result));
+    EXPECT_EQ(S_OK, attributes({Child(station)}, SFGAO_VALIDATE));
     EXPECT_EQ(0x20000100u, result);
-    EXPECT_EQ(E_FAIL, attributes({&deleted}, SFGAO_VALIDATE | SFGAO_FOLDER, result));
-    EXPECT_EQ(S_OK, attributes({&deleted}, SFGAO_FOLDER, result));
+    EXPECT_EQ(E_FAIL, attributes({Child(deleted)}, SFGAO_VALIDATE | SFGAO_FOLDER));
+    EXPECT_EQ(S_OK, attributes({Child(deleted)}, SFGAO_FOLDER));
     EXPECT_EQ(0x20000100u, result);
-    EXPECT_EQ(S_OK, attributes({&station, &deleted}, SFGAO_VALIDATE, result));
+    EXPECT_EQ(S_OK, attributes({Child(station), Child(deleted)}, SFGAO_VALIDATE));
     EXPECT_EQ(0x20000100u, result);
 
-    Station gone;
-    gone.Name = L"Station 1";
-    ASSERT_EQ(S_OK, DeleteStation(gone));
-    EXPECT_EQ(E_FAIL, attributes({&station}, SFGAO_VALIDATE, result));
+    ASSERT_EQ(S_OK, DeleteStation(Named(L"Station 1")));
+    EXPECT_EQ(E_FAIL, attributes({Child(station)}, SFGAO_VALIDATE));
 }
 
 TEST_F(ShellFolderTest, AllocationFailureWhileValidatingIsAResultNotAnException) {
@@ -123,9 +109,10 @@ TEST_F(ShellFolderTest, AllocationFailureWhileValidatingIsAResultNotAnException)
 
 TEST_F(ShellFolderTest, MalformedItemsAreRefusedBeforeTheirNamesAreRead) {
     ComPtr<IShellFolder> folder = CreateRootFolder();
+    // A station item whose name runs to the end of its cb without a terminator.
     UniquePidl unterminated = StationItem(L"AB");
-    auto* bytes = reinterpret_cast<uint8_t*>(unterminated.get());
-    memset(bytes + kItemNameOffset, 'x', unterminated.get()->mkid.cb - kItemNameOffset);
+    memset(reinterpret_cast<uint8_t*>(unterminated.get()) + kItemNameOffset, 'x',
+           unterminated.get()->mkid.cb - kItemNameOffset);
     // An item too short to hold a kind and a name, followed by the list terminator.
     uint8_t tiny[] = {4, 0, 2, 0, 0, 0};
     UniquePidl unknownKind = StationItem(L"K");
@@ -139,12 +126,14 @@ TEST_F(ShellFolderTest, MalformedItemsAreRefusedBeforeTheirNamesAreRead) {
         EXPECT_EQ(E_INVALIDARG, folder->GetDisplayNameOf(item, SHGDN_NORMAL, &text));
         SFGAOF attributes = SFGAO_VALIDATE;
         EXPECT_EQ(E_INVALIDARG, folder->GetAttributesOf(1, &item, &attributes));
+        EXPECT_EQ(E_INVALIDARG, folder->CompareIDs(0, Child(good), item));
         void* object = reinterpret_cast<void*>(1);
         EXPECT_EQ(E_INVALIDARG,
                   folder->GetUIObjectOf(nullptr, 1, &item, IID_IQueryInfo, nullptr, &object));
         EXPECT_EQ(nullptr, object);
-        EXPECT_EQ(E_INVALIDARG,
-                  folder->CompareIDs(0, reinterpret_cast<PCUIDLIST_RELATIVE>(good.get()), item));
+        object = reinterpret_cast<void*>(1);
+        EXPECT_EQ(E_INVALIDARG, folder->BindToObject(item, nullptr, IID_IShellFolder, &object));
+        EXPECT_EQ(nullptr, object);
     }
 }
 
@@ -155,8 +144,7 @@ TEST_F(ShellFolderTest, CompareIDsReturnsTheSignedOrderUnfolded) {
     UniquePidl alphaUpper = StationItem(L"ALPHA");
     UniquePidl file = FileItem(L"zzz");
     auto compare = [&](LPARAM column, const UniquePidl& first, const UniquePidl& second) {
-        return folder->CompareIDs(column, reinterpret_cast<PCUIDLIST_RELATIVE>(first.get()),
-                                  reinterpret_cast<PCUIDLIST_RELATIVE>(second.get()));
+        return folder->CompareIDs(column, Child(first), Child(second));
     };
     const HRESULT order = compare(0, alpha, beta);
     EXPECT_LT(order, 0) << "case is ignored: alpha before Beta";

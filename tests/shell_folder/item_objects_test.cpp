@@ -1,24 +1,20 @@
 // Per-item objects from GetUIObjectOf: icon extractor and info tip; the shared icon lists.
 #include "tests/shell_folder/shell_folder_fixture.h"
 
-#include <commctrl.h>
-
 #include "namespace/icon_lists.h"
 #include "support/unique_resource.h"
 
 namespace {
 
-SIZE IconSize(HICON icon) {
+LONG IconWidth(HICON icon) {
     ICONINFO info{};
     if (!::GetIconInfo(icon, &info))
-        return {};
+        return 0;
     BITMAP bitmap{};
     ::GetObjectW(info.hbmColor ? info.hbmColor : info.hbmMask, sizeof(bitmap), &bitmap);
-    if (info.hbmColor)
-        ::DeleteObject(info.hbmColor);
-    if (info.hbmMask)
-        ::DeleteObject(info.hbmMask);
-    return {bitmap.bmWidth, bitmap.bmHeight};
+    ::DeleteObject(info.hbmColor);  // either may be null, which DeleteObject ignores
+    ::DeleteObject(info.hbmMask);
+    return bitmap.bmWidth;
 }
 
 }  // namespace
@@ -37,7 +33,7 @@ TEST_F(ShellFolderTest, UIObjectsNeedExactlyOneItem) {
     // An item menu, and for now the drop target, are not handed out.
     for (REFIID iid : {IID_IContextMenu, IID_IDropTarget, IID_IExtractIconA}) {
         void* object = reinterpret_cast<void*>(1);
-        EXPECT_EQ(E_NOINTERFACE, folder->GetUIObjectOf(nullptr, 1, items, iid, nullptr, &object));
+        EXPECT_EQ(E_NOINTERFACE, UIObject(folder.Get(), first, iid, &object));
         EXPECT_EQ(nullptr, object);
     }
 }
@@ -45,9 +41,8 @@ TEST_F(ShellFolderTest, UIObjectsNeedExactlyOneItem) {
 TEST_F(ShellFolderTest, InfoTipIsThePathOfTheFullIdentifier) {
     ComPtr<IShellFolder> root = CreateRootFolder();
     UniquePidl station = StationItem(L"Station 1");
-    PCUITEMID_CHILD item = Child(station);
     ComPtr<IQueryInfo> info;
-    ASSERT_EQ(S_OK, root->GetUIObjectOf(nullptr, 1, &item, IID_IQueryInfo, nullptr, &info));
+    ASSERT_EQ(S_OK, UIObject(root.Get(), station, IID_IQueryInfo, &info));
     PWSTR tip = nullptr;
     ASSERT_EQ(S_OK, info->GetInfoTip(QITIPF_DEFAULT, &tip));
     EXPECT_STREQ(L"Quorvel Digital Level\\Station 1", tip);
@@ -55,13 +50,10 @@ TEST_F(ShellFolderTest, InfoTipIsThePathOfTheFullIdentifier) {
     DWORD flags = 0;
     EXPECT_EQ(E_NOTIMPL, info->GetInfoFlags(&flags));
 
-    ComPtr<IShellFolder> stationFolder;
-    ASSERT_EQ(S_OK, root->BindToObject(reinterpret_cast<PCUIDLIST_RELATIVE>(station.get()), nullptr,
-                                       IID_PPV_ARGS(&stationFolder)));
+    ComPtr<IShellFolder> stationFolder = Bind(root.Get(), station);
+    ASSERT_TRUE(stationFolder);
     UniquePidl file = FileItem(L"file1.hvr");
-    item = Child(file);
-    ASSERT_EQ(S_OK,
-              stationFolder->GetUIObjectOf(nullptr, 1, &item, IID_IQueryInfo, nullptr, &info));
+    ASSERT_EQ(S_OK, UIObject(stationFolder.Get(), file, IID_IQueryInfo, &info));
     // The folder's own copy of the list is gone; the tip object keeps its own.
     file.reset();
     ASSERT_EQ(S_OK, info->GetInfoTip(0, &tip));
@@ -72,36 +64,30 @@ TEST_F(ShellFolderTest, InfoTipIsThePathOfTheFullIdentifier) {
 TEST_F(ShellFolderTest, IconLocationByKindOfTheLastItem) {
     ComPtr<IShellFolder> root = CreateRootFolder();
     UniquePidl station = StationItem(L"Station 1");
-    UniquePidl rootItem = RootItem();
-    ComPtr<IShellFolder> stationFolder;
-    ASSERT_EQ(S_OK, root->BindToObject(reinterpret_cast<PCUIDLIST_RELATIVE>(station.get()), nullptr,
-                                       IID_PPV_ARGS(&stationFolder)));
+    UniquePidl rootItem(manager_.CreateRootPidl());
+    ComPtr<IShellFolder> stationFolder = Bind(root.Get(), station);
+    ASSERT_TRUE(stationFolder);
     UniquePidl file = FileItem(L"file1.lv");
 
     const std::tuple<IShellFolder*, const UniquePidl*, int> cases[] = {
         {root.Get(), &station, 0}, {stationFolder.Get(), &file, 2}, {root.Get(), &rootItem, 1}};
-    for (const auto& [folder, list, expectedIndex] : cases) {
-        PCUITEMID_CHILD item = Child(*list);
+    for (const auto& [folder, item, expectedIndex] : cases) {
         ComPtr<IExtractIconW> icon;
-        ASSERT_EQ(S_OK,
-                  folder->GetUIObjectOf(nullptr, 1, &item, IID_IExtractIconW, nullptr, &icon));
-        wchar_t file[MAX_PATH];
-        wcscpy(file, L"untouched");
+        ASSERT_EQ(S_OK, UIObject(folder, *item, IID_IExtractIconW, &icon));
+        wchar_t location[MAX_PATH] = L"untouched";
         int index = -1;
         UINT flags = 0;
-        ASSERT_EQ(S_OK, icon->GetIconLocation(GIL_FORSHELL, file, MAX_PATH, &index, &flags));
+        ASSERT_EQ(S_OK, icon->GetIconLocation(GIL_FORSHELL, location, MAX_PATH, &index, &flags));
         EXPECT_EQ(static_cast<UINT>(GIL_NOTFILENAME), flags);
         EXPECT_EQ(expectedIndex, index);
-        EXPECT_STREQ(L"untouched", file);
+        EXPECT_STREQ(L"untouched", location);
     }
 }
 
 TEST_F(ShellFolderTest, SharedIconListsFeedTheExtractor) {
     ComPtr<IShellFolder> root = CreateRootFolder();
-    UniquePidl station = StationItem(L"Station 1");
-    PCUITEMID_CHILD item = Child(station);
     ComPtr<IExtractIconW> extractor;
-    ASSERT_EQ(S_OK, root->GetUIObjectOf(nullptr, 1, &item, IID_IExtractIconW, nullptr, &extractor));
+    ASSERT_EQ(S_OK, UIObject(root.Get(), StationItem(L"Station 1"), IID_IExtractIconW, &extractor));
 
     DestroySharedIconLists();
     HICON large = reinterpret_cast<HICON>(1), small = reinterpret_cast<HICON>(1);
@@ -111,14 +97,11 @@ TEST_F(ShellFolderTest, SharedIconListsFeedTheExtractor) {
 
     // The test executable carries the module's resources, icons included.
     ASSERT_TRUE(BuildSharedIconLists(::GetModuleHandleW(nullptr)));
-    for (HIMAGELIST list : {SmallIconList(), LargeIconList()})
-        EXPECT_EQ(3, ::ImageList_GetImageCount(list));
     for (UINT index : {0u, 1u, 2u}) {
         ASSERT_EQ(S_OK, extractor->Extract(L"", index, &large, &small, MAKELONG(48, 16)));
         UniqueHIcon ownedLarge(large), ownedSmall(small);
-        ASSERT_TRUE(ownedLarge && ownedSmall);
-        EXPECT_EQ(::GetSystemMetrics(SM_CXICON), IconSize(large).cx) << "requested size ignored";
-        EXPECT_EQ(::GetSystemMetrics(SM_CXSMICON), IconSize(small).cx);
+        EXPECT_EQ(::GetSystemMetrics(SM_CXICON), IconWidth(large)) << "requested size ignored";
+        EXPECT_EQ(::GetSystemMetrics(SM_CXSMICON), IconWidth(small));
     }
     // An index past the lists (the shell passes back whatever GetIconLocation gave, but nothing
     // stops another caller) makes no icon rather than reading past them.
@@ -136,25 +119,4 @@ TEST_F(ShellFolderTest, IconListsAreNotBuiltFromAModuleWithoutTheIcons) {
     EXPECT_FALSE(BuildSharedIconLists(::GetModuleHandleW(L"kernel32.dll")));
     EXPECT_EQ(nullptr, SmallIconList());
     EXPECT_EQ(nullptr, LargeIconList());
-}
-
-TEST_F(ShellFolderTest, DataObjectOfAStationsFileNamesItByTheStationsModel) {
-    AddStationOfModel(L"Tripod", IDS_MODEL_LV20);
-    ComPtr<IShellFolder> root = CreateRootFolder();
-    UniquePidl station = StationItem(L"Tripod");
-    ComPtr<IShellFolder> stationFolder;
-    ASSERT_EQ(S_OK, root->BindToObject(Child(station), nullptr, IID_PPV_ARGS(&stationFolder)));
-    UniquePidl file = FileItem(L"file1.hvr");
-    PCUITEMID_CHILD item = Child(file);
-    ComPtr<IDataObject> data;
-    ASSERT_EQ(S_OK,
-              stationFolder->GetUIObjectOf(nullptr, 1, &item, IID_IDataObject, nullptr, &data));
-    FORMATETC format = {static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(CFSTR_FILEDESCRIPTORW)),
-                        nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
-    UniqueStgMedium medium;
-    ASSERT_EQ(S_OK, data->GetData(&format, medium.put()));
-    GlobalLockGuard lock(medium.get().hGlobal);
-    const auto* group = static_cast<const FILEGROUPDESCRIPTORW*>(lock.data());
-    ASSERT_EQ(1u, group->cItems);
-    EXPECT_STREQ(L"file1.hvr", group->fgd[0].cFileName);
 }

@@ -11,13 +11,11 @@
 #include <string>
 #include <vector>
 
-#include "server/lv_shell_folder.h"
 #include "namespace/pidl_manager.h"
-#include "res/resource.h"
-#include "stations/station_store.h"
+#include "server/lv_shell_folder.h"
 #include "support/class_factory.h"
 #include "support/module_lock.h"
-#include "support/text_lookup.h"
+#include "tests/stations/station_builders.h"
 #include "tests/support/registry_override.h"
 
 using Microsoft::WRL::ComPtr;
@@ -26,17 +24,12 @@ inline constexpr wchar_t kPrefix[] = L"::{7D3F2A61-4B8E-4c19-9A27-5E0C81B6D4F3}"
 
 class ShellFolderTest : public ::testing::Test {
 protected:
+    using Items = std::vector<std::pair<DWORD, std::wstring>>;
+
     void TearDown() override {
         // Every object made by a test is a local of the test body and gone by now: a lock left
         // over is a reference leaked by the code under test.
         EXPECT_EQ(0, ModuleLockCount());
-    }
-
-    static void AddStationOfModel(const std::wstring& name, UINT modelId = IDS_MODEL_LV10) {
-        Station station = DefaultStation();
-        station.Name = name;
-        station.Model = LoadUiText(modelId);
-        ASSERT_EQ(S_OK, AddStation(station));
     }
 
     // The root folder as the shell makes it: through the class's creation function, then
@@ -50,6 +43,12 @@ protected:
         return folder;
     }
 
+    static ComPtr<IShellFolder> Bind(IShellFolder* parent, const UniquePidl& item) {
+        ComPtr<IShellFolder> folder;
+        EXPECT_EQ(S_OK, parent->BindToObject(Child(item), nullptr, IID_PPV_ARGS(&folder)));
+        return folder;
+    }
+
     UniquePidl StationItem(const std::wstring& name) const {
         return UniquePidl(manager_.CreateItemPidl((L"Quorvel Digital Level\\" + name).c_str()));
     }
@@ -58,10 +57,17 @@ protected:
             manager_.CreatePidlFromPath((L"Quorvel Digital Level\\S\\" + name).c_str()));
         return UniquePidl(manager_.CopyFromIndex(full.get(), 2));
     }
-    UniquePidl RootItem() const { return UniquePidl(manager_.CreateRootPidl()); }
-
     static PCUITEMID_CHILD Child(const UniquePidl& list) {
         return reinterpret_cast<PCUITEMID_CHILD>(list.get());
+    }
+
+    // ParseDisplayName of a (writable copy of the) name; the list is null after a failure.
+    static HRESULT Parse(IShellFolder* folder, std::wstring name, UniquePidl& list) {
+        PIDLIST_RELATIVE parsed = reinterpret_cast<PIDLIST_RELATIVE>(1);
+        const HRESULT result =
+            folder->ParseDisplayName(nullptr, nullptr, name.data(), nullptr, &parsed, nullptr);
+        list.reset(reinterpret_cast<LPITEMIDLIST>(parsed));
+        return result;
     }
 
     static HRESULT DisplayName(IShellFolder* folder, const UniquePidl& item, SHGDNF flags,
@@ -76,16 +82,19 @@ protected:
         return result;
     }
 
+    static HRESULT UIObject(IShellFolder* folder, const UniquePidl& item, REFIID iid,
+                            void** object) {
+        PCUITEMID_CHILD child = Child(item);
+        return folder->GetUIObjectOf(nullptr, 1, &child, iid, nullptr, object);
+    }
+
     // Kind and name of every item the folder lists for the flags.
-    std::vector<std::pair<DWORD, std::wstring>> Enumerate(IShellFolder* folder, SHCONTF flags) {
-        std::vector<std::pair<DWORD, std::wstring>> items;
+    Items Enumerate(IShellFolder* folder, SHCONTF flags) {
+        Items items;
         ComPtr<IEnumIDList> enumerator;
         EXPECT_EQ(S_OK, folder->EnumObjects(nullptr, flags, &enumerator));
-        if (!enumerator)
-            return items;
         PITEMID_CHILD item = nullptr;
-        ULONG fetched = 0;
-        while (enumerator->Next(1, &item, &fetched) == S_OK && fetched == 1) {
+        while (enumerator && enumerator->Next(1, &item, nullptr) == S_OK) {
             UniquePidl owned(reinterpret_cast<LPITEMIDLIST>(item));
             items.emplace_back(manager_.GetLastItemKind(owned.get()),
                                manager_.GetItemName(owned.get()));

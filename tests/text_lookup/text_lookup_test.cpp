@@ -25,12 +25,8 @@ void WriteBytes(const fs::path& path, const std::string& bytes) {
 
 // A UTF-16LE translation file with its byte-order mark.
 void WriteTranslations(const fs::path& path, const std::wstring& text) {
-    std::string bytes = "\xFF\xFE";
-    for (wchar_t character : text) {
-        bytes.push_back(static_cast<char>(character & 0xFF));
-        bytes.push_back(static_cast<char>(character >> 8));
-    }
-    WriteBytes(path, bytes);
+    WriteBytes(path, "\xFF\xFE" + std::string(reinterpret_cast<const char*>(text.data()),
+                                              text.size() * sizeof(wchar_t)));
 }
 
 // A scratch directory that plays the directory of a module named LVShellExt.dll.
@@ -119,23 +115,17 @@ TEST_F(TranslationFolder, FileIsLoadedOncePerProcess) {
     EXPECT_EQ(German(L"Cancel"), L"Verwerfen");
 }
 
-TEST_F(TranslationFolder, BrokenFilesFallBackToEnglish) {
+TEST_F(TranslationFolder, FilesThatCannotBeReadFallBackToEnglish) {
+    // The parser's own rejections (short, big-endian, cut files) are proved by its portable tests.
     const fs::path file = directory_ / L"ShellExt.txt";
     TranslationMap map;
-    const std::string cases[] = {
-        std::string(),                                     // empty: cannot even be mapped
-        std::string("\xFF"),                               // one byte
-        std::string("\xFE\xFF\0[\0C\0]", 8),               // big-endian
-        std::string("\xFF\xFE[\0C\0a\0n\0c\0e\0l\0", 16),  // cut in the English line
-        std::string("\xFF\xFE\0\xD8\0\xDC\xFF", 7),        // stray surrogates, odd size
-    };
-    for (const std::string& bytes : cases) {
-        WriteBytes(file, bytes);
-        ClearTranslationCache();
-        EXPECT_EQ(German(L"Cancel@@note"), L"Cancel");
-    }
     WriteBytes(file, "");
+    EXPECT_EQ(LoadTranslationFile(file.wstring(), map), E_FAIL) << "an empty file cannot be mapped";
+    EXPECT_EQ(German(L"Cancel@@note"), L"Cancel");
+    WriteBytes(file, std::string("\xFE\xFF\0[\0C\0]", 8));
+    ClearTranslationCache();
     EXPECT_EQ(LoadTranslationFile(file.wstring(), map), E_FAIL);
+    EXPECT_EQ(German(L"Cancel@@note"), L"Cancel");
     EXPECT_EQ(LoadTranslationFile((directory_ / L"missing.txt").wstring(), map),
               HRESULT_FROM_WIN32(ERROR_FILE_NOT_FOUND));
     EXPECT_TRUE(map.empty());

@@ -1,10 +1,8 @@
 // The block receive procedures through the port interface: raw stream, BCC blocks, Y-Modem.
 #include <gtest/gtest.h>
 
-#include <cstring>
+#include <utility>
 
-#include "download/portable/block_format.h"
-#include "download/portable/serial_protocol.h"
 #include "tests/portable/serial/fake_serial.h"
 
 namespace {
@@ -12,9 +10,32 @@ namespace {
 const Bytes kEnqLine = {0x05, 0x0D, 0x0A};
 const Bytes kAckLine = {0x06, 0x0D, 0x0A};
 const Bytes kNakLine = {0x15, 0x0D, 0x0A};
+const WideString kWaitExpired = WIDE_TEXT("The waiting time of the data has expired.");
+const WideString kImportFailed = WIDE_TEXT("AZ doesn't respond or error in importing block");
+const WideString kInterrupted = WIDE_TEXT("The communication's process is interrupted by the user");
 
-Bytes AsBytes(const BccBlock& block) {
-    return Bytes(block.begin(), block.end());
+TEST(RawStream, WritesEveryBurstUntilEot) {
+    ProtocolRun run(3);
+    run.port.Deliver("first burst ");
+    run.port.Deliver("second");
+    run.port.onSilence = [sent = false](FakePort& port) mutable {
+        if (!std::exchange(sent, true))
+            port.Queue(ToBytes("end\x04x"));
+    };
+    EXPECT_EQ(run.protocol.Receive(), 0u);
+    EXPECT_EQ(run.file.Text(), "first burst secondend\x04x");
+    EXPECT_TRUE(run.port.writes.empty());
+    EXPECT_EQ(run.callback.progress.front(), std::make_pair(100u, 0u));
+    EXPECT_EQ(run.callback.progress.back(), std::make_pair(100u, 20u));
+}
+
+TEST(RawStream, WithoutEotTimesOut) {
+    ProtocolRun run(0);
+    run.port.Deliver("no end");
+    EXPECT_EQ(run.protocol.Receive(), 1u);
+    EXPECT_EQ(run.file.Text(), "no end");
+    EXPECT_EQ(run.callback.messages, OnlyMessage(4, kWaitExpired));
+    EXPECT_FALSE(run.file.open);
 }
 
 std::string BlockText(int index) {
@@ -22,307 +43,233 @@ std::string BlockText(int index) {
     return "R," + std::to_string(index) + ",1.2345,\x11\x13,";
 }
 
-Bytes Padded(const std::string& text) {
-    Bytes data(text.begin(), text.end());
-    data.resize(128, ' ');
-    return data;
-}
+// A BCC-block receive against an instrument that sends block 0 on ENQ, the next on ACK, the same
+// again on NAK, and EOT after the last. damage(index, attempt) may spoil what goes out; the
+// instrument may miss our first ACK of block missedAck and send that block again.
+struct BccRun : ProtocolRun {
+    BccRun() : ProtocolRun(1) {}
 
-struct BlockProtocolTest : ::testing::Test {
-    ProtocolRig rig;
-    std::unique_ptr<SerialProtocol> protocol;
-    void Start(uint32_t selector) {
-        protocol = std::make_unique<SerialProtocol>(rig.port, rig.clock, rig.file, rig.callback,
-                                                    rig.texts, selector);
-        protocol->SetPortOpen(true);
-    }
-};
-
-TEST_F(BlockProtocolTest, RawStreamWritesEveryBurstUntilEot) {
-    Start(3);
-    rig.port.Deliver(ToBytes("first burst "));
-    rig.port.Deliver(ToBytes("second"));
-    rig.port.onSilence = [sent = false](FakePort& port) mutable {
-        if (!sent)
-            port.Queue(Bytes{'e', 'n', 'd', 0x04, 'x'});
-        sent = true;
-    };
-    EXPECT_EQ(protocol->Receive(), 0u);
-    EXPECT_EQ(rig.file.content, (Bytes{'f', 'i', 'r', 's', 't', ' ', 'b', 'u', 'r', 's',  't', ' ',
-                                       's', 'e', 'c', 'o', 'n', 'd', 'e', 'n', 'd', 0x04, 'x'}));
-    EXPECT_TRUE(rig.port.written.empty());
-    EXPECT_EQ(rig.callback.progress.front(), std::make_pair(100u, 0u));
-    EXPECT_EQ(rig.callback.progress.back(), std::make_pair(100u, 20u));
-}
-
-TEST_F(BlockProtocolTest, RawStreamWithoutEotTimesOut) {
-    Start(0);
-    rig.port.Deliver(ToBytes("no end"));
-    EXPECT_EQ(protocol->Receive(), 1u);
-    EXPECT_EQ(rig.file.Text(), "no end");
-    EXPECT_EQ(rig.callback.messages,
-              OnlyMessage(4, WIDE_TEXT("The waiting time of the data has expired.")));
-    EXPECT_FALSE(rig.file.open);
-}
-
-// An instrument sending BCC blocks: block 0 on ENQ, the next on ACK, the same again on NAK,
-// EOT after the last. damage(index, attempt) may spoil what goes out.
-struct BccInstrument {
     int blocks = 3;
     int next = 0;
     int attempt = 0;
+    int missedAck = -1;
     std::function<void(int index, int attempt, BccBlock& block)> damage;
 
-    void Send(FakePort& port) {
-        if (next >= blocks) {
-            port.Deliver(Bytes{0x04});
-            return;
-        }
+    void Send() {
+        if (next >= blocks)
+            return port.Deliver(Bytes{0x04});
         const std::string text = BlockText(next);
-        BccBlock block =
-            BuildBccBlock(reinterpret_cast<const uint8_t*>(text.data()), text.size(), next);
+        BccBlock block = BuildBccBlock(BytesOf(text), text.size(), next);
         if (damage)
             damage(next, attempt, block);
         ++attempt;
-        port.Deliver(AsBytes(block));
+        port.Deliver(Bytes(block.begin(), block.end()));
     }
-    void Attach(FakePort& port) {
-        port.onWrite = [this](const Bytes& written, FakePort& p) {
-            if (written == kEnqLine) {
-                Send(p);
-            } else if (written == kAckLine && next <= blocks) {
+    uint32_t Receive() {
+        port.onWrite = [this](const Bytes& written, FakePort&) {
+            if (written == kAckLine && next == missedAck) {
+                missedAck = -1;  // lost on the line: the instrument sends the block again
+                Send();
+            } else if (written == kAckLine && next < blocks) {
                 ++next;
                 attempt = 0;
-                if (next <= blocks)
-                    Send(p);
-            } else if (written == kNakLine) {
-                Send(p);
+                Send();
+            } else if (written == kEnqLine || written == kNakLine) {
+                Send();
             }
         };
+        return protocol.Receive();
     }
 };
 
-TEST_F(BlockProtocolTest, BccBlocksAreWrittenAndTheEndAcknowledgedTenTimes) {
-    Start(1);
-    BccInstrument instrument;
-    instrument.Attach(rig.port);
-    EXPECT_EQ(protocol->Receive(), 0u);
-    Bytes expected;
-    for (int i = 0; i < 3; ++i) {
-        const Bytes data = Padded(BlockText(i));
-        expected.insert(expected.end(), data.begin(), data.end());
+// What the first count blocks leave in the file: each block's text filled with spaces.
+std::string BlocksText(int count) {
+    std::string text;
+    for (int i = 0; i < count; ++i)
+        text += (BlockText(i) + std::string(128, ' ')).substr(0, 128);
+    return text;
+}
+
+TEST(BccBlocks, AreWrittenAfterTheEnqAndTheEndIsAcknowledgedTenTimes) {
+    BccRun run;
+    EXPECT_EQ(run.Receive(), 0u);
+    EXPECT_EQ(run.file.Text(), BlocksText(3));
+    EXPECT_EQ(run.port.writes.front(), kEnqLine);
+    ASSERT_GE(run.port.writes.size(), 10u);
+    EXPECT_EQ(std::vector(run.port.writes.end() - 10, run.port.writes.end()),
+              std::vector<Bytes>(10, kAckLine));
+}
+
+TEST(BccBlocks, BadBccIsAnsweredWithNakUntilTheFifthBadBlockInARowEndsTheReceive) {
+    const struct {
+        int badAttempts;  // of block 1
+        uint32_t result;
+        long naks;
+        int blocksWritten;
+        std::vector<RecordedMessage> messages;
+    } cases[] = {
+        {2, 0, 2, 3, {}},
+        {5, 1, 4, 1, OnlyMessage(4, kImportFailed)},
+    };
+    for (const auto& test : cases) {
+        BccRun run;
+        run.damage = [&](int index, int attempt, BccBlock& block) {
+            if (index == 1 && attempt < test.badAttempts)
+                block[20] ^= 0x40;
+        };
+        EXPECT_EQ(run.Receive(), test.result) << test.badAttempts;
+        EXPECT_EQ(run.port.WritesOf(kNakLine), test.naks) << test.badAttempts;
+        EXPECT_EQ(run.file.Text(), BlocksText(test.blocksWritten)) << test.badAttempts;
+        EXPECT_EQ(run.callback.messages, test.messages) << test.badAttempts;
     }
-    EXPECT_EQ(rig.file.content, expected);
-    ASSERT_GE(rig.port.writes.size(), 10u);
-    for (size_t i = rig.port.writes.size() - 10; i < rig.port.writes.size(); ++i)
-        EXPECT_EQ(rig.port.writes[i], kAckLine);
-    EXPECT_EQ(rig.port.writes.front(), kEnqLine);
 }
 
-TEST_F(BlockProtocolTest, BadBccIsAnsweredWithNakAndTheResentBlockWrittenOnce) {
-    Start(1);
-    BccInstrument instrument;
-    instrument.damage = [](int index, int attempt, BccBlock& block) {
-        if (index == 1 && attempt < 2)
-            block[20] ^= 0x40;
-    };
-    instrument.Attach(rig.port);
-    EXPECT_EQ(protocol->Receive(), 0u);
-    EXPECT_EQ(rig.file.content.size(), 3 * 128u);
-    EXPECT_EQ(std::count(rig.port.writes.begin(), rig.port.writes.end(), kNakLine), 2);
+TEST(BccBlocks, BlockSentAgainWithTheSameDigitIsWrittenOnce) {
+    BccRun run;
+    run.missedAck = 1;
+    EXPECT_EQ(run.Receive(), 0u);
+    EXPECT_EQ(run.port.WritesOf(kAckLine), 3 + 1 + 10) << "block 1 is acknowledged twice";
+    EXPECT_EQ(run.file.Text(), BlocksText(3));
 }
 
-TEST_F(BlockProtocolTest, BlockRepeatedWithTheSameDigitIsWrittenOnce) {
-    Start(1);
-    BccInstrument instrument;
-    instrument.Attach(rig.port);
-    auto inner = rig.port.onWrite;
-    // The instrument misses our first ACK of block 1 and sends block 1 again.
-    rig.port.onWrite = [&, inner, missed = false](const Bytes& written, FakePort& port) mutable {
-        if (written == kAckLine && instrument.next == 1 && !missed) {
-            missed = true;
-            instrument.Send(port);
-            return;
-        }
-        inner(written, port);
-    };
-    EXPECT_EQ(protocol->Receive(), 0u);
-    EXPECT_EQ(rig.file.content.size(), 3 * 128u);
+TEST(BccBlocks, SilentInstrumentIsPolledAgainEveryFourSecondsUntilTheTimeOut) {
+    ProtocolRun run(1);
+    const int64_t start = run.clock.WallSeconds();
+    EXPECT_EQ(run.protocol.Receive(), 1u);
+    EXPECT_GT(run.clock.WallSeconds() - start, 60);
+    EXPECT_GE(run.port.WritesOf(kEnqLine), 14);
+    EXPECT_LE(run.port.WritesOf(kEnqLine), 16);
+    EXPECT_EQ(run.callback.messages.back().text, kWaitExpired);
 }
 
-TEST_F(BlockProtocolTest, FiveNaksInARowEndTheBlockProtocol) {
-    Start(1);
-    BccInstrument instrument;
-    instrument.damage = [](int index, int, BccBlock& block) {
-        if (index == 2)
-            block[5] ^= 1;
-    };
-    instrument.Attach(rig.port);
-    EXPECT_EQ(protocol->Receive(), 1u);
-    EXPECT_EQ(std::count(rig.port.writes.begin(), rig.port.writes.end(), kNakLine), 4);
-    EXPECT_EQ(rig.callback.messages,
-              OnlyMessage(4, WIDE_TEXT("AZ doesn't respond or error in importing block")));
-    EXPECT_EQ(rig.file.content.size(), 2 * 128u);
-}
-
-TEST_F(BlockProtocolTest, SilentInstrumentIsPolledAgainEveryFourSecondsUntilTheTimeOut) {
-    Start(1);
-    const int64_t start = rig.clock.WallSeconds();
-    EXPECT_EQ(protocol->Receive(), 1u);
-    EXPECT_GT(rig.clock.WallSeconds() - start, 60);
-    const auto enqs = std::count(rig.port.writes.begin(), rig.port.writes.end(), kEnqLine);
-    EXPECT_GE(enqs, 14);
-    EXPECT_LE(enqs, 16);
-    EXPECT_EQ(rig.callback.messages.back().text,
-              WIDE_TEXT("The waiting time of the data has expired."));
-}
-
-TEST_F(BlockProtocolTest, CancelAfterANakClosesThePort) {
-    Start(1);
-    BccInstrument instrument;
-    instrument.damage = [](int index, int, BccBlock& block) {
+TEST(BccBlocks, CancelAfterANakClosesThePort) {
+    BccRun run;
+    run.damage = [](int index, int, BccBlock& block) {
         if (index == 1)
             block[5] ^= 1;
     };
-    instrument.Attach(rig.port);
     int asked = 0;
-    rig.callback.cancelWhen = [&] { return ++asked > 1; };
-    EXPECT_EQ(protocol->Receive(), 1u);
-    EXPECT_EQ(rig.callback.messages,
-              OnlyMessage(4, WIDE_TEXT("The communication's process is interrupted by the user")));
-    EXPECT_EQ(rig.port.closes, 1);
-    EXPECT_FALSE(protocol->IsPortOpen());
+    run.callback.cancelWhen = [&] { return ++asked > 1; };
+    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_EQ(run.callback.messages, OnlyMessage(4, kInterrupted));
+    EXPECT_EQ(run.port.closes, 1);
+    EXPECT_FALSE(run.protocol.IsPortOpen());
 }
 
-// A Y-Modem sender: header on the first 'C', data blocks on each ACK, EOT after the last.
-struct YModemSender {
-    Bytes file;
-    std::string name = "survey.lv";
-    size_t nextBlock = 0;  // 0 = header
-    bool eotSent = false;
-    std::function<void(size_t block, Bytes& bytes)> damage;
-    CrcTable table;
-
-    YModemSender() { BuildCrcTable(table); }
-    size_t DataBlocks() const { return (file.size() + 127) / 128; }
-    void SendCurrent(FakePort& port) {
-        if (nextBlock == 0) {
-            const YModemBlock header =
-                BuildYModemHeaderBlock(name, static_cast<uint32_t>(file.size()), 0, table);
-            port.Deliver(Bytes(header.begin(), header.end()));
-            return;
-        }
-        if (nextBlock > DataBlocks()) {
-            port.Deliver(Bytes{0x04});
-            eotSent = true;
-            return;
-        }
-        Bytes block = {0x01, static_cast<uint8_t>(nextBlock),
-                       static_cast<uint8_t>(255 - nextBlock)};
-        const size_t offset = (nextBlock - 1) * 128;
-        Bytes data(file.begin() + offset, file.begin() + std::min(file.size(), offset + 128));
-        data.resize(128, 0x1A);
-        block.insert(block.end(), data.begin(), data.end());
-        const uint16_t crc = Crc16(table, data.data(), data.size());
-        block.push_back(static_cast<uint8_t>(crc >> 8));
-        block.push_back(static_cast<uint8_t>(crc));
-        if (damage)
-            damage(nextBlock, block);
-        port.Deliver(block);
-    }
-    void Attach(FakePort& port) {
-        port.onWrite = [this](const Bytes& written, FakePort& p) {
-            if (written == Bytes{0x43} && nextBlock == 0) {
-                SendCurrent(p);
-            } else if (written == Bytes{0x06, 0x43} || (written == Bytes{0x06} && !eotSent)) {
-                ++nextBlock;
-                SendCurrent(p);
-            } else if (written == Bytes{0x15}) {
-                SendCurrent(p);
-            }
-        };
-    }
-};
-
-TEST_F(BlockProtocolTest, YModemReceivesTheAnnouncedSizeAndReportsTheHeader) {
-    Start(2);
-    YModemSender sender;
-    for (int i = 0; i < 300; ++i)
-        sender.file.push_back(static_cast<uint8_t>(i * 7));
-    sender.Attach(rig.port);
-
-    EXPECT_EQ(protocol->Receive(), 0u);
-    EXPECT_EQ(rig.file.content, sender.file);
-    EXPECT_EQ(protocol->FileSize(), 300u);
-    EXPECT_EQ(protocol->YModemFileName(), "survey.lv");
-    EXPECT_EQ(protocol->ExpectedBlockCount(), 3u);
-    EXPECT_EQ(rig.callback.messages,
-              OnlyMessage(1, WIDE_TEXT("Y-Modem File Info: survey.lv (size=300 byte)")));
-    EXPECT_EQ(rig.port.writes.back(), (Bytes{0x18, 0x18}));
-    EXPECT_EQ(rig.callback.progress.back(), std::make_pair(300u, 299u));
-}
-
-TEST_F(BlockProtocolTest, YModemBlockOfHundredThirtyOneBytesPassesWithoutCrc) {
-    Start(2);
-    YModemSender sender;
-    sender.file = Bytes(200, 'L');
-    sender.damage = [](size_t block, Bytes& bytes) {
-        if (block == 2)
-            bytes.resize(131);
-    };
-    sender.Attach(rig.port);
-    EXPECT_EQ(protocol->Receive(), 0u);
-    EXPECT_EQ(rig.file.content, sender.file);
-}
-
-TEST_F(BlockProtocolTest, YModemTenNaksInARowFail) {
-    Start(2);
-    YModemSender sender;
-    sender.file = Bytes(500, 'L');
-    sender.damage = [](size_t block, Bytes& bytes) {
-        if (block == 2)
-            bytes[60] ^= 1;
-    };
-    sender.Attach(rig.port);
-    EXPECT_EQ(protocol->Receive(), 1u);
-    EXPECT_EQ(std::count(rig.port.writes.begin(), rig.port.writes.end(), Bytes{0x15}), 10);
-    EXPECT_EQ(rig.callback.messages.back().text,
-              WIDE_TEXT("AZ doesn't respond or error in importing block"));
-    EXPECT_EQ(rig.file.content.size(), 128u);
-}
-
-TEST_F(BlockProtocolTest, SendingAYModemHeaderWaitsForTheReceiverAndResendsUntilAck) {
-    Start(2);
-    CrcTable table;
-    BuildCrcTable(table);
-    const YModemBlock header = BuildYModemHeaderBlock("a.lv", 10, 5, table);
-    int sends = 0;
-    rig.port.Queue(Bytes{0x43});
-    rig.port.onWrite = [&](const Bytes& written, FakePort& port) {
-        EXPECT_EQ(written, Bytes(header.begin(), header.end()));
-        port.Deliver(Bytes{++sends < 3 ? uint8_t{0x15} : uint8_t{0x06}});
-    };
-    EXPECT_EQ(protocol->SendYModemHeader(header), 0u);
-    EXPECT_EQ(sends, 3);
-}
-
-TEST_F(BlockProtocolTest, InputFileBccMismatchIsReportedWithItsNumbers) {
-    Start(1);
-    const std::string text = "abc";
-    BccBlock block = BuildBccBlock(reinterpret_cast<const uint8_t*>(text.data()), 3, 0);
+TEST(BccBlocks, InputFileBccMismatchIsReportedWithItsNumbers) {
+    ProtocolRun run(1);
+    BccBlock block = BuildBccBlock(BytesOf("abc"), 3, 0);
     const uint8_t stored = ComputeBcc(block.data());
     block[1] = 'b';  // 'a' ^ 'b' = 3
     Bytes file(block.begin(), block.end());
     file.push_back(0x04);
-    EXPECT_FALSE(protocol->CheckInputFile(file.data(), file.size()));
-    ASSERT_EQ(rig.callback.messages.size(), 1u);
+    EXPECT_FALSE(run.protocol.CheckInputFile(file.data(), file.size()));
     const std::string expected = "Incorrect input file: BCC in block 0 mismatch with computed " +
                                  std::to_string(stored) + "!=" + std::to_string(stored ^ 3);
-    EXPECT_EQ(rig.callback.messages[0].text, WidenBytes(expected.data(), expected.size()));
-    EXPECT_TRUE(protocol->IsFileOpened());
+    EXPECT_EQ(run.callback.messages, OnlyMessage(4, WidenBytes(expected.data(), expected.size())));
+    EXPECT_TRUE(run.protocol.IsFileOpened());
+    // A file that is not made of blocks passes, but is noted as not opened.
     const Bytes notBlocks = ToBytes("plain text");
-    EXPECT_TRUE(protocol->CheckInputFile(notBlocks.data(), notBlocks.size()));
-    EXPECT_FALSE(protocol->IsFileOpened());
+    EXPECT_TRUE(run.protocol.CheckInputFile(notBlocks.data(), notBlocks.size()));
+    EXPECT_FALSE(run.protocol.IsFileOpened());
+}
+
+// A Y-Modem receive against a sender that sends its header on the first 'C', a data block on
+// each ACK and EOT after the last. damage(block, bytes) may spoil what goes out (block 0 is the
+// header).
+struct YModemRun : ProtocolRun {
+    explicit YModemRun(Bytes bytes) : ProtocolRun(2), sent(std::move(bytes)) {}
+
+    Bytes sent;
+    size_t nextBlock = 0;
+    bool eotSent = false;
+    std::function<void(size_t block, Bytes& bytes)> damage;
+    const CrcTable table = MakeCrcTable();
+
+    void Send() {
+        if (nextBlock == 0) {
+            const YModemBlock header =
+                BuildYModemHeaderBlock("survey.lv", static_cast<uint32_t>(sent.size()), 0, table);
+            return port.Deliver(Bytes(header.begin(), header.end()));
+        }
+        if (nextBlock > (sent.size() + 127) / 128) {
+            eotSent = true;
+            return port.Deliver(Bytes{0x04});
+        }
+        const size_t offset = (nextBlock - 1) * 128;
+        Bytes data(sent.begin() + offset, sent.begin() + std::min(sent.size(), offset + 128));
+        data.resize(128, 0x1A);
+        const uint16_t crc = Crc16(table, data.data(), data.size());
+        Bytes block = {0x01, static_cast<uint8_t>(nextBlock),
+                       static_cast<uint8_t>(255 - nextBlock)};
+        block.insert(block.end(), data.begin(), data.end());
+        block.insert(block.end(), {static_cast<uint8_t>(crc >> 8), static_cast<uint8_t>(crc)});
+        if (damage)
+            damage(nextBlock, block);
+        port.Deliver(block);
+    }
+    uint32_t Receive() {
+        port.onWrite = [this](const Bytes& written, FakePort&) {
+            if ((written == Bytes{0x43} && nextBlock == 0) || written == Bytes{0x15}) {
+                Send();
+            } else if (written == Bytes{0x06, 0x43} || (written == Bytes{0x06} && !eotSent)) {
+                ++nextBlock;
+                Send();
+            }
+        };
+        return protocol.Receive();
+    }
+};
+
+TEST(YModem, ReceivesTheAnnouncedSizeAndReportsTheHeader) {
+    Bytes sent;
+    for (int i = 0; i < 300; ++i)
+        sent.push_back(static_cast<uint8_t>(i * 7));
+    YModemRun run(sent);
+    EXPECT_EQ(run.Receive(), 0u);
+    EXPECT_EQ(run.file.content, sent);
+    EXPECT_EQ(run.protocol.FileSize(), 300u);
+    EXPECT_EQ(run.protocol.YModemFileName(), "survey.lv");
+    EXPECT_EQ(run.protocol.ExpectedBlockCount(), 3u);
+    EXPECT_EQ(run.callback.messages,
+              OnlyMessage(1, WIDE_TEXT("Y-Modem File Info: survey.lv (size=300 byte)")));
+    EXPECT_EQ(run.port.writes.back(), (Bytes{0x18, 0x18}));
+    EXPECT_EQ(run.callback.progress.back(), std::make_pair(300u, 299u));
+}
+
+TEST(YModem, BlockOfHundredThirtyOneBytesPassesWithoutCrc) {
+    YModemRun run(Bytes(200, 'L'));
+    run.damage = [](size_t block, Bytes& bytes) {
+        if (block == 2)
+            bytes.resize(131);
+    };
+    EXPECT_EQ(run.Receive(), 0u);
+    EXPECT_EQ(run.file.content, run.sent);
+}
+
+TEST(YModem, TenNaksInARowFail) {
+    YModemRun run(Bytes(500, 'L'));
+    run.damage = [](size_t block, Bytes& bytes) {
+        if (block == 2)
+            bytes[60] ^= 1;
+    };
+    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_EQ(run.port.WritesOf(Bytes{0x15}), 10);
+    EXPECT_EQ(run.callback.messages.back().text, kImportFailed);
+    EXPECT_EQ(run.file.content.size(), 128u);
+}
+
+TEST(YModem, SendingAHeaderWaitsForTheReceiverAndResendsUntilAck) {
+    ProtocolRun run(2);
+    const YModemBlock header = BuildYModemHeaderBlock("a.lv", 10, 5, MakeCrcTable());
+    int sends = 0;
+    run.port.Queue(Bytes{0x43});
+    run.port.onWrite = [&](const Bytes& written, FakePort& port) {
+        EXPECT_EQ(written, Bytes(header.begin(), header.end()));
+        port.Deliver(Bytes{++sends < 3 ? uint8_t{0x15} : uint8_t{0x06}});
+    };
+    EXPECT_EQ(run.protocol.SendYModemHeader(header), 0u);
+    EXPECT_EQ(sends, 3);
 }
 
 }  // namespace

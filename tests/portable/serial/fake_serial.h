@@ -1,21 +1,30 @@
 // Test doubles of the driver's outside world: a scripted port on a fake clock, a memory file,
-// a recording callback and the English texts.
+// a recording callback and the English texts; and the small builders the protocol tests share.
 #pragma once
 
+#include <algorithm>
 #include <cstdint>
 #include <deque>
 #include <functional>
 #include <string>
 #include <vector>
 
-#include "download/portable/driver_text.h"
-#include "download/portable/parser_callback.h"
-#include "download/portable/protocol_io.h"
+#include "download/portable/serial_protocol.h"  // with the port, file, callback and text types
 
 using Bytes = std::vector<uint8_t>;
 
 inline Bytes ToBytes(const std::string& text) {
     return Bytes(text.begin(), text.end());
+}
+
+inline const uint8_t* BytesOf(const std::string& text) {
+    return reinterpret_cast<const uint8_t*>(text.data());
+}
+
+inline CrcTable MakeCrcTable() {
+    CrcTable table;
+    BuildCrcTable(table);
+    return table;
 }
 
 // Time moves only when the port says so.
@@ -29,7 +38,8 @@ public:
 
 // A port whose peer is a script: what the driver writes is handed to onWrite, which answers
 // with Deliver. Each Read returns at most one delivered chunk (so a test chooses where bursts
-// split); an empty port costs the port's total time-out on the fake clock, as a real one would.
+// split); an empty port costs the port's total time-out on the fake clock, as a real one would,
+// and each write costs millisecondsPerWrite.
 class FakePort final : public SerialPort {
 public:
     explicit FakePort(FakeClock& clock) : clock_(clock) {}
@@ -41,7 +51,6 @@ public:
     void Queue(const Bytes& chunk) { incoming_.push_back(chunk); }
 
     size_t Read(uint8_t* buffer, size_t count) override {
-        ++readCalls;
         for (auto& chunk : pending_)
             incoming_.push_back(std::move(chunk));
         pending_.clear();
@@ -70,8 +79,8 @@ public:
             clock_.Advance(100);
             return 0;
         }
+        clock_.Advance(millisecondsPerWrite);
         const Bytes chunk(bytes, bytes + count);
-        written.insert(written.end(), chunk.begin(), chunk.end());
         writes.push_back(chunk);
         if (onWrite)
             onWrite(chunk, *this);
@@ -79,21 +88,22 @@ public:
     }
 
     void Purge(bool, bool receive) override {
-        ++purges;
         if (receive)
             incoming_.clear();
     }
     void Break() override { ++breaks; }
     void Close() override { ++closes; }
 
+    long WritesOf(const Bytes& bytes) const {
+        return std::count(writes.begin(), writes.end(), bytes);
+    }
+
     std::function<void(const Bytes& written, FakePort& port)> onWrite;
     std::function<void(FakePort& port)> onSilence;
     bool refuseWrites = false;
     int refusedWrites = 0;
-    Bytes written;
-    std::vector<Bytes> writes;
-    int readCalls = 0;
-    int purges = 0;
+    int64_t millisecondsPerWrite = 0;
+    std::vector<Bytes> writes;  // one entry per Write call
     int breaks = 0;
     int closes = 0;
 
@@ -153,22 +163,16 @@ public:
 class EnglishTexts final : public DriverTextSource {
 public:
     WideString Text(DriverText text) const override {
-        switch (text) {
-            case DriverText::PortNotOpened:
-                return WIDE_TEXT("Can not open COM port. Port is already open by another program");
-            case DriverText::WaitExpired:
-                return WIDE_TEXT("The waiting time of the data has expired.");
-            case DriverText::InterruptedByUser:
-                return WIDE_TEXT("The communication's process is interrupted by the user");
-            case DriverText::BlockImportFailed:
-                return WIDE_TEXT("AZ doesn't respond or error in importing block");
-            case DriverText::InputFileBccMismatch:
-                return WIDE_TEXT(
-                    "Incorrect input file: BCC in block %d mismatch with computed %d!=%d");
-            case DriverText::YModemFileInfo:
-                return WIDE_TEXT("Y-Modem File Info: %s (size=%s)");
-        }
-        return {};
+        static const WideChar* const kTexts[] = {
+            // in the order of DriverText
+            WIDE_TEXT("Can not open COM port. Port is already open by another program"),
+            WIDE_TEXT("The waiting time of the data has expired."),
+            WIDE_TEXT("The communication's process is interrupted by the user"),
+            WIDE_TEXT("AZ doesn't respond or error in importing block"),
+            WIDE_TEXT("Incorrect input file: BCC in block %d mismatch with computed %d!=%d"),
+            WIDE_TEXT("Y-Modem File Info: %s (size=%s)"),
+        };
+        return kTexts[static_cast<size_t>(text)];
     }
 };
 
@@ -179,4 +183,13 @@ struct ProtocolRig {
     MemoryFile file;
     RecordingCallback callback;
     EnglishTexts texts;
+};
+
+// A driver of the given protocol selector over its own rig, its port open as its owner leaves it.
+struct ProtocolRun : ProtocolRig {
+    explicit ProtocolRun(uint32_t selector)
+        : protocol(port, clock, file, callback, texts, selector) {
+        protocol.SetPortOpen(true);
+    }
+    SerialProtocol protocol;
 };

@@ -1,21 +1,24 @@
 // The line protocol through the port interface: acknowledgements, checks, repeats, time-outs.
 #include <gtest/gtest.h>
 
-#include "download/portable/block_format.h"
-#include "download/portable/serial_protocol.h"
 #include "tests/portable/serial/fake_serial.h"
 
 namespace {
 
 const Bytes kAckLine = {0x06, ',', 'R', ',', 0x0D, 0x0A};
 const Bytes kNakLine = {0x15, ',', '!', ',', 0x0D, 0x0A};
+const WideString kWaitExpired = WIDE_TEXT("The waiting time of the data has expired.");
 
 std::string DataLine(const std::string& body) {
-    const char check = static_cast<char>(
-        LineCheckCharacter(reinterpret_cast<const uint8_t*>(body.data()), body.size()));
-    return body + check + ",\r\n";
+    return body + static_cast<char>(LineCheckCharacter(BytesOf(body), body.size())) + ",\r\n";
 }
 
+std::string WithWrongCheck(std::string line) {
+    line[line.size() - 4] ^= 0x01;  // the check character
+    return line;
+}
+
+// The header, dataLines checked lines and the end line.
 std::vector<std::string> Transfer(int dataLines) {
     std::vector<std::string> lines = {"A,01,Z\r\n"};
     for (int i = 1; i <= dataLines; ++i)
@@ -25,273 +28,204 @@ std::vector<std::string> Transfer(int dataLines) {
     return lines;
 }
 
-std::string Joined(const std::vector<std::string>& lines) {
+// The first count lines, end to end.
+std::string Joined(const std::vector<std::string>& lines, size_t count = SIZE_MAX) {
     std::string all;
-    for (const auto& line : lines)
-        all += line;
+    for (size_t i = 0; i < lines.size() && i < count; ++i)
+        all += lines[i];
     return all;
 }
 
-int CountReplies(const Bytes& written, const Bytes& reply) {
-    int count = 0;
-    for (size_t i = 0; i + reply.size() <= written.size(); ++i)
-        if (std::equal(reply.begin(), reply.end(), written.begin() + i))
-            ++count;
-    return count;
-}
+// A line-protocol receive against an instrument that sends its lines one by one, the next on ACK
+// (or on NAK too, when nakMovesOn), the same one again on NAK. sendAs may change what goes on the
+// wire for (line index, attempt) and split it into chunks.
+struct LineRun : ProtocolRun {
+    explicit LineRun(std::vector<std::string> sent = {}) : ProtocolRun(1), lines(std::move(sent)) {}
 
-// An instrument that sends its lines one by one, the next on ACK, the same one again on NAK.
-// sendAs may change what goes on the wire for (line index, attempt) and split it into chunks.
-struct LineInstrument {
     std::vector<std::string> lines;
-    size_t next = 0;
-    int attempt = 0;
     std::function<std::vector<std::string>(size_t index, int attempt, const std::string& line)>
         sendAs;
+    bool nakMovesOn = false;
+    size_t next = 0;
+    int attempt = 0;
 
-    void Send(FakePort& port) {
+    void Send() {
         if (next >= lines.size())
             return;
-        const std::vector<std::string> chunks =
-            sendAs ? sendAs(next, attempt, lines[next]) : std::vector<std::string>{lines[next]};
-        for (const auto& chunk : chunks)
+        for (const auto& chunk :
+             sendAs ? sendAs(next, attempt, lines[next]) : std::vector<std::string>{lines[next]})
             port.Deliver(chunk);
         ++attempt;
     }
-    void Attach(FakePort& port) {
-        port.onWrite = [this](const Bytes& written, FakePort& p) {
-            if (written == kAckLine) {
+    uint32_t Receive() {
+        port.onWrite = [this](const Bytes& written, FakePort&) {
+            if (written == kAckLine || (nakMovesOn && written == kNakLine)) {
                 ++next;
                 attempt = 0;
             }
-            Send(p);
+            Send();
         };
-        Send(port);
+        Send();
+        return protocol.ReceiveLines();
     }
 };
 
-struct LineProtocolTest : ::testing::Test {
-    ProtocolRig rig;
-    SerialProtocol protocol{rig.port, rig.clock, rig.file, rig.callback, rig.texts, 1};
-    LineInstrument instrument;
-    void SetUp() override { protocol.SetPortOpen(true); }
-};
-
-TEST_F(LineProtocolTest, ReceivesWholeTransferWritingEveryLineAndAcknowledgingEach) {
-    instrument.lines = Transfer(3);
-    instrument.Attach(rig.port);
-
-    EXPECT_EQ(protocol.ReceiveLines(), 0u);
-    EXPECT_EQ(rig.file.Text(), Joined(instrument.lines));
-    EXPECT_EQ(rig.port.written.size(), 5 * kAckLine.size());
-    EXPECT_EQ(CountReplies(rig.port.written, kAckLine), 5);
-    EXPECT_FALSE(rig.file.open);
-    EXPECT_TRUE(rig.callback.messages.empty());
-    const std::vector<std::pair<uint32_t, uint32_t>> progress = {{100, 0},  {100, 3},  {100, 6},
-                                                                 {100, 10}, {100, 13}, {100, 16}};
-    EXPECT_EQ(rig.callback.progress, progress);
-}
-
-TEST_F(LineProtocolTest, LinesSplitAtEveryBoundaryAreJoined) {
-    const std::vector<std::string> lines = Transfer(1);
-    for (size_t split = 1; split < lines[1].size(); ++split) {
-        ProtocolRig local;
-        SerialProtocol receiver(local.port, local.clock, local.file, local.callback, local.texts,
-                                1);
-        receiver.SetPortOpen(true);
-        LineInstrument splitter;
-        splitter.lines = lines;
-        splitter.sendAs = [split](size_t index, int, const std::string& line) {
-            if (index != 1)
-                return std::vector<std::string>{line};
-            return std::vector<std::string>{line.substr(0, split), line.substr(split)};
-        };
-        splitter.Attach(local.port);
-        ASSERT_EQ(receiver.ReceiveLines(), 0u) << "split at " << split;
-        EXPECT_EQ(local.file.Text(), Joined(lines)) << "split at " << split;
-    }
-}
-
-TEST_F(LineProtocolTest, ProgressStopsAtHundredFromTheThirtiethLine) {
-    instrument.lines = Transfer(40);
-    instrument.Attach(rig.port);
-    ASSERT_EQ(protocol.ReceiveLines(), 0u);
-    const auto& progress = rig.callback.progress;
+TEST(LineProtocol, ReceivesTheWholeTransferAcknowledgingEachLineWithProgressUpToHundred) {
+    LineRun run(Transfer(40));
+    EXPECT_EQ(run.Receive(), 0u);
+    EXPECT_EQ(run.file.Text(), Joined(run.lines));
+    EXPECT_EQ(run.port.writes, std::vector<Bytes>(42, kAckLine));
+    EXPECT_FALSE(run.file.open);
+    EXPECT_TRUE(run.callback.messages.empty());
+    // 0 at the start, then 100 / 30 per accepted line up to the thirtieth.
+    const auto& progress = run.callback.progress;
     ASSERT_EQ(progress.size(), 43u);
+    const std::vector<std::pair<uint32_t, uint32_t>> start = {{100, 0}, {100, 3}, {100, 6}};
+    EXPECT_EQ(std::vector(progress.begin(), progress.begin() + 3), start);
     EXPECT_EQ(progress[29].second, 96u);
     EXPECT_EQ(progress[30].second, 100u);
     EXPECT_EQ(progress.back().second, 100u);
 }
 
-TEST_F(LineProtocolTest, AReplyThatMovesNoByteIsGivenUpAfterThreeSeconds) {
-    rig.port.Deliver(Transfer(1).front());  // the header, then nothing more
-    rig.port.refuseWrites = true;
-    EXPECT_EQ(protocol.ReceiveLines(), 1u) << "the instrument never hears the ACK and goes silent";
+TEST(LineProtocol, LinesSplitAtEveryBoundaryAreJoined) {
+    const std::vector<std::string> lines = Transfer(1);
+    for (size_t split = 1; split < lines[1].size(); ++split) {
+        LineRun run(lines);
+        run.sendAs = [split](size_t index, int, const std::string& line) {
+            if (index != 1)
+                return std::vector<std::string>{line};
+            return std::vector<std::string>{line.substr(0, split), line.substr(split)};
+        };
+        ASSERT_EQ(run.Receive(), 0u) << "split at " << split;
+        EXPECT_EQ(run.file.Text(), Joined(lines)) << "split at " << split;
+    }
+}
+
+TEST(LineProtocol, AReplyThatMovesNoByteIsGivenUpAfterThreeSeconds) {
+    LineRun run({Transfer(1).front()});  // the header, then nothing more
+    run.port.refuseWrites = true;
+    EXPECT_EQ(run.Receive(), 1u) << "the instrument never hears the ACK and goes silent";
     // Each refused write costs 100 ms: the reply stops at the first attempt past 3000 ms, and
     // the receive goes on to its own time-out instead of spinning on the dead line.
-    EXPECT_EQ(31, rig.port.refusedWrites);
-    EXPECT_TRUE(rig.port.written.empty());
+    EXPECT_EQ(31, run.port.refusedWrites);
+    EXPECT_TRUE(run.port.writes.empty());
 }
 
-TEST_F(LineProtocolTest, WrongCheckCharacterIsRefusedNotWrittenAndTheResendAccepted) {
-    instrument.lines = Transfer(3);
-    instrument.sendAs = [](size_t index, int attempt, const std::string& line) {
-        std::string sent = line;
-        if (index == 2 && attempt == 0)
-            sent[sent.size() - 4] ^= 0x01;  // the check character
-        return std::vector<std::string>{sent};
+TEST(LineProtocol, WrongCheckCharacterIsRefusedNotWrittenAndTheResendAccepted) {
+    LineRun run(Transfer(3));
+    run.sendAs = [](size_t index, int attempt, const std::string& line) {
+        return std::vector<std::string>{index == 2 && attempt == 0 ? WithWrongCheck(line) : line};
     };
-    instrument.Attach(rig.port);
-
-    EXPECT_EQ(protocol.ReceiveLines(), 0u);
-    EXPECT_EQ(rig.file.Text(), Joined(instrument.lines));
-    EXPECT_EQ(CountReplies(rig.port.written, kNakLine), 1);
-    EXPECT_EQ(CountReplies(rig.port.written, kAckLine), 5);
+    EXPECT_EQ(run.Receive(), 0u);
+    EXPECT_EQ(run.file.Text(), Joined(run.lines));
+    EXPECT_EQ(run.port.WritesOf(kNakLine), 1);
+    EXPECT_EQ(run.port.WritesOf(kAckLine), 5);
 }
 
-TEST_F(LineProtocolTest, RefusedLinesDoNotPostponeTheTimeOut) {
-    instrument.lines = Transfer(3);
-    instrument.sendAs = [](size_t index, int, const std::string& line) {
-        std::string sent = line;
-        if (index == 2)
-            sent[sent.size() - 4] ^= 0x01;
-        return std::vector<std::string>{sent};
+TEST(LineProtocol, RefusedLinesDoNotPostponeTheTimeOut) {
+    LineRun run(Transfer(3));
+    run.sendAs = [](size_t index, int, const std::string& line) {
+        return std::vector<std::string>{index == 2 ? WithWrongCheck(line) : line};
     };
-    // The instrument answers each NAK only after a second of thinking.
-    instrument.Attach(rig.port);
-    auto inner = rig.port.onWrite;
-    rig.port.onWrite = [&, inner](const Bytes& written, FakePort& port) {
-        rig.clock.Advance(1000);
-        inner(written, port);
-    };
-    const int64_t start = rig.clock.WallSeconds();
-
-    EXPECT_EQ(protocol.ReceiveLines(), 1u);
-    EXPECT_GT(rig.clock.WallSeconds() - start, 60);
-    EXPECT_LT(rig.clock.WallSeconds() - start, 70);
-    EXPECT_EQ(rig.callback.messages,
-              OnlyMessage(4, WIDE_TEXT("The waiting time of the data has expired.")));
-    EXPECT_EQ(rig.file.Text(), instrument.lines[0] + instrument.lines[1]);
+    run.port.millisecondsPerWrite = 1000;  // the instrument thinks a second before each answer
+    const int64_t start = run.clock.WallSeconds();
+    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_GT(run.clock.WallSeconds() - start, 60);
+    EXPECT_LT(run.clock.WallSeconds() - start, 70);
+    EXPECT_EQ(run.callback.messages, OnlyMessage(4, kWaitExpired));
+    EXPECT_EQ(run.file.Text(), Joined(run.lines, 2));
 }
 
-TEST_F(LineProtocolTest, RepeatedLineIsAcknowledgedTwiceButWrittenOnceUnlessNotAdjacent) {
+TEST(LineProtocol, RepeatedLineIsAcknowledgedTwiceButWrittenOnceUnlessNotAdjacent) {
     const std::string repeated = DataLine("B,7,1.11111,2.000,");
-    instrument.lines = {"A,01,Z\r\n", repeated,  repeated, DataLine("B,8,1.2,3.0,"),
-                        repeated,     "Z,&,\r\n"};
-    instrument.Attach(rig.port);
-
-    EXPECT_EQ(protocol.ReceiveLines(), 0u);
-    EXPECT_EQ(CountReplies(rig.port.written, kAckLine), 6);
-    EXPECT_EQ(rig.file.Text(),
-              "A,01,Z\r\n" + repeated + DataLine("B,8,1.2,3.0,") + repeated + "Z,&,\r\n");
+    const std::string other = DataLine("B,8,1.2,3.0,");
+    LineRun run({"A,01,Z\r\n", repeated, repeated, other, repeated, "Z,&,\r\n"});
+    EXPECT_EQ(run.Receive(), 0u);
+    EXPECT_EQ(run.port.WritesOf(kAckLine), 6);
+    EXPECT_EQ(run.file.Text(), "A,01,Z\r\n" + repeated + other + repeated + "Z,&,\r\n");
 }
 
-TEST_F(LineProtocolTest, EndLineIsWrittenWithoutTheLineCheck) {
+TEST(LineProtocol, EndLineIsWrittenWithoutTheLineCheck) {
     // The end line, with anything after "Z,&,", would fail the check.
-    instrument.lines = {"A,01,Z\r\n", DataLine("B,1,0.5,"), "Z,&,~~garbage\r\n"};
-    instrument.Attach(rig.port);
-    EXPECT_EQ(protocol.ReceiveLines(), 0u);
-    EXPECT_EQ(rig.file.Text(), Joined(instrument.lines));
+    LineRun run({"A,01,Z\r\n", DataLine("B,1,0.5,"), "Z,&,~~garbage\r\n"});
+    EXPECT_EQ(run.Receive(), 0u);
+    EXPECT_EQ(run.file.Text(), Joined(run.lines));
 }
 
-TEST_F(LineProtocolTest, SixtyRefusalsBeforeTheHeaderAreTolerated) {
-    instrument.lines.assign(60, "noise\r\n");
-    const auto transfer = Transfer(1);
-    instrument.lines.insert(instrument.lines.end(), transfer.begin(), transfer.end());
-    instrument.Attach(rig.port);
-    // Each refused line is answered with NAK: move on as if the noise were new lines.
-    auto inner = rig.port.onWrite;
-    rig.port.onWrite = [&, inner](const Bytes& written, FakePort& port) {
-        if (written == kNakLine)
-            inner(kAckLine, port);
-        else
-            inner(written, port);
-    };
-    EXPECT_EQ(protocol.ReceiveLines(), 0u);
-    EXPECT_EQ(CountReplies(rig.port.written, kNakLine), 60);
-    EXPECT_EQ(rig.file.Text(), Joined(transfer));
+TEST(LineProtocol, SixtyRefusalsBeforeTheHeaderAreToleratedAndTheSixtyFirstEndsSilently) {
+    for (const int noise : {60, 61}) {
+        const std::vector<std::string> transfer = Transfer(1);
+        LineRun run(std::vector<std::string>(noise, "noise before the header\r\n"));
+        run.lines.insert(run.lines.end(), transfer.begin(), transfer.end());
+        run.nakMovesOn = true;  // each refused noise line is followed by the next line
+        EXPECT_EQ(run.Receive(), noise == 60 ? 0u : 1u) << noise;
+        EXPECT_EQ(run.port.WritesOf(kNakLine), noise);
+        EXPECT_EQ(run.file.Text(), noise == 60 ? Joined(transfer) : "") << noise;
+        EXPECT_TRUE(run.callback.messages.empty()) << noise;
+        EXPECT_FALSE(run.file.open);
+    }
 }
 
-TEST_F(LineProtocolTest, TheSixtyFirstRefusalEndsTheReceiveSilently) {
-    instrument.lines.assign(100, "noise before the header\r\n");
-    instrument.Attach(rig.port);
-    auto inner = rig.port.onWrite;
-    rig.port.onWrite = [inner](const Bytes&, FakePort& port) { inner(kAckLine, port); };
-
-    EXPECT_EQ(protocol.ReceiveLines(), 1u);
-    EXPECT_EQ(CountReplies(rig.port.written, kNakLine), 61);
-    EXPECT_TRUE(rig.callback.messages.empty());
-    EXPECT_TRUE(rig.file.content.empty());
-    EXPECT_FALSE(rig.file.open);
-}
-
-TEST_F(LineProtocolTest, FullLineWithoutLineEndIsNeverAcceptedAndTimesOut) {
-    instrument.lines = {"A,01,Z\r\n", std::string(128, 'X'), DataLine("B,1,2,")};
-    instrument.Attach(rig.port);
+TEST(LineProtocol, FullLineWithoutLineEndIsNeverAcceptedAndTimesOut) {
+    LineRun run({"A,01,Z\r\n", std::string(128, 'X'), DataLine("B,1,2,")});
     // Keep streaming after the 128 bytes: the surplus must not overrun the line.
-    rig.port.onSilence = [](FakePort& port) { port.Queue(Bytes(200, 'Y')); };
-
-    EXPECT_EQ(protocol.ReceiveLines(), 1u);
-    EXPECT_EQ(rig.file.Text(), "A,01,Z\r\n");
-    EXPECT_EQ(rig.callback.messages,
-              OnlyMessage(4, WIDE_TEXT("The waiting time of the data has expired.")));
+    run.port.onSilence = [](FakePort& port) { port.Queue(Bytes(200, 'Y')); };
+    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_EQ(run.file.Text(), "A,01,Z\r\n");
+    EXPECT_EQ(run.callback.messages, OnlyMessage(4, kWaitExpired));
 }
 
-TEST_F(LineProtocolTest, ClosedPortFailsAtOnceAndSilenceEndsAfterMoreThanSixtySeconds) {
-    protocol.SetPortOpen(false);
-    EXPECT_EQ(protocol.ReceiveLines(), 1u);
-    EXPECT_EQ(rig.file.creates, 0);
-    EXPECT_EQ(rig.port.readCalls, 0);
+TEST(LineProtocol, ClosedPortFailsAtOnceAndSilenceEndsAfterMoreThanSixtySeconds) {
+    LineRun run;
+    const int64_t start = run.clock.milliseconds;
+    run.protocol.SetPortOpen(false);
+    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_EQ(run.protocol.Receive(), 1u) << "the block procedures too";
+    EXPECT_EQ(run.file.creates, 0);
+    EXPECT_EQ(run.clock.milliseconds, start) << "no read was tried";
 
-    protocol.SetPortOpen(true);
-    const int64_t start = rig.clock.WallSeconds();
-    EXPECT_EQ(protocol.ReceiveLines(), 1u);
-    EXPECT_EQ(rig.clock.WallSeconds() - start, 61);
-    ASSERT_EQ(rig.callback.messages.size(), 1u);
-    EXPECT_EQ(rig.callback.messages[0].code, 4u);
-    EXPECT_EQ(rig.port.closes, 0);
+    run.protocol.SetPortOpen(true);
+    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_EQ(run.clock.milliseconds / 1000 - start / 1000, 61);
+    EXPECT_EQ(run.callback.messages, OnlyMessage(4, kWaitExpired));
+    EXPECT_EQ(run.port.closes, 0);
 }
 
-TEST_F(LineProtocolTest, CancelReportsClosesThePortAndLeavesTheDriverUnusable) {
-    instrument.lines = Transfer(10);
-    instrument.Attach(rig.port);
-    rig.callback.cancelWhen = [&] { return rig.file.content.size() > 20; };
-
-    EXPECT_EQ(protocol.ReceiveLines(), 1u);
-    EXPECT_EQ(rig.callback.messages,
+TEST(LineProtocol, CancelReportsClosesThePortAndLeavesTheDriverUnusable) {
+    LineRun run(Transfer(10));
+    run.callback.cancelWhen = [&] { return run.file.content.size() > 20; };
+    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_EQ(run.callback.messages,
               OnlyMessage(4, WIDE_TEXT("The communication's process is interrupted by the user")));
-    EXPECT_EQ(rig.port.breaks, 1);
-    EXPECT_EQ(rig.port.closes, 1);
-    EXPECT_FALSE(protocol.IsPortOpen());
-    EXPECT_EQ(rig.file.Text(), instrument.lines[0] + instrument.lines[1]);
-    EXPECT_EQ(protocol.ReceiveLines(), 1u);
-    EXPECT_EQ(rig.file.creates, 1);
+    EXPECT_EQ(run.port.breaks, 1);
+    EXPECT_EQ(run.port.closes, 1);
+    EXPECT_FALSE(run.protocol.IsPortOpen());
+    EXPECT_EQ(run.file.Text(), Joined(run.lines, 2));
+    EXPECT_EQ(run.protocol.ReceiveLines(), 1u);
+    EXPECT_EQ(run.file.creates, 1);
 }
 
-TEST_F(LineProtocolTest, StopRequestEndsWithoutAMessage) {
-    instrument.lines = Transfer(10);
-    instrument.Attach(rig.port);
-    rig.callback.cancelWhen = [&] {
-        if (rig.file.content.size() > 20)
-            protocol.RequestStop();
+TEST(LineProtocol, StopRequestEndsWithoutAMessage) {
+    LineRun run(Transfer(10));
+    run.callback.cancelWhen = [&] {
+        if (run.file.content.size() > 20)
+            run.protocol.RequestStop();
         return false;
     };
-    EXPECT_EQ(protocol.ReceiveLines(), 1u);
-    EXPECT_TRUE(rig.callback.messages.empty());
-    EXPECT_EQ(rig.port.closes, 0);
+    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_TRUE(run.callback.messages.empty());
+    EXPECT_EQ(run.port.closes, 0);
 }
 
-TEST_F(LineProtocolTest, BytesAfterALineAreDroppedByThePurge) {
-    instrument.lines = Transfer(2);
-    instrument.sendAs = [](size_t index, int, const std::string& line) {
-        if (index == 1)
-            return std::vector<std::string>{line, "stale"};
-        return std::vector<std::string>{line};
-    };
+TEST(LineProtocol, BytesAfterALineAreDroppedByThePurge) {
+    LineRun run(Transfer(2));
     // The stale bytes are already in the queue when the driver purges for the next line.
-    instrument.Attach(rig.port);
-    EXPECT_EQ(protocol.ReceiveLines(), 0u);
-    EXPECT_EQ(rig.file.Text().find("stale"), std::string::npos);
+    run.sendAs = [](size_t index, int, const std::string& line) {
+        return index == 1 ? std::vector<std::string>{line, "stale"}
+                          : std::vector<std::string>{line};
+    };
+    EXPECT_EQ(run.Receive(), 0u);
+    EXPECT_EQ(run.file.Text().find("stale"), std::string::npos);
 }
 
 }  // namespace

@@ -30,55 +30,43 @@ TranslationMap Parse(const std::vector<uint8_t>& bytes) {
 
 }  // namespace
 
-TEST(TranslationFile, PairsFollowingBracketedLinesAcrossLineEndings) {
-    const TranslationMap map = Parse(
-        Utf16File(WIDE_TEXT("[Cancel]\r\n[Abbrechen]\r\n\r\n[Start]\n[Starten]\n\r[Status:]\r["
-                            "Status:]")));
-    ASSERT_EQ(map.size(), 3u);
-    EXPECT_EQ(map.at(WIDE_TEXT("Cancel")), WIDE_TEXT("Abbrechen"));
-    EXPECT_EQ(map.at(WIDE_TEXT("Start")), WIDE_TEXT("Starten"));
-    EXPECT_EQ(map.at(WIDE_TEXT("Status:")), WIDE_TEXT("Status:"));
+TEST(TranslationFile, PairsEachBracketedTextWithTheNextOne) {
+    const struct {
+        const char* rule;
+        WideString file;
+        TranslationMap expected;
+    } cases[] = {
+        {"CR LF, LF and CR end lines; a translation may equal its text",
+         WIDE_TEXT("[Cancel]\r\n[Abbrechen]\r\n\r\n[Start]\n[Starten]\n\r[Status:]\r[Status:]"),
+         {{WIDE_TEXT("Cancel"), WIDE_TEXT("Abbrechen")},
+          {WIDE_TEXT("Start"), WIDE_TEXT("Starten")},
+          {WIDE_TEXT("Status:"), WIDE_TEXT("Status:")}}},
+        {"a text runs to the last bracket of its line and keeps its note; what follows is ignored",
+         WIDE_TEXT(
+             "[Push [SET] key]   ; the key's name stays\r\n[[SET]-Taste drücken] ; translated\r\n"
+             "[Start@@button, at most 10 letters]\r\n[Starten]\r\n"),
+         {{WIDE_TEXT("Push [SET] key"), WIDE_TEXT("[SET]-Taste drücken")},
+          {WIDE_TEXT("Start@@button, at most 10 letters"), WIDE_TEXT("Starten")}}},
+        {"comments inside a pair are skipped, but a blank line drops a lone English text",
+         WIDE_TEXT("; German texts\r\n[Cancel]\r\n# button\r\n[Abbrechen]\r\n"
+                   "[Forgotten English line]\r\n   \t\r\n[Start]\r\n[Starten]\r\n"),
+         {{WIDE_TEXT("Cancel"), WIDE_TEXT("Abbrechen")},
+          {WIDE_TEXT("Start"), WIDE_TEXT("Starten")}}},
+        {"a line without its closing bracket is no text: the next lines pair up",
+         WIDE_TEXT("[Cancel\r\n[Abbrechen]\r\n[Start]\r\n[Starten]\r\n"),
+         {{WIDE_TEXT("Abbrechen"), WIDE_TEXT("Start")}}},
+        {"the first pair of a text wins; an empty translation is kept, an empty text is not",
+         WIDE_TEXT("[Start]\r\n[Starten]\r\n[Start]\r\n[Beginnen]\r\n[Name]\r\n[]\r\n[]\r\n[x]"),
+         {{WIDE_TEXT("Start"), WIDE_TEXT("Starten")}, {WIDE_TEXT("Name"), WIDE_TEXT("")}}},
+        {"escapes are decoded in both texts",
+         WIDE_TEXT("[a\\nb\\tc\\rd\\\\e]\r\n[A\\nB\\\\C]\r\n"),
+         {{WIDE_TEXT("a\nb\tc\rd\\e"), WIDE_TEXT("A\nB\\C")}}},
+    };
+    for (const auto& test : cases)
+        EXPECT_EQ(test.expected, Parse(Utf16File(test.file))) << test.rule;
 }
 
-TEST(TranslationFile, TextRunsToTheLastBracketKeepsTheNoteAndTrailingTextIsIgnored) {
-    const TranslationMap map =
-        Parse(Utf16File(WIDE_TEXT("[Push [SET] key]   ; the key's name stays\r\n"
-                                  "[[SET]-Taste drücken] ; translated\r\n"
-                                  "[Start@@button, at most 10 letters]\r\n[Starten]\r\n")));
-    ASSERT_EQ(map.size(), 2u);
-    EXPECT_EQ(map.at(WIDE_TEXT("Push [SET] key")), WIDE_TEXT("[SET]-Taste drücken"));
-    EXPECT_EQ(map.at(WIDE_TEXT("Start@@button, at most 10 letters")), WIDE_TEXT("Starten"));
-}
-
-TEST(TranslationFile, CommentsBetweenPairAreSkippedButBlankLineDropsLoneEnglish) {
-    const TranslationMap map = Parse(
-        Utf16File(WIDE_TEXT("; German texts\r\n[Cancel]\r\n# button\r\n[Abbrechen]\r\n"
-                            "[Forgotten English line]\r\n   \t\r\n[Start]\r\n[Starten]\r\n")));
-    ASSERT_EQ(map.size(), 2u);
-    EXPECT_EQ(map.at(WIDE_TEXT("Cancel")), WIDE_TEXT("Abbrechen"));
-    EXPECT_EQ(map.at(WIDE_TEXT("Start")), WIDE_TEXT("Starten"));
-}
-
-TEST(TranslationFile, LineWithoutClosingBracketDropsThePair) {
-    const TranslationMap map =
-        Parse(Utf16File(WIDE_TEXT("[Cancel\r\n[Abbrechen]\r\n[Start]\r\n[Starten]\r\n")));
-    // "[Abbrechen]" now opens a pair with "[Start]"; "[Starten]" waits in vain.
-    ASSERT_EQ(map.size(), 1u);
-    EXPECT_EQ(map.at(WIDE_TEXT("Abbrechen")), WIDE_TEXT("Start"));
-}
-
-TEST(TranslationFile, FirstPairOfAnEnglishTextWinsAndEmptyTranslationIsKept) {
-    const TranslationMap map = Parse(Utf16File(
-        WIDE_TEXT("[Start]\r\n[Starten]\r\n[Start]\r\n[Beginnen]\r\n[Name]\r\n[]\r\n[]\r\n[x]")));
-    EXPECT_EQ(map.at(WIDE_TEXT("Start")), WIDE_TEXT("Starten"));
-    EXPECT_EQ(map.at(WIDE_TEXT("Name")), WIDE_TEXT(""));
-    EXPECT_EQ(map.count(WIDE_TEXT("")), 0u);
-}
-
-TEST(TranslationFile, EscapesAreDecodedInBothTextsOneKindAfterTheOther) {
-    const TranslationMap map =
-        Parse(Utf16File(WIDE_TEXT("[a\\nb\\tc\\rd\\\\e]\r\n[A\\nB\\\\C]\r\n")));
-    EXPECT_EQ(map.at(WIDE_TEXT("a\nb\tc\rd\\e")), WIDE_TEXT("A\nB\\C"));
+TEST(TranslationFile, EscapesAreDecodedOneKindAfterTheOther) {
     EXPECT_EQ(DecodeTranslationEscapes(WIDE_TEXT("C:\\\\new")), WIDE_TEXT("C:\\\new"));
     EXPECT_EQ(DecodeTranslationEscapes(WIDE_TEXT("50\\\\%")), WIDE_TEXT("50\\%"));
     EXPECT_EQ(DecodeTranslationEscapes(WIDE_TEXT("\\x\\")), WIDE_TEXT("\\x\\"));
