@@ -76,6 +76,7 @@ DWORD Win32SerialPort::Open(const wchar_t* portName, const DCB& dcb,
     if (!::SetCommTimeouts(handle_.get(), &appliedTimeouts))
         return ::GetLastError();
     readTotalConstant_ = timeouts.ReadTotalTimeoutConstant;
+    writeTotalConstant_ = timeouts.WriteTotalTimeoutConstant;
     return ERROR_SUCCESS;
 }
 
@@ -99,9 +100,18 @@ size_t Win32SerialPort::Read(uint8_t* buffer, size_t count) {
 size_t Win32SerialPort::Write(const uint8_t* bytes, size_t count) {
     if (!handle_)
         return 0;
+    const ULONGLONG start = ::GetTickCount64();
     DWORD written = 0;
-    if (!::WriteFile(handle_.get(), bytes, static_cast<DWORD>(count), &written, nullptr))
+    const BOOL ok = ::WriteFile(handle_.get(), bytes, static_cast<DWORD>(count), &written, nullptr);
+    if (!ok || written == 0) {
+        // A port whose cable is gone refuses at once, and the sender tries again until its own
+        // give-up: wait the rest of the write time-out, as a working port would have, instead of
+        // spinning a core for those seconds.
+        const ULONGLONG spent = ::GetTickCount64() - start;
+        if (spent < writeTotalConstant_)
+            ::Sleep(static_cast<DWORD>(writeTotalConstant_ - spent));
         return 0;
+    }
     return written;
 }
 

@@ -42,6 +42,7 @@ private:
     DCB savedDcb_{};
     COMMTIMEOUTS savedTimeouts_{};
     DWORD readTotalConstant_ = 100;
+    DWORD writeTotalConstant_ = 100;
 };
 
 // _time64 for the 60-second wait, GetTickCount for the short ones.

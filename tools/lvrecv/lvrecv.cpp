@@ -13,7 +13,7 @@ namespace {
 const char kUsage[] =
     "Usage: lvrecv --port COMn --out FILE [options]\n"
     "Receives a file from a digital level as the extension does, printing the driver's\n"
-    "messages and progress.\n"
+    "messages (\"lvrecv: [code N] text\"; errors on the error stream) and progress.\n"
     "\n"
     "  --port COMn                    serial port (required)\n"
     "  --out FILE                     where the received data go (required)\n"
@@ -21,11 +21,15 @@ const char kUsage[] =
     "  --parity none|odd|even         parity (default even); 7 data bits, 1 stop bit\n"
     "  --protocol line|raw|bcc|ymodem receive procedure (default line)\n"
     "  --quiet                        no progress lines\n"
+    "  --cancel-after N               cancel as a user would, once N progress steps above\n"
+    "                                 zero were reported (the driver sees it at its next check)\n"
     "  --help                         this text\n"
-    "Exit code: 0 when the file is complete; 1 when the receive failed or was stopped with\n"
-    "Ctrl+C; 3 when the port cannot be opened; 2 on bad usage.\n";
+    "Exit code: 0 when the file is complete; 1 when the receive failed or was cancelled (Ctrl+C,\n"
+    "--cancel-after); 3 when the port cannot be opened; 2 on bad usage.\n";
 
 std::atomic<bool> g_cancelled{false};
+// Progress steps above zero after which the receive is cancelled; 0 = never.
+uint32_t g_cancelAfterSteps = 0;
 
 BOOL WINAPI OnConsoleControl(DWORD event) {
     if (event == CTRL_C_EVENT || event == CTRL_BREAK_EVENT || event == CTRL_CLOSE_EVENT) {
@@ -51,12 +55,12 @@ class ConsoleCallback final : public TParserCallBack {
 public:
     explicit ConsoleCallback(bool quiet) : quiet_(quiet) {}
     void ShowMessage(uint32_t code, const wchar_t* text) override {
-        lastCode = code;
-        lastError = text;
-        PrintLine(code == kMessageInformation ? stdout : stderr,
-                  code == kMessageInformation ? L"lvrecv: " : L"lvrecv: error: ", text);
+        const std::wstring prefix = L"lvrecv: [code " + std::to_wstring(code) + L"] ";
+        PrintLine(code == kMessageInformation ? stdout : stderr, prefix.c_str(), text);
     }
     void SetProgress(uint32_t total, uint32_t current) override {
+        if (current > 0 && g_cancelAfterSteps != 0 && ++steps_ >= g_cancelAfterSteps)
+            g_cancelled = true;
         if (quiet_ || total == 0)
             return;
         const std::wstring text = std::to_wstring(current) + L" / " + std::to_wstring(total);
@@ -64,11 +68,9 @@ public:
     }
     bool IsCancelled() override { return g_cancelled; }
 
-    uint32_t lastCode = 0;
-    std::wstring lastError;
-
 private:
     bool quiet_;
+    uint32_t steps_ = 0;
 };
 
 }  // namespace
@@ -99,6 +101,8 @@ int wmain(int argc, wchar_t** argv) {
             parity = name == L"none" ? 0 : name == L"odd" ? 1 : 2;
         } else if (option == L"--protocol" && hasValue) {
             protocol = argv[++i];
+        } else if (option == L"--cancel-after" && hasValue) {
+            g_cancelAfterSteps = static_cast<uint32_t>(std::wcstoul(argv[++i], nullptr, 10));
         } else {
             std::fprintf(stderr, "lvrecv: bad option %ls\n%s", option.c_str(), kUsage);
             return 2;

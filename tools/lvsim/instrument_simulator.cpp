@@ -8,6 +8,15 @@
 
 using namespace serial_bytes;
 
+namespace {
+// How a verbose log names the receiver's answer.
+const char* AnswerName(const std::string& answer) {
+    if (answer.empty())
+        return "none";
+    return static_cast<uint8_t>(answer[0]) == kAck ? "ACK" : "NAK";
+}
+}  // namespace
+
 std::string WithCheckCharacter(const std::string& body) {
     const char check = static_cast<char>(
         LineCheckCharacter(reinterpret_cast<const uint8_t*>(body.data()), body.size()));
@@ -85,9 +94,7 @@ bool InstrumentSimulator::SendLineUntilAcknowledged(const std::string& line, boo
         const std::string answer = ReadAnswer(options_.AnswerTimeoutMs);
         if (options_.Verbose)
             std::fprintf(stderr, "lvsim: sent %zu bytes, answer %s\n", sent.size(),
-                         answer.empty()                            ? "none"
-                         : static_cast<uint8_t>(answer[0]) == kAck ? "ACK"
-                                                                   : "NAK");
+                         AnswerName(answer));
         if (!answer.empty() && static_cast<uint8_t>(answer[0]) == kAck) {
             if (loseFirstAck && attempt == 0)
                 continue;  // as if the ACK was lost on the line: the same line goes again
@@ -103,7 +110,11 @@ int InstrumentSimulator::SendLines(const std::vector<std::string>& dataLines) {
     for (uint32_t i = 0; i < options_.NoiseLines; ++i) {
         if (!SendPaced("?? noise " + std::to_string(i) + "\r\n"))
             return 1;
-        (void)ReadAnswer(options_.AnswerTimeoutMs);  // each is refused with a NAK line
+        // Each is refused with a NAK line; nothing depends on it here.
+        const std::string answer = ReadAnswer(options_.AnswerTimeoutMs);
+        if (options_.Verbose)
+            std::fprintf(stderr, "lvsim: sent noise line %u, answer %s\n", i + 1,
+                         AnswerName(answer));
     }
     if (!SendLineUntilAcknowledged("A,01,Z\r\n", false, false))
         return 1;
@@ -125,6 +136,23 @@ int InstrumentSimulator::SendLines(const std::vector<std::string>& dataLines) {
     return SendLineUntilAcknowledged("Z,&,\r\n", false, false) ? 0 : 1;
 }
 
+int InstrumentSimulator::SendRawStream(const std::vector<std::string>& printedLines) {
+    for (uint32_t i = 1; i <= printedLines.size(); ++i) {
+        if (!SendPaced(printedLines[i - 1]))
+            return 1;
+        if (options_.Verbose)
+            std::fprintf(stderr, "lvsim: sent line %u (%zu bytes)\n", i,
+                         printedLines[i - 1].size());
+        if (i == options_.DisconnectAfterLine) {
+            port_.Close();
+            return 1;
+        }
+        if (options_.LineGapMs)
+            ::Sleep(options_.LineGapMs);
+    }
+    return SendPaced(std::string(1, static_cast<char>(kEot))) ? 0 : 1;
+}
+
 int InstrumentSimulator::SendBccBlocks(const std::vector<std::string>& dataLines) {
     // Wait for the receiver's ENQ.
     const ULONGLONG start = ::GetTickCount64();
@@ -135,6 +163,7 @@ int InstrumentSimulator::SendBccBlocks(const std::vector<std::string>& dataLines
         if (::GetTickCount64() - start > 60000)
             return 1;
     }
+    uint32_t resends = 0;
     for (size_t i = 0; i <= dataLines.size();) {
         std::string block;
         if (i == dataLines.size()) {
@@ -152,9 +181,20 @@ int InstrumentSimulator::SendBccBlocks(const std::vector<std::string>& dataLines
         const std::string answer = ReadAnswer(options_.AnswerTimeoutMs);
         if (i == dataLines.size())
             return !answer.empty() && static_cast<uint8_t>(answer[0]) == kAck ? 0 : 1;
-        if (!answer.empty() && static_cast<uint8_t>(answer[0]) == kAck)
+        if (options_.Verbose)
+            std::fprintf(stderr, "lvsim: sent block %zu, answer %s\n", i + 1, AnswerName(answer));
+        if (!answer.empty() && static_cast<uint8_t>(answer[0]) == kAck) {
             ++i;
-        else if (i + 1 == options_.BadCheckLine)
+            resends = 0;
+            if (i == options_.DisconnectAfterLine) {
+                port_.Close();
+                return 1;
+            }
+            continue;
+        }
+        if (++resends > options_.MaxResends)
+            return 1;
+        if (i + 1 == options_.BadCheckLine)
             options_.BadCheckLine = 0;  // the resend is clean
     }
     return 0;
@@ -180,6 +220,7 @@ int InstrumentSimulator::SendYModem(const std::string& name, const std::string& 
     if (!SendPaced(std::string(header.begin(), header.end())) || !waitFor(kAck))
         return 1;
     const size_t blocks = (content.size() + 127) / 128;
+    uint32_t resends = 0;
     for (size_t i = 0; i < blocks;) {
         std::string data = content.substr(i * 128, 128);
         data.resize(128, 0x1A);
@@ -196,8 +237,18 @@ int InstrumentSimulator::SendYModem(const std::string& name, const std::string& 
         if (!SendPaced(block))
             return 1;
         const std::string answer = ReadAnswer(options_.AnswerTimeoutMs);
-        if (!answer.empty() && static_cast<uint8_t>(answer[0]) == kAck)
+        if (options_.Verbose)
+            std::fprintf(stderr, "lvsim: sent block %zu, answer %s\n", i + 1, AnswerName(answer));
+        if (!answer.empty() && static_cast<uint8_t>(answer[0]) == kAck) {
             ++i;
+            resends = 0;
+            if (i == options_.DisconnectAfterLine) {
+                port_.Close();
+                return 1;
+            }
+        } else if (++resends > options_.MaxResends) {
+            return 1;
+        }
     }
     if (!SendPaced(std::string(1, static_cast<char>(kEot))))
         return 1;

@@ -11,14 +11,17 @@ struct SimulatorOptions {
     uint32_t BaudRate = 9600;
     uint32_t BitsPerCharacter = 10;   // start + 7 data + parity + stop for 7E1
     uint32_t AnswerTimeoutMs = 1000;  // no ACK or NAK within this: send the line again
-    uint32_t MaxResends = 20;
+    uint32_t MaxResends = 20;         // of one line or block before giving up
     // Faults (line numbers count data lines from 1; 0 = off).
     uint32_t BadCheckLine = 0;         // first sending of that line carries a wrong check character
     uint32_t LostAckLine = 0;          // the ACK of that line is ignored once: the line is resent
     uint32_t NoiseLines = 0;           // noise lines before the header
     uint32_t SilenceSeconds = 0;       // hold the port and say nothing for so long first
     bool LongLineWithoutEnd = false;   // a 128-byte line without CR LF after the header
-    uint32_t DisconnectAfterLine = 0;  // close the port after that line was acknowledged
+    uint32_t DisconnectAfterLine = 0;  // close the port after that line or block was acknowledged
+                                       // (raw stream: was sent), and say nothing more
+    uint32_t LineGapMs = 0;            // raw stream: pause after each line, so that each line
+                                       // reaches the receiver as a burst of its own
     bool Verbose = false;
 };
 
@@ -30,6 +33,9 @@ public:
     // Header "A,01,Z", the data lines (without CR LF; check characters are computed), "Z,&,".
     // 0 when the receiver acknowledged everything.
     int SendLines(const std::vector<std::string>& dataLines);
+    // The lines as an instrument prints them (each with its CR LF), then EOT; no answer is
+    // awaited. 0 when everything was sent.
+    int SendRawStream(const std::vector<std::string>& printedLines);
     // One BCC block per line, started by the receiver's ENQ, ended by EOT.
     int SendBccBlocks(const std::vector<std::string>& dataLines);
     // Y-Modem: header block with name and size, 128-byte CRC blocks, EOT.

@@ -16,30 +16,37 @@ const char kUsage[] =
     "Usage: lvsim --port COMn [options]\n"
     "Plays a digital level on a serial port: sends a survey file with the line protocol\n"
     "(header \"A,01,Z\", data lines with check characters, end line \"Z,&,\"), waiting for each\n"
-    "ACK or NAK line, at the wire speed of the configured baud rate and framing.\n"
+    "ACK or NAK line, at the wire speed of the configured baud rate and framing. The raw stream\n"
+    "sends the same lines without waiting for answers, then EOT; BCC blocks and Y-Modem carry\n"
+    "the data lines (BCC: one line a block, without check character; Y-Modem: the lines with\n"
+    "check characters, as the file \"survey.lv\").\n"
     "\n"
     "  --port COMn            serial port to play on (required)\n"
     "  --baud N               baud rate (default 9600)\n"
     "  --parity none|odd|even parity (default even)\n"
     "  --data-bits N          data bits (default 7; 7E1 = 10 bits a character)\n"
-    "  --protocol line|bcc|ymodem  what to speak (default line)\n"
+    "  --protocol line|raw|bcc|ymodem  what to speak (default line)\n"
     "  --file PATH            survey file to send: one data line per text line, without check\n"
     "                         characters; lines \"A,01,Z\" and \"Z,&,\" in it are skipped\n"
     "  --lines N              send N generated lines instead of a file (default 20)\n"
     "  --line-length N        length of generated lines with CR LF (default 60)\n"
     "  --answer-timeout MS    resend a line with no ACK or NAK after MS (default 1000)\n"
-    "  --max-resends N        give up after N resends of one line (default 20)\n"
+    "  --max-resends N        give up after N resends of one line or block (default 20)\n"
     "  --start-delay MS       wait before the first byte, to let the receiver start (default 0)\n"
+    "  --gap MS               raw stream: pause after each line (default 0)\n"
     "Faults:\n"
     "  --bad-check K          line (or block) K goes first with a wrong check character\n"
     "  --lose-ack K           the ACK of line K is ignored once, so line K is sent again\n"
     "  --noise N              N noise lines before the header\n"
     "  --silence S            say nothing for S seconds first\n"
     "  --long-line            after the header, a 128-byte line without CR LF, then nothing\n"
-    "  --disconnect-after K   close the port after line K was acknowledged\n"
-    "  --verbose              report every line and its answer on stderr\n"
+    "  --disconnect-after K   close the port after line or block K was acknowledged (raw\n"
+    "                         stream: sent), before the end\n"
+    "  --verbose              report the opened port, every line or block and its answer on\n"
+    "                         stderr\n"
     "  --help                 this text\n"
-    "Exit code: 0 when the receiver acknowledged everything, 1 otherwise, 2 on bad usage.\n";
+    "Exit code: 0 when the receiver acknowledged everything (raw stream: when everything was\n"
+    "sent), 1 otherwise, 2 on bad usage.\n";
 
 std::vector<std::string> ReadSurveyFile(const std::wstring& path, bool& ok) {
     std::vector<std::string> lines;
@@ -112,6 +119,8 @@ int wmain(int argc, wchar_t** argv) {
             options.MaxResends = number();
         } else if (option == L"--start-delay") {
             startDelay = number();
+        } else if (option == L"--gap") {
+            options.LineGapMs = number();
         } else if (option == L"--bad-check") {
             options.BadCheckLine = number();
         } else if (option == L"--lose-ack") {
@@ -132,7 +141,8 @@ int wmain(int argc, wchar_t** argv) {
         }
     }
     if (port.empty() || options.BaudRate == 0 ||
-        (protocol != L"line" && protocol != L"bcc" && protocol != L"ymodem")) {
+        (protocol != L"line" && protocol != L"raw" && protocol != L"bcc" &&
+         protocol != L"ymodem")) {
         std::fputs(kUsage, stderr);
         return 2;
     }
@@ -173,6 +183,8 @@ int wmain(int argc, wchar_t** argv) {
     }
     // Answers left on the line by an earlier receiver are not meant for this transfer.
     serial.Purge(true, true);
+    if (options.Verbose)
+        std::fprintf(stderr, "lvsim: ready on %ls\n", port.c_str());
     if (startDelay)
         ::Sleep(startDelay);
 
@@ -180,6 +192,13 @@ int wmain(int argc, wchar_t** argv) {
     int result = 1;
     if (protocol == L"line") {
         result = simulator.SendLines(lines);
+    } else if (protocol == L"raw") {
+        // What the instrument prints: the line protocol's lines, without its answers.
+        std::vector<std::string> printed = {"A,01,Z\r\n"};
+        for (const auto& line : lines)
+            printed.push_back(WithCheckCharacter(line));
+        printed.push_back("Z,&,\r\n");
+        result = simulator.SendRawStream(printed);
     } else if (protocol == L"bcc") {
         result = simulator.SendBccBlocks(lines);
     } else {
