@@ -22,6 +22,16 @@ elseif(LV_SANITIZE)
 endif()
 
 # lv_add_test(name sources... [LIBS libs...]): one test executable, one CTest entry.
+# lv_add_module_resources(target): the module's resource script compiled into target. windres
+# reports no dependencies of its own, so the script is rebuilt whenever one of its parts changes.
+function(lv_add_module_resources target)
+    file(GLOB parts CONFIGURE_DEPENDS ${PROJECT_SOURCE_DIR}/res/*.rc ${PROJECT_SOURCE_DIR}/res/*.h
+        ${PROJECT_SOURCE_DIR}/res/registry/* ${PROJECT_SOURCE_DIR}/res/icons/*)
+    set_source_files_properties(${PROJECT_SOURCE_DIR}/res/LVShellExt.rc PROPERTIES
+        OBJECT_DEPENDS "${parts}")
+    target_sources(${target} PRIVATE ${PROJECT_SOURCE_DIR}/res/LVShellExt.rc)
+endfunction()
+
 function(lv_add_test name)
     cmake_parse_arguments(ARG "" "" "LIBS" ${ARGN})
     add_executable(${name} ${ARG_UNPARSED_ARGUMENTS})
@@ -29,7 +39,7 @@ function(lv_add_test name)
     if(WIN32)
         # Test executables carry the module's resources (string table) so that text lookups
         # made through the executable's own module find them.
-        target_sources(${name} PRIVATE ${PROJECT_SOURCE_DIR}/res/LVShellExt.rc)
+        lv_add_module_resources(${name})
         add_test(NAME ${name} COMMAND ${PROJECT_SOURCE_DIR}/scripts/wine-run $<TARGET_FILE:${name}>)
     else()
         add_test(NAME ${name} COMMAND ${name})

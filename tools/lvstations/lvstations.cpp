@@ -1,5 +1,6 @@
 // lvstations: the station store from the command line, as the extension sees it.
 #include <windows.h>
+#include <commctrl.h>
 
 #include <cwchar>
 #include <string>
@@ -7,6 +8,7 @@
 
 #include "res/resource.h"
 #include "stations/serial_ports.h"
+#include "stations/station_dialog.h"
 #include "stations/station_store.h"
 #include "support/text_lookup.h"
 #include "support/unique_resource.h"
@@ -24,6 +26,10 @@ const wchar_t kUsage[] =
     L"      --parity none|odd|even      parity (default even)\n"
     L"      --model TEXT                \"Quorvel LV-10\" (default), \"Quorvel LV-20\" or "
     L"\"Quorvel LV-30\"\n"
+    L"  lvstations add                  opens the station sheet on a new station, as the folder's\n"
+    L"                                  Add command does (exit code 0 OK, 1 Cancel)\n"
+    L"  lvstations properties NAME      opens the station sheet on a stored station (exit code 0\n"
+    L"                                  OK, 1 Cancel, 2 no such station)\n"
     L"  lvstations delete NAME          deletes a station\n";
 
 std::wstring ParityName(DWORD parity) {
@@ -94,6 +100,38 @@ int Add(int argc, wchar_t** argv) {
     return 0;
 }
 
+// The station property sheet, as the folder's Add and Properties commands open it.
+int RunSheet(Station& station, bool newStation) {
+    INITCOMMONCONTROLSEX controls{sizeof controls, ICC_STANDARD_CLASSES | ICC_TAB_CLASSES};
+    (void)::InitCommonControlsEx(&controls);  // already registered where it fails
+    CStationDialog sheet(nullptr, station, newStation);
+    const INT_PTR result = sheet.DoModal();
+    if (result == -1) {
+        PrintUtf8(L"The station's properties could not be shown.\n");
+        return 2;
+    }
+    return result == IDOK ? 0 : 1;
+}
+
+int AddWithSheet() {
+    Station station = DefaultStation();
+    station.Name = MakeUniqueStationName(LoadUiText(IDS_NEW_DIGITAL_LEVEL));
+    const std::vector<std::wstring> ports = ListSerialPorts();
+    if (!ports.empty())
+        station.Port = ports.front();
+    return RunSheet(station, true);
+}
+
+int Properties(const wchar_t* name) {
+    Station station;
+    station.Name = name;
+    if (FindStation(station) != S_OK) {
+        PrintUtf8(L"No station named \"" + station.Name + L"\".\n");
+        return 2;
+    }
+    return RunSheet(station, false);
+}
+
 int Delete(const wchar_t* name) {
     Station station;
     station.Name = name;
@@ -113,8 +151,12 @@ int wmain(int argc, wchar_t** argv) {
         return List();
     if (command == L"ports" && argc == 2)
         return Ports();
+    if (command == L"add" && argc == 2)
+        return AddWithSheet();
     if (command == L"add" && argc >= 3)
         return Add(argc, argv);
+    if (command == L"properties" && argc == 3)
+        return Properties(argv[2]);
     if (command == L"delete" && argc == 3)
         return Delete(argv[2]);
     PrintUtf8(kUsage);

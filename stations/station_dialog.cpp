@@ -1,0 +1,152 @@
+// The station property sheet: lists, exchange, the three name checks and the store.
+#include "stations/station_dialog.h"
+
+#include <cwchar>
+
+#include "res/resource.h"
+#include "stations/portable/station_names.h"
+#include "stations/serial_ports.h"
+#include "stations/station_store.h"
+#include "support/text_lookup.h"
+#include "support/user_interface.h"
+
+namespace {
+
+const wchar_t* const kBaudRates[] = {L"300", L"600", L"1200", L"2400", L"4800", L"9600"};
+
+std::wstring ParityText(uint32_t parity) {
+    return LoadUiText(parity == 1 ? IDS_PARITY_ODD : parity == 2 ? IDS_PARITY_EVEN : IDS_PARITY_NONE);
+}
+
+// The decimal number at the start of the text; 0 for no selection or a text that is not one.
+uint32_t BaudRateFromText(const std::wstring& text) {
+    wchar_t* end = nullptr;
+    const unsigned long value = std::wcstoul(text.c_str(), &end, 10);
+    return end == text.c_str() ? 0 : static_cast<uint32_t>(value);
+}
+
+}  // namespace
+
+CStationGeneralPage::CStationGeneralPage(Station& station, bool newStation)
+    : CPropertyPage(IDD_STATION_GENERAL), station_(station), newStation_(newStation) {
+    BindEdit(IDC_STATION_NAME_EDIT, name_);
+    BindList(IDC_STATION_PORT, port_);
+    BindList(IDC_STATION_BAUD, baudRate_);
+    BindList(IDC_STATION_PARITY, parity_);
+    BindList(IDC_STATION_MODEL, model_);
+}
+
+void CStationGeneralPage::OnInitDialog() {
+    // The port and model lists sort themselves (COM10 before COM2); baud and parity keep this
+    // order.
+    for (const std::wstring& port : ListSerialPorts())
+        AddListEntry(IDC_STATION_PORT, port);
+    for (const wchar_t* rate : kBaudRates)
+        AddListEntry(IDC_STATION_BAUD, rate);
+    for (UINT id : {IDS_PARITY_NONE, IDS_PARITY_ODD, IDS_PARITY_EVEN})
+        AddListEntry(IDC_STATION_PARITY, LoadUiText(id));
+    for (UINT id : {IDS_MODEL_LV10, IDS_MODEL_LV20, IDS_MODEL_LV30})
+        AddListEntry(IDC_STATION_MODEL, LoadUiText(id));
+
+    name_ = station_.Name;
+    port_ = station_.Port;
+    baudRate_ = std::to_wstring(station_.BaudRate);
+    parity_ = ParityText(station_.Parity);
+    model_ = station_.Model;
+
+    // Set here, not in the template, so that a translation relabels the page.
+    SetControlText(IDC_STATION_NAME_LABEL, LoadUiText(IDS_NAME_LABEL));
+    SetControlText(IDC_STATION_PORT_LABEL, LoadUiText(IDS_PORT_LABEL));
+    SetControlText(IDC_STATION_BAUD_LABEL, LoadUiText(IDS_BAUD_LABEL));
+    SetControlText(IDC_STATION_PARITY_LABEL, LoadUiText(IDS_PARITY_LABEL));
+    SetControlText(IDC_STATION_MODEL_LABEL, LoadUiText(IDS_MODEL_LABEL));
+    UpdateControls();
+}
+
+void CStationGeneralPage::OnCommand(WORD controlId, WORD notification) {
+    // Only an existing station has changes to apply before OK: a new one is stored by OK alone.
+    if (newStation_)
+        return;
+    const bool nameEdited = controlId == IDC_STATION_NAME_EDIT && notification == EN_CHANGE;
+    const bool listChanged =
+        notification == CBN_SELCHANGE &&
+        (controlId == IDC_STATION_PORT || controlId == IDC_STATION_BAUD ||
+         controlId == IDC_STATION_PARITY || controlId == IDC_STATION_MODEL);
+    if (nameEdited || listChanged)
+        SetModified();
+}
+
+void CStationGeneralPage::ExchangeIntoRecord() {
+    UpdateFields();
+    station_.Name = name_;
+    station_.Port = port_;
+    station_.BaudRate = BaudRateFromText(baudRate_);
+    if (parity_ == LoadUiText(IDS_PARITY_NONE))
+        station_.Parity = 0;
+    else if (parity_ == LoadUiText(IDS_PARITY_ODD))
+        station_.Parity = 1;
+    else if (parity_ == LoadUiText(IDS_PARITY_EVEN))
+        station_.Parity = 2;
+    station_.Model = model_;
+}
+
+CStationDialog::CStationDialog(HWND parent, Station& station, bool newStation)
+    : CPropertySheet(parent, std::wstring()),
+      newStation_(newStation),
+      openingName_(station.Name),
+      station_(station),
+      page_(station, newStation) {
+    SetCaption(Caption());
+    AddPage(page_);
+}
+
+std::wstring CStationDialog::Caption() const {
+    return LoadUiText(newStation_ ? IDS_CREATE_DIGITAL_LEVEL : IDS_STATION_PROPERTIES);
+}
+
+void CStationDialog::OnInitialized() {
+    SetFirstTabText(LoadUiText(IDS_GENERAL_TAB));
+    SetCaption(Caption());
+}
+
+bool CStationDialog::AcceptName(const std::wstring& name) const {
+    UINT refusal = 0;
+    std::wstring text;
+    if (name.empty()) {
+        refusal = IDS_STATION_NAME_EMPTY;
+    } else if (!IsValidStationName(name)) {
+        refusal = IDS_STATION_NAME_SYMBOLS;
+    } else if (newStation_) {
+        // Only a new station must have a name of its own: a rename may match another station.
+        Station existing;
+        existing.Name = name;
+        if (FindStation(existing) == S_OK) {
+            refusal = IDS_STATION_EXISTS;
+            text = LoadUiText(IDS_STATION_EXISTS);
+            const size_t insert = text.find(L"%s");
+            if (insert != std::wstring::npos)
+                text.replace(insert, 2, name);
+        }
+    }
+    if (refusal == 0)
+        return true;
+    if (text.empty())
+        text = LoadUiText(refusal);
+    // The caption is the one of adding, in both modes.
+    ShowMessageBox(Window(), text, LoadUiText(IDS_ADD_NEW_DIGITAL_LEVEL), MB_ICONERROR);
+    return false;
+}
+
+bool CStationDialog::OnApply(bool) {
+    page_.ExchangeIntoRecord();
+    if (!AcceptName(station_.Name))
+        return false;
+    // Store failures are not reported: the sheet has no better answer for them than the store.
+    if (newStation_) {
+        (void)AddStation(station_);
+        added_ = true;
+    } else {
+        (void)UpdateStation(openingName_, station_);
+    }
+    return true;
+}
