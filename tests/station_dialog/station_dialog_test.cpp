@@ -57,8 +57,13 @@ struct Sheet {
                        reinterpret_cast<LPARAM>(list));
     }
     bool ApplyEnabled() const { return ::IsWindowEnabled(::GetDlgItem(frame, kApplyButton)); }
+    // The sheet's own press of a button, as a click gives it; it does not depend on where the
+    // sheet is on the screen or whether it has the focus yet.
     void Press(int buttonId) const {
-        ::SendMessageW(::GetDlgItem(frame, buttonId), BM_CLICK, 0, 0);
+        const int button = buttonId == IDOK         ? PSBTN_OK
+                           : buttonId == IDCANCEL   ? PSBTN_CANCEL
+                                                    : PSBTN_APPLYNOW;
+        ::SendMessageW(frame, PSM_PRESSBUTTON, button, 0);
     }
 };
 
@@ -84,6 +89,10 @@ INT_PTR RunSheet(CStationDialog& dialog, const std::function<void(const Sheet&)>
             ADD_FAILURE() << "no sheet appeared";
             return;
         }
+        // The page exists before the sheet has finished setting it up: wait until it shows.
+        for (int tries = 0; tries < 250 && !::IsWindowVisible(sheet.page); ++tries)
+            ::Sleep(20);
+        ::Sleep(200);
         script(sheet);
         for (int tries = 0; tries < 250 && ::IsWindow(sheet.frame); ++tries)
             ::Sleep(20);
