@@ -102,6 +102,11 @@ TEST_F(DownloadDialog, ShowsInstructionsNameAndWaitsForStart) {
         EXPECT_EQ(Text(window, IDC_STATION_NAME), L"Site 4 level");
         EXPECT_EQ(Text(window, IDC_STATUS_TEXT), L"Waiting for start...");
         EXPECT_TRUE(IsEnabled(window, IDC_START));
+        // A progress message without a text, or with an empty one, leaves the status as it is.
+        static const wchar_t empty[] = L"";
+        for (LPARAM text : {LPARAM{0}, reinterpret_cast<LPARAM>(empty)})
+            ::SendMessageW(window, g_registeredMessages.downloadThreadMessage, 1, text);
+        EXPECT_EQ(Text(window, IDC_STATUS_TEXT), L"Waiting for start...");
         Press(window, IDCANCEL);
     });
     EXPECT_EQ(result, IDCANCEL);
