@@ -6,6 +6,7 @@
 #include "download/portable/port_setup.h"
 #include "download/portable/serial_protocol.h"
 #include "download/win32_serial_port.h"
+#include "support/module_instance.h"
 
 namespace {
 // One clock and one text source serve every driver: both are stateless.
@@ -47,7 +48,7 @@ bool TAZComm::OpenPort() {
     // Only a configuration failure has a system text of its own; a port that did not open
     // gets the driver's message alone.
     if (port_->IsValid())
-        callback_->ShowMessage(kMessageError, SystemErrorText(error).c_str());
+        callback_->ShowMessage(kMessageError, SystemMessageText(error).c_str());
     return false;
 }
 
@@ -78,7 +79,7 @@ bool TAZComm::IsFileOpened() const noexcept {
 uint32_t TAZComm::SendYModemHeader(const std::wstring& path) {
     WIN32_FILE_ATTRIBUTE_DATA attributes{};
     if (!::GetFileAttributesExW(path.c_str(), GetFileExInfoStandard, &attributes)) {
-        callback_->ShowMessage(kMessageError, SystemErrorText(::GetLastError()).c_str());
+        callback_->ShowMessage(kMessageError, SystemMessageText(::GetLastError()).c_str());
         return 1;
     }
     // The name travels as multibyte text of the thread's code page.
@@ -106,7 +107,7 @@ bool TAZComm::CheckInputFile() {
     UniqueFileHandle input(::CreateFileW(params_->OutputPath.c_str(), GENERIC_READ, FILE_SHARE_READ,
                                          nullptr, OPEN_EXISTING, FILE_ATTRIBUTE_NORMAL, nullptr));
     if (!input) {
-        callback_->ShowMessage(kMessageError, SystemErrorText(::GetLastError()).c_str());
+        callback_->ShowMessage(kMessageError, SystemMessageText(::GetLastError()).c_str());
         return false;
     }
     std::vector<uint8_t> bytes;

@@ -43,10 +43,6 @@ COMMTIMEOUTS ToCommTimeouts(const PortTimeouts& timeouts) noexcept {
     return result;
 }
 
-std::wstring SystemErrorText(DWORD error) {
-    return SystemMessageText(error);
-}
-
 Win32SerialPort::~Win32SerialPort() {
     Close();
 }

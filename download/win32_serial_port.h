@@ -15,9 +15,6 @@
 void ApplyDeviceControlFields(const DeviceControlFields& fields, DCB& dcb) noexcept;
 COMMTIMEOUTS ToCommTimeouts(const PortTimeouts& timeouts) noexcept;
 
-// The system's text for an error code (FormatMessageW, default language), without the line end.
-std::wstring SystemErrorText(DWORD error);
-
 // A COM port opened with CreateFileW and configured with SetCommState/SetCommTimeouts; the
 // settings found are saved and put back by Close.
 class Win32SerialPort final : public SerialPort {

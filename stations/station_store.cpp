@@ -5,7 +5,6 @@
 
 #include <algorithm>
 #include <cwchar>
-#include <memory>
 #include <string_view>
 #include <unordered_set>
 
@@ -44,26 +43,36 @@ LONG ReadNumber(HKEY key, const wchar_t* name, uint32_t& field) {
     return status;
 }
 
-// Hands each station key that has a readable "Name", in the registry's order, to visit until it
-// answers true; true when it did. The end of the list and any enumeration failure end the walk.
+// Hands each subkey name, in the registry's order, to visit until it answers true; true when it
+// did. The end of the list and any enumeration failure end the walk.
 template <typename Visit>
-bool VisitStationKeys(HKEY stations, REGSAM access, Visit&& visit) {
+bool VisitSubkeyNames(HKEY key, Visit&& visit) {
     for (DWORD index = 0;; ++index) {
         wchar_t subkeyName[kKeyNameCapacity];
         DWORD length = kKeyNameCapacity;
-        if (::RegEnumKeyExW(stations, index, subkeyName, &length, nullptr, nullptr, nullptr,
+        if (::RegEnumKeyExW(key, index, subkeyName, &length, nullptr, nullptr, nullptr,
                             nullptr) != ERROR_SUCCESS) {
             return false;
         }
-        UniqueRegKey subkey;
-        std::wstring name;
-        if (::RegOpenKeyExW(stations, subkeyName, 0, access, subkey.put()) != ERROR_SUCCESS ||
-            ReadText(subkey.get(), L"Name", name) != ERROR_SUCCESS) {
-            continue;
-        }
-        if (visit(std::wstring_view(subkeyName, length), subkey.get(), name))
+        if (visit(std::wstring_view(subkeyName, length)))
             return true;
     }
+}
+
+// Hands each station key that has a readable "Name", in the registry's order, to visit until it
+// answers true; true when it did.
+template <typename Visit>
+bool VisitStationKeys(HKEY stations, REGSAM access, Visit&& visit) {
+    return VisitSubkeyNames(stations, [&](std::wstring_view subkeyName) {
+        UniqueRegKey subkey;
+        std::wstring name;
+        const std::wstring keyName(subkeyName);
+        if (::RegOpenKeyExW(stations, keyName.c_str(), 0, access, subkey.put()) != ERROR_SUCCESS ||
+            ReadText(subkey.get(), L"Name", name) != ERROR_SUCCESS) {
+            return false;
+        }
+        return visit(subkeyName, subkey.get(), name);
+    });
 }
 
 // Registry key names compare without regard to case.
@@ -75,22 +84,18 @@ std::wstring KeyNameFolded(std::wstring name) {
 
 std::unordered_set<std::wstring> SubkeyNamesFolded(HKEY stations) {
     std::unordered_set<std::wstring> names;
-    for (DWORD index = 0;; ++index) {
-        wchar_t subkeyName[kKeyNameCapacity];
-        DWORD length = kKeyNameCapacity;
-        if (::RegEnumKeyExW(stations, index, subkeyName, &length, nullptr, nullptr, nullptr,
-                            nullptr) != ERROR_SUCCESS) {
-            return names;
-        }
-        names.insert(KeyNameFolded(std::wstring(subkeyName, length)));
-    }
+    VisitSubkeyNames(stations, [&](std::wstring_view subkeyName) {
+        names.insert(KeyNameFolded(std::wstring(subkeyName)));
+        return false;
+    });
+    return names;
 }
 
 // Whether a name is taken, by one reading of the store made when the predicate is built.
 NameTakenPredicate TakenInStore() {
     const std::vector<std::wstring> stored = ListStationNames();
-    auto taken = std::make_shared<std::unordered_set<std::wstring>>(stored.begin(), stored.end());
-    return [taken](const WideString& name) { return taken->count(name) != 0; };
+    return [taken = std::unordered_set<std::wstring>(stored.begin(), stored.end())](
+               const WideString& name) { return taken.count(name) != 0; };
 }
 
 }  // namespace

@@ -216,15 +216,14 @@ HRESULT CLVDataObject::GetFileContents(LONG index, STGMEDIUM* medium) {
     const HWND owner = ::GetActiveWindow();
     INT_PTR answer = -1;
     bool completed = false;
-    if (external) {
-        CHalvekDownloadProgressDialog dialog(owner, station, target);
+    const auto run = [&](CProgressDialogBase&& dialog) {
         answer = dialog.DoModal();
         completed = dialog.TransferCompleted();
-    } else {
-        CDownloadProgressDialog dialog(owner, station, target);
-        answer = dialog.DoModal();
-        completed = dialog.TransferCompleted();
-    }
+    };
+    if (external)
+        run(CHalvekDownloadProgressDialog(owner, station, target));
+    else
+        run(CDownloadProgressDialog(owner, station, target));
     // The dialogs are gone, and with them the download thread: nothing writes the file now.
     // Only a transfer that reported its end makes a file; an IDOK from anywhere else, a cancel
     // or a dialog that could not run leaves at most a partial file, which goes.

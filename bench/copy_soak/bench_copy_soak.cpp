@@ -48,23 +48,6 @@ DWORD CountHandles() {
     return count;
 }
 
-SIZE_T HeapBytesInUse() {
-    std::vector<HANDLE> heaps(::GetProcessHeaps(0, nullptr) + 16);
-    heaps.resize(::GetProcessHeaps(static_cast<DWORD>(heaps.size()), heaps.data()));
-    SIZE_T total = 0;
-    for (HANDLE heap : heaps) {
-        if (!::HeapLock(heap))
-            continue;
-        PROCESS_HEAP_ENTRY entry{};
-        while (::HeapWalk(heap, &entry)) {
-            if (entry.wFlags & PROCESS_HEAP_ENTRY_BUSY)
-                total += entry.cbData;
-        }
-        ::HeapUnlock(heap);
-    }
-    return total;
-}
-
 // Busy heap blocks by size, for telling which allocation grows with the copies.
 std::map<SIZE_T, long> HeapBlockSizes() {
     std::map<SIZE_T, long> sizes;
@@ -81,6 +64,13 @@ std::map<SIZE_T, long> HeapBlockSizes() {
         ::HeapUnlock(heap);
     }
     return sizes;
+}
+
+SIZE_T HeapBytesInUse() {
+    SIZE_T total = 0;
+    for (const auto& [size, count] : HeapBlockSizes())
+        total += size * static_cast<SIZE_T>(count);
+    return total;
 }
 
 Usage Measure() {

@@ -8,6 +8,7 @@
 #include <string>
 #include <vector>
 
+#include "support/module_instance.h"
 #include "tools/lvsim/instrument_simulator.h"
 
 namespace {
@@ -178,7 +179,7 @@ int wmain(int argc, wchar_t** argv) {
     const DWORD error = serial.Open(device.c_str(), dcb, timeouts);
     if (error != ERROR_SUCCESS) {
         std::fprintf(stderr, "lvsim: cannot open %ls: %ls\n", port.c_str(),
-                     SystemErrorText(error).c_str());
+                     SystemMessageText(error).c_str());
         return 1;
     }
     // Answers left on the line by an earlier receiver are not meant for this transfer.
