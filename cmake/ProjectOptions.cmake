@@ -26,7 +26,8 @@ endif()
 # reports no dependencies of its own, so the script is rebuilt whenever one of its parts changes.
 function(lv_add_module_resources target)
     file(GLOB parts CONFIGURE_DEPENDS ${PROJECT_SOURCE_DIR}/res/*.rc ${PROJECT_SOURCE_DIR}/res/*.h
-        ${PROJECT_SOURCE_DIR}/res/registry/* ${PROJECT_SOURCE_DIR}/res/icons/*)
+        ${PROJECT_SOURCE_DIR}/res/registry/* ${PROJECT_SOURCE_DIR}/res/icons/*
+        ${PROJECT_SOURCE_DIR}/res/animation/*)
     set_source_files_properties(${PROJECT_SOURCE_DIR}/res/LVShellExt.rc PROPERTIES
         OBJECT_DEPENDS "${parts}")
     target_sources(${target} PRIVATE ${PROJECT_SOURCE_DIR}/res/LVShellExt.rc)

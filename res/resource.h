@@ -11,3 +11,6 @@
 #if __has_include("res/ids_download.h")
 #include "res/ids_download.h"
 #endif
+#if __has_include("res/ids_view.h")
+#include "res/ids_view.h"
+#endif

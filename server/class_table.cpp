@@ -9,6 +9,7 @@
 #include "res/registry/ids_registry.h"
 #include "server/lv_shell_folder.h"
 #include "view/lv_data_object.h"
+#include "view/lv_shell_view.h"
 
 namespace {
 
@@ -35,7 +36,7 @@ constexpr ClassTableEntry kClassTable[] = {
     {&kEnumIdListClassId, IDR_LVENUMIDLIST, &CreateComInstance<CLVEnumIDList>},
     {&kExtractIconClassId, IDR_LVEXTRACTICON, &CreateComInstance<CLVExtractIcon>},
     {&kQueryInfoClassId, IDR_AZQUERYINFO, &CreateComInstance<CLVQueryInfo>},
-    {&kShellViewClassId, IDR_LVSHELLVIEW, nullptr},
+    {&kShellViewClassId, IDR_LVSHELLVIEW, &CreateComInstance<CLVShellView>},
     {&kDropTargetClassId, IDR_LVDROPTARGET, nullptr},
     {&kDropTargetOnListViewClassId, IDR_LVDROPTARGETONLISTVIEW, nullptr},
 };

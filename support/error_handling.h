@@ -57,3 +57,10 @@ HRESULT ResultFromCaughtException() noexcept;
         LogFailure(lv_caught_, __FILE__, __func__, __LINE__);   \
         return lv_caught_;                                      \
     }
+
+// Ends a body whose failure has nowhere to go (a window procedure, a destructor's clean-up): the
+// failure is logged and the caller goes on.
+#define CATCH_LOG()                                                                       \
+    catch (...) {                                                                         \
+        LogFailure(ResultFromCaughtException(), __FILE__, __func__, __LINE__);            \
+    }

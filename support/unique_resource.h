@@ -99,6 +99,24 @@ struct HModuleTraits {
     static void Close(Type value) noexcept { ::FreeLibrary(value); }
 };
 
+struct WindowTraits {
+    using Type = HWND;
+    static Type Invalid() noexcept { return nullptr; }
+    static void Close(Type value) noexcept { ::DestroyWindow(value); }
+};
+
+struct MenuTraits {
+    using Type = HMENU;
+    static Type Invalid() noexcept { return nullptr; }
+    static void Close(Type value) noexcept { ::DestroyMenu(value); }
+};
+
+struct AcceleratorTraits {
+    using Type = HACCEL;
+    static Type Invalid() noexcept { return nullptr; }
+    static void Close(Type value) noexcept { ::DestroyAcceleratorTable(value); }
+};
+
 using UniqueHandle = UniqueResource<HandleTraits>;
 using UniqueFileHandle = UniqueResource<FileHandleTraits>;
 using UniqueRegKey = UniqueResource<RegKeyTraits>;
@@ -108,6 +126,9 @@ using UniqueHGlobal = UniqueResource<HGlobalTraits>;
 using UniqueHIcon = UniqueResource<HIconTraits>;
 using UniqueHImageList = UniqueResource<HImageListTraits>;
 using UniqueHModule = UniqueResource<HModuleTraits>;
+using UniqueWindow = UniqueResource<WindowTraits>;  // windows of the thread that made them
+using UniqueMenu = UniqueResource<MenuTraits>;
+using UniqueAccelerators = UniqueResource<AcceleratorTraits>;
 
 // Keeps a global memory block locked for one scope.
 class GlobalLockGuard {

@@ -108,8 +108,8 @@ TEST_F(ShellFolderTest, RefusedObjectsComeBackNull) {
     object = reinterpret_cast<void*>(1);
     EXPECT_EQ(E_NOTIMPL, folder->BindToStorage(Child(station), nullptr, IID_IStream, &object));
     EXPECT_EQ(nullptr, object);
-    // The view and the background menu do not exist yet.
-    for (REFIID iid : {IID_IShellView, IID_IContextMenu}) {
+    // The folder makes views and background menus only; the drop target does not exist yet.
+    for (REFIID iid : {IID_IDropTarget, IID_IShellFolder}) {
         object = reinterpret_cast<void*>(1);
         EXPECT_EQ(E_NOINTERFACE, folder->CreateViewObject(nullptr, iid, &object));
         EXPECT_EQ(nullptr, object);

@@ -1,0 +1,229 @@
+// The view's commands: add, open, delete, edit, copy and paste stations, the view modes, and the
+// drag of a station's file.
+#include "view/lv_shell_view.h"
+
+#include "res/ids_stations.h"
+#include "res/ids_view.h"
+#include "stations/portable/station_names.h"
+#include "stations/station_dialog.h"
+#include "stations/station_list_block.h"
+#include "stations/station_store.h"
+#include "support/error_handling.h"
+#include "support/text_lookup.h"
+#include "view/lv_data_object.h"
+
+namespace {
+
+constexpr wchar_t kStationListFormat[] = L"Quorvel Total Stations";
+
+// The drag image moves with the cursor and keeps the distance from the cursor to the item where
+// the drag began. The data object moves it to the cursor's screen position plus this offset, and
+// image positions count from the list's window corner.
+POINT DragImageOffset(HWND list, POINT imageOrigin) {
+    POINT cursor{};
+    ::GetCursorPos(&cursor);
+    POINT client = cursor;
+    ::ScreenToClient(list, &client);
+    RECT frame{};
+    ::GetWindowRect(list, &frame);
+    return POINT{imageOrigin.x - client.x - frame.left, imageOrigin.y - client.y - frame.top};
+}
+
+}  // namespace
+
+void CLVShellView::OnCommand(UINT command) {
+    if (const UINT mode = ViewModeOfCommand(command)) {
+        SetViewMode(mode);
+        return;
+    }
+    switch (command) {
+        case IDM_REFRESH:
+            (void)Refresh();  // without a list there is nothing to refresh
+            break;
+        case IDM_CREATE_STATION:
+            AddStation();
+            break;
+        case IDM_COPY:
+            CopySelection();
+            break;
+        case IDM_PASTE:
+            PasteStations();
+            break;
+        case IDM_PROPERTIES:
+            EditSelectedStations();
+            break;
+        case IDM_DELETE:
+            DeleteSelection();
+            break;
+        case IDM_OPEN:
+            OpenSelection();
+            break;
+        default:
+            break;
+    }
+}
+
+void CLVShellView::ChangedStations() {
+    (void)Refresh();
+    BroadcastStationsChanged(folderKind_);
+}
+
+void CLVShellView::AddStation() {
+    Station station = DefaultStation();
+    station.Name = MakeUniqueStationName(LoadUiText(IDS_NEW_DIGITAL_LEVEL));
+    CStationDialog dialog(window_, station, true);
+    // The sheet stores the station itself; Cancel stores nothing.
+    if (dialog.DoModal() == IDOK || dialog.Added())
+        ChangedStations();
+}
+
+void CLVShellView::OpenSelection() {
+    const std::vector<SelectedItem> selection = Selection();
+    if (selection.empty())
+        return;
+    const SelectedItem& first = selection.front();
+    if (IsTopFolder() && !first.item) {
+        AddStation();
+        return;
+    }
+    if (!first.item || !browser_)
+        return;
+    // Browsing destroys this view and its list (Wine's browsers do it before returning): keep
+    // the view and the identifier alive across the call.
+    Microsoft::WRL::ComPtr<CLVShellView> keepAlive(this);
+    Microsoft::WRL::ComPtr<ICommDlgBrowser> dialogBrowser = dialogBrowser_;
+    UniquePidl item(manager_.CopyPidl(reinterpret_cast<LPCITEMIDLIST>(first.item)));
+    if (!item)
+        return;
+    if (FAILED(browser_->BrowseObject(reinterpret_cast<PCUIDLIST_RELATIVE>(item.get()), SBSP_DEFBROWSER | SBSP_RELATIVE)) &&
+        dialogBrowser) {
+        // A file is not a folder to browse to: in a file dialog, opening it chooses it.
+        (void)dialogBrowser->OnDefaultCommand(this);
+    }
+}
+
+void CLVShellView::DeleteSelection() {
+    if (!IsTopFolder())
+        return;
+    const std::vector<SelectedItem> selection = Selection();
+    if (selection.empty())
+        return;
+    for (const SelectedItem& selected : selection) {
+        if (!selected.item)
+            continue;  // the entry is not a station
+        Station station;
+        station.Name = manager_.GetItemName(reinterpret_cast<LPCITEMIDLIST>(selected.item));
+        // A station deleted meanwhile (in another view) is simply gone; the refresh shows it.
+        (void)::DeleteStation(station);
+    }
+    ChangedStations();
+}
+
+void CLVShellView::EditSelectedStations() {
+    // The names first: each OK refreshes the list, which frees the items' identifiers.
+    std::vector<std::wstring> names;
+    for (const SelectedItem& selected : Selection()) {
+        if (selected.item)
+            names.push_back(manager_.GetItemName(reinterpret_cast<LPCITEMIDLIST>(selected.item)));
+    }
+    if (names.empty())
+        return;
+    for (const std::wstring& name : names) {
+        Station station;
+        station.Name = name;
+        // A station deleted since it was listed has no sheet to show.
+        if (FAILED(FindStation(station)))
+            continue;
+        CStationDialog dialog(window_, station, false);
+        if (dialog.DoModal() == IDOK)
+            (void)Refresh();
+    }
+    BroadcastStationsChanged(folderKind_);
+}
+
+void CLVShellView::CopySelection() {
+    if (folderKind_ != PT_ROOT && folderKind_ != PT_STATION)
+        return;
+    const std::vector<SelectedItem> selection = Selection();
+    if (selection.empty())
+        return;
+    auto dataObject = MakeComObject<CLVDataObject>();
+    bool added = false;
+    for (const SelectedItem& selected : selection) {
+        if (!selected.item)
+            continue;  // the entry alone copies nothing, and leaves the clipboard as it was
+        UniquePidl full(CreateFullItem(selected.item));
+        if (!full || FAILED(dataObject->AddItem(reinterpret_cast<PCUIDLIST_RELATIVE>(full.get()))))
+            return;  // a part of the selection on the clipboard would be a lie
+        added = true;
+    }
+    // The clipboard keeps the object and renders from it on request.
+    if (added)
+        (void)::OleSetClipboard(dataObject.Get());
+}
+
+void CLVShellView::PasteStations() {
+    if (!IsTopFolder())
+        return;
+    Microsoft::WRL::ComPtr<IDataObject> clipboard;
+    if (FAILED(::OleGetClipboard(&clipboard)) || !clipboard)
+        return;
+    FORMATETC format{static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(kStationListFormat)),
+                     nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
+    STGMEDIUM medium{};
+    if (format.cfFormat == 0 || FAILED(clipboard->GetData(&format, &medium)))
+        return;
+    std::vector<Station> stations;
+    const HRESULT parsed =
+        medium.tymed == TYMED_HGLOBAL ? ParseStationList(medium.hGlobal, stations) : E_FAIL;
+    ::ReleaseStgMedium(&medium);
+    if (FAILED(parsed))
+        return;
+    for (Station& station : stations) {
+        // Another program's block may name a station that the folder could neither show nor
+        // open (empty, or with a path separator in it): such records are skipped.
+        if (!IsValidStationName(station.Name))
+            continue;
+        station.Name = MakePastedStationName(station.Name);
+        // A refused add leaves the others; the refresh shows what is stored.
+        (void)::AddStation(station);
+    }
+    ChangedStations();
+}
+
+void CLVShellView::SetViewMode(UINT mode) {
+    settings_.ViewMode = mode;
+    ApplyViewModeStyle();
+    ResetColumnsAndImages();
+    (void)Refresh();
+    if (mode == FVM_ICON)
+        list_.Send(LVM_ARRANGE, LVA_SNAPTOGRID);
+    // Rebuilt, so that the radio mark moves.
+    BuildMenus();
+}
+
+void CLVShellView::BeginDrag() {
+    // Only a station's file leaves by drag; stations themselves move by copy and paste.
+    if (folderKind_ != PT_STATION)
+        return;
+    const std::vector<SelectedItem> selection = Selection();
+    if (selection.empty())
+        return;
+    auto dataObject = MakeComObject<CLVDataObject>();
+    for (const SelectedItem& selected : selection) {
+        UniquePidl full(CreateFullItem(selected.item));
+        if (!full || FAILED(dataObject->AddItem(reinterpret_cast<PCUIDLIST_RELATIVE>(full.get()))))
+            return;
+    }
+    POINT origin{};
+    const int first = selection.front().index;
+    const HIMAGELIST image = reinterpret_cast<HIMAGELIST>(
+        list_.Send(LVM_CREATEDRAGIMAGE, first, reinterpret_cast<LPARAM>(&origin)));
+    if (image) {
+        const POINT offset = DragImageOffset(list_.Window(), origin);
+        dataObject->SetDragImage(image, list_.Window(), offset.x, offset.y);
+    }
+    DWORD effect = DROPEFFECT_NONE;
+    // The target decides what happens; the source has nothing to do afterwards.
+    (void)::DoDragDrop(dataObject.Get(), dataObject.Get(), DROPEFFECT_COPY, &effect);
+}

@@ -1,0 +1,304 @@
+// The view's list: its styles, columns and image lists for each view mode, its asynchronous fill,
+// the texts and images it asks for, and its sorting.
+#include "view/lv_shell_view.h"
+
+#include <memory>
+
+#include "namespace/icon_lists.h"
+#include "namespace/portable/item_id_layout.h"
+#include "res/ids_stations.h"
+#include "res/ids_view.h"
+#include "stations/display_settings.h"
+#include "support/error_handling.h"
+#include "support/module_instance.h"
+#include "support/registered_messages.h"
+#include "support/text_lookup.h"
+
+namespace {
+
+// The fill thread only enumerates the registry; a megabyte is what it was always given.
+constexpr SIZE_T kFillThreadStackSize = 1024 * 1024;
+
+// Process-wide, as the display settings are: every view sorts the way the last click asked.
+int g_sortColumn = 1;  // 1-based
+int g_sortDirection = 1;
+
+DWORD ListViewType(UINT mode) noexcept {
+    switch (mode) {
+        case FVM_SMALLICON:
+            return LVS_SMALLICON;
+        case FVM_LIST:
+            return LVS_LIST;
+        case FVM_DETAILS:
+            return LVS_REPORT;
+        default:
+            return LVS_ICON;
+    }
+}
+
+// One-click activation with hot tracking unless the user chose double-click or the classic shell.
+DWORD ClickStyles() noexcept {
+    using GetSettingsProcedure = void(WINAPI*)(SHELLFLAGSTATE*, DWORD);
+    SHELLFLAGSTATE state{};
+    // Windows' default is double-click. Wine's SHGetSettings leaves both fields as the caller set
+    // them, so the default must be in place before the call.
+    state.fDoubleClickInWebView = TRUE;
+    if (const HMODULE shell = ::GetModuleHandleW(L"shell32.dll")) {
+        const auto procedure = reinterpret_cast<GetSettingsProcedure>(
+            reinterpret_cast<void*>(::GetProcAddress(shell, "SHGetSettings")));
+        if (procedure)
+            procedure(&state, SSF_DOUBLECLICKINWEBVIEW | SSF_WIN95CLASSIC);
+    }
+    if (state.fWin95Classic || state.fDoubleClickInWebView)
+        return 0;
+    return LVS_EX_TRACKSELECT | LVS_EX_ONECLICKACTIVATE | LVS_EX_UNDERLINEHOT;
+}
+
+struct FillRequest {
+    Microsoft::WRL::ComPtr<IShellFolder> folder;
+    HWND window;
+};
+
+struct SortContext {
+    IShellFolder* folder;
+    LPARAM column;
+};
+
+int CALLBACK CompareItems(LPARAM first, LPARAM second, LPARAM context) {
+    // The entry has no identifier and stays on top in either direction.
+    if (!first || !second)
+        return first ? 1 : (second ? -1 : 0);
+    const auto& sort = *reinterpret_cast<const SortContext*>(context);
+    // The folder answers with the order itself in the status value.
+    return static_cast<int>(sort.folder->CompareIDs(sort.column,
+                                                    reinterpret_cast<PCUIDLIST_RELATIVE>(first),
+                                                    reinterpret_cast<PCUIDLIST_RELATIVE>(second)));
+}
+
+}  // namespace
+
+bool CLVShellView::CreateList() {
+    // Clipping its siblings keeps the animation visible over the list while a fill runs.
+    const DWORD style = WS_CHILD | WS_VISIBLE | WS_TABSTOP | WS_CLIPSIBLINGS | LVS_AUTOARRANGE |
+                        LVS_SHAREIMAGELISTS | LVS_SHOWSELALWAYS |
+                        ListViewType(settings_.ViewMode);
+    // No label editing: stations are renamed in their property sheet only.
+    if (!list_.Create(window_, style, WS_EX_CLIENTEDGE, IDC_VIEW_LIST))
+        return false;
+    RECT area{};
+    ::GetClientRect(window_, &area);
+    ::MoveWindow(list_.Window(), 0, 0, area.right, area.bottom, FALSE);
+    ApplyViewModeStyle();
+    ResetColumnsAndImages();
+    return true;
+}
+
+void CLVShellView::ApplyViewModeStyle() noexcept {
+    const HWND list = list_.Window();
+    if (!list)
+        return;
+    const LONG_PTR style = ::GetWindowLongPtrW(list, GWL_STYLE);
+    ::SetWindowLongPtrW(list, GWL_STYLE,
+                        (style & ~static_cast<LONG_PTR>(LVS_TYPEMASK)) |
+                            ListViewType(settings_.ViewMode));
+    constexpr DWORD kClickMask = LVS_EX_TRACKSELECT | LVS_EX_ONECLICKACTIVATE | LVS_EX_UNDERLINEHOT;
+    list_.Send(LVM_SETEXTENDEDLISTVIEWSTYLE, kClickMask, ClickStyles());
+}
+
+void CLVShellView::ResetColumnsAndImages() {
+    list_.Send(LVM_DELETEALLITEMS);
+    while (list_.Send(LVM_DELETECOLUMN, 0)) {
+    }
+    if (settings_.ViewMode == FVM_DETAILS) {
+        std::wstring name = LoadUiText(IDS_NAME_COLUMN);
+        LVCOLUMNW column{};
+        column.mask = LVCF_FMT | LVCF_TEXT | LVCF_WIDTH | LVCF_SUBITEM;
+        column.fmt = LVCFMT_LEFT;
+        column.cx = DisplayColumnWidth(0);
+        column.pszText = name.data();
+        list_.Send(LVM_INSERTCOLUMNW, 0, reinterpret_cast<LPARAM>(&column));
+    }
+    if (settings_.ViewMode == FVM_ICON)
+        list_.Send(LVM_SETIMAGELIST, LVSIL_NORMAL, reinterpret_cast<LPARAM>(LargeIconList()));
+    else
+        list_.Send(LVM_SETIMAGELIST, LVSIL_SMALL, reinterpret_cast<LPARAM>(SmallIconList()));
+}
+
+void CLVShellView::StartFill() {
+    // A newer fill takes the animation over; the older thread's result is still taken.
+    animation_.reset();
+    RECT area{};
+    ::GetClientRect(window_, &area);
+    animation_.reset(::CreateWindowExW(
+        0, ANIMATE_CLASSW, L"", WS_CHILD | WS_VISIBLE | ACS_CENTER | ACS_TRANSPARENT | ACS_AUTOPLAY,
+        0, 0, area.right, area.bottom, window_,
+        reinterpret_cast<HMENU>(static_cast<UINT_PTR>(IDC_VIEW_ANIMATION)), ThisModule(),
+        nullptr));
+    if (animation_) {
+        ::SetWindowPos(animation_.get(), HWND_TOP, 0, 0, 0, 0, SWP_NOMOVE | SWP_NOSIZE);
+        // Without its video the fill still runs; there is just nothing to watch.
+        ::SendMessageW(animation_.get(), ACM_OPENW, reinterpret_cast<WPARAM>(ThisModule()),
+                       reinterpret_cast<LPARAM>(MAKEINTRESOURCEW(IDR_SEARCH_ANIMATION)));
+    }
+
+    auto request = std::make_unique<FillRequest>(FillRequest{folder_, window_});
+    UniqueHandle thread(::CreateThread(nullptr, kFillThreadStackSize, &FillThread, request.get(),
+                                       STACK_SIZE_PARAM_IS_A_RESERVATION, nullptr));
+    if (!thread) {
+        // The list stays empty until the next refresh, as it would after a failed enumeration.
+        animation_.reset();
+        return;
+    }
+    request.release();  // the thread's now
+    fillThreads_.push_back(std::move(thread));
+}
+
+DWORD WINAPI CLVShellView::FillThread(void* parameter) {
+    std::unique_ptr<FillRequest> request(static_cast<FillRequest*>(parameter));
+    const HRESULT apartment = ::CoInitializeEx(nullptr, COINIT_MULTITHREADED);
+    IEnumIDList* enumerator = nullptr;
+    if (FAILED(request->folder->EnumObjects(request->window,
+                                            SHCONTF_FOLDERS | SHCONTF_NONFOLDERS, &enumerator)))
+        enumerator = nullptr;
+    // The window owns the enumerator once the message is posted; a window that is gone takes
+    // nothing, and the enumerator is released here.
+    if (!::PostMessageW(request->window, g_registeredMessages.getEnumIdList, 0,
+                        reinterpret_cast<LPARAM>(enumerator)) &&
+        enumerator)
+        enumerator->Release();
+    request.reset();
+    if (SUCCEEDED(apartment))
+        ::CoUninitialize();
+    return 0;
+}
+
+void CLVShellView::StopFillThreads() noexcept {
+    // Each thread ends after one enumeration of the registry and one post: waiting is short, and
+    // it keeps the module's code in place until the last thread has left it.
+    for (UniqueHandle& thread : fillThreads_)
+        ::WaitForSingleObject(thread.get(), INFINITE);
+    fillThreads_.clear();
+    if (!window_)
+        return;
+    // Results posted to a window about to go would be lost with their enumerators.
+    MSG message;
+    const UINT ready = g_registeredMessages.getEnumIdList;
+    while (ready && ::PeekMessageW(&message, window_, ready, ready, PM_REMOVE)) {
+        if (auto* enumerator = reinterpret_cast<IEnumIDList*>(message.lParam))
+            enumerator->Release();
+    }
+}
+
+void CLVShellView::OnEnumeratorReady(IEnumIDList* enumerator) {
+    Microsoft::WRL::ComPtr<IEnumIDList> owned;
+    *owned.GetAddressOf() = enumerator;  // the posted reference is ours now
+    animation_.reset();
+    // Finished threads need no more waiting for.
+    std::erase_if(fillThreads_, [](const UniqueHandle& thread) {
+        return ::WaitForSingleObject(thread.get(), 0) == WAIT_OBJECT_0;
+    });
+    const HCURSOR previousCursor = ::SetCursor(::LoadCursorW(nullptr, IDC_WAIT));
+    list_.Send(WM_SETREDRAW, FALSE);
+    // Each result shows the stations as they are now: a list from an older fill that arrives
+    // late replaces what is shown instead of adding to it.
+    list_.Send(LVM_DELETEALLITEMS);
+    int index = 0;
+    if (IsTopFolder()) {
+        std::wstring entry = LoadUiText(IDS_ADD_NEW_DIGITAL_LEVEL);
+        LVITEMW item{};
+        item.mask = LVIF_TEXT | LVIF_IMAGE | LVIF_PARAM;
+        item.iItem = index++;
+        item.pszText = entry.data();
+        item.iImage = 1;
+        item.lParam = 0;
+        list_.Send(LVM_INSERTITEMW, 0, reinterpret_cast<LPARAM>(&item));
+    }
+    if (owned) {
+        PITEMID_CHILD next = nullptr;
+        while (owned->Next(1, &next, nullptr) == S_OK) {
+            UniquePidl identifier(reinterpret_cast<LPITEMIDLIST>(next));
+            LVITEMW item{};
+            item.mask = LVIF_TEXT | LVIF_IMAGE | LVIF_PARAM;
+            item.iItem = index;
+            item.pszText = LPSTR_TEXTCALLBACKW;
+            item.iImage = I_IMAGECALLBACK;
+            item.lParam = reinterpret_cast<LPARAM>(identifier.get());
+            if (list_.Send(LVM_INSERTITEMW, 0, reinterpret_cast<LPARAM>(&item)) >= 0) {
+                (void)identifier.release();  // the list's item owns it; deleting it frees it
+                ++index;
+            }
+        }
+    }
+    Sort(0);
+    list_.Send(WM_SETREDRAW, TRUE);
+    ::InvalidateRect(list_.Window(), nullptr, TRUE);
+    ::SetCursor(previousCursor);
+}
+
+void CLVShellView::Sort(int columnArgument) {
+    SortContext context{folder_.Get(), columnArgument};
+    list_.Send(LVM_SORTITEMS, reinterpret_cast<WPARAM>(&context),
+               reinterpret_cast<LPARAM>(&CompareItems));
+}
+
+void CLVShellView::OnColumnClick(int column) {
+    if (column + 1 == g_sortColumn)
+        g_sortDirection = -g_sortDirection;
+    g_sortColumn = column + 1;
+    Sort(g_sortDirection * g_sortColumn);
+}
+
+void CLVShellView::ReadColumnWidths() noexcept {
+    // The list has one column; the second width is kept as the control reports it (0).
+    for (size_t column = 0; column < kDisplayColumnCount; ++column)
+        SetDisplayColumnWidth(column, static_cast<int>(list_.Send(LVM_GETCOLUMNWIDTH, column)));
+}
+
+void CLVShellView::OnGetDisplayInfo(NMLVDISPINFOW& info) {
+    const auto item = reinterpret_cast<PCUITEMID_CHILD>(info.item.lParam);
+    if (!item)
+        return;
+    if (info.item.mask & LVIF_TEXT) {
+        STRRET name{};
+        if (info.item.pszText && info.item.cchTextMax > 0 &&
+            SUCCEEDED(folder_->GetDisplayNameOf(item, SHGDN_NORMAL, &name)))
+            (void)::StrRetToBufW(&name, item, info.item.pszText, info.item.cchTextMax);
+    }
+    if (info.item.mask & LVIF_IMAGE) {
+        Microsoft::WRL::ComPtr<IExtractIconW> icon;
+        wchar_t location[MAX_PATH] = {};
+        int index = kRootIconIndex;
+        UINT flags = 0;
+        if (SUCCEEDED(folder_->GetUIObjectOf(window_, 1, &item, IID_IExtractIconW, nullptr,
+                                             reinterpret_cast<void**>(icon.GetAddressOf()))) &&
+            FAILED(icon->GetIconLocation(0, location, ARRAYSIZE(location), &index, &flags)))
+            index = kRootIconIndex;
+        info.item.iImage = index;
+    }
+}
+
+std::vector<CLVShellView::SelectedItem> CLVShellView::Selection() const {
+    std::vector<SelectedItem> selection;
+    if (!list_.Window())
+        return selection;
+    int index = -1;
+    while ((index = static_cast<int>(list_.Send(LVM_GETNEXTITEM, static_cast<WPARAM>(index),
+                                                LVNI_SELECTED))) >= 0) {
+        LVITEMW item{};
+        item.mask = LVIF_PARAM;
+        item.iItem = index;
+        if (list_.Send(LVM_GETITEMW, 0, reinterpret_cast<LPARAM>(&item)))
+            selection.push_back({index, reinterpret_cast<PCUITEMID_CHILD>(item.lParam)});
+    }
+    return selection;
+}
+
+LPITEMIDLIST CLVShellView::CreateFullItem(PCUITEMID_CHILD item) const {
+    return manager_.CreatePidlFromPath(
+        (folderPath_ + L'\\' + manager_.GetItemName(reinterpret_cast<LPCITEMIDLIST>(item)))
+            .c_str());
+}
+
+bool CLVShellView::IsTopFolder() const noexcept {
+    return folderKind_ == PT_ROOT;
+}
