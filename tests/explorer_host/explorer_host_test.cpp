@@ -1,0 +1,253 @@
+// The browser that hosts folder views: Wine's own file-system view in it, and the browser's side
+// of menu merging, status bar, navigation and keys through a view of the test's own (FakeView).
+#include <windows.h>
+#include <commctrl.h>
+#include <shlobj.h>
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <functional>
+#include <vector>
+
+#include "support/module_lock.h"
+#include "tests/explorer_host/fake_shell_view.h"
+#include "tools/lvexplore/explorer_window.h"
+
+using Microsoft::WRL::ComPtr;
+
+namespace {
+
+UniqueAbsoluteIdList Parse(const wchar_t* name) {
+    PIDLIST_ABSOLUTE list = nullptr;
+    EXPECT_EQ(S_OK, ::SHParseDisplayName(name, nullptr, &list, 0, nullptr)) << name;
+    return UniqueAbsoluteIdList(list);
+}
+
+RECT Bounds(HWND window) {
+    RECT bounds{};
+    ::GetWindowRect(window, &bounds);
+    return bounds;
+}
+
+class ExplorerHost : public ::testing::Test {
+protected:
+    void SetUp() override { ASSERT_TRUE(SUCCEEDED(::OleInitialize(nullptr))); }
+    void TearDown() override {
+        if (window_)
+            window_->Close();
+        window_.Reset();
+        view_.Reset();
+        ::OleUninitialize();
+        EXPECT_EQ(0, ModuleLockCount()) << "the browser or a view was kept alive";
+    }
+
+    void Open(ExplorerOptions options = {}) {
+        if (window_)
+            window_->Close();
+        options.visible = false;
+        ASSERT_EQ(S_OK, CExplorerWindow::Create(options, window_));
+    }
+    void OpenOnFakeView(const wchar_t* place, const ExplorerOptions& options = {}) {
+        Open(options);
+        view_ = MakeComObject<FakeView>();
+        ASSERT_EQ(S_OK, window_->BrowseToView(view_.Get(), Parse(place).get()));
+    }
+    IShellBrowser* Browser() const { return window_.Get(); }
+    HMENU Popup(HMENU menu, UINT id) const {
+        MENUITEMINFOW item{};
+        item.cbSize = sizeof(item);
+        item.fMask = MIIM_SUBMENU;
+        return ::GetMenuItemInfoW(menu, id, FALSE, &item) ? item.hSubMenu : nullptr;
+    }
+    bool IsAt(const wchar_t* place) const {
+        return ::ILIsEqual(window_->CurrentFolder(), Parse(place).get());
+    }
+    std::wstring Place() const {
+        return ShellItemName(window_->CurrentFolder(), SIGDN_DESKTOPABSOLUTEPARSING);
+    }
+
+    ComPtr<CExplorerWindow> window_;
+    ComPtr<FakeView> view_;
+};
+
+TEST_F(ExplorerHost, WineFileSystemView_IsAChildOfTheFrameBetweenToolbarAndStatusBar) {
+    Open();
+    ASSERT_EQ(S_OK, window_->BrowseToParsingName(L"C:\\windows"));
+    ASSERT_NE(nullptr, window_->View());
+    HWND fromView = nullptr;
+    EXPECT_EQ(S_OK, window_->View()->GetWindow(&fromView));
+    EXPECT_EQ(window_->ViewWindow(), fromView);
+    EXPECT_EQ(window_->Window(), ::GetParent(window_->ViewWindow()));
+    EXPECT_GE(Bounds(window_->ViewWindow()).top, Bounds(window_->Toolbar()).bottom);
+    EXPECT_LE(Bounds(window_->ViewWindow()).bottom, Bounds(window_->StatusBar()).top);
+}
+
+TEST_F(ExplorerHost, FirstView_GetsTheViewModeOfTheOptions) {
+    OpenOnFakeView(L"C:\\", {.viewMode = FVM_DETAILS});
+    EXPECT_EQ(static_cast<UINT>(FVM_DETAILS), view_->viewMode);
+}
+
+TEST_F(ExplorerHost, BrowseToParsingName_ReportsAnUnknownNameAsAParseFailure) {
+    Open();
+    EXPECT_FALSE(SUCCEEDED(window_->BrowseToParsingName(L"C:\\no such folder")));
+    EXPECT_EQ(BrowseStep::Parse, window_->FailedStep());
+    EXPECT_EQ(nullptr, window_->View());
+}
+
+TEST_F(ExplorerHost, MergedMenu_HoldsTheBrowserPopupsUnderTheirShellIds) {
+    OpenOnFakeView(L"C:\\");
+    ASSERT_EQ(view_->menu, window_->MenuBar());
+    for (UINT id : {FCIDM_MENU_FILE, FCIDM_MENU_EDIT, FCIDM_MENU_VIEW})
+        EXPECT_NE(nullptr, Popup(window_->MenuBar(), id)) << std::hex << id;
+    MENUITEMINFOW options{};
+    options.cbSize = sizeof(options);
+    options.fMask = MIIM_FTYPE;
+    HMENU view = Popup(window_->MenuBar(), FCIDM_MENU_VIEW);
+    ASSERT_TRUE(::GetMenuItemInfoW(view, FCIDM_MENU_VIEW_SEP_OPTIONS, FALSE, &options));
+    EXPECT_TRUE(options.fType & MFT_SEPARATOR);
+    const LONG expected[6] = {2, 0, 1, 0, 0, 0};  // File and Edit; View
+    EXPECT_TRUE(std::equal(expected, expected + 6, view_->widths.width));
+}
+
+TEST_F(ExplorerHost, RemoveMenusSB_TakesThePopupsOutAliveAndPutsTheBrowsersMenuBack) {
+    OpenOnFakeView(L"C:\\");
+    HMENU shared = window_->MenuBar();
+    const HMENU popups[] = {Popup(shared, FCIDM_MENU_FILE), Popup(shared, FCIDM_MENU_EDIT),
+                            Popup(shared, FCIDM_MENU_VIEW)};
+    EXPECT_EQ(S_OK, Browser()->RemoveMenusSB(shared));
+    EXPECT_EQ(0, ::GetMenuItemCount(shared));
+    for (HMENU popup : popups)
+        EXPECT_TRUE(::IsMenu(popup));
+    EXPECT_NE(shared, window_->MenuBar());
+    EXPECT_NE(nullptr, Popup(window_->MenuBar(), FCIDM_MENU_FILE));
+}
+
+TEST_F(ExplorerHost, MenuCommand_OfAMergedItemGoesToTheViewWindow) {
+    OpenOnFakeView(L"C:\\");
+    ASSERT_NE(-1, static_cast<int>(::GetMenuState(window_->MenuBar(), kViewCommand, MF_BYCOMMAND)));
+    ::SendMessageW(window_->Window(), WM_COMMAND, MAKEWPARAM(kViewCommand, 0), 0);  // as the menu
+    EXPECT_EQ(std::vector<UINT>{kViewCommand}, view_->commands);
+}
+
+TEST_F(ExplorerHost, MenuCommand_OfTheBrowserStaysWithTheBrowser) {
+    OpenOnFakeView(L"C:\\");
+    ::SendMessageW(window_->Window(), WM_COMMAND, MAKEWPARAM(kCommandRefresh, 0), 0);
+    EXPECT_TRUE(view_->commands.empty());
+    EXPECT_EQ(1, view_->refreshes);
+}
+
+TEST_F(ExplorerHost, StatusBar_ShowsWhatTheViewSendsAndAnswersIt) {
+    OpenOnFakeView(L"C:\\");
+    EXPECT_EQ(L"Fake status", window_->StatusText(0));
+    int edges[] = {100, -1};
+    LRESULT result = 0;
+    EXPECT_EQ(S_OK, Browser()->SendControlMsg(FCW_STATUS, SB_SETPARTS, 2,
+                                              reinterpret_cast<LPARAM>(edges), &result));
+    EXPECT_TRUE(result);
+    EXPECT_EQ(2, window_->StatusPartCount());
+    EXPECT_EQ(S_OK, Browser()->SetStatusTextSB(L"Part one"));
+    EXPECT_EQ(L"Part one", window_->StatusText(0));
+}
+
+TEST_F(ExplorerHost, GetControlWindow_GivesStatusBarAndToolbarOnly) {
+    Open();
+    const struct {
+        UINT id;
+        HRESULT result;
+        HWND window;
+    } cases[] = {{FCW_STATUS, S_OK, window_->StatusBar()},
+                 {FCW_TOOLBAR, S_OK, window_->Toolbar()},
+                 {FCW_TREE, E_FAIL, nullptr}};
+    for (const auto& entry : cases) {
+        HWND window = reinterpret_cast<HWND>(1);
+        EXPECT_EQ(entry.result, Browser()->GetControlWindow(entry.id, &window)) << entry.id;
+        EXPECT_EQ(entry.window, window) << entry.id;
+    }
+}
+
+TEST_F(ExplorerHost, MenusNotImplemented_AnswersENotImplAsWinesBrowsersDo) {
+    ExplorerOptions options;
+    options.menusNotImplemented = true;
+    OpenOnFakeView(L"C:\\", options);
+    HWND control = nullptr;
+    OLEMENUGROUPWIDTHS widths{};
+    const std::function<HRESULT(IShellBrowser*)> calls[] = {
+        [&](IShellBrowser* b) { return b->InsertMenusSB(view_->menu, &widths); },
+        [&](IShellBrowser* b) { return b->SetMenuSB(view_->menu, nullptr, nullptr); },
+        [&](IShellBrowser* b) { return b->RemoveMenusSB(view_->menu); },
+        [](IShellBrowser* b) { return b->SetStatusTextSB(L"text"); },
+        [](IShellBrowser* b) { return b->SendControlMsg(FCW_STATUS, SB_SETTEXTW, 0, 0, nullptr); },
+        [&](IShellBrowser* b) { return b->GetControlWindow(FCW_STATUS, &control); }};
+    for (const auto& call : calls)
+        EXPECT_EQ(E_NOTIMPL, call(Browser()));
+    EXPECT_NE(view_->menu, window_->MenuBar());
+    EXPECT_EQ(L"", window_->StatusText(0));
+}
+
+TEST_F(ExplorerHost, CommonDialogMode_AnswersICommDlgBrowserAndCountsDefaultCommands) {
+    for (bool commonDialog : {false, true}) {
+        ExplorerOptions options;
+        options.commonDialog = commonDialog;
+        Open(options);
+        ComPtr<ICommDlgBrowser> dialog;
+        EXPECT_EQ(commonDialog ? S_OK : E_NOINTERFACE,
+                  Browser()->QueryInterface(IID_PPV_ARGS(&dialog)));
+    }
+    ComPtr<ICommDlgBrowser> dialog;
+    ASSERT_EQ(S_OK, Browser()->QueryInterface(IID_PPV_ARGS(&dialog)));
+    EXPECT_EQ(S_OK, dialog->OnDefaultCommand(nullptr));
+    EXPECT_EQ(S_OK, dialog->OnDefaultCommand(nullptr));
+    EXPECT_EQ(2, window_->DefaultCommandCount());
+}
+
+TEST_F(ExplorerHost, BrowseObject_FollowsRelativeParentAndBackRequests) {
+    Open();
+    ASSERT_EQ(S_OK, window_->BrowseToParsingName(L"C:\\windows"));
+    const UniqueAbsoluteIdList system32 = Parse(L"C:\\windows\\system32");
+    const struct {
+        PCUIDLIST_RELATIVE list;
+        UINT flags;
+        const wchar_t* place;
+    } steps[] = {{::ILFindLastID(system32.get()), SBSP_RELATIVE, L"C:\\windows\\system32"},
+                 {nullptr, SBSP_PARENT, L"C:\\windows"},
+                 {nullptr, SBSP_NAVIGATEBACK, L"C:\\windows\\system32"}};
+    for (const auto& step : steps) {
+        EXPECT_EQ(S_OK, Browser()->BrowseObject(step.list, step.flags)) << std::hex << step.flags;
+        EXPECT_TRUE(IsAt(step.place)) << Place();
+    }
+    EXPECT_EQ(3, window_->BrowseRequestCount());
+}
+
+TEST_F(ExplorerHost, BrowsingAway_DeactivatesAndDestroysTheOldView) {
+    OpenOnFakeView(L"C:\\");
+    HWND oldWindow = window_->ViewWindow();
+    ASSERT_EQ(S_OK, window_->BrowseToParsingName(L"C:\\windows"));
+    EXPECT_EQ(static_cast<UINT>(SVUIA_DEACTIVATE), view_->state);
+    EXPECT_FALSE(::IsWindow(oldWindow));
+}
+
+TEST_F(ExplorerHost, GoBackAndGoUp_AreFalseWithNowhereToGo) {
+    Open();
+    EXPECT_FALSE(window_->GoBack());
+    EXPECT_FALSE(window_->GoUp());
+}
+
+TEST_F(ExplorerHost, FrameKeys_ActOnlyWhenTheViewLeavesThem) {
+    const struct {
+        WPARAM key;
+        bool viewTakesIt;
+    } cases[] = {{VK_BACK, false}, {VK_BACK, true}, {VK_F5, false}, {VK_F5, true}};
+    for (const auto& entry : cases) {
+        SCOPED_TRACE(testing::Message()
+                     << "key " << entry.key << ", view takes it " << entry.viewTakesIt);
+        OpenOnFakeView(L"C:\\windows");
+        view_->keyTaken = entry.viewTakesIt ? entry.key : 0;
+        MSG key{window_->ViewWindow(), WM_KEYDOWN, entry.key, 1, 0, {}};
+        EXPECT_TRUE(window_->TranslateThroughView(key));
+        const bool frameActed = view_->refreshes > 0 || !IsAt(L"C:\\windows");
+        EXPECT_EQ(!entry.viewTakesIt, frameActed) << Place();
+    }
+}
+
+}  // namespace

@@ -1,0 +1,169 @@
+// The view's list in a browser: what the fill shows, the view modes and the details column, the
+// column click, the status text, the selection's objects and the shell's command groups.
+#include "tests/view/view_fixture.h"
+
+#include "stations/display_settings.h"
+#include "stations/station_list_block.h"
+
+namespace {
+
+constexpr wchar_t kEntry[] = L"Add New Digital Level";
+
+int ImageOf(HWND list, int index) {
+    LVITEMW item{};
+    item.mask = LVIF_IMAGE;
+    item.iItem = index;
+    ListView_GetItem(list, &item);
+    return item.iImage;
+}
+
+TEST_F(ShellViewTest, TopFolderListsTheEntryFirstThenStationsInNameOrder) {
+    // With no stations the entry stands alone.
+    EXPECT_EQ(std::vector<std::wstring>{kEntry}, Texts(Open()));
+    for (const wchar_t* name : {L"bravo", L"Alpha", L"charlie"})
+        AddStationOfModel(name);
+    CExplorerWindow& browser = Open();
+    EXPECT_EQ((std::vector<std::wstring>{kEntry, L"Alpha", L"bravo", L"charlie"}), Texts(browser));
+    EXPECT_EQ(kRootIconIndex, ImageOf(List(browser), 0));
+    EXPECT_EQ(kStationIconIndex, ImageOf(List(browser), 1));
+}
+
+TEST_F(ShellViewTest, StationFolderListsItsOneFileNamedByTheModel) {
+    const struct {
+        UINT model;
+        const wchar_t* file;
+    } cases[] = {{IDS_MODEL_LV10, L"file1.lv"}, {IDS_MODEL_LV20, L"file1.hvr"},
+                 {IDS_MODEL_LV30, L"file1.hvr"}};
+    for (const auto& c : cases) {
+        const std::wstring station = L"S" + std::to_wstring(c.model);
+        AddStationOfModel(station, c.model);
+        CExplorerWindow& browser = Open(station);
+        EXPECT_EQ(std::vector<std::wstring>{c.file}, Texts(browser)) << station;
+        EXPECT_EQ(kFileIconIndex, ImageOf(List(browser), 0));
+    }
+}
+
+TEST_F(ShellViewTest, ViewModesSetTheListStyleAndDetailsShowsOneNameColumnAtTheStoredWidth) {
+    SetDisplayColumnWidth(0, 100);
+    CExplorerWindow& browser = Open();
+    const HWND list = List(browser);
+    const struct {
+        DWORD command;
+        DWORD style;
+    } modes[] = {{1284, LVS_SMALLICON}, {1285, LVS_LIST}, {1286, LVS_REPORT}, {1283, LVS_ICON}};
+    for (const auto& mode : modes) {
+        EXPECT_EQ(S_OK, Command(browser, mode.command));
+        EXPECT_EQ(mode.style, ::GetWindowLongW(list, GWL_STYLE) & LVS_TYPEMASK) << mode.command;
+        FOLDERSETTINGS settings{};
+        EXPECT_EQ(S_OK, browser.View()->GetCurrentInfo(&settings));
+        EXPECT_EQ(mode.command - 1282, settings.ViewMode);
+        EXPECT_EQ(std::vector<std::wstring>{kEntry}, Texts(browser));
+    }
+    EXPECT_EQ(S_OK, Command(browser, 1286));
+    const HWND header = ListView_GetHeader(list);
+    ASSERT_EQ(1, Header_GetItemCount(header));
+    wchar_t text[32] = {};
+    LVCOLUMNW column{};
+    column.mask = LVCF_TEXT;
+    column.pszText = text;
+    column.cchTextMax = 32;
+    ASSERT_TRUE(ListView_GetColumn(list, 0, &column));
+    EXPECT_STREQ(L"Name", text);
+    EXPECT_EQ(100, ListView_GetColumnWidth(list, 0));
+
+    // The end of a column drag stores both widths as the list has them; the second column does
+    // not exist and reads as 0.
+    ListView_SetColumnWidth(list, 0, 180);
+    NMHEADERW drag{};
+    drag.hdr = NMHDR{header, 0, static_cast<UINT>(HDN_ENDTRACKW)};
+    ::SendMessageW(browser.ViewWindow(), WM_NOTIFY, 0, reinterpret_cast<LPARAM>(&drag));
+    browser.PumpMessages(50);
+    EXPECT_EQ(180, DisplayColumnWidth(0));
+    EXPECT_EQ(0, DisplayColumnWidth(1));
+    // A later details view starts at the stored width.
+    EXPECT_EQ(180, ListView_GetColumnWidth(List(Open(L"", Details())), 0));
+    SetDisplayColumnWidth(0, 100);
+}
+
+TEST_F(ShellViewTest, TheFirstClickOnNameSortsDescendingAndTheNextAscending) {
+    for (const wchar_t* name : {L"b", L"A", L"c"})
+        AddStationOfModel(name);
+    CExplorerWindow& browser = Open(L"", Details());
+    NotifyFromList(browser, LVN_COLUMNCLICK, -1, 0);
+    EXPECT_EQ((std::vector<std::wstring>{kEntry, L"c", L"b", L"A"}), Texts(browser));
+    NotifyFromList(browser, LVN_COLUMNCLICK, -1, 0);
+    EXPECT_EQ((std::vector<std::wstring>{kEntry, L"A", L"b", L"c"}), Texts(browser));
+}
+
+TEST_F(ShellViewTest, TheStatusBarNamesTheFolderInOnePart) {
+    AddStationOfModel(L"North");
+    CExplorerWindow& top = Open();
+    EXPECT_EQ(1, top.StatusPartCount());
+    // The top folder's own name is its root item's.
+    EXPECT_EQ(L"Quorvel Digital Levels: Quorvel Digital Level", top.StatusText());
+    EXPECT_EQ(L"Quorvel Digital Levels: North", Open(L"North").StatusText());
+}
+
+TEST_F(ShellViewTest, GetItemObjectAnswersForTheFirstSelectedItemOnly) {
+    AddStationOfModel(L"A");
+    AddStationOfModel(L"B");
+    CExplorerWindow& browser = Open();
+    ComPtr<IDataObject> object;
+    EXPECT_EQ(E_INVALIDARG,
+              browser.View()->GetItemObject(SVGIO_SELECTION, IID_PPV_ARGS(&object)));
+    Select(browser, {2, 1});
+    EXPECT_EQ(E_NOINTERFACE, browser.View()->GetItemObject(SVGIO_ALLVIEW, IID_PPV_ARGS(&object)));
+    ASSERT_EQ(S_OK, browser.View()->GetItemObject(SVGIO_SELECTION, IID_PPV_ARGS(&object)));
+    // The object carries the station of list index 1, the first selected from the top.
+    FORMATETC format{static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(L"Quorvel Total Stations")),
+                     nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
+    STGMEDIUM medium{};
+    ASSERT_EQ(S_OK, object->GetData(&format, &medium));
+    std::vector<Station> stations;
+    EXPECT_EQ(S_OK, ParseStationList(medium.hGlobal, stations));
+    ::ReleaseStgMedium(&medium);
+    ASSERT_EQ(1u, stations.size());
+    EXPECT_EQ(L"A", stations[0].Name);
+}
+
+TEST_F(ShellViewTest, TheCommandTargetAnswersTheShellsTwoGroupsOnly) {
+    CExplorerWindow& browser = Open();
+    ComPtr<IOleCommandTarget> target;
+    ASSERT_EQ(S_OK, browser.View()->QueryInterface(IID_PPV_ARGS(&target)));
+    OLECMD commands[] = {{1286, 0}, {4711, 0}};
+    for (const GUID* group : {&CGID_Explorer, &CGID_ShellDocView}) {
+        EXPECT_EQ(S_OK, target->QueryStatus(group, 2, commands, nullptr));
+        EXPECT_EQ(static_cast<DWORD>(OLECMDF_SUPPORTED | OLECMDF_ENABLED), commands[0].cmdf);
+        EXPECT_EQ(0u, commands[1].cmdf);
+    }
+    const GUID unknown = {0x12345678, 0x1234, 0x1234, {1, 2, 3, 4, 5, 6, 7, 8}};
+    EXPECT_EQ(OLECMDERR_E_UNKNOWNGROUP, target->QueryStatus(&unknown, 2, commands, nullptr));
+    EXPECT_EQ(E_POINTER, target->QueryStatus(&CGID_Explorer, 2, nullptr, nullptr));
+    EXPECT_EQ(OLECMDERR_E_UNKNOWNGROUP, target->Exec(&unknown, 1286, 0, nullptr, nullptr));
+    EXPECT_EQ(LVS_ICON, ::GetWindowLongW(List(browser), GWL_STYLE) & LVS_TYPEMASK);
+    EXPECT_EQ(S_OK, target->Exec(&CGID_ShellDocView, 1286, 0, nullptr, nullptr));
+    EXPECT_EQ(LVS_REPORT, ::GetWindowLongW(List(browser), GWL_STYLE) & LVS_TYPEMASK);
+}
+
+TEST_F(ShellViewTest, TranslateAcceleratorSaysNotHandledWhileCtrlCCopies) {
+    AddStationOfModel(L"North");
+    CExplorerWindow& browser = Open();
+    Select(browser, {1});
+    BYTE keys[256] = {};
+    ASSERT_TRUE(::GetKeyboardState(keys));
+    keys[VK_CONTROL] = 0x80;
+    ASSERT_TRUE(::SetKeyboardState(keys));
+    MSG message{};
+    message.hwnd = List(browser);
+    message.message = WM_KEYDOWN;
+    message.wParam = 'C';
+    message.lParam = 0x002E0001;
+    EXPECT_EQ(S_FALSE, browser.View()->TranslateAccelerator(&message));
+    keys[VK_CONTROL] = 0;
+    ASSERT_TRUE(::SetKeyboardState(keys));
+    browser.PumpMessages(50);
+    const UINT format = ::RegisterClipboardFormatW(L"Quorvel Total Stations");
+    EXPECT_TRUE(::IsClipboardFormatAvailable(format));
+}
+
+}  // namespace
