@@ -13,29 +13,23 @@ using Microsoft::WRL::ComPtr;
 
 namespace {
 
-class TwoInterfaces final : public ComObject<IPersist, IOleWindow> {
+class Persist final : public ComObject<IPersist> {
 public:
     IFACEMETHODIMP QueryInterface(REFIID iid, void** object) override {
-        static const QITAB table[] = {
-            QITABENT(TwoInterfaces, IPersist), QITABENT(TwoInterfaces, IOleWindow), {}};
+        static const QITAB table[] = {QITABENT(Persist, IPersist), {}};
         return QISearch(this, table, iid, object);
     }
     IFACEMETHODIMP GetClassID(CLSID* id) override {
         *id = IID_IPersist;
         return S_OK;
     }
-    IFACEMETHODIMP GetWindow(HWND* window) override {
-        *window = nullptr;
-        return E_FAIL;
-    }
-    IFACEMETHODIMP ContextSensitiveHelp(BOOL) override { return E_NOTIMPL; }
 };
 
 }  // namespace
 
 TEST(ClassFactory, OnlyClientsAndLockServerHoldTheModule) {
     const LONG before = ModuleLockCount();
-    auto factory = MakeComObject<ClassFactory>(&CreateComInstance<TwoInterfaces>);
+    auto factory = MakeComObject<ClassFactory>(&CreateComInstance<Persist>);
     EXPECT_EQ(before, ModuleLockCount()) << "the cache's own reference must not hold the module";
     {
         ComPtr<IClassFactory> client = factory;
@@ -52,7 +46,7 @@ TEST(ClassFactory, OnlyClientsAndLockServerHoldTheModule) {
 
 TEST(ClassFactory, CreatesAndReleasesWhatItRefuses) {
     const LONG before = ModuleLockCount();
-    auto factory = MakeComObject<ClassFactory>(&CreateComInstance<TwoInterfaces>);
+    auto factory = MakeComObject<ClassFactory>(&CreateComInstance<Persist>);
     ComPtr<IPersist> persist;
     ASSERT_EQ(S_OK, factory->CreateInstance(nullptr, IID_PPV_ARGS(&persist)));
     CLSID id{};

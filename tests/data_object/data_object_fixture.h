@@ -18,6 +18,7 @@
 #include "support/registered_messages.h"
 #include "support/unique_resource.h"
 #include "support/user_interface.h"
+#include "tests/stations/station_builders.h"
 #include "tests/support/registry_override.h"
 #include "view/lv_data_object.h"
 
@@ -69,22 +70,14 @@ protected:
     void SetUp() override {
         ASSERT_TRUE(SUCCEEDED(::OleInitialize(nullptr)));
         RegisterWindowMessages();  // the progress dialogs' messages
-        AddStationNamed(L"North", L"Quorvel LV-10");
-        AddStationNamed(L"South", L"Quorvel LV-30");
-        AddStationNamed(L"East", L"Quorvel LV-10");
+        AddStationOfModel(L"North");
+        AddStationOfModel(L"South", IDS_MODEL_LV30);
+        AddStationOfModel(L"East");
     }
 
     void TearDown() override {
         ::OleUninitialize();
         EXPECT_EQ(0, ModuleLockCount()) << "a reference was leaked";
-    }
-
-    void AddStationNamed(const std::wstring& name, const std::wstring& model) {
-        Station station = DefaultStation();
-        station.Name = name;
-        station.Model = model;
-        station.Port = L"COM" + std::to_wstring(name.size());
-        ASSERT_EQ(S_OK, AddStation(station));
     }
 
     // A data object over items given by their paths inside the namespace.
@@ -118,7 +111,7 @@ protected:
         return stations;
     }
 
-    // The local machine too: an empty serial-port list leaves the stored ports as they are.
+    // The local machine too: the prefix's serial ports would replace the stored ones.
     RegistryOverride registry_{RegistryOverride::Hives::CurrentUserAndLocalMachine};
     CPidlMgr manager_;
 };

@@ -174,7 +174,6 @@ TEST_F(DataObject, StationListOnTheOleClipboardCarriesTheLoadableStations) {
     ASSERT_EQ(2u, stations.size());
     EXPECT_EQ(L"South", stations[0].Name);
     EXPECT_EQ(L"Quorvel LV-30", stations[0].Model);
-    EXPECT_EQ(L"COM5", stations[0].Port);
     EXPECT_EQ(L"North", stations[1].Name);
 
     EXPECT_TRUE(StationsIn(Over({}).Get()).empty());

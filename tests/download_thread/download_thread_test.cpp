@@ -8,8 +8,6 @@
 
 #include "support/registered_messages.h"
 #include "support/text_lookup.h"
-#include "support/user_interface.h"
-#include "tests/support/recording_user_interface.h"
 
 namespace {
 
@@ -76,26 +74,6 @@ TEST_F(DownloadThread, ConnectionRecordAlwaysUsesSevenDataBitsOneStopBitSelector
     EXPECT_FALSE(thread.IsCancelled());
     thread.Stop();
     EXPECT_TRUE(thread.IsCancelled()) << "cancel is the stop request";
-}
-
-TEST_F(DownloadThread, MissingPortReportsCodeFiftyThenClosesTheWindow) {
-    RecordingUserInterface boxes;
-    ScopedUserInterface seam(boxes);
-    CLVDownloadThread thread(window_, station_, L"C:\\out.lv");
-    EXPECT_FALSE(thread.HasDriver());
-    ASSERT_NE(thread.Start(), nullptr);
-    // The state turns finished just before the thread's own end: poll the exit code.
-    for (int tries = 0; tries < 500 && thread.GetExitCode() == STILL_ACTIVE; ++tries)
-        ::Sleep(10);
-    EXPECT_EQ(thread.GetStatus(), CThread::kFinished);
-    EXPECT_EQ(thread.GetExitCode(), 0u);
-    const std::vector<Received> received = Pump();
-    ASSERT_EQ(received.size(), 2u);
-    EXPECT_EQ(received[0].code, 50u);
-    EXPECT_EQ(received[0].text, L"Can not open COM port. Port is already open by another program");
-    EXPECT_EQ(received[1].message, static_cast<UINT>(WM_CLOSE));
-    // Only a failed receive shows the time-out box; no driver is not a receive.
-    EXPECT_TRUE(boxes.MessageBoxes().empty());
 }
 
 TEST_F(DownloadThread, ProgressPostsPercentTextsAndNothingAtZero) {

@@ -88,6 +88,8 @@ TEST(ListPath, JoinsNamesWithoutOuterSeparatorsAndCountsTheNeededCapacity) {
     EXPECT_EQ(WIDE_TEXT("Quorvel Digital Level\\Station 1\\file1.lv"), PathOf(list, 260, &count));
     EXPECT_EQ(40u, count);
     EXPECT_EQ(42u, BuildListPath(list.data(), nullptr, 0)) << "every name and separator";
+    EXPECT_EQ(WIDE_TEXT("Quorvel Digital Level\\Station 1"), PathOf(list, 32, &count));
+    EXPECT_EQ(32u, count) << "a buffer that cuts the path counts the names it took";
     EXPECT_EQ(0u, BuildListPath(nullptr, nullptr, 0));
     EXPECT_EQ(WIDE_TEXT(""), PathOf({0, 0}, 260, &count));
     EXPECT_EQ(0u, count);
@@ -103,8 +105,12 @@ TEST(ListPath, SmallBufferIsNeverOverrun) {
                   std::vector<WideChar>(buffer.begin() + capacity, buffer.end()))
             << "capacity " << capacity;
     }
-    // Ten characters hold nine and the terminator.
-    EXPECT_EQ(WIDE_TEXT("Quorvel D"), PathOf(list, 10));
+    // Without a buffer: the names, the separator and the terminator.
+    EXPECT_EQ(26u, BuildListPath(list.data(), nullptr, 0));
+    // Ten characters hold nine and the terminator; the count is of the names taken.
+    size_t count = 0;
+    EXPECT_EQ(WIDE_TEXT("Quorvel D"), PathOf(list, 10, &count));
+    EXPECT_EQ(22u, count);
 }
 
 TEST(ItemComparison, ScalesByTheColumnArgumentWithDefinedArithmeticForShellBits) {

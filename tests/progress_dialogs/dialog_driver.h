@@ -61,10 +61,11 @@ inline BOOL CALLBACK FindVisibleDialog(HWND window, LPARAM found) {
     return FALSE;
 }
 
-// Runs the dialog modally on this thread while script drives its window from another. The run
-// fails when the dialog does not appear within ten seconds, or is still open 30 seconds after
-// the script ended (it is closed then).
-inline INT_PTR RunDialog(CModalDialog& dialog, const std::function<void(HWND)>& script) {
+// Runs the dialog (or property sheet) modally on this thread while script drives its window from
+// another. The run fails when the dialog does not appear within ten seconds, or is still open 30
+// seconds after the script ended (it is closed then).
+template <typename Dialog>
+INT_PTR RunDialog(Dialog& dialog, const std::function<void(HWND)>& script) {
     std::thread user([&script, dialogThread = ::GetCurrentThreadId()] {
         HWND window = nullptr;
         const auto found = [&] {

@@ -4,12 +4,11 @@
 #include "download/download_progress_dialog.h"
 
 #include <optional>
-#include <thread>
 
 #include "res/resource.h"
 #include "support/text_lookup.h"
 #include "tests/progress_dialogs/dialog_driver.h"
-#include "tools/lvsim/instrument_simulator.h"
+#include "tests/serial/instrument.h"
 
 namespace {
 
@@ -17,61 +16,6 @@ namespace {
 constexpr wchar_t kDialogPort[] = L"\\\\.\\COM40";      // the receiving end of the virtual cable
 constexpr wchar_t kInstrumentPort[] = L"\\\\.\\COM41";  // the simulator's end
 constexpr wchar_t kMissingPort[] = L"COM49";            // never created
-
-// The simulator on its own thread, playing the instrument on the other end of the cable.
-class Instrument {
-public:
-    // The instrument repeats an unanswered line every half second, maxResends times: long
-    // enough for the receiver to start, short enough to give up soon after a cancel.
-    Instrument(uint32_t baudRate, uint32_t lineCount, uint32_t maxResends)
-        : lines_(GenerateSurveyLines(lineCount, 60)) {
-        options_.BaudRate = baudRate;
-        options_.AnswerTimeoutMs = 500;
-        options_.MaxResends = maxResends;
-    }
-    ~Instrument() { Finish(); }
-    bool Open() {
-        DCB dcb{};
-        dcb.DCBlength = sizeof dcb;
-        dcb.BaudRate = options_.BaudRate;
-        dcb.ByteSize = 7;
-        dcb.Parity = EVENPARITY;
-        dcb.StopBits = ONESTOPBIT;
-        dcb.fBinary = TRUE;
-        COMMTIMEOUTS timeouts{};
-        timeouts.ReadIntervalTimeout = 20;
-        timeouts.ReadTotalTimeoutConstant = 100;
-        timeouts.WriteTotalTimeoutConstant = 1000;
-        return port_.Open(kInstrumentPort, dcb, timeouts) == ERROR_SUCCESS;
-    }
-    void Play() {
-        thread_ = std::thread([this] {
-            port_.Purge(true, true);
-            result_ = InstrumentSimulator(port_, options_).SendLines(lines_);
-            port_.Close();
-        });
-    }
-    // 0 when the receiver acknowledged every line.
-    int Finish() {
-        if (thread_.joinable())
-            thread_.join();
-        return result_;
-    }
-    // The file the receiver must write: every line as it went over the wire.
-    std::string ExpectedFile() const {
-        std::string file = "A,01,Z\r\n";
-        for (const std::string& line : lines_)
-            file += WithCheckCharacter(line);
-        return file + "Z,&,\r\n";
-    }
-
-private:
-    std::vector<std::string> lines_;
-    SimulatorOptions options_;
-    Win32SerialPort port_;
-    std::thread thread_;
-    int result_ = -1;
-};
 
 class DownloadDialog : public DialogTest {
 protected:
@@ -93,25 +37,6 @@ protected:
 };
 
 }  // namespace
-
-TEST_F(DownloadDialog, ShowsInstructionsNameAndWaitsForStart) {
-    CDownloadProgressDialog dialog(nullptr, station_, output_.wstring());
-    const INT_PTR result = RunDialog(dialog, [](HWND window) {
-        EXPECT_EQ(Text(window), L"Download file from Digital Level");
-        EXPECT_EQ(Text(window, IDC_INSTRUCTIONS), LoadUiText(IDS_INSTRUCTIONS_LV10));
-        EXPECT_EQ(Text(window, IDC_STATION_NAME), L"Site 4 level");
-        EXPECT_EQ(Text(window, IDC_STATUS_TEXT), L"Waiting for start...");
-        EXPECT_TRUE(IsEnabled(window, IDC_START));
-        // A progress message without a text, or with an empty one, leaves the status as it is.
-        static const wchar_t empty[] = L"";
-        for (LPARAM text : {LPARAM{0}, reinterpret_cast<LPARAM>(empty)})
-            ::SendMessageW(window, g_registeredMessages.downloadThreadMessage, 1, text);
-        EXPECT_EQ(Text(window, IDC_STATUS_TEXT), L"Waiting for start...");
-        Press(window, IDCANCEL);
-    });
-    EXPECT_EQ(result, IDCANCEL);
-    EXPECT_TRUE(user_.MessageBoxes().empty());
-}
 
 TEST_F(DownloadDialog, AStrayOkBeforeStartIsIgnoredAndTextsQueuedAtCloseAreFreed) {
     CDownloadProgressDialog dialog(nullptr, station_, output_.wstring());
@@ -137,16 +62,28 @@ TEST_F(DownloadDialog, AStrayOkBeforeStartIsIgnoredAndTextsQueuedAtCloseAreFreed
     EXPECT_EQ(CLVDownloadThread::LiveMessageTexts(), 0) << "every text was freed";
 }
 
-TEST_F(DownloadDialog, MissingPortShowsItsTextAndTheDialogCloses) {
+TEST_F(DownloadDialog, ShowsItsTextsUntilStartWhenAMissingPortShowsItsBoxAndTheDialogCloses) {
     station_.Port = kMissingPort;
     CDownloadProgressDialog dialog(nullptr, station_, output_.wstring());
-    EXPECT_EQ(RunDialog(dialog, [](HWND window) { Press(window, IDC_START); }), IDCANCEL);
+    const INT_PTR result = RunDialog(dialog, [](HWND window) {
+        EXPECT_EQ(Text(window), L"Download file from Digital Level");
+        EXPECT_EQ(Text(window, IDC_INSTRUCTIONS), LoadUiText(IDS_INSTRUCTIONS_LV10));
+        EXPECT_EQ(Text(window, IDC_STATION_NAME), L"Site 4 level");
+        EXPECT_EQ(Text(window, IDC_STATUS_TEXT), L"Waiting for start...");
+        // A progress message without a text, or with an empty one, leaves the status as it is.
+        static const wchar_t empty[] = L"";
+        for (LPARAM text : {LPARAM{0}, reinterpret_cast<LPARAM>(empty)})
+            ::SendMessageW(window, g_registeredMessages.downloadThreadMessage, 1, text);
+        EXPECT_EQ(Text(window, IDC_STATUS_TEXT), L"Waiting for start...");
+        Press(window, IDC_START);
+    });
+    EXPECT_EQ(result, IDCANCEL);
     ExpectOneBox(user_, L"Can not open COM port. Port is already open by another program",
                  MB_ICONSTOP);
 }
 
 TEST_F(DownloadDialog, TransferFromTheInstrumentEndsWithOkAndTheExactFile) {
-    Instrument instrument(9600, 24, 20);
+    Instrument instrument(kInstrumentPort, 9600, 24, 20);
     ASSERT_TRUE(instrument.Open()) << "no virtual cable: run through run_dialog_tests";
     CDownloadProgressDialog dialog(nullptr, station_, output_.wstring());
     const INT_PTR result = RunDialog(dialog, [&](HWND window) {
@@ -165,7 +102,7 @@ TEST_F(DownloadDialog, TransferFromTheInstrumentEndsWithOkAndTheExactFile) {
 }
 
 TEST_F(DownloadDialog, CancelDuringTransferWaitsForTheDriverToStop) {
-    Instrument instrument(1200, 200, 3);
+    Instrument instrument(kInstrumentPort, 1200, 200, 3);
     ASSERT_TRUE(instrument.Open()) << "no virtual cable: run through run_dialog_tests";
     {
         CDownloadProgressDialog dialog(nullptr, station_, output_.wstring());

@@ -1,6 +1,6 @@
 // TAZComm through the Win32 serial API: its port set-up, and a cancel over a socat pty pair
-// (COM20 ↔ COM21) with lvsim. The protocol's cases run in the portable tests, a whole download
-// through the shell in the end-to-end test.
+// (COM20 ↔ COM21) with the instrument simulator. The protocol's cases run in the portable tests,
+// a whole download through the shell in the end-to-end test.
 #include <gtest/gtest.h>
 
 #include <windows.h>
@@ -14,49 +14,11 @@
 #include "download/win32_serial_port.h"
 #include "support/unique_resource.h"
 #include "tests/portable/serial/fake_serial.h"
+#include "tests/serial/instrument.h"
 
 namespace {
 
 const wchar_t kDriverPort[] = L"\\\\.\\COM20";
-
-std::wstring ExecutablePath(const wchar_t* name) {
-    wchar_t path[MAX_PATH];
-    const std::wstring self(path, ::GetModuleFileNameW(nullptr, path, MAX_PATH));
-    return self.substr(0, self.find_last_of(L"\\/") + 1) + name;
-}
-
-// lvsim on the other end of the cable, ended when the test is.
-class Simulator {
-public:
-    explicit Simulator(const std::wstring& arguments) {
-        STARTUPINFOW startup{};
-        startup.cb = sizeof startup;
-        std::wstring command =
-            L"\"" + ExecutablePath(L"..\\..\\bin\\lvsim.exe") + L"\" --port COM21 " + arguments;
-        PROCESS_INFORMATION process{};
-        if (::CreateProcessW(nullptr, command.data(), nullptr, nullptr, FALSE, 0, nullptr, nullptr,
-                             &startup, &process)) {
-            process_.reset(process.hProcess);
-            UniqueHandle thread(process.hThread);
-        }
-    }
-    ~Simulator() {
-        if (process_ && ::WaitForSingleObject(process_.get(), 0) == WAIT_TIMEOUT)
-            ::TerminateProcess(process_.get(), 99);
-    }
-    bool Started() const { return static_cast<bool>(process_); }
-    // Exit code, or -1 when it did not end within the time.
-    int Wait(DWORD milliseconds) {
-        DWORD code = 0;
-        if (::WaitForSingleObject(process_.get(), milliseconds) != WAIT_OBJECT_0 ||
-            !::GetExitCodeProcess(process_.get(), &code))
-            return -1;
-        return static_cast<int>(code);
-    }
-
-private:
-    UniqueHandle process_;
-};
 
 // The line protocol at 9600 baud, 7 data bits, even parity, as the download thread asks for it.
 TAZCommParams LineParams(const wchar_t* port, const std::wstring& output) {
@@ -83,7 +45,9 @@ TEST(SerialDriver, FillsTheRecordsDeviceControlBlockAndTimeOutsEvenWhenThePortIs
 }
 
 TEST(SerialDriver, CancelMidTransferReportsAndFreesThePort) {
-    const std::wstring output = ExecutablePath(L"received-cancelled.lv");
+    wchar_t self[MAX_PATH];
+    const std::wstring output =
+        std::wstring(self, ::GetModuleFileNameW(nullptr, self, MAX_PATH)) + L".cancelled.lv";
     TAZCommParams params = LineParams(kDriverPort, output);
     RecordingCallback callback;
     callback.cancelWhen = [&] {  // after the third line
@@ -92,8 +56,9 @@ TEST(SerialDriver, CancelMidTransferReportsAndFreesThePort) {
     TAZComm driver(&callback, &params);
     ASSERT_TRUE(driver.IsPortOpen());
 
-    Simulator simulator(L"--lines 200 --answer-timeout 300 --max-resends 2");
-    ASSERT_TRUE(simulator.Started());
+    Instrument instrument(L"\\\\.\\COM21", 9600, 200, 2);
+    ASSERT_TRUE(instrument.Open());
+    instrument.Play();
     EXPECT_EQ(driver.ReceiveLines(), 1u);
     EXPECT_FALSE(driver.IsPortOpen());
     EXPECT_EQ(callback.messages,
@@ -103,7 +68,7 @@ TEST(SerialDriver, CancelMidTransferReportsAndFreesThePort) {
                                             OPEN_EXISTING, 0, nullptr));
     EXPECT_TRUE(reopened) << ::GetLastError();
     reopened.reset();
-    EXPECT_NE(simulator.Wait(20000), 0);
+    EXPECT_NE(instrument.Finish(), 0);
     std::ifstream file(output.c_str(), std::ios::binary);
     const std::string received{std::istreambuf_iterator<char>(file), {}};
     EXPECT_EQ(std::count(received.begin(), received.end(), '\n'), 3) << "the header and two lines";

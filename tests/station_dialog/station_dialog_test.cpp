@@ -7,34 +7,25 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <functional>
-#include <thread>
-#include <tuple>
 
 #include "res/resource.h"
 #include "stations/station_store.h"
 #include "support/text_lookup.h"
-#include "tests/support/recording_user_interface.h"
+#include "tests/progress_dialogs/dialog_driver.h"
 #include "tests/support/registry_override.h"
 
 namespace {
 
 constexpr int kApplyButton = 0x3021;  // the sheet's Apply
 
-// The sheet's frame, its page, and what a user does to them, from a thread of its own.
-struct Sheet {
+// What a user does to the sheet's one page, from the thread that drives the sheet.
+struct Page {
     HWND frame;
-    HWND page;
+    HWND window = ::FindWindowExW(frame, nullptr, L"#32770", nullptr);
 
-    std::wstring Text(int controlId = 0, bool onFrame = false) const {
-        wchar_t text[512] = {};
-        const HWND window = controlId ? ::GetDlgItem(onFrame ? frame : page, controlId) : frame;
-        ::SendMessageW(window, WM_GETTEXT, 512, reinterpret_cast<LPARAM>(text));
-        return text;
-    }
     // The selected entry's text; empty with no selection.
     std::wstring Selected(int listId) const {
-        const HWND list = ::GetDlgItem(page, listId);
+        const HWND list = ::GetDlgItem(window, listId);
         const LRESULT index = ::SendMessageW(list, CB_GETCURSEL, 0, 0);
         wchar_t text[256] = {};
         if (index != CB_ERR)
@@ -42,68 +33,34 @@ struct Sheet {
         return text;
     }
     void Type(const std::wstring& text) const {
-        const HWND edit = ::GetDlgItem(page, IDC_STATION_NAME_EDIT);
+        const HWND edit = ::GetDlgItem(window, IDC_STATION_NAME_EDIT);
         ::SendMessageW(edit, EM_SETSEL, 0, -1);
         ::SendMessageW(edit, WM_CHAR, VK_BACK, 0);
         for (wchar_t c : text)
             ::SendMessageW(edit, WM_CHAR, c, 0);
     }
     void Pick(int listId, const std::wstring& entry) const {
-        const HWND list = ::GetDlgItem(page, listId);
+        const HWND list = ::GetDlgItem(window, listId);
         const LRESULT index =
             ::SendMessageW(list, CB_FINDSTRINGEXACT, -1, reinterpret_cast<LPARAM>(entry.c_str()));
         ::SendMessageW(list, CB_SETCURSEL, index, 0);
-        ::SendMessageW(page, WM_COMMAND, MAKEWPARAM(listId, CBN_SELCHANGE),
+        ::SendMessageW(window, WM_COMMAND, MAKEWPARAM(listId, CBN_SELCHANGE),
                        reinterpret_cast<LPARAM>(list));
     }
-    bool ApplyEnabled() const { return ::IsWindowEnabled(::GetDlgItem(frame, kApplyButton)); }
+    bool ApplyEnabled() const { return IsEnabled(frame, kApplyButton); }
     // The sheet's own press of a button, as a click gives it; it does not depend on where the
     // sheet is on the screen or whether it has the focus yet.
-    void Press(int buttonId) const {
-        const int button = buttonId == IDOK         ? PSBTN_OK
-                           : buttonId == IDCANCEL   ? PSBTN_CANCEL
-                                                    : PSBTN_APPLYNOW;
-        ::SendMessageW(frame, PSM_PRESSBUTTON, button, 0);
-    }
+    void Press(int button) const { ::SendMessageW(frame, PSM_PRESSBUTTON, button, 0); }
 };
 
-// Runs the sheet modally on this thread while script acts on it from another.
-INT_PTR RunSheet(CStationDialog& dialog, const std::function<void(const Sheet&)>& script) {
-    std::thread user([&, sheetThread = ::GetCurrentThreadId()] {
-        Sheet sheet{};
-        for (int tries = 0; tries < 500 && !sheet.page; ++tries) {
-            ::Sleep(20);
-            ::EnumThreadWindows(
-                sheetThread,
-                [](HWND window, LPARAM found) {
-                    if (!::IsWindowVisible(window))
-                        return TRUE;
-                    *reinterpret_cast<HWND*>(found) = window;
-                    return FALSE;
-                },
-                reinterpret_cast<LPARAM>(&sheet.frame));
-            if (sheet.frame)
-                sheet.page = ::FindWindowExW(sheet.frame, nullptr, L"#32770", nullptr);
-        }
-        if (!sheet.page) {
-            ADD_FAILURE() << "no sheet appeared";
-            return;
-        }
+// Runs the sheet modally on this thread while script acts on its page from another.
+INT_PTR RunSheet(CStationDialog& dialog, const std::function<void(const Page&)>& script) {
+    return RunDialog(dialog, [&](HWND frame) {
         // The page exists before the sheet has finished setting it up: wait until it shows.
-        for (int tries = 0; tries < 250 && !::IsWindowVisible(sheet.page); ++tries)
-            ::Sleep(20);
+        ASSERT_TRUE(WaitFor([&] { return ::IsWindowVisible(Page{frame}.window) != FALSE; }, 5000));
         ::Sleep(200);
-        script(sheet);
-        for (int tries = 0; tries < 250 && ::IsWindow(sheet.frame); ++tries)
-            ::Sleep(20);
-        if (::IsWindow(sheet.frame)) {
-            ADD_FAILURE() << "the sheet stayed open";
-            sheet.Press(IDCANCEL);
-        }
+        script(Page{frame});
     });
-    const INT_PTR result = dialog.DoModal();
-    user.join();
-    return result;
 }
 
 class StationDialog : public ::testing::Test {
@@ -112,21 +69,15 @@ protected:
         INITCOMMONCONTROLSEX controls{sizeof controls, ICC_STANDARD_CLASSES | ICC_TAB_CLASSES};
         ::InitCommonControlsEx(&controls);
         registry_.SetSerialPorts({L"COM3", L"COM10", L"COM2"});
-        north_.Name = L"North";
-        north_.Port = L"COM10";
-        ASSERT_EQ(S_OK, AddStation(north_));
-    }
-    static Station Stored(const std::wstring& name) {
-        Station station;
-        station.Name = name;
-        EXPECT_EQ(S_OK, FindStation(station)) << name;
-        return station;
+        Station north = DefaultStation();
+        north.Name = L"North";
+        north.Port = L"COM10";
+        ASSERT_EQ(S_OK, AddStation(north));
     }
 
     RegistryOverride registry_{RegistryOverride::Hives::CurrentUserAndLocalMachine};
     RecordingUserInterface user_;
     ScopedUserInterface seam_{user_};
-    Station north_ = DefaultStation();
 };
 
 }  // namespace
@@ -145,11 +96,11 @@ TEST_F(StationDialog, RefusedNamesKeepTheSheetOpenWithTheirTextAndStoreNothing) 
         ScopedUserInterface seam(user);
         Station station = DefaultStation();
         CStationDialog dialog(nullptr, station, true);
-        const INT_PTR result = RunSheet(dialog, [&](const Sheet& sheet) {
-            sheet.Type(test.typed);
-            sheet.Press(IDOK);
-            EXPECT_TRUE(::IsWindow(sheet.frame)) << test.typed;
-            sheet.Press(IDCANCEL);
+        const INT_PTR result = RunSheet(dialog, [&](const Page& page) {
+            page.Type(test.typed);
+            page.Press(PSBTN_OK);
+            EXPECT_TRUE(::IsWindow(page.frame)) << test.typed;
+            page.Press(PSBTN_CANCEL);
         });
         EXPECT_EQ(IDCANCEL, result);
         const auto boxes = user.MessageBoxes();
@@ -166,22 +117,24 @@ TEST_F(StationDialog, NewStationOpensWithTheListsAndStoresOnOkOnly) {
         Station station = DefaultStation();
         station.Name = L"New digital level";
         CStationDialog dialog(nullptr, station, true);
-        const INT_PTR result = RunSheet(dialog, [&](const Sheet& sheet) {
-            EXPECT_EQ(L"Create Digital Level", sheet.Text());
-            EXPECT_EQ(L"New digital level", sheet.Text(IDC_STATION_NAME_EDIT));
-            EXPECT_EQ(L"Baudrate:", sheet.Text(IDC_STATION_BAUD_LABEL));
-            EXPECT_EQ(L"9600", sheet.Selected(IDC_STATION_BAUD));
-            EXPECT_EQ(L"Even", sheet.Selected(IDC_STATION_PARITY));
-            EXPECT_EQ(L"Quorvel LV-10", sheet.Selected(IDC_STATION_MODEL));
-            sheet.Type(name);
-            sheet.Pick(IDC_STATION_PORT, L"COM2");
-            sheet.Pick(IDC_STATION_MODEL, L"Quorvel LV-30");
-            EXPECT_FALSE(sheet.ApplyEnabled()) << "a new station is stored by OK alone";
-            sheet.Press(IDOK);
+        const INT_PTR result = RunSheet(dialog, [&](const Page& page) {
+            EXPECT_EQ(L"Create Digital Level", Text(page.frame));
+            EXPECT_EQ(L"New digital level", Text(page.window, IDC_STATION_NAME_EDIT));
+            EXPECT_EQ(L"Baudrate:", Text(page.window, IDC_STATION_BAUD_LABEL));
+            EXPECT_EQ(L"9600", page.Selected(IDC_STATION_BAUD));
+            EXPECT_EQ(L"Even", page.Selected(IDC_STATION_PARITY));
+            EXPECT_EQ(L"Quorvel LV-10", page.Selected(IDC_STATION_MODEL));
+            page.Type(name);
+            page.Pick(IDC_STATION_PORT, L"COM2");
+            page.Pick(IDC_STATION_MODEL, L"Quorvel LV-30");
+            EXPECT_FALSE(page.ApplyEnabled()) << "a new station is stored by OK alone";
+            page.Press(PSBTN_OK);
         });
         EXPECT_EQ(IDOK, result);
         EXPECT_TRUE(dialog.Added());
-        const Station stored = Stored(name);
+        Station stored;
+        stored.Name = name;
+        ASSERT_EQ(S_OK, FindStation(stored));
         EXPECT_EQ(L"COM2", stored.Port);
         EXPECT_EQ(L"Quorvel LV-30", stored.Model);
         EXPECT_EQ(9600u, stored.BaudRate);
@@ -195,20 +148,25 @@ TEST_F(StationDialog, EditModeShowsUnlistedValuesAsNoSelectionAndApplyStoresBefo
     odd.Parity = 7;
     odd.Port = L"COM9";  // not among the computer's ports
     odd.StopBits = 2;
+    odd.DataBits = 8;
+    odd.Flow = 1;
+    odd.Manufacturer = L"Maker";
     ASSERT_EQ(S_OK, AddStation(odd));
     Station station = odd;  // as the folder holds it: the store would read the port as COM3
+    station.Model = L"Some other level";
     CStationDialog dialog(nullptr, station, false);
-    const INT_PTR result = RunSheet(dialog, [&](const Sheet& sheet) {
-        EXPECT_EQ(L"Digital Level properties", sheet.Text());
-        EXPECT_EQ(L"", sheet.Selected(IDC_STATION_BAUD)) << "19200 is not offered";
-        EXPECT_EQ(L"None", sheet.Selected(IDC_STATION_PARITY));
-        EXPECT_EQ(L"", sheet.Selected(IDC_STATION_PORT));
-        EXPECT_FALSE(sheet.ApplyEnabled());
-        sheet.Type(L"North");  // another station's name: accepted when editing
-        EXPECT_TRUE(sheet.ApplyEnabled());
-        sheet.Press(kApplyButton);
-        EXPECT_TRUE(::IsWindow(sheet.frame));
-        sheet.Press(IDCANCEL);
+    const INT_PTR result = RunSheet(dialog, [&](const Page& page) {
+        EXPECT_EQ(L"Digital Level properties", Text(page.frame));
+        EXPECT_EQ(L"", page.Selected(IDC_STATION_BAUD)) << "19200 is not offered";
+        EXPECT_EQ(L"None", page.Selected(IDC_STATION_PARITY));
+        EXPECT_EQ(L"", page.Selected(IDC_STATION_PORT));
+        EXPECT_EQ(L"", page.Selected(IDC_STATION_MODEL));
+        EXPECT_FALSE(page.ApplyEnabled());
+        page.Type(L"North");  // another station's name: accepted when editing
+        EXPECT_TRUE(page.ApplyEnabled());
+        page.Press(PSBTN_APPLYNOW);
+        EXPECT_TRUE(::IsWindow(page.frame));
+        page.Press(PSBTN_CANCEL);
     });
     EXPECT_EQ(IDCANCEL, result);
     EXPECT_TRUE(user_.MessageBoxes().empty());
@@ -217,7 +175,25 @@ TEST_F(StationDialog, EditModeShowsUnlistedValuesAsNoSelectionAndApplyStoresBefo
     EXPECT_EQ(0u, station.BaudRate);
     EXPECT_EQ(0u, station.Parity);
     EXPECT_EQ(L"", station.Port);
-    EXPECT_EQ(2u, station.StopBits) << "values the page does not show are kept";
+    EXPECT_EQ(L"", station.Model) << "no selection reads back as no text";
+    // Values the page does not show are kept.
+    EXPECT_EQ(2u, station.StopBits);
+    EXPECT_EQ(8u, station.DataBits);
+    EXPECT_EQ(1u, station.Flow);
+    EXPECT_EQ(L"Maker", station.Manufacturer);
+}
+
+TEST_F(StationDialog, OkOnAStationMissingFromTheStoreShowsItsWholeNameAndStoresNothing) {
+    Station station = DefaultStation();
+    station.Name = std::wstring(300, L'n');  // longer than the store keeps: never found there
+    CStationDialog dialog(nullptr, station, false);
+    const INT_PTR result = RunSheet(dialog, [&](const Page& page) {
+        EXPECT_EQ(station.Name, Text(page.window, IDC_STATION_NAME_EDIT));
+        page.Press(PSBTN_OK);
+    });
+    EXPECT_EQ(IDOK, result);
+    EXPECT_EQ(std::wstring(300, L'n'), station.Name);
+    EXPECT_EQ(std::vector<std::wstring>{L"North"}, ListStationNames());
 }
 
 TEST_F(StationDialog, AGermanUiRelabelsTheSheetAndItsRefusals) {
@@ -225,45 +201,18 @@ TEST_F(StationDialog, AGermanUiRelabelsTheSheetAndItsRefusals) {
     ASSERT_TRUE(SelectThreadUiLanguage(MAKELANGID(LANG_GERMAN, SUBLANG_GERMAN)));
     Station station = DefaultStation();
     CStationDialog dialog(nullptr, station, true);
-    RunSheet(dialog, [&](const Sheet& sheet) {
-        EXPECT_EQ(L"Digitalnivellier anlegen", sheet.Text());
-        EXPECT_EQ(L"Anschluss:", sheet.Text(IDC_STATION_PORT_LABEL));
-        EXPECT_EQ(L"Parität:", sheet.Text(IDC_STATION_PARITY_LABEL));
-        EXPECT_EQ(L"Gerade", sheet.Selected(IDC_STATION_PARITY));
-        sheet.Type(L"");
-        sheet.Press(IDOK);
-        sheet.Press(IDCANCEL);
+    RunSheet(dialog, [&](const Page& page) {
+        EXPECT_EQ(L"Digitalnivellier anlegen", Text(page.frame));
+        EXPECT_EQ(L"Anschluss:", Text(page.window, IDC_STATION_PORT_LABEL));
+        EXPECT_EQ(L"Parität:", Text(page.window, IDC_STATION_PARITY_LABEL));
+        EXPECT_EQ(L"Gerade", page.Selected(IDC_STATION_PARITY));
+        page.Type(L"");
+        page.Press(PSBTN_OK);
+        page.Press(PSBTN_CANCEL);
     });
     SelectThreadUiLanguage(before);
     const auto boxes = user_.MessageBoxes();
     ASSERT_EQ(1u, boxes.size());
     EXPECT_EQ(L"Bitte einen gültigen Gerätenamen eingeben!", boxes[0].text);
     EXPECT_EQ(L"Neues Digitalnivellier hinzufügen", boxes[0].caption);
-}
-
-TEST_F(StationDialog, ValuesTheListsDoNotHoldLeaveTheHiddenFieldsAlone) {
-    Station station = DefaultStation();
-    station.Name = std::wstring(300, L'n');  // longer than the store keeps: never found there
-    station.Model = L"Some other level";
-    station.Port = L"COM99";
-    station.StopBits = 2;
-    station.DataBits = 8;
-    station.Flow = 1;
-    station.Manufacturer = L"Maker";
-    const Station before = station;
-    CStationDialog dialog(nullptr, station, false);
-    const INT_PTR result = RunSheet(dialog, [&](const Sheet& sheet) {
-        EXPECT_EQ(before.Name, sheet.Text(IDC_STATION_NAME_EDIT));
-        EXPECT_EQ(L"", sheet.Selected(IDC_STATION_MODEL));
-        sheet.Press(IDOK);
-    });
-    EXPECT_EQ(IDOK, result);
-    EXPECT_EQ(before.Name, station.Name);
-    EXPECT_EQ(L"", station.Model) << "no selection reads back as no text";
-    EXPECT_EQ(L"", station.Port);
-    EXPECT_EQ(9600u, station.BaudRate);
-    EXPECT_EQ(std::make_tuple(2u, 8u, 1u, std::wstring(L"Maker")),
-              std::make_tuple(station.StopBits, station.DataBits, station.Flow,
-                              station.Manufacturer));
-    EXPECT_EQ(std::vector<std::wstring>{L"North"}, ListStationNames()) << "nothing was stored";
 }

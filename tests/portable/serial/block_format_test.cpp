@@ -87,23 +87,29 @@ std::vector<uint8_t> BlockFile(int blocks, bool endWithEot) {
     return file;
 }
 
-TEST(InputFileCheck, NumberedBlocksAreValidAndMismatchOrWrongDigitIsNamed) {
-    auto file = BlockFile(12, true);  // digits wrap from 9 to 0
-    EXPECT_EQ(CheckBccBlocks(file.data(), file.size()).Result, BccFileCheck::Outcome::Valid);
+TEST(InputFileCheck, NumberedBlocksPassAndABccMismatchIsReportedWithItsNumbers) {
+    ProtocolRun run(1);
+    std::vector<uint8_t> file = BlockFile(12, true);  // digits wrap from 9 to 0
+    EXPECT_TRUE(run.protocol.CheckInputFile(file.data(), file.size()));
+    const uint8_t stored = ComputeBcc(file.data() + 136);
+    file[136 + 10] ^= 0x01;  // a bit of block 1's text
+    EXPECT_FALSE(run.protocol.CheckInputFile(file.data(), file.size()));
+    const std::string expected = "Incorrect input file: BCC in block 1 mismatch with computed " +
+                                 std::to_string(stored) + "!=" + std::to_string(stored ^ 1);
+    EXPECT_EQ(run.callback.messages, OnlyMessage(4, WidenBytes(expected.data(), expected.size())));
+    EXPECT_TRUE(run.protocol.IsFileOpened());
+}
 
-    file[136 * 1 + 10] ^= 0x01;
-    const BccFileCheck check = CheckBccBlocks(file.data(), file.size());
-    EXPECT_EQ(check.Result, BccFileCheck::Outcome::BccMismatch);
-    EXPECT_EQ(check.Block, 1u);
-    EXPECT_EQ(check.ValueInBlock ^ check.Computed, 0x01u);
-
-    file = BlockFile(3, true);
-    file[136 * 2 + 129] = '7';
-    EXPECT_EQ(CheckBccBlocks(file.data(), file.size()).Result, BccFileCheck::Outcome::WrongBlock);
-    const uint8_t notBlocks[] = {'h', 'e', 'l', 'l', 'o'};
-    EXPECT_EQ(CheckBccBlocks(notBlocks, sizeof notBlocks).Result,
-              BccFileCheck::Outcome::WrongBlock);
-    EXPECT_EQ(CheckBccBlocks(nullptr, 0).Result, BccFileCheck::Outcome::WrongBlock);
+TEST(InputFileCheck, WhatIsNotABlockFilePassesButIsNotedAsNotOpened) {
+    std::vector<uint8_t> wrongDigit = BlockFile(3, true);
+    wrongDigit[136 * 2 + 129] = '7';
+    const std::vector<uint8_t> files[] = {wrongDigit, ToBytes("plain text"), {}};
+    for (const auto& file : files) {
+        ProtocolRun run(1);
+        EXPECT_TRUE(run.protocol.CheckInputFile(file.data(), file.size())) << file.size();
+        EXPECT_FALSE(run.protocol.IsFileOpened()) << file.size();
+        EXPECT_TRUE(run.callback.messages.empty());
+    }
 }
 
 TEST(PortSetup, FlowControlOnlyForSelectorZero) {

@@ -156,24 +156,6 @@ TEST(BccBlocks, CancelAfterANakClosesThePort) {
     EXPECT_FALSE(run.protocol.IsPortOpen());
 }
 
-TEST(BccBlocks, InputFileBccMismatchIsReportedWithItsNumbers) {
-    ProtocolRun run(1);
-    BccBlock block = BuildBccBlock(BytesOf("abc"), 3, 0);
-    const uint8_t stored = ComputeBcc(block.data());
-    block[1] = 'b';  // 'a' ^ 'b' = 3
-    Bytes file(block.begin(), block.end());
-    file.push_back(0x04);
-    EXPECT_FALSE(run.protocol.CheckInputFile(file.data(), file.size()));
-    const std::string expected = "Incorrect input file: BCC in block 0 mismatch with computed " +
-                                 std::to_string(stored) + "!=" + std::to_string(stored ^ 3);
-    EXPECT_EQ(run.callback.messages, OnlyMessage(4, WidenBytes(expected.data(), expected.size())));
-    EXPECT_TRUE(run.protocol.IsFileOpened());
-    // A file that is not made of blocks passes, but is noted as not opened.
-    const Bytes notBlocks = ToBytes("plain text");
-    EXPECT_TRUE(run.protocol.CheckInputFile(notBlocks.data(), notBlocks.size()));
-    EXPECT_FALSE(run.protocol.IsFileOpened());
-}
-
 // A Y-Modem receive against a sender that sends its header on the first 'C', a data block on
 // each ACK and EOT after the last. damage(block, bytes) may spoil what goes out (block 0 is the
 // header).
