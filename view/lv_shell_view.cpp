@@ -74,8 +74,11 @@ HRESULT CLVShellView::GetWindow(HWND* window) {
 }
 
 HRESULT CLVShellView::TranslateAccelerator(MSG* message) {
-    if (message && window_ && accelerators_)
-        ::TranslateAcceleratorW(window_, accelerators_.get(), message);
+    if (message && window_ && accelerators_ &&
+        ::TranslateAcceleratorW(window_, accelerators_.get(), message)) {
+        translatedKey_ = message->wParam;
+        translatedKeyTime_ = static_cast<LONG>(message->time);
+    }
     // S_FALSE even for a translated key: the browser goes on processing the message, as the
     // folder always let it.
     return S_FALSE;
@@ -320,6 +323,9 @@ LRESULT CLVShellView::OnNotify(const NMHDR& header) {
         case LVN_COLUMNCLICK:
             OnColumnClick(reinterpret_cast<const NMLISTVIEW&>(header).iSubItem);
             return 0;
+        case LVN_KEYDOWN:
+            OnListKeyDown(reinterpret_cast<const NMLVKEYDOWN&>(header).wVKey);
+            return 0;
         case LVN_ITEMACTIVATE:
             OpenSelection();
             return 0;
@@ -335,4 +341,20 @@ LRESULT CLVShellView::OnNotify(const NMHDR& header) {
             break;
     }
     return 0;
+}
+
+void CLVShellView::OnListKeyDown(WORD key) {
+    // The message being dispatched is the one the browser already gave to TranslateAccelerator.
+    if (translatedKey_ == key && translatedKeyTime_ == ::GetMessageTime()) {
+        translatedKey_ = 0;
+        return;
+    }
+    if (!accelerators_)
+        return;
+    MSG message{};
+    message.hwnd = list_.Window();
+    message.message = WM_KEYDOWN;
+    message.wParam = key;
+    message.time = static_cast<DWORD>(::GetMessageTime());
+    ::TranslateAcceleratorW(window_, accelerators_.get(), &message);
 }

@@ -62,6 +62,8 @@ private:
                                             LPARAM lParam);
     LRESULT HandleMessage(UINT message, WPARAM wParam, LPARAM lParam);
     LRESULT OnNotify(const NMHDR& header);
+    // A key pressed in the list that no browser translated (Wine's never call TranslateAccelerator).
+    void OnListKeyDown(WORD key);
 
     // Activation, menus and status text (shell_view_menus.cpp).
     void SetActivation(ViewActivation state);
@@ -124,6 +126,10 @@ private:
     UniqueWindow animation_;
     CViewNotifyWindow notifyWindow_;
     UniqueAccelerators accelerators_;
+    // The last key that TranslateAccelerator turned into a command: when the browser goes on to
+    // dispatch that same message, the list must not turn it into a command again.
+    WPARAM translatedKey_ = 0;
+    LONG translatedKeyTime_ = 0;
     ViewActivation activation_ = ViewActivation::Deactivated;
     UniqueMenu menu_;
     std::vector<UniqueHandle> fillThreads_;

@@ -166,4 +166,36 @@ TEST_F(ShellViewTest, TranslateAcceleratorSaysNotHandledWhileCtrlCCopies) {
     EXPECT_TRUE(::IsClipboardFormatAvailable(format));
 }
 
+// Wine's browsers never call TranslateAccelerator: the list's own keys still give commands, and a
+// browser that does call it does not get each command twice.
+TEST_F(ShellViewTest, ShortcutsWorkWithAndWithoutTheBrowsersTranslationAndActOnce) {
+    AddStationOfModel(L"A");
+    AddStationOfModel(L"B");
+    CExplorerWindow& browser = Open();
+    Select(browser, {1});
+    BYTE keys[256] = {};
+    ASSERT_TRUE(::GetKeyboardState(keys));
+    const auto press = [&](WORD key, bool control, bool throughBrowser) {
+        keys[VK_CONTROL] = control ? 0x80 : 0;
+        ASSERT_TRUE(::SetKeyboardState(keys));
+        ::PostMessageW(List(browser), WM_KEYDOWN, key, 1);
+        if (throughBrowser) {
+            browser.PumpMessages(50);
+        } else {
+            MSG message;
+            while (::PeekMessageW(&message, nullptr, 0, 0, PM_REMOVE))
+                ::DispatchMessageW(&message);
+        }
+        keys[VK_CONTROL] = 0;
+        ASSERT_TRUE(::SetKeyboardState(keys));
+        WaitForFill(browser);
+    };
+    press('C', true, false);
+    press('V', true, true);
+    EXPECT_EQ((std::vector<std::wstring>{L"A", L"B", L"Copy of A"}), StoredNames());
+    Select(browser, {1});  // A
+    press(VK_DELETE, false, false);
+    EXPECT_EQ((std::vector<std::wstring>{L"B", L"Copy of A"}), StoredNames());
+}
+
 }  // namespace
