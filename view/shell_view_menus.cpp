@@ -97,8 +97,13 @@ void CLVShellView::BuildMenus() {
     if (FAILED(browser_->InsertMenusSB(menu.get(), &widths)))
         return;
     const MenuContext context = CurrentMenuContext();
-    if (const HMENU file = SubMenuOf(menu.get(), FCIDM_MENU_FILE))
-        InsertGroup(file, 0, true, FileMenuGroup(context));
+    if (const HMENU file = SubMenuOf(menu.get(), FCIDM_MENU_FILE)) {
+        const std::vector<MenuItem> group = FileMenuGroup(context);
+        InsertGroup(file, 0, true, group);
+        // The browser's own items (Close) follow, set apart.
+        if (::GetMenuItemCount(file) > static_cast<int>(group.size()))
+            InsertGroup(file, static_cast<UINT>(group.size()), true, {MenuItem{}});
+    }
     if (const HMENU view = SubMenuOf(menu.get(), FCIDM_MENU_VIEW)) {
         // In front of the browser's options separator; at the end if it has none.
         std::vector<MenuItem> group = ViewMenuGroup(context);

@@ -103,6 +103,24 @@ TEST_F(ShellViewTest, AStationsFolderOffersOpenAndEditButNoStationCommands) {
         EXPECT_EQ(0xFFFFFFFFu, ::GetMenuState(bar, command, MF_BYCOMMAND)) << command;
 }
 
+TEST_F(ShellViewTest, AGermanUiTranslatesTheEntryTheMenusAndTheStatusText) {
+    const LANGID before = UiLanguage();
+    ASSERT_TRUE(SelectThreadUiLanguage(MAKELANGID(LANG_GERMAN, SUBLANG_GERMAN)));
+    CExplorerWindow& browser = Open(L"", Details());
+    const HMENU bar = browser.MenuBar();
+    const std::vector<std::wstring> entry = Texts(browser);
+    const std::wstring open = Entry(bar, 1289).text;
+    const std::wstring create = Entry(bar, 1280).text;
+    const std::wstring copy = Entry(bar, 1281).text;
+    const std::wstring status = browser.StatusText();
+    SelectThreadUiLanguage(before);
+    EXPECT_EQ(std::vector<std::wstring>{L"Neues Digitalnivellier hinzufügen"}, entry);
+    EXPECT_EQ(L"Öffnen", open);
+    EXPECT_EQ(L"Digitalnivellier anlegen", create);
+    EXPECT_EQ(L"&Kopieren", copy);
+    EXPECT_EQ(L"Quorvel Digitalnivelliere: Quorvel Digital Level", status);
+}
+
 TEST_F(ShellViewTest, InAFileDialogOpenReadsSelect) {
     ExplorerOptions dialog;
     dialog.commonDialog = true;
