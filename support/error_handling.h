@@ -5,7 +5,10 @@
 
 #include <new>
 
-// Appends "%ls - 0x%08X (%ls, %i)" style entries to the module's error log. Never fails.
+#include "support/error_log.h"
+
+// Writes a failure at a point of this code to the error log (support/error_log.h), its source
+// named by the file name alone: the build machine's folders are nobody's business. Never fails.
 void LogFailure(HRESULT result, const char* file, const char* function, int line) noexcept;
 
 // The thread's last error as an HRESULT; E_FAIL when a failed call left none, so that the
@@ -37,10 +40,10 @@ HRESULT ResultFromCaughtException() noexcept;
 
 #define RETURN_IF_NULL_ALLOC(pointer) RETURN_HR_IF(E_OUTOFMEMORY, (pointer) == nullptr)
 
-#define RETURN_IF_WIN32_BOOL_FALSE(expression)                       \
-    do {                                                             \
-        if (!(expression))                                           \
-            LV_LOG_AND_RETURN(LastErrorResult());                    \
+#define RETURN_IF_WIN32_BOOL_FALSE(expression)    \
+    do {                                          \
+        if (!(expression))                        \
+            LV_LOG_AND_RETURN(LastErrorResult()); \
     } while (0)
 
 #define RETURN_IF_WIN32_ERROR(expression)                     \
@@ -60,7 +63,7 @@ HRESULT ResultFromCaughtException() noexcept;
 
 // Ends a body whose failure has nowhere to go (a window procedure, a destructor's clean-up): the
 // failure is logged and the caller goes on.
-#define CATCH_LOG()                                                                       \
-    catch (...) {                                                                         \
-        LogFailure(ResultFromCaughtException(), __FILE__, __func__, __LINE__);            \
+#define CATCH_LOG()                                                            \
+    catch (...) {                                                              \
+        LogFailure(ResultFromCaughtException(), __FILE__, __func__, __LINE__); \
     }
