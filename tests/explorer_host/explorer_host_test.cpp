@@ -95,17 +95,9 @@ TEST_F(ExplorerHost, BrowseToParsingName_ReportsAnUnknownNameAsAParseFailure) {
     EXPECT_EQ(nullptr, window_->View());
 }
 
-TEST_F(ExplorerHost, MergedMenu_HoldsTheBrowserPopupsUnderTheirShellIds) {
+// The popups, their shell ids and the View separator are seen by the view's own menu tests.
+TEST_F(ExplorerHost, InsertMenusSB_CountsFileAndEditInTheFirstGroupAndViewInTheThird) {
     OpenOnFakeView(L"C:\\");
-    ASSERT_EQ(view_->menu, window_->MenuBar());
-    for (UINT id : {FCIDM_MENU_FILE, FCIDM_MENU_EDIT, FCIDM_MENU_VIEW})
-        EXPECT_NE(nullptr, Popup(window_->MenuBar(), id)) << std::hex << id;
-    MENUITEMINFOW options{};
-    options.cbSize = sizeof(options);
-    options.fMask = MIIM_FTYPE;
-    HMENU view = Popup(window_->MenuBar(), FCIDM_MENU_VIEW);
-    ASSERT_TRUE(::GetMenuItemInfoW(view, FCIDM_MENU_VIEW_SEP_OPTIONS, FALSE, &options));
-    EXPECT_TRUE(options.fType & MFT_SEPARATOR);
     const LONG expected[6] = {2, 0, 1, 0, 0, 0};  // File and Edit; View
     EXPECT_TRUE(std::equal(expected, expected + 6, view_->widths.width));
 }
@@ -167,9 +159,7 @@ TEST_F(ExplorerHost, GetControlWindow_GivesStatusBarAndToolbarOnly) {
 }
 
 TEST_F(ExplorerHost, MenusNotImplemented_AnswersENotImplAsWinesBrowsersDo) {
-    ExplorerOptions options;
-    options.menusNotImplemented = true;
-    OpenOnFakeView(L"C:\\", options);
+    OpenOnFakeView(L"C:\\", {.menusNotImplemented = true});
     HWND control = nullptr;
     OLEMENUGROUPWIDTHS widths{};
     const std::function<HRESULT(IShellBrowser*)> calls[] = {
@@ -185,15 +175,9 @@ TEST_F(ExplorerHost, MenusNotImplemented_AnswersENotImplAsWinesBrowsersDo) {
     EXPECT_EQ(L"", window_->StatusText(0));
 }
 
-TEST_F(ExplorerHost, CommonDialogMode_AnswersICommDlgBrowserAndCountsDefaultCommands) {
-    for (bool commonDialog : {false, true}) {
-        ExplorerOptions options;
-        options.commonDialog = commonDialog;
-        Open(options);
-        ComPtr<ICommDlgBrowser> dialog;
-        EXPECT_EQ(commonDialog ? S_OK : E_NOINTERFACE,
-                  Browser()->QueryInterface(IID_PPV_ARGS(&dialog)));
-    }
+// Whether the browser answers ICommDlgBrowser at all is seen by the view's menu tests.
+TEST_F(ExplorerHost, CommonDialogMode_CountsDefaultCommands) {
+    Open({.commonDialog = true});
     ComPtr<ICommDlgBrowser> dialog;
     ASSERT_EQ(S_OK, Browser()->QueryInterface(IID_PPV_ARGS(&dialog)));
     EXPECT_EQ(S_OK, dialog->OnDefaultCommand(nullptr));

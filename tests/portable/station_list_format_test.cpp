@@ -79,21 +79,3 @@ TEST(StationListFormat, LyingCountsAndSizesStopWithTheCompleteRecordsBefore) {
     // One record whose name fills the whole block with no terminator.
     EXPECT_TRUE(Parse({1, 0, 0, 0, 8, 0, 0, 0, 'N', 0, 'N', 0, 'N', 0, 'N', 0}).empty());
 }
-
-TEST(StationListFormat, EveryTruncationYieldsOnlyCompleteRecords) {
-    const std::vector<Station> stations = {SampleStation(WIDE_TEXT("One")),
-                                           SampleStation(WIDE_TEXT("Two")),
-                                           SampleStation(WIDE_TEXT("Three"))};
-    const std::vector<uint8_t> block = SerializeStationRecords(stations);
-    std::vector<size_t> ends = {4};  // the count, then each record's size field and record
-    for (const Station& station : stations)
-        ends.push_back(ends.back() + 4 + FlatStationRecordSize(station));
-    for (size_t length = 0; length <= block.size(); ++length) {
-        size_t complete = 0;
-        while (complete < stations.size() && ends[complete + 1] <= length)
-            ++complete;
-        EXPECT_EQ(std::vector<Station>(stations.begin(), stations.begin() + complete),
-                  Parse(std::vector<uint8_t>(block.begin(), block.begin() + length)))
-            << "length " << length;
-    }
-}

@@ -19,6 +19,8 @@ const std::wstring kFolderKey = L"CLSID\\{7D3F2A61-4B8E-4C19-9A27-5E0C81B6D4F3}"
 const std::wstring kTypeLib = L"{B8D31C5F-2A67-4E9B-A4F1-5C09D7E82B36}";
 const std::wstring kApprovedKey =
     L"Software\\Microsoft\\Windows\\CurrentVersion\\Shell Extensions\\Approved";
+// The folder's value there, as a dumped line starts.
+const std::wstring kApprovedValue = L"|{7D3F2A61-4B8E-4c19-9A27-5E0C81B6D4F3}|";
 const std::wstring kNameSpaceKey =
     L"Software\\Microsoft\\Windows\\CurrentVersion\\Explorer\\MyComputer\\NameSpace\\"
     L"{7D3F2A61-4B8E-4c19-9A27-5E0C81B6D4F3}";
@@ -103,16 +105,6 @@ intptr_t RunRegsvr32(bool unregister) {
     return ::_wspawnv(_P_WAIT, program.c_str(), arguments.data());
 }
 
-// The folder's entry under the approved shell extensions; empty when there is none.
-std::wstring ApprovedValue() {
-    const std::wstring prefix = L"|{7D3F2A61-4B8E-4c19-9A27-5E0C81B6D4F3}|";
-    for (const std::wstring& line : Dump(HKEY_LOCAL_MACHINE, kApprovedKey)) {
-        if (line.starts_with(prefix))
-            return line.substr(prefix.size());
-    }
-    return {};
-}
-
 class Registration : public testing::Test {
 protected:
     void SetUp() override { ASSERT_EQ(0, RunRegsvr32(false)); }
@@ -164,7 +156,9 @@ TEST_F(Registration, EveryScriptedClassHasItsProgIdsAndClassKey) {
 }
 
 TEST_F(Registration, TheFolderIsApprovedAndStandsUnderMyComputer) {
-    EXPECT_EQ(L"Quorvel Digital Levels", ApprovedValue());
+    EXPECT_EQ(
+        1u,
+        Dump(HKEY_LOCAL_MACHINE, kApprovedKey).count(kApprovedValue + L"Quorvel Digital Levels"));
     EXPECT_EQ((RegistryLines{L"|", L"||Quorvel Digital Levels"}),
               Dump(HKEY_LOCAL_MACHINE, kNameSpaceKey));
     EXPECT_EQ(1u, Dump(HKEY_CLASSES_ROOT, L"TypeLib\\" + kTypeLib + L"\\1.0\\0\\win64")
@@ -181,8 +175,10 @@ TEST_F(Registration, UnregisterRemovesEverythingButAnEmptyShellFolderKey) {
             EXPECT_EQ(RegistryLines{}, Dump(HKEY_CLASSES_ROOT, key)) << key;
         }
     }
-    EXPECT_EQ(L"", ApprovedValue());
-    EXPECT_EQ(1u, Dump(HKEY_LOCAL_MACHINE, kApprovedKey).count(L"|")) << "NoRemove";
+    const RegistryLines approved = Dump(HKEY_LOCAL_MACHINE, kApprovedKey);
+    EXPECT_EQ(1u, approved.count(L"|")) << "NoRemove";
+    for (const std::wstring& line : approved)
+        EXPECT_FALSE(line.starts_with(kApprovedValue)) << line;
     EXPECT_EQ(RegistryLines{}, Dump(HKEY_LOCAL_MACHINE, kNameSpaceKey));
     EXPECT_EQ(RegistryLines{}, Dump(HKEY_CLASSES_ROOT, L"TypeLib\\" + kTypeLib));
 }

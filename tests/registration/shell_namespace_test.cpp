@@ -105,13 +105,3 @@ TEST_F(ShellNamespace, TheDesktopFindsTheFolderUnderMyComputerAndBindsIntoAStati
     ASSERT_TRUE(station);
     EXPECT_EQ(Names{L"file1.hvr"}, ListedNames(station.Get(), SHCONTF_NONFOLDERS));
 }
-
-TEST_F(ShellNamespace, AnOverlongNameUnderTheFolderFailsCleanly) {
-    ComPtr<IShellFolder> desktop;
-    ASSERT_EQ(S_OK, ::SHGetDesktopFolder(&desktop));
-    std::wstring overlong = kFolderPath + L"\\" + std::wstring(300, L'y');
-    PIDLIST_RELATIVE list = nullptr;
-    EXPECT_TRUE(FAILED(
-        desktop->ParseDisplayName(nullptr, nullptr, overlong.data(), nullptr, &list, nullptr)));
-    EXPECT_EQ(nullptr, list);
-}

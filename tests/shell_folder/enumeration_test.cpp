@@ -15,28 +15,26 @@ TEST_F(ShellFolderTest, RootListsStationsOnlyForFolders) {
     ASSERT_EQ(ERROR_SUCCESS,
               WriteStringValue(StationKey(L"Station 9").get(), L"Name", L"North\\South"));
 
-    ComPtr<IShellFolder> folder = CreateRootFolder();
     const Items expected = {{PT_STATION, L"Station 1"},
                             {PT_STATION, L"Station 2"},
                             {PT_ROOT, L"Quorvel Digital Level"},
                             {PT_STATION, L"North"}};
-    EXPECT_EQ(expected, Enumerate(folder.Get(), SHCONTF_FOLDERS));
-    EXPECT_EQ(expected, Enumerate(folder.Get(), SHCONTF_FOLDERS | SHCONTF_NONFOLDERS));
-    EXPECT_EQ(Items{}, Enumerate(folder.Get(), SHCONTF_NONFOLDERS));
+    EXPECT_EQ(expected, Enumerate(root_.Get(), SHCONTF_FOLDERS));
+    EXPECT_EQ(expected, Enumerate(root_.Get(), SHCONTF_FOLDERS | SHCONTF_NONFOLDERS));
+    EXPECT_EQ(Items{}, Enumerate(root_.Get(), SHCONTF_NONFOLDERS));
 }
 
 TEST_F(ShellFolderTest, StationFolderListsOneFileNamedByModel) {
     AddStationOfModel(L"Level 10", IDS_MODEL_LV10);
     AddStationOfModel(L"Level 20", IDS_MODEL_LV20);
     AddStationOfModel(L"Level 30", IDS_MODEL_LV30);
-    ComPtr<IShellFolder> root = CreateRootFolder();
     const std::pair<const wchar_t*, const wchar_t*> cases[] = {
         {L"Level 10", L"file1.lv"},  {L"Level 20", L"file1.hvr"},
         {L"Level 30", L"file1.hvr"}, {L"Not in the store", L"file1.lv"},
         {L"level 30", L"file1.lv"},  // station names are matched case-sensitively
     };
     for (const auto& [station, file] : cases) {
-        ComPtr<IShellFolder> folder = Bind(root.Get(), StationItem(station));
+        ComPtr<IShellFolder> folder = Bind(root_.Get(), StationItem(station));
         ASSERT_TRUE(folder);
         EXPECT_EQ((Items{{PT_FILE, file}}), Enumerate(folder.Get(), SHCONTF_NONFOLDERS))
             << testing::PrintToString(station);
@@ -47,9 +45,8 @@ TEST_F(ShellFolderTest, StationFolderListsOneFileNamedByModel) {
 TEST_F(ShellFolderTest, NextSkipAndResetFollowTheEnumerationRules) {
     for (const wchar_t* name : {L"A", L"B", L"C"})
         AddStationOfModel(name);
-    ComPtr<IShellFolder> folder = CreateRootFolder();
     ComPtr<IEnumIDList> list;
-    ASSERT_EQ(S_OK, folder->EnumObjects(nullptr, SHCONTF_FOLDERS, &list));
+    ASSERT_EQ(S_OK, root_->EnumObjects(nullptr, SHCONTF_FOLDERS, &list));
     PITEMID_CHILD items[5] = {};
     ULONG fetched = 99;
     // The names of the items fetched, which are freed.

@@ -20,29 +20,28 @@ LONG IconWidth(HICON icon) {
 }  // namespace
 
 TEST_F(ShellFolderTest, UIObjectsNeedExactlyOneItem) {
-    ComPtr<IShellFolder> folder = CreateRootFolder();
     UniquePidl first = StationItem(L"A");
     UniquePidl second = StationItem(L"B");
     PCUITEMID_CHILD items[] = {Child(first), Child(second)};
-    for (REFIID iid : {IID_IExtractIconW, IID_IQueryInfo, IID_IDataObject, IID_IUnknown}) {
+    for (REFIID iid :
+         {IID_IExtractIconW, IID_IQueryInfo, IID_IDataObject, IID_IDropTarget, IID_IUnknown}) {
         void* object = reinterpret_cast<void*>(1);
-        EXPECT_EQ(E_FAIL, folder->GetUIObjectOf(nullptr, 2, items, iid, nullptr, &object));
+        EXPECT_EQ(E_FAIL, root_->GetUIObjectOf(nullptr, 2, items, iid, nullptr, &object));
         EXPECT_EQ(nullptr, object);
-        EXPECT_EQ(E_FAIL, folder->GetUIObjectOf(nullptr, 0, items, iid, nullptr, &object));
+        EXPECT_EQ(E_FAIL, root_->GetUIObjectOf(nullptr, 0, items, iid, nullptr, &object));
     }
-    // An item menu, and for now the drop target, are not handed out.
-    for (REFIID iid : {IID_IContextMenu, IID_IDropTarget, IID_IExtractIconA}) {
+    // An item menu is not handed out.
+    for (REFIID iid : {IID_IContextMenu, IID_IExtractIconA}) {
         void* object = reinterpret_cast<void*>(1);
-        EXPECT_EQ(E_NOINTERFACE, UIObject(folder.Get(), first, iid, &object));
+        EXPECT_EQ(E_NOINTERFACE, UIObject(root_.Get(), first, iid, &object));
         EXPECT_EQ(nullptr, object);
     }
 }
 
 TEST_F(ShellFolderTest, InfoTipIsThePathOfTheFullIdentifier) {
-    ComPtr<IShellFolder> root = CreateRootFolder();
     UniquePidl station = StationItem(L"Station 1");
     ComPtr<IQueryInfo> info;
-    ASSERT_EQ(S_OK, UIObject(root.Get(), station, IID_IQueryInfo, &info));
+    ASSERT_EQ(S_OK, UIObject(root_.Get(), station, IID_IQueryInfo, &info));
     PWSTR tip = nullptr;
     ASSERT_EQ(S_OK, info->GetInfoTip(QITIPF_DEFAULT, &tip));
     EXPECT_STREQ(L"Quorvel Digital Level\\Station 1", tip);
@@ -50,7 +49,7 @@ TEST_F(ShellFolderTest, InfoTipIsThePathOfTheFullIdentifier) {
     DWORD flags = 0;
     EXPECT_EQ(E_NOTIMPL, info->GetInfoFlags(&flags));
 
-    ComPtr<IShellFolder> stationFolder = Bind(root.Get(), station);
+    ComPtr<IShellFolder> stationFolder = Bind(root_.Get(), station);
     ASSERT_TRUE(stationFolder);
     UniquePidl file = FileItem(L"file1.hvr");
     ASSERT_EQ(S_OK, UIObject(stationFolder.Get(), file, IID_IQueryInfo, &info));
@@ -62,15 +61,14 @@ TEST_F(ShellFolderTest, InfoTipIsThePathOfTheFullIdentifier) {
 }
 
 TEST_F(ShellFolderTest, IconLocationByKindOfTheLastItem) {
-    ComPtr<IShellFolder> root = CreateRootFolder();
     UniquePidl station = StationItem(L"Station 1");
     UniquePidl rootItem(manager_.CreateRootPidl());
-    ComPtr<IShellFolder> stationFolder = Bind(root.Get(), station);
+    ComPtr<IShellFolder> stationFolder = Bind(root_.Get(), station);
     ASSERT_TRUE(stationFolder);
     UniquePidl file = FileItem(L"file1.lv");
 
     const std::tuple<IShellFolder*, const UniquePidl*, int> cases[] = {
-        {root.Get(), &station, 0}, {stationFolder.Get(), &file, 2}, {root.Get(), &rootItem, 1}};
+        {root_.Get(), &station, 0}, {stationFolder.Get(), &file, 2}, {root_.Get(), &rootItem, 1}};
     for (const auto& [folder, item, expectedIndex] : cases) {
         ComPtr<IExtractIconW> icon;
         ASSERT_EQ(S_OK, UIObject(folder, *item, IID_IExtractIconW, &icon));
@@ -85,9 +83,9 @@ TEST_F(ShellFolderTest, IconLocationByKindOfTheLastItem) {
 }
 
 TEST_F(ShellFolderTest, SharedIconListsFeedTheExtractor) {
-    ComPtr<IShellFolder> root = CreateRootFolder();
     ComPtr<IExtractIconW> extractor;
-    ASSERT_EQ(S_OK, UIObject(root.Get(), StationItem(L"Station 1"), IID_IExtractIconW, &extractor));
+    ASSERT_EQ(S_OK,
+              UIObject(root_.Get(), StationItem(L"Station 1"), IID_IExtractIconW, &extractor));
 
     DestroySharedIconLists();
     HICON large = reinterpret_cast<HICON>(1), small = reinterpret_cast<HICON>(1);

@@ -26,21 +26,20 @@ class ShellFolderTest : public ::testing::Test {
 protected:
     using Items = std::vector<std::pair<DWORD, std::wstring>>;
 
-    void TearDown() override {
-        // Every object made by a test is a local of the test body and gone by now: a lock left
-        // over is a reference leaked by the code under test.
-        EXPECT_EQ(0, ModuleLockCount());
-    }
-
     // The root folder as the shell makes it: through the class's creation function, then
     // IPersistFolder::Initialize.
-    static ComPtr<IShellFolder> CreateRootFolder() {
-        ComPtr<IShellFolder> folder;
-        EXPECT_EQ(S_OK, CreateComInstance<CLVShellFolder>(IID_PPV_ARGS(&folder)));
+    void SetUp() override {
+        ASSERT_EQ(S_OK, CreateComInstance<CLVShellFolder>(IID_PPV_ARGS(&root_)));
         ComPtr<IPersistFolder> persist;
-        EXPECT_EQ(S_OK, folder.As(&persist));
-        EXPECT_EQ(S_OK, persist->Initialize(nullptr));
-        return folder;
+        ASSERT_EQ(S_OK, root_.As(&persist));
+        ASSERT_EQ(S_OK, persist->Initialize(nullptr));
+    }
+
+    void TearDown() override {
+        root_.Reset();
+        // Every other object made by a test is a local of the test body and gone by now: a lock
+        // left over is a reference leaked by the code under test.
+        EXPECT_EQ(0, ModuleLockCount());
     }
 
     static ComPtr<IShellFolder> Bind(IShellFolder* parent, const UniquePidl& item) {
@@ -88,6 +87,17 @@ protected:
         return folder->GetUIObjectOf(nullptr, 1, &child, iid, nullptr, object);
     }
 
+    // Kind and name of every item of a list; none for no list.
+    Items ItemsOf(const UniquePidl& list) const {
+        Items items;
+        for (LPCITEMIDLIST item = list.get(); item && item->mkid.cb;
+             item = manager_.GetNextItem(item)) {
+            items.emplace_back(ItemKind(reinterpret_cast<const uint8_t*>(item)),
+                               manager_.GetItemName(item));
+        }
+        return items;
+    }
+
     // Kind and name of every item the folder lists for the flags.
     Items Enumerate(IShellFolder* folder, SHCONTF flags) {
         Items items;
@@ -104,4 +114,5 @@ protected:
 
     RegistryOverride registry_;
     CPidlMgr manager_;
+    ComPtr<IShellFolder> root_;
 };

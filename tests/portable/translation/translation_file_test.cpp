@@ -102,13 +102,7 @@ TEST(TranslationFile, TruncatedFilesKeepWhatIsComplete) {
     std::vector<uint8_t> bytes = Utf16File(WIDE_TEXT("[Start]\r\n[Starten]\r\n[Cancel]\r\n[Abb]"));
     // Cut in the middle of the last character: the odd byte is dropped, the line loses its "]".
     bytes.pop_back();
-    TranslationMap map = Parse(bytes);
+    const TranslationMap map = Parse(bytes);
     EXPECT_EQ(map.size(), 1u);
     EXPECT_EQ(map.at(WIDE_TEXT("Start")), WIDE_TEXT("Starten"));
-    // Every shorter prefix parses without reading past its end.
-    for (size_t size = 2; size < bytes.size(); ++size) {
-        map.clear();
-        EXPECT_TRUE(ParseTranslationFile(bytes.data(), size, map)) << size;
-        EXPECT_LE(map.size(), 1u);
-    }
 }
