@@ -5,7 +5,6 @@
 #include <windows.h>
 #include <shlobj.h>
 
-#include "namespace/pending_shell_object.h"
 #include "namespace/quorvel_shell_folder_base.h"
 #include "support/com_object.h"
 #include "support/error_handling.h"
@@ -55,22 +54,12 @@ public:
         *object = nullptr;
         try {
             if (iid == IID_IShellView) {
-                if constexpr (kIsPendingShellObject<View>) {
-                    return E_NOINTERFACE;
-                } else {
-                    auto view = MakeComObject<View>();
-                    RETURN_IF_FAILED(
-                        view->SetUp(static_cast<IShellFolder*>(this), OwnIdentifier()));
-                    return view->QueryInterface(iid, object);
-                }
+                auto view = MakeComObject<View>();
+                RETURN_IF_FAILED(view->SetUp(static_cast<IShellFolder*>(this), OwnIdentifier()));
+                return view->QueryInterface(iid, object);
             }
-            if (iid == IID_IContextMenu) {
-                if constexpr (kIsPendingShellObject<ContextMenu>) {
-                    return E_NOINTERFACE;
-                } else {
-                    return MakeComObject<ContextMenu>()->QueryInterface(iid, object);
-                }
-            }
+            if (iid == IID_IContextMenu)
+                return MakeComObject<ContextMenu>()->QueryInterface(iid, object);
             return E_NOINTERFACE;
         }
         CATCH_RETURN()
@@ -104,15 +93,10 @@ private:
     // The object keeps its own copy of the item's full list; ours is freed on return.
     template <typename ItemObject>
     HRESULT CreateItemObject(PCUITEMID_CHILD item, REFIID iid, void** object) {
-        if constexpr (kIsPendingShellObject<ItemObject>) {
-            return E_NOINTERFACE;
-        } else {
-            UniquePidl fullList;
-            RETURN_IF_FAILED(CreateFullList(item, fullList));
-            auto itemObject = MakeComObject<ItemObject>();
-            RETURN_IF_FAILED(
-                itemObject->SetItem(reinterpret_cast<PCUIDLIST_RELATIVE>(fullList.get())));
-            return itemObject->QueryInterface(iid, object);
-        }
+        UniquePidl fullList;
+        RETURN_IF_FAILED(CreateFullList(item, fullList));
+        auto itemObject = MakeComObject<ItemObject>();
+        RETURN_IF_FAILED(itemObject->SetItem(reinterpret_cast<PCUIDLIST_RELATIVE>(fullList.get())));
+        return itemObject->QueryInterface(iid, object);
     }
 };

@@ -9,11 +9,11 @@
 #include "res/registry/ids_registry.h"
 #include "server/lv_shell_folder.h"
 #include "view/lv_data_object.h"
+#include "view/lv_drop_target.h"
 #include "view/lv_shell_view.h"
 
 namespace {
 
-// Classes without a creatable object here carry a null creation function.
 constexpr CLSID kDataObjectClassId = {
     0x4F9A7D26, 0xE3B1, 0x4C58, {0x8D, 0x0F, 0x72, 0xA5, 0xB1, 0xE6, 0xC3, 0x90}};
 constexpr CLSID kShellViewClassId = {
@@ -37,8 +37,9 @@ constexpr ClassTableEntry kClassTable[] = {
     {&kExtractIconClassId, IDR_LVEXTRACTICON, &CreateComInstance<CLVExtractIcon>},
     {&kQueryInfoClassId, IDR_AZQUERYINFO, &CreateComInstance<CLVQueryInfo>},
     {&kShellViewClassId, IDR_LVSHELLVIEW, &CreateComInstance<CLVShellView>},
-    {&kDropTargetClassId, IDR_LVDROPTARGET, nullptr},
-    {&kDropTargetOnListViewClassId, IDR_LVDROPTARGETONLISTVIEW, nullptr},
+    {&kDropTargetClassId, IDR_LVDROPTARGET, &CreateComInstance<CLVDropTarget>},
+    {&kDropTargetOnListViewClassId, IDR_LVDROPTARGETONLISTVIEW,
+     &CreateComInstance<CLVDropTargetOnListView>},
 };
 
 constexpr size_t kClassCount = sizeof kClassTable / sizeof kClassTable[0];

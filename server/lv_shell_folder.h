@@ -13,8 +13,8 @@
 #include "support/com_object.h"
 #include "view/lv_context_menu.h"
 #include "view/lv_data_object.h"
+#include "view/lv_drop_target.h"
 #include "view/lv_shell_view.h"
-#include "view/pending_view_objects.h"
 
 // {7D3F2A61-4B8E-4C19-9A27-5E0C81B6D4F3}
 inline constexpr CLSID CLSID_LVShellFolder = {

@@ -136,10 +136,10 @@ HRESULT CLVShellView::CreateViewWindow(IShellView*, LPCFOLDERSETTINGS settings,
         (void)browser->SetToolbarItems(nullptr, 0, FCT_MERGE);
         RETURN_IF_FAILED(browser->GetWindow(&parent_));
 
-        const HWND created = ::CreateWindowExW(
-            0, kViewWindowClass, L"", WS_CHILD | WS_VISIBLE | WS_CLIPSIBLINGS, area->left,
-            area->top, area->right - area->left, area->bottom - area->top, parent_, nullptr,
-            ThisModule(), this);
+        const HWND created =
+            ::CreateWindowExW(0, kViewWindowClass, L"", WS_CHILD | WS_VISIBLE | WS_CLIPSIBLINGS,
+                              area->left, area->top, area->right - area->left,
+                              area->bottom - area->top, parent_, nullptr, ThisModule(), this);
         RETURN_HR_IF(E_FAIL, !created);
         accelerators_.reset(
             ::LoadAcceleratorsW(ThisModule(), MAKEINTRESOURCEW(IDR_VIEW_ACCELERATORS)));
@@ -188,8 +188,7 @@ HRESULT CLVShellView::GetItemObject(UINT item, REFIID iid, void** object) {
     CATCH_RETURN()
 }
 
-HRESULT CLVShellView::QueryStatus(const GUID* group, ULONG count, OLECMD* commands,
-                                  OLECMDTEXT*) {
+HRESULT CLVShellView::QueryStatus(const GUID* group, ULONG count, OLECMD* commands, OLECMDTEXT*) {
     if (!commands)
         return E_POINTER;
     if (!group || (*group != CGID_Explorer && *group != CGID_ShellDocView))
@@ -240,6 +239,10 @@ LRESULT CLVShellView::HandleMessage(UINT message, WPARAM wParam, LPARAM lParam) 
             return 0;
         case WM_DESTROY:
             StopFillThreads();
+            // The drop target holds this view: revoking it ends that cycle.
+            if (dropTargetRegistered_)
+                (void)::RevokeDragDrop(list_.Window());
+            dropTargetRegistered_ = false;
             list_.Destroy();
             animation_.reset();
             return 0;

@@ -62,7 +62,8 @@ private:
                                             LPARAM lParam);
     LRESULT HandleMessage(UINT message, WPARAM wParam, LPARAM lParam);
     LRESULT OnNotify(const NMHDR& header);
-    // A key pressed in the list that no browser translated (Wine's never call TranslateAccelerator).
+    // A key pressed in the list that no browser translated (Wine's never call
+    // TranslateAccelerator).
     void OnListKeyDown(WORD key);
 
     // Activation, menus and status text (shell_view_menus.cpp).
@@ -123,6 +124,7 @@ private:
     HWND parent_ = nullptr;
     HWND window_ = nullptr;
     CShellViewListWindow list_;
+    bool dropTargetRegistered_ = false;
     UniqueWindow animation_;
     CViewNotifyWindow notifyWindow_;
     UniqueAccelerators accelerators_;

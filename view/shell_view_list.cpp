@@ -13,6 +13,7 @@
 #include "support/module_instance.h"
 #include "support/registered_messages.h"
 #include "support/text_lookup.h"
+#include "view/lv_drop_target.h"
 
 namespace {
 
@@ -80,8 +81,7 @@ int CALLBACK CompareItems(LPARAM first, LPARAM second, LPARAM context) {
 bool CLVShellView::CreateList() {
     // Clipping its siblings keeps the animation visible over the list while a fill runs.
     const DWORD style = WS_CHILD | WS_VISIBLE | WS_TABSTOP | WS_CLIPSIBLINGS | LVS_AUTOARRANGE |
-                        LVS_SHAREIMAGELISTS | LVS_SHOWSELALWAYS |
-                        ListViewType(settings_.ViewMode);
+                        LVS_SHAREIMAGELISTS | LVS_SHOWSELALWAYS | ListViewType(settings_.ViewMode);
     // No label editing: stations are renamed in their property sheet only.
     if (!list_.Create(window_, style, WS_EX_CLIENTEDGE, IDC_VIEW_LIST))
         return false;
@@ -90,6 +90,13 @@ bool CLVShellView::CreateList() {
     ::MoveWindow(list_.Window(), 0, 0, area.right, area.bottom, FALSE);
     ApplyViewModeStyle();
     ResetColumnsAndImages();
+    // Files dropped on a station row or into a station's folder. Without OLE (a host that did not
+    // initialise it) the view simply takes no drops.
+    auto dropTarget = MakeComObject<CLVDropTargetOnListView>();
+    UniquePidl folder(manager_.CreatePidlFromPath(folderPath_.c_str()));
+    if (folder && SUCCEEDED(dropTarget->SetUp(list_.Window(), this,
+                                              reinterpret_cast<PCUIDLIST_RELATIVE>(folder.get()))))
+        dropTargetRegistered_ = SUCCEEDED(::RegisterDragDrop(list_.Window(), dropTarget.Get()));
     return true;
 }
 
@@ -98,9 +105,9 @@ void CLVShellView::ApplyViewModeStyle() noexcept {
     if (!list)
         return;
     const LONG_PTR style = ::GetWindowLongPtrW(list, GWL_STYLE);
-    ::SetWindowLongPtrW(list, GWL_STYLE,
-                        (style & ~static_cast<LONG_PTR>(LVS_TYPEMASK)) |
-                            ListViewType(settings_.ViewMode));
+    ::SetWindowLongPtrW(
+        list, GWL_STYLE,
+        (style & ~static_cast<LONG_PTR>(LVS_TYPEMASK)) | ListViewType(settings_.ViewMode));
     constexpr DWORD kClickMask = LVS_EX_TRACKSELECT | LVS_EX_ONECLICKACTIVATE | LVS_EX_UNDERLINEHOT;
     list_.Send(LVM_SETEXTENDEDLISTVIEWSTYLE, kClickMask, ClickStyles());
 }
@@ -132,8 +139,7 @@ void CLVShellView::StartFill() {
     animation_.reset(::CreateWindowExW(
         0, ANIMATE_CLASSW, L"", WS_CHILD | WS_VISIBLE | ACS_CENTER | ACS_TRANSPARENT | ACS_AUTOPLAY,
         0, 0, area.right, area.bottom, window_,
-        reinterpret_cast<HMENU>(static_cast<UINT_PTR>(IDC_VIEW_ANIMATION)), ThisModule(),
-        nullptr));
+        reinterpret_cast<HMENU>(static_cast<UINT_PTR>(IDC_VIEW_ANIMATION)), ThisModule(), nullptr));
     if (animation_) {
         ::SetWindowPos(animation_.get(), HWND_TOP, 0, 0, 0, 0, SWP_NOMOVE | SWP_NOSIZE);
         // Without its video the fill still runs; there is just nothing to watch.
@@ -157,8 +163,8 @@ DWORD WINAPI CLVShellView::FillThread(void* parameter) {
     std::unique_ptr<FillRequest> request(static_cast<FillRequest*>(parameter));
     const HRESULT apartment = ::CoInitializeEx(nullptr, COINIT_MULTITHREADED);
     IEnumIDList* enumerator = nullptr;
-    if (FAILED(request->folder->EnumObjects(request->window,
-                                            SHCONTF_FOLDERS | SHCONTF_NONFOLDERS, &enumerator)))
+    if (FAILED(request->folder->EnumObjects(request->window, SHCONTF_FOLDERS | SHCONTF_NONFOLDERS,
+                                            &enumerator)))
         enumerator = nullptr;
     // The window owns the enumerator once the message is posted; a window that is gone takes
     // nothing, and the enumerator is released here.
@@ -282,8 +288,8 @@ std::vector<CLVShellView::SelectedItem> CLVShellView::Selection() const {
     if (!list_.Window())
         return selection;
     int index = -1;
-    while ((index = static_cast<int>(list_.Send(LVM_GETNEXTITEM, static_cast<WPARAM>(index),
-                                                LVNI_SELECTED))) >= 0) {
+    while ((index = static_cast<int>(
+                list_.Send(LVM_GETNEXTITEM, static_cast<WPARAM>(index), LVNI_SELECTED))) >= 0) {
         LVITEMW item{};
         item.mask = LVIF_PARAM;
         item.iItem = index;

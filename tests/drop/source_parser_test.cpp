@@ -1,0 +1,232 @@
+// The parser of dropped sources over real files in the prefix and data objects built here: files,
+// shortcuts, folders, file group descriptors, shell items, the hand-over to another thread, and
+// blocks that lie.
+#include "tests/drop/drop_fixture.h"
+
+#include <thread>
+
+#include "support/error_log.h"
+#include "view/lv_drop_target.h"
+
+namespace {
+
+class SourceParserTest : public ::testing::Test {
+protected:
+    void SetUp() override { ASSERT_EQ(S_OK, ::OleInitialize(nullptr)); }
+    void TearDown() override { ::OleUninitialize(); }
+
+    static std::vector<TSourceDescriptor> Parse(IDataObject* data, HRESULT expected = S_OK,
+                                                bool deep = true) {
+        TSourceParser parser(true);
+        EXPECT_EQ(expected, parser.ParseDataObject(data, L"", deep));
+        return *parser.Sources();
+    }
+
+    ScratchFolder scratch_;
+};
+
+// A file group descriptor of the given names and attributes, wide or ANSI.
+Bytes FileGroupBlock(const std::vector<std::pair<std::wstring, DWORD>>& entries, bool wide) {
+    const size_t recordSize = wide ? sizeof(FILEDESCRIPTORW) : sizeof(FILEDESCRIPTORA);
+    Bytes block(sizeof(UINT) + recordSize * entries.size());
+    *reinterpret_cast<UINT*>(block.data()) = static_cast<UINT>(entries.size());
+    for (size_t index = 0; index < entries.size(); ++index) {
+        uint8_t* record = block.data() + sizeof(UINT) + recordSize * index;
+        if (wide) {
+            auto* descriptor = reinterpret_cast<FILEDESCRIPTORW*>(record);
+            descriptor->dwFileAttributes = entries[index].second;
+            wcsncpy(descriptor->cFileName, entries[index].first.c_str(), MAX_PATH - 1);
+        } else {
+            auto* descriptor = reinterpret_cast<FILEDESCRIPTORA*>(record);
+            descriptor->dwFileAttributes = entries[index].second;
+            for (size_t c = 0; c < entries[index].first.size(); ++c)
+                descriptor->cFileName[c] = static_cast<char>(entries[index].first[c]);
+        }
+    }
+    return block;
+}
+
+TEST_F(SourceParserTest, DroppedFilesAreEachTheirOwnRoot) {
+    const std::wstring first = scratch_.File(L"a.lv");
+    const std::wstring second = scratch_.File(L"b.txt");
+    auto data = MakeComObject<BlockDataObject>();
+    data->blocks[CF_HDROP] = DropFilesBlock({first, second});
+    EXPECT_EQ(S_OK, AcceptDropSource(data.Get()));
+    EXPECT_EQ((std::vector<TSourceDescriptor>{{first, first, 0}, {second, second, 0}}),
+              Parse(data.Get()));
+}
+
+TEST_F(SourceParserTest, AShortcutToAFolderWalksItWithTheFolderAsRoot) {
+    const std::wstring target = scratch_.Folder(L"survey");
+    const std::wstring inner = scratch_.File(L"survey\\day1.lv");
+    scratch_.Folder(L"survey\\old");
+    const std::wstring nested = scratch_.File(L"survey\\old\\day0.lv");
+    // A shortcut back to the folder's parent inside it: the walk must still end.
+    scratch_.Shortcut(L"survey\\up.lnk", scratch_.Path());
+    const std::wstring link = scratch_.Shortcut(L"survey.lnk", target);
+    // A shortcut whose target is gone is dropped as the file it is.
+    const std::wstring gone = scratch_.Shortcut(L"gone.lnk", scratch_.File(L"temporary.lv"));
+    ::DeleteFileW((scratch_.Path() + L"\\temporary.lv").c_str());
+    auto data = MakeComObject<BlockDataObject>();
+    data->blocks[CF_HDROP] = DropFilesBlock({link, gone});
+    TSourceParser parser(true);
+    EXPECT_EQ(S_OK, parser.ParseDataObject(data.Get(), L"", true));
+    std::vector<TSourceDescriptor> sources = *parser.Sources();
+    ASSERT_GE(sources.size(), 3u);
+    EXPECT_EQ((TSourceDescriptor{target, inner, 0}), sources[0]);
+    EXPECT_EQ((TSourceDescriptor{target, nested, 0}), sources[1]);
+    EXPECT_EQ((TSourceDescriptor{gone, gone, 0}), sources.back());
+    // Each file once, however the shortcut inside loops back.
+    const auto count = [&](const std::wstring& path) {
+        return std::count_if(sources.begin(), sources.end(),
+                             [&](const TSourceDescriptor& source) { return source.path == path; });
+    };
+    EXPECT_EQ(1, count(inner));
+    EXPECT_EQ(1, count(nested));
+    EXPECT_GE(parser.FolderCount(), 2u);
+}
+
+TEST_F(SourceParserTest, FileGroupsSkipDirectoriesAndKeepTheIndexes) {
+    for (bool wide : {true, false}) {
+        auto data = MakeComObject<BlockDataObject>();
+        data->blocks[Format(wide ? CFSTR_FILEDESCRIPTORW : CFSTR_FILEDESCRIPTORA)] = FileGroupBlock(
+            {{L"one.lv", 0}, {L"folder", FILE_ATTRIBUTE_DIRECTORY}, {L"two.lv", 0}}, wide);
+        EXPECT_EQ((std::vector<TSourceDescriptor>{{L"", L"one.lv", 0}, {L"", L"two.lv", 2}}),
+                  Parse(data.Get()))
+            << wide;
+    }
+}
+
+TEST_F(SourceParserTest, DropSourcesAreAcceptedByTheirFormats) {
+    const struct {
+        const char* what;
+        std::vector<CLIPFORMAT> formats;
+        bool contents;
+        HRESULT expected;
+    } cases[] = {
+        {"files", {CF_HDROP}, false, S_OK},
+        {"shell items", {Format(CFSTR_SHELLIDLIST)}, false, S_OK},
+        {"virtual files with contents", {Format(CFSTR_FILEDESCRIPTORW)}, true, S_OK},
+        {"virtual files without contents", {Format(CFSTR_FILEDESCRIPTORW)}, false, E_INVALIDARG},
+        {"text", {CF_UNICODETEXT}, false, E_INVALIDARG},
+    };
+    for (const auto& c : cases) {
+        auto data = MakeComObject<BlockDataObject>();
+        for (CLIPFORMAT format : c.formats)
+            data->blocks[format] = Bytes(8);
+        data->contents = c.contents;
+        EXPECT_EQ(c.expected, AcceptDropSource(data.Get())) << c.what;
+    }
+}
+
+TEST_F(SourceParserTest, ShellItemsUnderARealFolderAreParsedAsTheirFiles) {
+    const std::wstring first = scratch_.File(L"x.lv");
+    const std::wstring second = scratch_.File(L"y.lv");
+    PIDLIST_ABSOLUTE folder = nullptr, one = nullptr, two = nullptr;
+    ASSERT_EQ(S_OK, ::SHParseDisplayName(scratch_.Path().c_str(), nullptr, &folder, 0, nullptr));
+    ASSERT_EQ(S_OK, ::SHParseDisplayName(first.c_str(), nullptr, &one, 0, nullptr));
+    ASSERT_EQ(S_OK, ::SHParseDisplayName(second.c_str(), nullptr, &two, 0, nullptr));
+    auto data = MakeComObject<BlockDataObject>();
+    data->blocks[Format(CFSTR_SHELLIDLIST)] =
+        IdListArrayBlock(folder, {::ILFindLastID(one), ::ILFindLastID(two)});
+    ::ILFree(folder);
+    ::ILFree(one);
+    ::ILFree(two);
+    EXPECT_EQ((std::vector<TSourceDescriptor>{{first, first, 0}, {second, second, 0}}),
+              Parse(data.Get()));
+    // Not deep: shell items are not opened, and a source with nothing else gives nothing.
+    EXPECT_TRUE(Parse(data.Get(), DV_E_FORMATETC, false).empty());
+}
+
+TEST_F(SourceParserTest, TheDataObjectCanBeFetchedOnceOnAnotherThread) {
+    auto data = MakeComObject<BlockDataObject>();
+    data->blocks[CF_HDROP] = DropFilesBlock({scratch_.File(L"z.lv")});
+    TSourceParser parser(true);
+    ComPtr<IDataObject> none;
+    EXPECT_EQ(S_FALSE, parser.GetDataObject(&none));
+    ASSERT_EQ(S_OK, parser.ParseDataObject(data.Get(), L"", true));
+    HRESULT first = E_FAIL, second = E_FAIL, query = E_FAIL;
+    UniqueHandle finished(::CreateEventW(nullptr, TRUE, FALSE, nullptr));
+    std::thread worker([&] {
+        ::CoInitializeEx(nullptr, COINIT_MULTITHREADED);
+        {
+            ComPtr<IDataObject> fetched, again;
+            first = parser.GetDataObject(&fetched);
+            FORMATETC format{CF_HDROP, nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
+            if (fetched)
+                query = fetched->QueryGetData(&format);
+            second = parser.GetDataObject(&again);
+        }
+        ::CoUninitialize();
+        ::SetEvent(finished.get());
+    });
+    // The proxy calls back into this apartment: keep its messages flowing.
+    const HANDLE waitFor = finished.get();
+    while (::MsgWaitForMultipleObjects(1, &waitFor, FALSE, 5000, QS_ALLINPUT) ==
+           WAIT_OBJECT_0 + 1) {
+        MSG message;
+        while (::PeekMessageW(&message, nullptr, 0, 0, PM_REMOVE))
+            ::DispatchMessageW(&message);
+    }
+    worker.join();
+    EXPECT_EQ(S_OK, first);
+    EXPECT_EQ(S_OK, query);
+    EXPECT_EQ(S_FALSE, second);
+    EXPECT_EQ(E_INVALIDARG, parser.GetDataObject(nullptr));
+}
+
+TEST_F(SourceParserTest, BlocksThatLieAreReadOnlyWithinThemselves) {
+    const std::wstring real = scratch_.File(L"real.lv");
+    Bytes dropFiles = DropFilesBlock({real});
+    Bytes pastTheEnd = dropFiles;
+    reinterpret_cast<DROPFILES*>(pastTheEnd.data())->pFiles = 4096;
+    Bytes unterminated = dropFiles;
+    unterminated.resize(unterminated.size() - 6);  // the last path loses its end
+    Bytes group = FileGroupBlock({{L"a.lv", 0}}, true);
+    *reinterpret_cast<UINT*>(group.data()) = 100000;  // far more records than the block holds
+    const struct {
+        const char* what;
+        CLIPFORMAT format;
+        Bytes block;
+        size_t sources;
+    } cases[] = {
+        {"file list offset past the block", CF_HDROP, pastTheEnd, 0},
+        {"file list without terminators", CF_HDROP, unterminated, 0},
+        {"file group announcing too many records", Format(CFSTR_FILEDESCRIPTORW), group, 1},
+    };
+    for (const auto& c : cases) {
+        auto data = MakeComObject<BlockDataObject>();
+        data->blocks[c.format] = c.block;
+        TSourceParser parser(true);
+        (void)parser.ParseDataObject(data.Get(), L"", true);
+        EXPECT_EQ(c.sources, parser.Sources()->size()) << c.what;
+    }
+}
+
+TEST_F(SourceParserTest, ANullSourceAndAFailedMarshallingAreWrittenToTheErrorLog) {
+    ::SetEnvironmentVariableW(L"LVSHELLEXT_LOG_DIR", scratch_.Path().c_str());
+    TSourceParser parser(true);
+    EXPECT_EQ(E_INVALIDARG, parser.ParseDataObject(nullptr, L"", true));
+    auto refusing = MakeComObject<BlockDataObject>();
+    refusing->refuseMarshalling = true;
+    const HRESULT marshalling = parser.ParseDataObject(refusing.Get(), L"", true);
+    EXPECT_TRUE(FAILED(marshalling));
+    const std::wstring log = ErrorLogPath();
+    ::SetEnvironmentVariableW(L"LVSHELLEXT_LOG_DIR", nullptr);
+
+    UniqueFileHandle file(::CreateFileW(log.c_str(), GENERIC_READ, FILE_SHARE_READ, nullptr,
+                                        OPEN_EXISTING, 0, nullptr));
+    ASSERT_TRUE(file);
+    std::wstring text(::GetFileSize(file.get(), nullptr) / sizeof(wchar_t), L'\0');
+    DWORD read = 0;
+    ::ReadFile(file.get(), text.data(), static_cast<DWORD>(text.size() * sizeof(wchar_t)), &read,
+               nullptr);
+    wchar_t expected[128];
+    EXPECT_NE(std::wstring::npos,
+              text.find(L"SourceParser - 0x80070057 (TSourceParser::ParseDataObject, 57)"));
+    swprintf(expected, 128, L"SourceParser - 0x%08X (TSourceParser::ParseDataObject, 64)",
+             static_cast<unsigned>(marshalling));
+    EXPECT_NE(std::wstring::npos, text.find(expected)) << "in the log: " << text.size();
+}
+
+}  // namespace

@@ -1,0 +1,354 @@
+// The dropped sources: the blocks a drag source hands over are read only within their real size,
+// shortcuts are resolved through the shell link object, and folders are walked.
+#include "view/source_parser.h"
+
+#include <shlwapi.h>
+
+#include "support/error_handling.h"
+#include "support/unique_resource.h"
+#include "view/portable/drop_blocks.h"
+
+namespace {
+
+constexpr wchar_t kSource[] = L"SourceParser";
+constexpr DWORD kLongPathCapacity = 32768;
+
+FORMATETC HGlobalFormat(CLIPFORMAT format) {
+    return FORMATETC{format, nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
+}
+
+CLIPFORMAT RegisteredFormat(const wchar_t* name) {
+    return static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(name));
+}
+
+// Results of several sources: S_OK when any succeeded, else the last failure, else S_OK.
+class CombinedResult {
+public:
+    void Add(HRESULT result) noexcept {
+        if (result == S_OK)
+            anySucceeded_ = true;
+        else if (result != S_FALSE)
+            lastFailure_ = result;
+    }
+    HRESULT Value() const noexcept { return anySucceeded_ ? S_OK : lastFailure_; }
+
+private:
+    bool anySucceeded_ = false;
+    HRESULT lastFailure_ = S_OK;
+};
+
+// A medium owned for one scope.
+class OwnedMedium {
+public:
+    OwnedMedium() noexcept = default;
+    OwnedMedium(const OwnedMedium&) = delete;
+    OwnedMedium& operator=(const OwnedMedium&) = delete;
+    ~OwnedMedium() { ::ReleaseStgMedium(&medium_); }
+    STGMEDIUM* put() noexcept { return &medium_; }
+    HGLOBAL global() const noexcept {
+        return medium_.tymed == TYMED_HGLOBAL ? medium_.hGlobal : nullptr;
+    }
+
+private:
+    STGMEDIUM medium_{};
+};
+
+// 8-bit names through the system's ANSI code page, as the source wrote them.
+WideString WidenAnsi(std::string_view bytes) {
+    if (bytes.empty())
+        return {};
+    const int length =
+        ::MultiByteToWideChar(CP_ACP, 0, bytes.data(), static_cast<int>(bytes.size()), nullptr, 0);
+    WideString wide(static_cast<size_t>(length > 0 ? length : 0), L'\0');
+    if (length > 0)
+        ::MultiByteToWideChar(CP_ACP, 0, bytes.data(), static_cast<int>(bytes.size()), wide.data(),
+                              length);
+    return wide;
+}
+
+std::wstring DirectoryPart(const std::wstring& path) {
+    const size_t separator = path.find_last_of(L"\\/");
+    return separator == std::wstring::npos ? std::wstring() : path.substr(0, separator);
+}
+
+std::wstring FileSystemPath(PCIDLIST_ABSOLUTE item) {
+    std::wstring path(kLongPathCapacity, L'\0');
+    if (!::SHGetPathFromIDListEx(item, path.data(), kLongPathCapacity, GPFIDL_DEFAULT))
+        return {};
+    path.resize(wcsnlen(path.c_str(), kLongPathCapacity));
+    return path;
+}
+
+struct IdListTraits {
+    using Type = PIDLIST_ABSOLUTE;
+    static Type Invalid() noexcept { return nullptr; }
+    static void Close(Type value) noexcept { ::ILFree(value); }
+};
+using UniqueIdList = UniqueResource<IdListTraits>;
+
+}  // namespace
+
+TSourceParser::TSourceParser(bool recurse) noexcept
+    : sources_(std::make_shared<TSourceList>()), recurse_(recurse) {}
+
+TSourceParser::~TSourceParser() {
+    // A stream never unmarshalled still holds the data object's marshalling data.
+    if (marshalled_)
+        (void)::CoReleaseMarshalData(marshalled_.Get());
+}
+
+void TSourceParser::Add(const std::wstring& rootPath, const std::wstring& path, uint32_t index) {
+    sources_->push_back({rootPath, path, index});
+    ++fileCount_;
+}
+
+HRESULT TSourceParser::ParseDataObject(IDataObject* dataObject, const std::wstring& rootPath,
+                                       bool deep) {
+    cancelled_ = false;
+    if (!dataObject) {
+        ReportError(kSource, E_INVALIDARG, L"TSourceParser::ParseDataObject", 57);
+        return E_INVALIDARG;
+    }
+    if (!marshalledOnce_) {
+        const HRESULT marshalled = ::CoMarshalInterThreadInterfaceInStream(
+            IID_IDataObject, dataObject, marshalled_.ReleaseAndGetAddressOf());
+        if (FAILED(marshalled)) {
+            ReportError(kSource, marshalled, L"TSourceParser::ParseDataObject", 64);
+            return marshalled;
+        }
+        marshalledOnce_ = true;
+    }
+    // Some sources render lazily and want their formats asked for once before any data.
+    Microsoft::WRL::ComPtr<IEnumFORMATETC> formats;
+    if (SUCCEEDED(dataObject->EnumFormatEtc(DATADIR_GET, &formats)) && formats) {
+        FORMATETC format{};
+        while (formats->Next(1, &format, nullptr) == S_OK) {
+            if (format.ptd)
+                ::CoTaskMemFree(format.ptd);
+        }
+    }
+
+    FORMATETC dropFiles = HGlobalFormat(CF_HDROP);
+    if (dataObject->QueryGetData(&dropFiles) == S_OK)
+        return ParseDropFiles(dataObject, dropFiles);
+
+    std::wstring root = rootPath;
+    FORMATETC items = HGlobalFormat(RegisteredFormat(CFSTR_SHELLIDLIST));
+    const bool offersItems = dataObject->QueryGetData(&items) == S_OK;
+    if (root.empty() && offersItems)
+        (void)ParseItemArray(dataObject, items, true, root);  // a failure leaves the root empty
+
+    FORMATETC ansiGroup = HGlobalFormat(RegisteredFormat(CFSTR_FILEDESCRIPTORA));
+    if (dataObject->QueryGetData(&ansiGroup) == S_OK)
+        return ParseFileGroup(dataObject, ansiGroup, false, root);
+    FORMATETC wideGroup = HGlobalFormat(RegisteredFormat(CFSTR_FILEDESCRIPTORW));
+    const HRESULT offersWideGroup = dataObject->QueryGetData(&wideGroup);
+    if (offersWideGroup == S_OK)
+        return ParseFileGroup(dataObject, wideGroup, true, root);
+    if (deep && offersItems)
+        return ParseItemArray(dataObject, items, false, root);
+    return offersWideGroup;
+}
+
+HRESULT TSourceParser::ParseDropFiles(IDataObject* dataObject, const FORMATETC& format) {
+    FORMATETC request = format;
+    OwnedMedium medium;
+    RETURN_IF_FAILED(dataObject->GetData(&request, medium.put()));
+    GlobalLockGuard lock(medium.global());
+    RETURN_HR_IF(E_INVALIDARG, !lock.data());
+    const std::vector<WideString> paths =
+        ReadDropFilePaths(static_cast<const uint8_t*>(lock.data()), lock.size(), WidenAnsi);
+    CombinedResult result;
+    for (const WideString& path : paths) {
+        if (cancelled_)
+            break;
+        result.Add(ParsePath(path, path));
+    }
+    return result.Value();
+}
+
+HRESULT TSourceParser::ParseFileGroup(IDataObject* dataObject, const FORMATETC& format, bool wide,
+                                      const std::wstring& rootPath) {
+    FORMATETC request = format;
+    OwnedMedium medium;
+    RETURN_IF_FAILED(dataObject->GetData(&request, medium.put()));
+    GlobalLockGuard lock(medium.global());
+    RETURN_HR_IF(E_INVALIDARG, !lock.data());
+    for (const FileGroupEntry& entry : ReadFileGroupDescriptors(
+             static_cast<const uint8_t*>(lock.data()), lock.size(), wide, WidenAnsi)) {
+        // Directories come with their files listed after them; only the files are sources.
+        if (entry.attributes & FILE_ATTRIBUTE_DIRECTORY)
+            continue;
+        Add(rootPath, entry.name, entry.index);
+    }
+    return S_OK;
+}
+
+HRESULT TSourceParser::ParseItemArray(IDataObject* dataObject, const FORMATETC& format,
+                                      bool rootOnly, std::wstring& rootPath) {
+    FORMATETC request = format;
+    OwnedMedium medium;
+    RETURN_IF_FAILED(dataObject->GetData(&request, medium.put()));
+    GlobalLockGuard lock(medium.global());
+    RETURN_HR_IF(E_INVALIDARG, !lock.data());
+    const IdListArray array =
+        ReadIdListArray(static_cast<const uint8_t*>(lock.data()), lock.size());
+    RETURN_HR_IF(E_INVALIDARG, array.parent.empty());
+    const auto parent = reinterpret_cast<PCIDLIST_ABSOLUTE>(array.parent.data());
+    if (rootOnly) {
+        RETURN_HR_IF(E_INVALIDARG, array.children.empty());
+        UniqueIdList first(::ILCombine(
+            parent, reinterpret_cast<PCUIDLIST_RELATIVE>(array.children.front().list.data())));
+        RETURN_IF_NULL_ALLOC(first.get());
+        rootPath = DirectoryPart(FileSystemPath(first.get()));
+        return S_OK;
+    }
+    CombinedResult result;
+    for (const IdListArrayChild& child : array.children) {
+        if (cancelled_)
+            break;
+        result.Add(ParsePIDL(parent, reinterpret_cast<PCUITEMID_CHILD>(child.list.data())));
+    }
+    return result.Value();
+}
+
+HRESULT TSourceParser::ParsePIDL(PCIDLIST_ABSOLUTE parent, PCUITEMID_CHILD child) {
+    Microsoft::WRL::ComPtr<IShellFolder> desktop;
+    Microsoft::WRL::ComPtr<IShellFolder> folder;
+    HRESULT result = ::SHGetDesktopFolder(&desktop);
+    if (SUCCEEDED(result)) {
+        // The desktop's own list is empty: its items need no bind.
+        result = ::ILIsEmpty(parent)
+                     ? desktop.CopyTo(folder.GetAddressOf())
+                     : desktop->BindToObject(parent, nullptr, IID_PPV_ARGS(&folder));
+    }
+    if (FAILED(result)) {
+        ReportError(kSource, result, L"TSourceParser::ParsePIDL", 390);
+        return result;
+    }
+    UniqueIdList item(::ILCombine(parent, child));
+    RETURN_IF_NULL_ALLOC(item.get());
+    const std::wstring path = FileSystemPath(item.get());
+    if (!path.empty())
+        return ParsePath(path, path);
+
+    // A virtual item: its own data object says what it holds, one level deep only.
+    STRRET name{};
+    wchar_t itemName[MAX_PATH] = {};
+    if (SUCCEEDED(folder->GetDisplayNameOf(child, SHGDN_FORPARSING, &name)))
+        (void)::StrRetToBufW(&name, child, itemName, ARRAYSIZE(itemName));
+    Microsoft::WRL::ComPtr<IDataObject> itemData;
+    result = folder->GetUIObjectOf(nullptr, 1, &child, IID_IDataObject, nullptr,
+                                   reinterpret_cast<void**>(itemData.GetAddressOf()));
+    if (FAILED(result)) {
+        ReportError(kSource, result, L"TSourceParser::ParsePIDL", 412);
+        return result;
+    }
+    return ParseDataObject(itemData.Get(), DirectoryPart(itemName), false);
+}
+
+HRESULT TSourceParser::ParsePath(const std::wstring& path, const std::wstring& rootPath) {
+    for (const std::wstring& pattern : filter_) {
+        if (::PathMatchSpecW(path.c_str(), pattern.c_str()))
+            return S_OK;
+    }
+    const DWORD attributes = ::GetFileAttributesW(path.c_str());
+    if (attributes == INVALID_FILE_ATTRIBUTES) {
+        const HRESULT result = LastErrorResult();
+        ReportError(kSource, result, L"TSourceParser::ParsePath", 330, path.c_str());
+        return result;
+    }
+    if (attributes & FILE_ATTRIBUTE_DIRECTORY)
+        return ParseFolder(path, rootPath);
+    if (::CompareStringOrdinal(::PathFindExtensionW(path.c_str()), -1, L".LNK", -1, TRUE) ==
+        CSTR_EQUAL) {
+        bool parsed = false;
+        const HRESULT result = ParseShortcut(path, parsed);
+        if (parsed)
+            return result;
+    }
+    if (cancelled_)
+        return S_FALSE;
+    Add(rootPath, path, 0);
+    return S_OK;
+}
+
+// parsed false: the shortcut could not be followed and counts as a plain file.
+HRESULT TSourceParser::ParseShortcut(const std::wstring& path, bool& parsed) {
+    parsed = false;
+    if (depth_ >= kMaximumSourceDepth)
+        return S_OK;
+    Microsoft::WRL::ComPtr<IShellLinkW> link;
+    Microsoft::WRL::ComPtr<IPersistFile> file;
+    if (FAILED(::CoCreateInstance(CLSID_ShellLink, nullptr, CLSCTX_INPROC_SERVER,
+                                  IID_PPV_ARGS(&link))) ||
+        FAILED(link.As(&file)) || FAILED(file->Load(path.c_str(), 0)) ||
+        FAILED(link->Resolve(nullptr, 0)))
+        return S_OK;
+    wchar_t target[MAX_PATH] = {};
+    ++depth_;
+    HRESULT result = S_OK;
+    if (SUCCEEDED(link->GetPath(target, ARRAYSIZE(target), nullptr, 0)) && target[0]) {
+        // A target that is gone leaves the shortcut itself as the source.
+        if (::GetFileAttributesW(target) != INVALID_FILE_ATTRIBUTES) {
+            parsed = true;
+            result = ParsePath(target, target);
+        }
+    } else {
+        PIDLIST_ABSOLUTE raw = nullptr;
+        if (SUCCEEDED(link->GetIDList(&raw)) && raw) {
+            UniqueIdList parent(raw);
+            UniqueIdList child(reinterpret_cast<PIDLIST_ABSOLUTE>(::ILClone(::ILFindLastID(parent.get()))));
+            if (child && ::ILRemoveLastID(parent.get())) {
+                parsed = true;
+                result = ParsePIDL(parent.get(), reinterpret_cast<PCUITEMID_CHILD>(child.get()));
+            }
+        }
+    }
+    --depth_;
+    return result;
+}
+
+HRESULT TSourceParser::ParseFolder(const std::wstring& path, const std::wstring& rootPath) {
+    // A folder reached again (through a shortcut to itself or a parent) or too deep is not
+    // walked again: the walk must end.
+    std::wstring key(path);
+    ::CharUpperBuffW(key.data(), static_cast<DWORD>(key.size()));
+    if (depth_ >= kMaximumSourceDepth || !walkedFolders_.insert(key).second)
+        return S_OK;
+    ++folderCount_;
+    WIN32_FIND_DATAW found{};
+    const std::wstring pattern = path + L"\\*";
+    struct FindTraits {
+        using Type = HANDLE;
+        static Type Invalid() noexcept { return INVALID_HANDLE_VALUE; }
+        static void Close(Type value) noexcept { ::FindClose(value); }
+    };
+    UniqueResource<FindTraits> search(::FindFirstFileW(pattern.c_str(), &found));
+    if (!search)
+        return S_OK;  // nothing in it
+    ++depth_;
+    CombinedResult result;
+    do {
+        const std::wstring name = found.cFileName;
+        if (name == L"." || name == L"..")
+            continue;
+        if ((found.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) && !recurse_)
+            continue;
+        result.Add(ParsePath(path + L"\\" + name, rootPath));
+    } while (!cancelled_ && ::FindNextFileW(search.get(), &found));
+    --depth_;
+    return result.Value();
+}
+
+HRESULT TSourceParser::GetDataObject(IDataObject** dataObject) {
+    if (!dataObject) {
+        ReportError(kSource, E_INVALIDARG, L"TSourceParser::GetDataObject", 249);
+        return E_INVALIDARG;
+    }
+    *dataObject = nullptr;
+    if (!marshalled_)
+        return S_FALSE;
+    // The stream is used up by this: the object can be fetched once.
+    return ::CoGetInterfaceAndReleaseStream(marshalled_.Detach(), IID_PPV_ARGS(dataObject));
+}

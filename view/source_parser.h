@@ -1,0 +1,79 @@
+// TSourceParser: turns a dropped data object into the flat list of its sources (files on disk
+// with shortcuts resolved and folders walked, virtual files of a file group descriptor, and shell
+// items), for a sending feature to work through later, on another thread if it likes.
+#pragma once
+
+#include <windows.h>
+#include <objidl.h>
+#include <shlobj.h>
+#include <wrl/client.h>
+
+#include <cstdint>
+#include <memory>
+#include <set>
+#include <string>
+#include <vector>
+
+struct TSourceDescriptor {
+    std::wstring rootPath;  // where the source was found
+    std::wstring path;      // full path on disk, or a virtual file's name
+    uint32_t index = 0;     // a virtual file's lindex for "FileContents"; 0 for files on disk
+
+    bool operator==(const TSourceDescriptor&) const = default;
+};
+
+using TSourceList = std::vector<TSourceDescriptor>;
+
+class TSourceParser {
+public:
+    // Subfolders are walked only with recurse set.
+    explicit TSourceParser(bool recurse) noexcept;
+    TSourceParser(const TSourceParser&) = delete;
+    TSourceParser& operator=(const TSourceParser&) = delete;
+    ~TSourceParser();
+
+    // Appends the data object's sources. rootPath empty: found from the object's item IDs when it
+    // offers them; deep false stops at virtual items (their own data objects are not opened).
+    HRESULT ParseDataObject(IDataObject* dataObject, const std::wstring& rootPath, bool deep);
+    // The first parsed data object, for use on another thread: once. S_FALSE before any parse.
+    HRESULT GetDataObject(IDataObject** dataObject);
+    HRESULT ParsePath(const std::wstring& path, const std::wstring& rootPath);
+    // A shell item given as its parent folder (absolute) and its own ID.
+    HRESULT ParsePIDL(PCIDLIST_ABSOLUTE parent, PCUITEMID_CHILD child);
+
+    // Wildcard patterns (as in "*.tmp") of paths to leave out; none by default.
+    void SetPathFilter(std::vector<std::wstring> patterns) { filter_ = std::move(patterns); }
+
+    // Shared, so that the list can outlive the parser.
+    std::shared_ptr<TSourceList> Sources() const noexcept { return sources_; }
+    uint32_t FileCount() const noexcept { return fileCount_; }
+    uint32_t FolderCount() const noexcept { return folderCount_; }
+    void Cancel() noexcept { cancelled_ = true; }
+    bool Cancelled() const noexcept { return cancelled_; }
+
+private:
+    HRESULT ParseDropFiles(IDataObject* dataObject, const FORMATETC& format);
+    HRESULT ParseFileGroup(IDataObject* dataObject, const FORMATETC& format, bool wide,
+                           const std::wstring& rootPath);
+    HRESULT ParseItemArray(IDataObject* dataObject, const FORMATETC& format, bool rootOnly,
+                           std::wstring& rootPath);
+    HRESULT ParseShortcut(const std::wstring& path, bool& parsed);
+    HRESULT ParseFolder(const std::wstring& path, const std::wstring& rootPath);
+    void Add(const std::wstring& rootPath, const std::wstring& path, uint32_t index);
+
+    std::shared_ptr<TSourceList> sources_;
+    std::vector<std::wstring> filter_;
+    bool recurse_;
+    uint32_t fileCount_ = 0;
+    uint32_t folderCount_ = 0;
+    Microsoft::WRL::ComPtr<IStream> marshalled_;
+    bool marshalledOnce_ = false;
+    bool cancelled_ = false;
+    // Shortcuts can point back up the tree: each folder is walked once per parser, and nesting
+    // stops at a fixed depth.
+    std::set<std::wstring> walkedFolders_;
+    int depth_ = 0;
+};
+
+// Folders and shortcuts nest at most this deep below a dropped source.
+inline constexpr int kMaximumSourceDepth = 64;
