@@ -147,6 +147,28 @@ TEST(DropBlocks, IdListArrayKeepsOnlyListsWhollyInsideTheBlock) {
     }
 }
 
+TEST(DropBlocks, ChildrenThatAllNameOneLongListCostNoMoreThanABudget) {
+    // A list of 999 empty items, and 2,000 children whose offsets all point at it.
+    Bytes list;
+    for (int item = 0; item < 999; ++item)
+        list.insert(list.end(), {2, 0});
+    list.insert(list.end(), {0, 0});
+    const uint32_t children = 2000;
+    Bytes block(4 + 4 * (children + 1), 0);
+    const uint32_t listOffset = static_cast<uint32_t>(block.size());
+    WriteU32(block.data(), children);
+    for (uint32_t i = 0; i <= children; ++i)
+        WriteU32(block.data() + 4 + 4 * i, listOffset);
+    block.insert(block.end(), list.begin(), list.end());
+    const IdListArray array = ReadIdListArray(block.data(), block.size());
+    size_t copied = 0;
+    for (const IdListArrayChild& child : array.children)
+        copied += child.list.size();
+    EXPECT_FALSE(array.children.empty());
+    EXPECT_LE(copied, 5 * block.size());
+    EXPECT_LT(array.children.size(), children);
+}
+
 TEST(DropBlocks, FileGroupReadsOnlyWholeRecordsWithBoundedNames) {
     using Entries = std::vector<FileGroupEntry>;
     const Entries three = {

@@ -9,22 +9,26 @@
 namespace {
 
 // Bytes of the item-ID list at offset, terminator included; 0 when an item's cb is 1, or the list
-// or its terminator leaves the block.
-size_t IdListLength(const uint8_t* block, size_t blockSize, size_t offset) {
+// or its terminator leaves the block. walked grows by the bytes stepped over, whatever the result.
+size_t IdListLength(const uint8_t* block, size_t blockSize, size_t offset, size_t& walked) {
     size_t position = offset;
     while (position <= blockSize && blockSize - position >= 2) {
         const size_t cb = ReadU16(block + position);
-        if (cb == 0)
+        if (cb == 0) {
+            walked += position + 2 - offset;
             return position + 2 - offset;
+        }
         if (cb < 2 || cb > blockSize - position)
-            return 0;
+            break;
         position += cb;
     }
+    walked += position - offset;
     return 0;
 }
 
-std::vector<uint8_t> IdListAt(const uint8_t* block, size_t blockSize, size_t offset) {
-    const size_t length = IdListLength(block, blockSize, offset);
+std::vector<uint8_t> IdListAt(const uint8_t* block, size_t blockSize, size_t offset,
+                              size_t& walked) {
+    const size_t length = IdListLength(block, blockSize, offset, walked);
     if (length == 0)
         return {};
     return std::vector<uint8_t>(block + offset, block + offset + length);
@@ -77,17 +81,22 @@ IdListArray ReadIdListArray(const uint8_t* block, size_t blockSize) {
     IdListArray array;
     if (!block || blockSize < sizeof(IdListArrayHeader))
         return array;
-    array.parent =
-        IdListAt(block, blockSize, ReadU32(block + offsetof(IdListArrayHeader, parentOffset)));
+    size_t walked = 0;
+    array.parent = IdListAt(block, blockSize,
+                            ReadU32(block + offsetof(IdListArrayHeader, parentOffset)), walked);
     if (array.parent.empty())
         return array;
     // Only the offsets that lie inside the block are read, whatever cidl claims.
     const size_t fittingChildren = (blockSize - sizeof(IdListArrayHeader)) / 4;
     const size_t childCount =
         std::min<size_t>(ReadU32(block + offsetof(IdListArrayHeader, childCount)), fittingChildren);
-    for (size_t index = 0; index < childCount; ++index) {
+    // The lists of a real array lie side by side, so together they are no longer than the block.
+    // Offsets that all point at one long list would make every child a copy of it: reading
+    // stops once the lists walked add up to four blocks, which keeps time and memory linear.
+    const size_t budget = 4 * blockSize;
+    for (size_t index = 0; index < childCount && walked <= budget; ++index) {
         const size_t offset = ReadU32(block + sizeof(IdListArrayHeader) + 4 * index);
-        std::vector<uint8_t> list = IdListAt(block, blockSize, offset);
+        std::vector<uint8_t> list = IdListAt(block, blockSize, offset, walked);
         if (!list.empty())
             array.children.push_back({static_cast<uint32_t>(index), std::move(list)});
     }
