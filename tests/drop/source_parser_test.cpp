@@ -86,6 +86,24 @@ TEST_F(SourceParserTest, AShortcutToAFolderWalksItWithTheFolderAsRoot) {
     EXPECT_GE(parser.FolderCount(), 2u);
 }
 
+TEST_F(SourceParserTest, AVeryDeepFolderIsWalkedDownToTheDepthLimitOnly) {
+    std::wstring relative = L"deep";
+    scratch_.Folder(relative);
+    std::wstring shallow, tooDeep;
+    for (int depth = 1; depth <= kMaximumSourceDepth + 4; ++depth) {
+        relative += L"\\d";
+        scratch_.Folder(relative);
+        if (depth == 8)
+            shallow = scratch_.File(relative + L"\\near.lv");
+    }
+    tooDeep = scratch_.File(relative + L"\\far.lv");
+    auto data = MakeComObject<BlockDataObject>();
+    const std::wstring top = scratch_.Path() + L"\\deep";
+    data->blocks[CF_HDROP] = DropFilesBlock({top});
+    EXPECT_EQ((std::vector<TSourceDescriptor>{{top, shallow, 0}}), Parse(data.Get()))
+        << "beyond the limit: " << tooDeep.size();
+}
+
 TEST_F(SourceParserTest, FileGroupsSkipDirectoriesAndKeepTheIndexes) {
     for (bool wide : {true, false}) {
         auto data = MakeComObject<BlockDataObject>();
