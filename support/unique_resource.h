@@ -4,6 +4,7 @@
 #include <windows.h>
 #include <commctrl.h>
 #include <objbase.h>
+#include <shlobj.h>
 
 #include <utility>
 
@@ -117,6 +118,19 @@ struct AcceleratorTraits {
     static void Close(Type value) noexcept { ::DestroyAcceleratorTable(value); }
 };
 
+struct FindHandleTraits {  // FindFirstFileW
+    using Type = HANDLE;
+    static Type Invalid() noexcept { return INVALID_HANDLE_VALUE; }
+    static void Close(Type value) noexcept { ::FindClose(value); }
+};
+
+// An item-ID list that the shell made for its caller (SHParseDisplayName, ILClone, ILCombine).
+struct AbsoluteIdListTraits {
+    using Type = PIDLIST_ABSOLUTE;
+    static Type Invalid() noexcept { return nullptr; }
+    static void Close(Type value) noexcept { ::ILFree(value); }
+};
+
 using UniqueHandle = UniqueResource<HandleTraits>;
 using UniqueFileHandle = UniqueResource<FileHandleTraits>;
 using UniqueRegKey = UniqueResource<RegKeyTraits>;
@@ -129,6 +143,8 @@ using UniqueHModule = UniqueResource<HModuleTraits>;
 using UniqueWindow = UniqueResource<WindowTraits>;  // windows of the thread that made them
 using UniqueMenu = UniqueResource<MenuTraits>;
 using UniqueAccelerators = UniqueResource<AcceleratorTraits>;
+using UniqueFindHandle = UniqueResource<FindHandleTraits>;
+using UniqueAbsoluteIdList = UniqueResource<AbsoluteIdListTraits>;
 
 // Keeps a global memory block locked for one scope.
 class GlobalLockGuard {
@@ -162,6 +178,10 @@ public:
         return &medium_;
     }
     const STGMEDIUM& get() const noexcept { return medium_; }
+    // The memory block of a TYMED_HGLOBAL medium; null for any other.
+    HGLOBAL global() const noexcept {
+        return medium_.tymed == TYMED_HGLOBAL ? medium_.hGlobal : nullptr;
+    }
     void reset() noexcept {
         if (medium_.tymed != TYMED_NULL)
             ::ReleaseStgMedium(&medium_);

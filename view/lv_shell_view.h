@@ -18,6 +18,8 @@
 #include "view/shell_view_list_window.h"
 #include "view/view_notify_window.h"
 
+class CLVDataObject;
+
 enum class ViewActivation { Deactivated, ActiveWithoutFocus, ActiveWithFocus };
 
 class CLVShellView final : public ComObject<IShellView, IOleCommandTarget> {
@@ -108,6 +110,10 @@ private:
         PCUITEMID_CHILD item;
     };
     std::vector<SelectedItem> Selection() const;
+    // The selected items with an identifier, added to the data object by their full identifiers;
+    // S_FALSE when the selection held none.
+    HRESULT AddSelectedItems(CLVDataObject& dataObject,
+                             const std::vector<SelectedItem>& selection) const;
     // Items' internal full identifiers: the folder's path, then the item.
     LPITEMIDLIST CreateFullItem(PCUITEMID_CHILD item) const;
     bool IsTopFolder() const noexcept;

@@ -148,18 +148,25 @@ void CLVShellView::CopySelection() {
     if (selection.empty())
         return;
     auto dataObject = MakeComObject<CLVDataObject>();
+    // The entry alone copies nothing, and leaves the clipboard as it was. The clipboard keeps the
+    // object and renders from it on request.
+    if (AddSelectedItems(*dataObject.Get(), selection) == S_OK)
+        (void)::OleSetClipboard(dataObject.Get());
+}
+
+HRESULT CLVShellView::AddSelectedItems(CLVDataObject& dataObject,
+                                       const std::vector<SelectedItem>& selection) const {
     bool added = false;
     for (const SelectedItem& selected : selection) {
         if (!selected.item)
-            continue;  // the entry alone copies nothing, and leaves the clipboard as it was
+            continue;  // the entry is not an item of the folder
         UniquePidl full(CreateFullItem(selected.item));
-        if (!full || FAILED(dataObject->AddItem(reinterpret_cast<PCUIDLIST_RELATIVE>(full.get()))))
-            return;  // a part of the selection on the clipboard would be a lie
+        // Part of the selection on the clipboard or in a drag would be a lie.
+        RETURN_IF_NULL_ALLOC(full.get());
+        RETURN_IF_FAILED(dataObject.AddItem(reinterpret_cast<PCUIDLIST_RELATIVE>(full.get())));
         added = true;
     }
-    // The clipboard keeps the object and renders from it on request.
-    if (added)
-        (void)::OleSetClipboard(dataObject.Get());
+    return added ? S_OK : S_FALSE;
 }
 
 void CLVShellView::PasteStations() {
@@ -170,14 +177,11 @@ void CLVShellView::PasteStations() {
         return;
     FORMATETC format{static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(kStationListFormat)),
                      nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
-    STGMEDIUM medium{};
-    if (format.cfFormat == 0 || FAILED(clipboard->GetData(&format, &medium)))
+    UniqueStgMedium medium;
+    if (format.cfFormat == 0 || FAILED(clipboard->GetData(&format, medium.put())))
         return;
     std::vector<Station> stations;
-    const HRESULT parsed =
-        medium.tymed == TYMED_HGLOBAL ? ParseStationList(medium.hGlobal, stations) : E_FAIL;
-    ::ReleaseStgMedium(&medium);
-    if (FAILED(parsed))
+    if (!medium.global() || FAILED(ParseStationList(medium.global(), stations)))
         return;
     for (Station& station : stations) {
         // Another program's block may name a station that the folder could neither show nor
@@ -210,11 +214,8 @@ void CLVShellView::BeginDrag() {
     if (selection.empty())
         return;
     auto dataObject = MakeComObject<CLVDataObject>();
-    for (const SelectedItem& selected : selection) {
-        UniquePidl full(CreateFullItem(selected.item));
-        if (!full || FAILED(dataObject->AddItem(reinterpret_cast<PCUIDLIST_RELATIVE>(full.get()))))
-            return;
-    }
+    if (AddSelectedItems(*dataObject.Get(), selection) != S_OK)
+        return;
     POINT origin{};
     const int first = selection.front().index;
     const HIMAGELIST image = reinterpret_cast<HIMAGELIST>(

@@ -37,22 +37,6 @@ private:
     HRESULT lastFailure_ = S_OK;
 };
 
-// A medium owned for one scope.
-class OwnedMedium {
-public:
-    OwnedMedium() noexcept = default;
-    OwnedMedium(const OwnedMedium&) = delete;
-    OwnedMedium& operator=(const OwnedMedium&) = delete;
-    ~OwnedMedium() { ::ReleaseStgMedium(&medium_); }
-    STGMEDIUM* put() noexcept { return &medium_; }
-    HGLOBAL global() const noexcept {
-        return medium_.tymed == TYMED_HGLOBAL ? medium_.hGlobal : nullptr;
-    }
-
-private:
-    STGMEDIUM medium_{};
-};
-
 // 8-bit names through the system's ANSI code page, as the source wrote them.
 WideString WidenAnsi(std::string_view bytes) {
     if (bytes.empty())
@@ -78,13 +62,6 @@ std::wstring FileSystemPath(PCIDLIST_ABSOLUTE item) {
     path.resize(wcsnlen(path.c_str(), kLongPathCapacity));
     return path;
 }
-
-struct IdListTraits {
-    using Type = PIDLIST_ABSOLUTE;
-    static Type Invalid() noexcept { return nullptr; }
-    static void Close(Type value) noexcept { ::ILFree(value); }
-};
-using UniqueIdList = UniqueResource<IdListTraits>;
 
 }  // namespace
 
@@ -152,7 +129,7 @@ HRESULT TSourceParser::ParseDataObject(IDataObject* dataObject, const std::wstri
 
 HRESULT TSourceParser::ParseDropFiles(IDataObject* dataObject, const FORMATETC& format) {
     FORMATETC request = format;
-    OwnedMedium medium;
+    UniqueStgMedium medium;
     RETURN_IF_FAILED(dataObject->GetData(&request, medium.put()));
     GlobalLockGuard lock(medium.global());
     RETURN_HR_IF(E_INVALIDARG, !lock.data());
@@ -170,7 +147,7 @@ HRESULT TSourceParser::ParseDropFiles(IDataObject* dataObject, const FORMATETC& 
 HRESULT TSourceParser::ParseFileGroup(IDataObject* dataObject, const FORMATETC& format, bool wide,
                                       const std::wstring& rootPath) {
     FORMATETC request = format;
-    OwnedMedium medium;
+    UniqueStgMedium medium;
     RETURN_IF_FAILED(dataObject->GetData(&request, medium.put()));
     GlobalLockGuard lock(medium.global());
     RETURN_HR_IF(E_INVALIDARG, !lock.data());
@@ -187,7 +164,7 @@ HRESULT TSourceParser::ParseFileGroup(IDataObject* dataObject, const FORMATETC& 
 HRESULT TSourceParser::ParseItemArray(IDataObject* dataObject, const FORMATETC& format,
                                       bool rootOnly, std::wstring& rootPath) {
     FORMATETC request = format;
-    OwnedMedium medium;
+    UniqueStgMedium medium;
     RETURN_IF_FAILED(dataObject->GetData(&request, medium.put()));
     GlobalLockGuard lock(medium.global());
     RETURN_HR_IF(E_INVALIDARG, !lock.data());
@@ -197,7 +174,7 @@ HRESULT TSourceParser::ParseItemArray(IDataObject* dataObject, const FORMATETC& 
     const auto parent = reinterpret_cast<PCIDLIST_ABSOLUTE>(array.parent.data());
     if (rootOnly) {
         RETURN_HR_IF(E_INVALIDARG, array.children.empty());
-        UniqueIdList first(::ILCombine(
+        UniqueAbsoluteIdList first(::ILCombine(
             parent, reinterpret_cast<PCUIDLIST_RELATIVE>(array.children.front().list.data())));
         RETURN_IF_NULL_ALLOC(first.get());
         rootPath = DirectoryPart(FileSystemPath(first.get()));
@@ -226,7 +203,7 @@ HRESULT TSourceParser::ParsePIDL(PCIDLIST_ABSOLUTE parent, PCUITEMID_CHILD child
         ReportError(kSource, result, L"TSourceParser::ParsePIDL", 390);
         return result;
     }
-    UniqueIdList item(::ILCombine(parent, child));
+    UniqueAbsoluteIdList item(::ILCombine(parent, child));
     RETURN_IF_NULL_ALLOC(item.get());
     const std::wstring path = FileSystemPath(item.get());
     if (!path.empty())
@@ -297,8 +274,8 @@ HRESULT TSourceParser::ParseShortcut(const std::wstring& path, bool& parsed) {
     } else {
         PIDLIST_ABSOLUTE raw = nullptr;
         if (SUCCEEDED(link->GetIDList(&raw)) && raw) {
-            UniqueIdList parent(raw);
-            UniqueIdList child(reinterpret_cast<PIDLIST_ABSOLUTE>(::ILClone(::ILFindLastID(parent.get()))));
+            UniqueAbsoluteIdList parent(raw);
+            UniqueAbsoluteIdList child(reinterpret_cast<PIDLIST_ABSOLUTE>(::ILClone(::ILFindLastID(parent.get()))));
             if (child && ::ILRemoveLastID(parent.get())) {
                 parsed = true;
                 result = ParsePIDL(parent.get(), reinterpret_cast<PCUITEMID_CHILD>(child.get()));
@@ -319,12 +296,7 @@ HRESULT TSourceParser::ParseFolder(const std::wstring& path, const std::wstring&
     ++folderCount_;
     WIN32_FIND_DATAW found{};
     const std::wstring pattern = path + L"\\*";
-    struct FindTraits {
-        using Type = HANDLE;
-        static Type Invalid() noexcept { return INVALID_HANDLE_VALUE; }
-        static void Close(Type value) noexcept { ::FindClose(value); }
-    };
-    UniqueResource<FindTraits> search(::FindFirstFileW(pattern.c_str(), &found));
+    UniqueFindHandle search(::FindFirstFileW(pattern.c_str(), &found));
     if (!search)
         return S_OK;  // nothing in it
     ++depth_;

@@ -23,6 +23,7 @@
 #include "support/module_instance.h"
 #include "support/module_lock.h"
 #include "support/registered_messages.h"
+#include "tests/progress_dialogs/dialog_driver.h"
 #include "tests/stations/station_builders.h"
 #include "tests/support/recording_user_interface.h"
 #include "tests/support/registry_override.h"
@@ -65,8 +66,7 @@ public:
                   }
                   script(sheet);
                   ++handled_;
-                  for (int tries = 0; tries < 250 && ::IsWindow(sheet.frame); ++tries)
-                      ::Sleep(20);
+                  (void)WaitFor([&] { return !::IsWindow(sheet.frame); }, 5000);
               }
           }) {}
     ~SheetUser() { thread_.join(); }
@@ -75,25 +75,17 @@ public:
 private:
     static SheetWindow WaitForSheet(DWORD viewThread) {
         SheetWindow sheet;
-        for (int tries = 0; tries < 500 && !sheet.page; ++tries) {
-            ::Sleep(20);
+        const auto shown = [&] {
             sheet.frame = nullptr;
-            ::EnumThreadWindows(
-                viewThread,
-                [](HWND window, LPARAM found) {
-                    wchar_t className[16] = {};
-                    ::GetClassNameW(window, className, 16);
-                    if (!::IsWindowVisible(window) || std::wstring(className) != L"#32770")
-                        return TRUE;
-                    *reinterpret_cast<HWND*>(found) = window;
-                    return FALSE;
-                },
-                reinterpret_cast<LPARAM>(&sheet.frame));
-            if (sheet.frame)
-                sheet.page = ::FindWindowExW(sheet.frame, nullptr, L"#32770", nullptr);
-            if (sheet.page && !::IsWindowVisible(sheet.page))
-                sheet.page = nullptr;  // the sheet is still setting its page up
-        }
+            ::EnumThreadWindows(viewThread, &FindVisibleDialog,
+                                reinterpret_cast<LPARAM>(&sheet.frame));
+            sheet.page =
+                sheet.frame ? ::FindWindowExW(sheet.frame, nullptr, L"#32770", nullptr) : nullptr;
+            // The page exists before the sheet has finished setting it up: wait until it shows.
+            return sheet.page && ::IsWindowVisible(sheet.page);
+        };
+        if (!WaitFor(shown, 10000))
+            return SheetWindow{};
         ::Sleep(100);
         return sheet;
     }
