@@ -11,6 +11,7 @@
 
 #include <cstring>
 #include <map>
+#include <ostream>
 #include <string>
 #include <vector>
 
@@ -23,6 +24,18 @@ using Bytes = std::vector<uint8_t>;
 
 inline CLIPFORMAT Format(const wchar_t* name) {
     return static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(name));
+}
+
+// Descriptors print as their text in failure messages.
+inline void PrintTo(const TSourceDescriptor& source, std::ostream* out) {
+    const auto narrow = [](const std::wstring& text) {
+        std::string result;
+        for (wchar_t c : text)
+            result += c < 0x80 ? static_cast<char>(c) : '?';
+        return result;
+    };
+    *out << "{\"" << narrow(source.rootPath) << "\", \"" << narrow(source.path) << "\", "
+         << source.index << "}";
 }
 
 // HGLOBAL blocks by format; "FileContents" is announced as a stream when contents is set.

@@ -3,6 +3,8 @@
 #include "tests/view/view_fixture.h"
 
 #include "tests/drop/drop_fixture.h"
+#include "server/class_table.h"
+#include "server/lv_shell_folder.h"
 #include "view/lv_drop_target.h"
 
 namespace {
@@ -81,6 +83,66 @@ TEST_F(ViewDropTest, ADropOnAStationRowIsTheStationsDropAndOneInItsFolderIsRefus
     EXPECT_EQ(L"North", received_[0].first);
     EXPECT_EQ(expected, received_[0].second);
     EXPECT_EQ(expected, received_[1].second);
+}
+
+// The folder class made available to the shell in this process, as registration does for
+// Explorer: the class object through COM, and the class key without which the shell refuses the
+// class before asking COM (E_ACCESSDENIED); the key's values are not read.
+class FolderClassForTheShell {
+public:
+    FolderClassForTheShell() {
+        ComPtr<IClassFactory> factory;
+        EXPECT_EQ(S_OK, GetClassObject(CLSID_LVShellFolder, IID_PPV_ARGS(&factory)));
+        EXPECT_EQ(S_OK, ::CoRegisterClassObject(CLSID_LVShellFolder, factory.Get(),
+                                                CLSCTX_INPROC_SERVER, REGCLS_MULTIPLEUSE,
+                                                &cookie_));
+        EXPECT_EQ(ERROR_SUCCESS, ::RegCreateKeyExW(HKEY_CLASSES_ROOT, kServerKey, 0, nullptr, 0,
+                                                   KEY_WRITE, nullptr, key_.put(), nullptr));
+    }
+    ~FolderClassForTheShell() {
+        (void)::CoRevokeClassObject(cookie_);  // nothing to undo when it was never registered
+        key_.reset();
+        (void)::RegDeleteTreeW(HKEY_CLASSES_ROOT, kClassKey);  // likewise
+    }
+
+private:
+    static constexpr wchar_t kClassKey[] = L"CLSID\\{7D3F2A61-4B8E-4C19-9A27-5E0C81B6D4F3}";
+    static constexpr wchar_t kServerKey[] =
+        L"CLSID\\{7D3F2A61-4B8E-4C19-9A27-5E0C81B6D4F3}\\InprocServer32";
+    DWORD cookie_ = 0;
+    UniqueRegKey key_;
+};
+
+// A station's file dragged from a shell window arrives as a shell item with no file-system path:
+// its own data object is parsed, one level deep, and names the file the station would send.
+TEST_F(ViewDropTest, AStationsFileDraggedAsAShellItemIsParsedThroughItsOwnDataObject) {
+    AddStationOfModel(L"North");
+    FolderClassForTheShell shellClass;
+    ComPtr<IShellFolder> desktop;
+    ASSERT_EQ(S_OK, ::SHGetDesktopFolder(&desktop));
+    std::wstring path =
+        L"::{20D04FE0-3AEA-1069-A2D8-08002B30309D}\\::{7D3F2A61-4B8E-4C19-9A27-5E0C81B6D4F3}"
+        L"\\North";
+    UniqueAbsoluteIdList station;
+    ASSERT_EQ(S_OK, desktop->ParseDisplayName(nullptr, nullptr, path.data(), nullptr,
+                                              reinterpret_cast<PIDLIST_RELATIVE*>(station.put()),
+                                              nullptr));
+    ComPtr<IShellFolder> stationFolder;
+    ASSERT_EQ(S_OK, desktop->BindToObject(station.get(), nullptr, IID_PPV_ARGS(&stationFolder)));
+    ComPtr<IEnumIDList> items;
+    ASSERT_EQ(S_OK, stationFolder->EnumObjects(nullptr, SHCONTF_NONFOLDERS, &items));
+    UniquePidl file;
+    ASSERT_EQ(S_OK, items->Next(1, reinterpret_cast<PITEMID_CHILD*>(file.put()), nullptr));
+
+    auto data = MakeComObject<BlockDataObject>();
+    data->blocks[Format(CFSTR_SHELLIDLIST)] =
+        IdListArrayBlock(station.get(), {reinterpret_cast<PCUITEMID_CHILD>(file.get())});
+    TSourceParser parser(true);
+    EXPECT_EQ(S_OK, parser.ParseDataObject(data.Get(), L"", true));
+    // The root is the directory part of the file's parsing name: the station's own.
+    const TSourceList expected{
+        {L"::{7D3F2A61-4B8E-4c19-9A27-5E0C81B6D4F3}\\North", L"file1.lv", 0}};
+    EXPECT_EQ(expected, *parser.Sources());
 }
 
 // Drops as soon as the drag starts: no button is held.
