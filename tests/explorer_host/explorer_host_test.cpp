@@ -83,11 +83,6 @@ TEST_F(ExplorerHost, WineFileSystemView_IsAChildOfTheFrameBetweenToolbarAndStatu
     EXPECT_LE(Bounds(window_->ViewWindow()).bottom, Bounds(window_->StatusBar()).top);
 }
 
-TEST_F(ExplorerHost, FirstView_GetsTheViewModeOfTheOptions) {
-    OpenOnFakeView(L"C:\\", {.viewMode = FVM_DETAILS});
-    EXPECT_EQ(static_cast<UINT>(FVM_DETAILS), view_->viewMode);
-}
-
 TEST_F(ExplorerHost, BrowseToParsingName_ReportsAnUnknownNameAsAParseFailure) {
     Open();
     EXPECT_FALSE(SUCCEEDED(window_->BrowseToParsingName(L"C:\\no such folder")));

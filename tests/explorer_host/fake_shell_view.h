@@ -67,9 +67,8 @@ public:
         ++refreshes;
         return S_OK;
     }
-    IFACEMETHODIMP CreateViewWindow(IShellView*, LPCFOLDERSETTINGS settings, IShellBrowser* browser,
+    IFACEMETHODIMP CreateViewWindow(IShellView*, LPCFOLDERSETTINGS, IShellBrowser* browser,
                                     RECT* area, HWND* window) override {
-        viewMode = settings->ViewMode;
         static const WNDCLASSW viewClass{
             0,       RecordCommands, 0,       0,       ::GetModuleHandleW(nullptr),
             nullptr, nullptr,        nullptr, nullptr, L"FakeShellView"};
@@ -98,7 +97,6 @@ public:
     IFACEMETHODIMP SelectItem(PCUITEMID_CHILD, SVSIF) override { return E_NOTIMPL; }
     IFACEMETHODIMP GetItemObject(UINT, REFIID, void**) override { return E_NOTIMPL; }
 
-    UINT viewMode = 0;  // as CreateViewWindow got it
     UINT state = SVUIA_DEACTIVATE;
     HMENU menu = nullptr;  // the shared menu while active
     OLEMENUGROUPWIDTHS widths{};

@@ -3,6 +3,7 @@
 #pragma once
 
 #include <windows.h>
+#include <commctrl.h>
 
 #include <gtest/gtest.h>
 
@@ -13,6 +14,7 @@
 #include <string>
 #include <thread>
 
+#include "res/resource.h"
 #include "support/modal_dialog.h"
 #include "support/registered_messages.h"
 #include "support/user_interface.h"
@@ -61,6 +63,13 @@ inline BOOL CALLBACK FindVisibleDialog(HWND window, LPARAM found) {
     return FALSE;
 }
 
+// The visible dialog window of the thread; null while it shows none.
+inline HWND VisibleDialogOf(DWORD thread) {
+    HWND window = nullptr;
+    ::EnumThreadWindows(thread, &FindVisibleDialog, reinterpret_cast<LPARAM>(&window));
+    return window;
+}
+
 // Runs the dialog (or property sheet) modally on this thread while script drives its window from
 // another. The run fails when the dialog does not appear within ten seconds, or is still open 30
 // seconds after the script ended (it is closed then).
@@ -68,11 +77,7 @@ template <typename Dialog>
 INT_PTR RunDialog(Dialog& dialog, const std::function<void(HWND)>& script) {
     std::thread user([&script, dialogThread = ::GetCurrentThreadId()] {
         HWND window = nullptr;
-        const auto found = [&] {
-            ::EnumThreadWindows(dialogThread, &FindVisibleDialog,
-                                reinterpret_cast<LPARAM>(&window));
-            return window != nullptr;
-        };
+        const auto found = [&] { return (window = VisibleDialogOf(dialogThread)) != nullptr; };
         if (!WaitFor(found, 10000)) {
             ADD_FAILURE() << "no dialog appeared";
             return;
@@ -87,6 +92,45 @@ INT_PTR RunDialog(Dialog& dialog, const std::function<void(HWND)>& script) {
     user.join();
     return result;
 }
+
+// The station property sheet's one page, acted on from the thread that drives the sheet.
+struct StationPage {
+    HWND frame;
+    HWND window = ::FindWindowExW(frame, nullptr, L"#32770", nullptr);
+
+    // The page exists before the sheet has finished setting it up: it is ready once it shows.
+    bool Shown() const { return window && ::IsWindowVisible(window); }
+    std::wstring Name() const { return Text(window, IDC_STATION_NAME_EDIT); }
+    // The selected entry's text; empty with no selection.
+    std::wstring Selected(int listId) const {
+        const HWND list = ::GetDlgItem(window, listId);
+        const LRESULT index = ::SendMessageW(list, CB_GETCURSEL, 0, 0);
+        wchar_t text[256] = {};
+        if (index != CB_ERR)
+            ::SendMessageW(list, CB_GETLBTEXT, index, reinterpret_cast<LPARAM>(text));
+        return text;
+    }
+    // Replaces the name with text, key by key.
+    void Type(const std::wstring& text) const {
+        const HWND edit = ::GetDlgItem(window, IDC_STATION_NAME_EDIT);
+        ::SendMessageW(edit, EM_SETSEL, 0, -1);
+        ::SendMessageW(edit, WM_CHAR, VK_BACK, 0);
+        for (wchar_t c : text)
+            ::SendMessageW(edit, WM_CHAR, c, 0);
+    }
+    void Pick(int listId, const std::wstring& entry) const {
+        const HWND list = ::GetDlgItem(window, listId);
+        const LRESULT index =
+            ::SendMessageW(list, CB_FINDSTRINGEXACT, -1, reinterpret_cast<LPARAM>(entry.c_str()));
+        ::SendMessageW(list, CB_SETCURSEL, index, 0);
+        ::SendMessageW(window, WM_COMMAND, MAKEWPARAM(listId, CBN_SELCHANGE),
+                       reinterpret_cast<LPARAM>(list));
+    }
+    bool ApplyEnabled() const { return IsEnabled(frame, 0x3021); }  // the sheet's Apply
+    // The sheet's own press of a button, as a click gives it; it does not depend on where the
+    // sheet is on the screen or whether it has the focus yet.
+    void Press(int button) const { ::SendMessageW(frame, PSM_PRESSBUTTON, button, 0); }
+};
 
 // Registered messages, message boxes recorded instead of shown, and files in the temporary
 // folder under names of this process.

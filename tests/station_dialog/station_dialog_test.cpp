@@ -16,50 +16,12 @@
 
 namespace {
 
-constexpr int kApplyButton = 0x3021;  // the sheet's Apply
-
-// What a user does to the sheet's one page, from the thread that drives the sheet.
-struct Page {
-    HWND frame;
-    HWND window = ::FindWindowExW(frame, nullptr, L"#32770", nullptr);
-
-    // The selected entry's text; empty with no selection.
-    std::wstring Selected(int listId) const {
-        const HWND list = ::GetDlgItem(window, listId);
-        const LRESULT index = ::SendMessageW(list, CB_GETCURSEL, 0, 0);
-        wchar_t text[256] = {};
-        if (index != CB_ERR)
-            ::SendMessageW(list, CB_GETLBTEXT, index, reinterpret_cast<LPARAM>(text));
-        return text;
-    }
-    void Type(const std::wstring& text) const {
-        const HWND edit = ::GetDlgItem(window, IDC_STATION_NAME_EDIT);
-        ::SendMessageW(edit, EM_SETSEL, 0, -1);
-        ::SendMessageW(edit, WM_CHAR, VK_BACK, 0);
-        for (wchar_t c : text)
-            ::SendMessageW(edit, WM_CHAR, c, 0);
-    }
-    void Pick(int listId, const std::wstring& entry) const {
-        const HWND list = ::GetDlgItem(window, listId);
-        const LRESULT index =
-            ::SendMessageW(list, CB_FINDSTRINGEXACT, -1, reinterpret_cast<LPARAM>(entry.c_str()));
-        ::SendMessageW(list, CB_SETCURSEL, index, 0);
-        ::SendMessageW(window, WM_COMMAND, MAKEWPARAM(listId, CBN_SELCHANGE),
-                       reinterpret_cast<LPARAM>(list));
-    }
-    bool ApplyEnabled() const { return IsEnabled(frame, kApplyButton); }
-    // The sheet's own press of a button, as a click gives it; it does not depend on where the
-    // sheet is on the screen or whether it has the focus yet.
-    void Press(int button) const { ::SendMessageW(frame, PSM_PRESSBUTTON, button, 0); }
-};
-
 // Runs the sheet modally on this thread while script acts on its page from another.
-INT_PTR RunSheet(CStationDialog& dialog, const std::function<void(const Page&)>& script) {
+INT_PTR RunSheet(CStationDialog& dialog, const std::function<void(const StationPage&)>& script) {
     return RunDialog(dialog, [&](HWND frame) {
-        // The page exists before the sheet has finished setting it up: wait until it shows.
-        ASSERT_TRUE(WaitFor([&] { return ::IsWindowVisible(Page{frame}.window) != FALSE; }, 5000));
+        ASSERT_TRUE(WaitFor([&] { return StationPage{frame}.Shown(); }, 5000));
         ::Sleep(200);
-        script(Page{frame});
+        script(StationPage{frame});
     });
 }
 
@@ -96,7 +58,7 @@ TEST_F(StationDialog, RefusedNamesKeepTheSheetOpenWithTheirTextAndStoreNothing) 
         ScopedUserInterface seam(user);
         Station station = DefaultStation();
         CStationDialog dialog(nullptr, station, true);
-        const INT_PTR result = RunSheet(dialog, [&](const Page& page) {
+        const INT_PTR result = RunSheet(dialog, [&](const StationPage& page) {
             page.Type(test.typed);
             page.Press(PSBTN_OK);
             EXPECT_TRUE(::IsWindow(page.frame)) << test.typed;
@@ -117,7 +79,7 @@ TEST_F(StationDialog, NewStationOpensWithTheListsAndStoresOnOkOnly) {
         Station station = DefaultStation();
         station.Name = L"New digital level";
         CStationDialog dialog(nullptr, station, true);
-        const INT_PTR result = RunSheet(dialog, [&](const Page& page) {
+        const INT_PTR result = RunSheet(dialog, [&](const StationPage& page) {
             EXPECT_EQ(L"Create Digital Level", Text(page.frame));
             EXPECT_EQ(L"New digital level", Text(page.window, IDC_STATION_NAME_EDIT));
             EXPECT_EQ(L"Baudrate:", Text(page.window, IDC_STATION_BAUD_LABEL));
@@ -155,7 +117,7 @@ TEST_F(StationDialog, EditModeShowsUnlistedValuesAsNoSelectionAndApplyStoresBefo
     Station station = odd;  // as the folder holds it: the store would read the port as COM3
     station.Model = L"Some other level";
     CStationDialog dialog(nullptr, station, false);
-    const INT_PTR result = RunSheet(dialog, [&](const Page& page) {
+    const INT_PTR result = RunSheet(dialog, [&](const StationPage& page) {
         EXPECT_EQ(L"Digital Level properties", Text(page.frame));
         EXPECT_EQ(L"", page.Selected(IDC_STATION_BAUD)) << "19200 is not offered";
         EXPECT_EQ(L"None", page.Selected(IDC_STATION_PARITY));
@@ -187,7 +149,7 @@ TEST_F(StationDialog, OkOnAStationMissingFromTheStoreShowsItsWholeNameAndStoresN
     Station station = DefaultStation();
     station.Name = std::wstring(300, L'n');  // longer than the store keeps: never found there
     CStationDialog dialog(nullptr, station, false);
-    const INT_PTR result = RunSheet(dialog, [&](const Page& page) {
+    const INT_PTR result = RunSheet(dialog, [&](const StationPage& page) {
         EXPECT_EQ(station.Name, Text(page.window, IDC_STATION_NAME_EDIT));
         page.Press(PSBTN_OK);
     });
@@ -201,7 +163,7 @@ TEST_F(StationDialog, AGermanUiRelabelsTheSheetAndItsRefusals) {
     ASSERT_TRUE(SelectThreadUiLanguage(MAKELANGID(LANG_GERMAN, SUBLANG_GERMAN)));
     Station station = DefaultStation();
     CStationDialog dialog(nullptr, station, true);
-    RunSheet(dialog, [&](const Page& page) {
+    RunSheet(dialog, [&](const StationPage& page) {
         EXPECT_EQ(L"Digitalnivellier anlegen", Text(page.frame));
         EXPECT_EQ(L"Anschluss:", Text(page.window, IDC_STATION_PORT_LABEL));
         EXPECT_EQ(L"Parität:", Text(page.window, IDC_STATION_PARITY_LABEL));

@@ -1,16 +1,11 @@
 // The recording user interface of the tests.
 #include "tests/support/recording_user_interface.h"
 
-#include <chrono>
-
 int RecordingUserInterface::ShowMessageBox(HWND owner, const std::wstring& text,
                                            const std::wstring& caption, UINT style) {
-    {
-        std::lock_guard<std::mutex> guard(lock_);
-        boxes_.push_back({owner, text, caption, style});
-    }
-    shown_.notify_all();
-    return answer_;
+    std::lock_guard<std::mutex> guard(lock_);
+    boxes_.push_back({owner, text, caption, style});
+    return IDOK;
 }
 
 INT_PTR RecordingUserInterface::RunModalDialog(HINSTANCE instance, UINT templateId, HWND parent,
@@ -21,10 +16,4 @@ INT_PTR RecordingUserInterface::RunModalDialog(HINSTANCE instance, UINT template
 std::vector<RecordingUserInterface::MessageBoxRecord> RecordingUserInterface::MessageBoxes() const {
     std::lock_guard<std::mutex> guard(lock_);
     return boxes_;
-}
-
-bool RecordingUserInterface::WaitForMessageBoxes(size_t count, DWORD timeoutMilliseconds) const {
-    std::unique_lock<std::mutex> guard(lock_);
-    return shown_.wait_for(guard, std::chrono::milliseconds(timeoutMilliseconds),
-                           [&] { return boxes_.size() >= count; });
 }

@@ -9,8 +9,6 @@
 
 namespace {
 
-constexpr wchar_t kEntry[] = L"Add New Digital Level";
-
 // Puts a station-list block on the clipboard as another program would, without a data object.
 void PutBlockOnClipboard(const std::vector<uint8_t>& block) {
     ASSERT_TRUE(::OpenClipboard(nullptr));
@@ -30,7 +28,7 @@ TEST_F(ShellViewTest, AddRefusesBadNamesThenStoresAGoodOneWithTheDefaults) {
     CExplorerWindow& browser = Open();
     std::wstring offered;
     {
-        SheetUser user(::GetCurrentThreadId(), {[&](const SheetWindow& sheet) {
+        SheetUser user(::GetCurrentThreadId(), {[&](const StationPage& sheet) {
                            offered = sheet.Name();
                            for (const wchar_t* refused : {L"", L"North", L"a/b"}) {
                                sheet.Type(refused);
@@ -56,11 +54,11 @@ TEST_F(ShellViewTest, OpeningTheEntryStartsAddAndCancelStoresNothing) {
     Select(browser, {0});
     {
         SheetUser user(::GetCurrentThreadId(),
-                       {[](const SheetWindow& sheet) { sheet.Press(PSBTN_CANCEL); }});
+                       {[](const StationPage& sheet) { sheet.Press(PSBTN_CANCEL); }});
         EXPECT_EQ(S_OK, Command(browser, 1289));
         EXPECT_EQ(1, user.Handled());
     }
-    EXPECT_TRUE(StoredNames().empty());
+    EXPECT_TRUE(ListStationNames().empty());
     EXPECT_EQ(0, browser.BrowseRequestCount());
 }
 
@@ -80,12 +78,12 @@ TEST_F(ShellViewTest, PropertiesOpensOneSheetPerSelectedStationInListOrder) {
     Select(browser, {3, 1});
     std::vector<std::wstring> shown;
     {
-        SheetUser user(::GetCurrentThreadId(), {[&](const SheetWindow& sheet) {
+        SheetUser user(::GetCurrentThreadId(), {[&](const StationPage& sheet) {
                                                     shown.push_back(sheet.Name());
                                                     sheet.Type(L"A2");
                                                     sheet.Press(PSBTN_OK);
                                                 },
-                                                [&](const SheetWindow& sheet) {
+                                                [&](const StationPage& sheet) {
                                                     shown.push_back(sheet.Name());
                                                     sheet.Press(PSBTN_CANCEL);
                                                 }});
@@ -103,7 +101,7 @@ TEST_F(ShellViewTest, StationsDeletedElsewhereAreSkippedByPropertiesAndDelete) {
     ASSERT_EQ(S_OK, DeleteStation(Named(L"A")));
     {
         std::vector<std::wstring> shown;
-        SheetUser user(::GetCurrentThreadId(), {[&](const SheetWindow& sheet) {
+        SheetUser user(::GetCurrentThreadId(), {[&](const StationPage& sheet) {
                            shown.push_back(sheet.Name());
                            sheet.Press(PSBTN_CANCEL);
                        }});
@@ -126,7 +124,7 @@ TEST_F(ShellViewTest, DeleteSkipsTheEntryAndAsksNothing) {
     Select(browser, {0, 1, 3});
     EXPECT_EQ(S_OK, Command(browser, 1288));
     EXPECT_TRUE(user_.MessageBoxes().empty());
-    EXPECT_EQ(std::vector<std::wstring>{L"B"}, StoredNames());
+    EXPECT_EQ(std::vector<std::wstring>{L"B"}, ListStationNames());
     EXPECT_EQ((std::vector<std::wstring>{kEntry, L"B"}), Texts(browser));
 }
 
@@ -157,7 +155,7 @@ TEST_F(ShellViewTest, PastingAnotherProgramsBlockStoresOnlyCompleteRecordsWithVa
     PutBlockOnClipboard(block);
     CExplorerWindow& browser = Open();
     EXPECT_EQ(S_OK, Command(browser, 1282));
-    EXPECT_EQ((std::vector<std::wstring>{L"Good", L"Fine"}), StoredNames());
+    EXPECT_EQ((std::vector<std::wstring>{L"Good", L"Fine"}), ListStationNames());
     EXPECT_EQ((std::vector<std::wstring>{kEntry, L"Fine", L"Good"}), Texts(browser));
 }
 

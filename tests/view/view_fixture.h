@@ -31,65 +31,36 @@
 
 using Microsoft::WRL::ComPtr;
 
-// A property sheet the view opened, seen from the user's thread.
-struct SheetWindow {
-    HWND frame = nullptr;
-    HWND page = nullptr;
-
-    std::wstring Name() const {
-        wchar_t text[256] = {};
-        ::GetDlgItemTextW(page, IDC_STATION_NAME_EDIT, text, 256);
-        return text;
-    }
-    void Type(const std::wstring& name) const {
-        ::SetDlgItemTextW(page, IDC_STATION_NAME_EDIT, name.c_str());
-        ::SendMessageW(page, WM_COMMAND, MAKEWPARAM(IDC_STATION_NAME_EDIT, EN_CHANGE),
-                       reinterpret_cast<LPARAM>(::GetDlgItem(page, IDC_STATION_NAME_EDIT)));
-    }
-    void Press(int button) const {
-        ::SendMessageW(frame, PSM_PRESSBUTTON, button, 0);
-    }
-};
+// The top folder's first item, which starts adding a station.
+inline constexpr wchar_t kEntry[] = L"Add New Digital Level";
 
 // Acts on each sheet that the given thread shows, one after the other, from a thread of its own.
 class SheetUser {
 public:
-    using Script = std::function<void(const SheetWindow&)>;
+    using Script = std::function<void(const StationPage&)>;
 
     SheetUser(DWORD viewThread, std::vector<Script> scripts)
         : thread_([this, viewThread, scripts = std::move(scripts)] {
               for (const Script& script : scripts) {
-                  const SheetWindow sheet = WaitForSheet(viewThread);
-                  if (!sheet.page) {
+                  HWND frame = nullptr;
+                  const auto shown = [&] {
+                      frame = VisibleDialogOf(viewThread);
+                      return frame && StationPage{frame}.Shown();
+                  };
+                  if (!WaitFor(shown, 10000)) {
                       ADD_FAILURE() << "no sheet appeared";
                       return;
                   }
-                  script(sheet);
+                  ::Sleep(100);
+                  script(StationPage{frame});
                   ++handled_;
-                  (void)WaitFor([&] { return !::IsWindow(sheet.frame); }, 5000);
+                  (void)WaitFor([&] { return !::IsWindow(frame); }, 5000);
               }
           }) {}
     ~SheetUser() { thread_.join(); }
     int Handled() const { return handled_; }
 
 private:
-    static SheetWindow WaitForSheet(DWORD viewThread) {
-        SheetWindow sheet;
-        const auto shown = [&] {
-            sheet.frame = nullptr;
-            ::EnumThreadWindows(viewThread, &FindVisibleDialog,
-                                reinterpret_cast<LPARAM>(&sheet.frame));
-            sheet.page =
-                sheet.frame ? ::FindWindowExW(sheet.frame, nullptr, L"#32770", nullptr) : nullptr;
-            // The page exists before the sheet has finished setting it up: wait until it shows.
-            return sheet.page && ::IsWindowVisible(sheet.page);
-        };
-        if (!WaitFor(shown, 10000))
-            return SheetWindow{};
-        ::Sleep(100);
-        return sheet;
-    }
-
     int handled_ = 0;
     std::thread thread_;
 };
@@ -235,8 +206,6 @@ protected:
         WaitForFill(browser);
         return result;
     }
-
-    static std::vector<std::wstring> StoredNames() { return ListStationNames(); }
 
     CPidlMgr manager_;
     RegistryOverride registry_;

@@ -7,8 +7,6 @@
 
 namespace {
 
-constexpr wchar_t kEntry[] = L"Add New Digital Level";
-
 int ImageOf(HWND list, int index) {
     LVITEMW item{};
     item.mask = LVIF_IMAGE;
@@ -192,10 +190,10 @@ TEST_F(ShellViewTest, ShortcutsWorkWithAndWithoutTheBrowsersTranslationAndActOnc
     };
     press('C', true, false);
     press('V', true, true);
-    EXPECT_EQ((std::vector<std::wstring>{L"A", L"B", L"Copy of A"}), StoredNames());
+    EXPECT_EQ((std::vector<std::wstring>{L"A", L"B", L"Copy of A"}), ListStationNames());
     Select(browser, {1});  // A
     press(VK_DELETE, false, false);
-    EXPECT_EQ((std::vector<std::wstring>{L"B", L"Copy of A"}), StoredNames());
+    EXPECT_EQ((std::vector<std::wstring>{L"B", L"Copy of A"}), ListStationNames());
 }
 
 }  // namespace

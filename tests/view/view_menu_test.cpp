@@ -122,23 +122,19 @@ TEST_F(ShellViewTest, AGermanUiTranslatesTheEntryTheMenusAndTheStatusText) {
 }
 
 TEST_F(ShellViewTest, InAFileDialogOpenReadsSelect) {
-    ExplorerOptions dialog;
-    dialog.commonDialog = true;
-    const HMENU bar = Open(L"", dialog).MenuBar();
+    const HMENU bar = Open(L"", {.commonDialog = true}).MenuBar();
     EXPECT_EQ(L"Select", Entry(bar, 1289).text);
 }
 
 TEST_F(ShellViewTest, ABrowserWithoutMenusLeavesAWorkingView) {
     AddStationOfModel(L"North");
-    ExplorerOptions withoutMenus;
-    withoutMenus.menusNotImplemented = true;
-    CExplorerWindow& browser = Open(L"", withoutMenus);
-    EXPECT_EQ((std::vector<std::wstring>{L"Add New Digital Level", L"North"}), Texts(browser));
+    CExplorerWindow& browser = Open(L"", {.menusNotImplemented = true});
+    EXPECT_EQ((std::vector<std::wstring>{kEntry, L"North"}), Texts(browser));
     Select(browser, {1});
     EXPECT_EQ(S_OK, Command(browser, 1281));
     EXPECT_TRUE(::IsClipboardFormatAvailable(::RegisterClipboardFormatW(L"Quorvel Total Stations")));
     EXPECT_EQ(S_OK, Command(browser, 1288));
-    EXPECT_TRUE(StoredNames().empty());
+    EXPECT_TRUE(ListStationNames().empty());
 }
 
 TEST_F(ShellViewTest, TheBackgroundMenuCarriesItsOneSampleCommand) {
