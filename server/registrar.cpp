@@ -126,7 +126,8 @@ HRESULT RunRegistryScript(std::wstring_view script,
     CATCH_RETURN()
 }
 
-HRESULT RunRegistryResource(HMODULE module, UINT resourceId, RegistrationMode mode) noexcept {
+HRESULT ParseRegistryResource(HMODULE module, UINT resourceId, std::wstring_view modulePath,
+                              std::vector<RegistryKeyOperation>& operations) noexcept {
     try {
         const HRSRC found = ::FindResourceW(module, MAKEINTRESOURCEW(resourceId), L"REGISTRY");
         RETURN_IF_WIN32_BOOL_FALSE(found);
@@ -135,12 +136,23 @@ HRESULT RunRegistryResource(HMODULE module, UINT resourceId, RegistrationMode mo
         const auto* bytes = static_cast<const uint8_t*>(::LockResource(loaded));
         RETURN_IF_NULL_ALLOC(bytes);
         WideString script;
+        RegistryScriptError error;
         RETURN_HR_IF(HRESULT_FROM_WIN32(ERROR_INVALID_DATA),
-                     !DecodeRegistryScriptBytes(bytes, ::SizeofResource(module, found), script));
+                     !DecodeRegistryScriptBytes(bytes, ::SizeofResource(module, found), script) ||
+                         !ParseRegistryScript(script, {{L"MODULE", WideString(modulePath)}},
+                                              operations, error));
+        return S_OK;
+    }
+    CATCH_RETURN()
+}
 
+HRESULT RunRegistryResource(HMODULE module, UINT resourceId, RegistrationMode mode) noexcept {
+    try {
         const std::wstring path = ModuleFilePath(module);
         RETURN_IF_WIN32_BOOL_FALSE(!path.empty());
-        return RunRegistryScript(script, {{L"MODULE", path}}, mode);
+        std::vector<RegistryKeyOperation> operations;
+        RETURN_IF_FAILED(ParseRegistryResource(module, resourceId, path, operations));
+        return ApplyRegistryOperations(operations, mode);
     }
     CATCH_RETURN()
 }

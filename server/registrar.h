@@ -25,6 +25,12 @@ enum class RegistrationMode { Register, Unregister };
                                         const std::vector<RegistryScriptReplacement>& replacements,
                                         RegistrationMode mode) noexcept;
 
+// Parses the "REGISTRY" resource of this id (module may be loaded as a data file) with %MODULE%
+// standing for modulePath; a missing or malformed script gives no operations and a failure.
+[[nodiscard]] HRESULT ParseRegistryResource(HMODULE module, UINT resourceId,
+                                            std::wstring_view modulePath,
+                                            std::vector<RegistryKeyOperation>& operations) noexcept;
+
 // Runs the module's "REGISTRY" resource of this id with %MODULE% standing for the module's path.
 [[nodiscard]] HRESULT RunRegistryResource(HMODULE module, UINT resourceId,
                                           RegistrationMode mode) noexcept;
