@@ -50,43 +50,51 @@ std::string Narrow(WideStringView text) {
     return result;
 }
 
-// Square brackets start a property reference in the installer's formatted text; a value that
-// begins with '#' would be read as a number. Then the XML escapes.
-std::string Escape(WideStringView text, WideStringView placeholder, const std::string& reference,
-                   bool leadingHash) {
-    std::string result;
-    if (leadingHash && !text.empty() && text[0] == '#')
-        result += '#';
-    for (size_t index = 0; index < text.size(); ++index) {
-        if (!placeholder.empty() && text.substr(index, placeholder.size()) == placeholder) {
-            result += reference;
-            index += placeholder.size() - 1;
-            continue;
-        }
-        switch (text[index]) {
+// Square brackets start a property reference in the installer's formatted text. Then the XML
+// escapes. All of them are ASCII, so the text is escaped as UTF-16 and encoded once.
+WideString EscapePiece(WideStringView text) {
+    WideString result;
+    for (WideChar c : text) {
+        switch (c) {
             case '[':
-                result += "[\\[]";
+                result += WIDE_TEXT("[\\[]");
                 break;
             case ']':
-                result += "[\\]]";
+                result += WIDE_TEXT("[\\]]");
                 break;
             case '&':
-                result += "&amp;";
+                result += WIDE_TEXT("&amp;");
                 break;
             case '<':
-                result += "&lt;";
+                result += WIDE_TEXT("&lt;");
                 break;
             case '>':
-                result += "&gt;";
+                result += WIDE_TEXT("&gt;");
                 break;
             case '"':
-                result += "&quot;";
+                result += WIDE_TEXT("&quot;");
                 break;
             default:
-                result += Narrow(text.substr(index, 1));
+                result += c;
         }
     }
     return result;
+}
+
+// The text escaped, with every placeholder replaced by reference as it stands; a value that
+// begins with '#' would be read as a number, so its '#' is doubled.
+std::string Escape(WideStringView text, WideStringView placeholder, const std::string& reference,
+                   bool leadingHash) {
+    std::string result = leadingHash && !text.empty() && text[0] == '#' ? "#" : "";
+    for (size_t start = 0;;) {
+        const size_t found =
+            placeholder.empty() ? WideStringView::npos : text.find(placeholder, start);
+        result += Narrow(EscapePiece(text.substr(start, found - start)));
+        if (found == WideStringView::npos)
+            return result;
+        result += reference;
+        start = found + placeholder.size();
+    }
 }
 
 WideChar Lower(WideChar c) {

@@ -113,17 +113,18 @@ def same(what, actual, expected):
           "missing:\n" + describe(missing) + "\nextra:\n" + describe(extra))
 
 
-def without_type_library(entries):
-    return {entry: value for entry, value in entries.items() if "\\typelib\\" not in entry[0]}
+def view_32(entries):
+    """The values of the 32-bit registry view, without the type library (one key that both
+    modules share; checked separately)."""
+    return {entry: value for entry, value in values(entries).items()
+            if "wow6432node" in entry[0] and "\\typelib\\" not in entry[0]}
 
 
 def to_32_bit_view(entries):
     """Self-registration of the same DLL as the x86 module writes it: the 32-bit view of the
-    classes and of Software\\Microsoft, the x86 program folder, the type library as win32."""
+    classes and of Software\\Microsoft, in the x86 program folder."""
     result = {}
     for (key, name), value in entries.items():
-        if "\\typelib\\" in key:
-            continue  # one shared key for both modules; checked separately
         key = key.replace("\\software\\classes\\", "\\software\\classes\\wow6432node\\")
         key = key.replace("\\software\\microsoft\\", "\\software\\wow6432node\\microsoft\\")
         result[(key, name)] = value.replace("Program Files\\\\", "Program Files (x86)\\\\")
@@ -182,10 +183,9 @@ for folder, names in files.items():
 pictures = os.listdir(prefix.unix(PROGRAM_FILES + r"\guide"))
 check(pictures and all(name.endswith(".png") for name in pictures),
       f"the guides' {len(pictures)} pictures are installed beside them")
-check(not any("halvekcomm" in name.lower() for _, _, names in os.walk(prefix.unix(r"C:\Program Files"))
-              for name in names) and
-      not any("halvekcomm" in name.lower() for _, _, names in
-              os.walk(prefix.unix(r"C:\Program Files (x86)")) for name in names),
+check(not any("halvekcomm" in name.lower()
+              for folder in (r"C:\Program Files", r"C:\Program Files (x86)")
+              for _, _, names in os.walk(prefix.unix(folder)) for name in names),
       "the substitute external library is not installed")
 for folder in (PROGRAM_FILES, PROGRAM_FILES_X86):
     path = prefix.unix(folder + r"\LVShellExt.dll")
@@ -203,10 +203,8 @@ view64 = {entry: value for entry, value in package.items()
           if "wow6432node" not in entry[0] and entry[0] != win32[0]}
 same("the x64 registration equals regsvr32's, key by key and value by value", view64,
      {entry: value for entry, value in registered.items() if "wow6432node" not in entry[0]})
-view32 = {entry: value for entry, value in without_type_library(values(package)).items()
-          if "wow6432node" in entry[0]}
 same("the x86 registration in the 32-bit view equals regsvr32's for the x86 path",
-     view32, values(to_32_bit_view(registered)))
+     view_32(package), view_32(to_32_bit_view(registered)))
 check(package.get(win32) == '"' + PROGRAM_FILES_X86.replace("\\", "\\\\") + '\\\\LVShellExt.dll"',
       "the type library names the x86 module for win32")
 
@@ -250,9 +248,7 @@ installed = [name for name in ["LVShellExt.dll", "lvcopy.exe", "lvrecv.exe", "lv
 check(len(installed) == 6, f"{PROGRAM_FILES_X86} holds the x86 extension, tools and guides",
       str(installed))
 same("the x86 package's registration in the 32-bit view equals regsvr32's for the x86 path",
-     {entry: value for entry, value in without_type_library(values(package32)).items()
-      if "wow6432node" in entry[0]},
-     values(to_32_bit_view(registered)))
+     view_32(package32), view_32(to_32_bit_view(registered)))
 check(prefix.wine("msiexec", "/x", msi(x86), "/qn").returncode == 0,
       "msiexec /x removes the x86 package")
 left = written(clean, prefix.registry())
