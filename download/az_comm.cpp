@@ -72,6 +72,10 @@ uint32_t TAZComm::FileSize() const noexcept {
     return protocol_->FileSize();
 }
 
+uint32_t TAZComm::FileError() const noexcept {
+    return protocol_->FileError();
+}
+
 bool TAZComm::IsFileOpened() const noexcept {
     return protocol_->IsFileOpened();
 }

@@ -60,6 +60,9 @@ public:
     // Checks that the record's OutputPath holds BCC blocks numbered 0, 1, 2 … ended by EOT:
     // false only on a BCC mismatch or an unreadable file (both reported, code 4).
     [[nodiscard]] bool CheckInputFile();
+    // The system's code of the output-file write that failed the last receive (already reported,
+    // code 4); 0 when none did.
+    uint32_t FileError() const noexcept;
     // Set at opening; cleared by CheckInputFile on a wrong block kind or digit.
     bool IsFileOpened() const noexcept;
 

@@ -18,6 +18,11 @@ CDownloadProgressDialog::~CDownloadProgressDialog() {
     }
 }
 
+HRESULT CDownloadProgressDialog::DownloadResult() const noexcept {
+    // The worker records its result before it posts the message that ends the dialog.
+    return thread_ ? thread_->DownloadResult() : CProgressDialogBase::DownloadResult();
+}
+
 BOOL CDownloadProgressDialog::OnInitDialog() {
     // The Start button keeps its template text.
     ShowInitialTexts(IDS_DOWNLOAD_TITLE);

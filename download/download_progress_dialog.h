@@ -17,6 +17,8 @@ public:
     // Stops the download thread and waits for it without limit, then deletes it.
     ~CDownloadProgressDialog() override;
 
+    HRESULT DownloadResult() const noexcept override;
+
 protected:
     BOOL OnInitDialog() override;
     bool OnCommand(WORD controlId, WORD notification) override;

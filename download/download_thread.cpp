@@ -111,6 +111,11 @@ DWORD CLVDownloadThread::Run() {
                        LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONEXCLAMATION);
     }
     received_ = result == 0;
+    const uint32_t fileError = driver_ ? driver_->FileError() : 0;
+    if (fileError != 0)
+        result_ = HRESULT_FROM_WIN32(fileError);
+    else if (!received_)
+        result_ = S_FALSE;
     return 0;
 }
 

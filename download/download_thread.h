@@ -34,6 +34,10 @@ public:
     bool IsCancelled() override;
 
     bool HasDriver() const noexcept { return driver_ != nullptr; }
+    // Why the output file is not complete, once Run has ended: the HRESULT of the write the
+    // system refused, S_FALSE for a receive that failed otherwise (time-out, cancel), S_OK when
+    // the file is complete or no receive ended yet.
+    HRESULT DownloadResult() const noexcept { return result_.load(); }
     const TAZCommParams& ConnectionRecord() const noexcept { return *params_; }
 
     // The text copies handed over with "Download Thread Message": the receiver frees each one
@@ -53,4 +57,5 @@ private:
     HWND notifyWindow_;
     Station station_;
     bool received_ = false;  // written and read on the worker only
+    std::atomic<HRESULT> result_{S_OK};  // written by the worker before it posts its end
 };

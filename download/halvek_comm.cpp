@@ -5,6 +5,7 @@
 #include <new>
 
 #include "res/resource.h"
+#include "support/read_only_file.h"
 #include "support/module_instance.h"
 #include "support/text_lookup.h"
 
@@ -33,6 +34,27 @@ std::wstring SystemResultText(HRESULT result, const std::wstring& insert) {
             text += L" (" + insert + L")";
     }
     return text;
+}
+
+HRESULT CheckReceivedFile(const std::wstring& path) {
+    // Sharing read only: a library still writing the file holds it open for writing, and the
+    // open then fails with a sharing violation instead of handing on half a file.
+    UniqueFileHandle file;
+    uint64_t size = 0;
+    const HRESULT opened = OpenReadOnlyFile(path, file, size);
+    if (FAILED(opened))
+        return opened;
+    if (size == 0)
+        return HRESULT_FROM_WIN32(ERROR_INVALID_DATA);
+    // A file that ends where its drive ran out of room was most likely cut short there.
+    const size_t slash = path.find_last_of(L"\\/");
+    const std::wstring folder = slash == std::wstring::npos ? path : path.substr(0, slash + 1);
+    ULARGE_INTEGER available{};
+    if (::GetDiskFreeSpaceExW(folder.c_str(), &available, nullptr, nullptr) &&
+        available.QuadPart == 0) {
+        return HRESULT_FROM_WIN32(ERROR_DISK_FULL);
+    }
+    return S_OK;
 }
 
 HRESULT CreateHalvekObject(UniqueHalvekObject& object, std::wstring& errorText) {

@@ -78,6 +78,12 @@ int32_t HalvekPortNumber(WideStringView port) noexcept;
 // bytes with the terminator.
 std::string HalvekFilePath(const std::wstring& path);
 
+// Whether the file the library reported as received can be handed on: S_OK when it exists, no
+// one still writes it, it holds data and its drive did not run out of room (the library's own
+// success says nothing about a write that the disk cut short); otherwise the HRESULT of what is
+// wrong.
+HRESULT CheckReceivedFile(const std::wstring& path);
+
 // The string-table text for a library result code.
 std::wstring HalvekResultText(int32_t code);
 

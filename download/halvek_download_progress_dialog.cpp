@@ -1,6 +1,7 @@
 // CHalvekDownloadProgressDialog: library set-up step by step, completion, cancel and errors.
 #include "download/halvek_download_progress_dialog.h"
 
+#include "download/portable/driver_text.h"
 #include "res/resource.h"
 #include "support/registered_messages.h"
 #include "support/text_lookup.h"
@@ -113,6 +114,13 @@ void CHalvekDownloadProgressDialog::OnStart() {
 void CHalvekDownloadProgressDialog::OnLibraryResult(int32_t code) {
     if (code != kHalvekNoError) {
         FailWith(HalvekResultText(code));
+        return;
+    }
+    // The library writes its file under the given name with ".txt" added.
+    const HRESULT check = CheckReceivedFile(OutputPath() + L".txt");
+    if (FAILED(check)) {
+        SetDownloadResult(check);
+        FailWith(FormatDriverText(LoadUiText(IDS_DOWNLOAD_INCOMPLETE), {SystemResultText(check)}));
         return;
     }
     FinishTransfer();

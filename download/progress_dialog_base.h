@@ -15,6 +15,10 @@ public:
     // the caller hands the shell a file only when both hold.
     bool TransferCompleted() const noexcept { return completed_; }
     const std::wstring& OutputPath() const noexcept { return outputPath_; }
+    // Why a dialog ended without a file, once DoModal has returned: a failure HRESULT when the
+    // download failed for a reason of the system's (the disk refused the file), so that the
+    // caller can fail the copy with it rather than report a cancel; S_OK or S_FALSE otherwise.
+    virtual HRESULT DownloadResult() const noexcept { return downloadResult_; }
 
 protected:
     // parent may be null (the data object runs the dialog without one).
@@ -28,6 +32,7 @@ protected:
     // through a posted command, so that pending messages are handled first.
     void FinishTransfer();
     void SetStatus(UINT textId);
+    void SetDownloadResult(HRESULT result) noexcept { downloadResult_ = result; }
 
     // An IDOK that did not come from FinishTransfer is ignored: on Windows, Enter in the
     // multi-line instructions (no ES_WANTRETURN) sends one, and a stray command must not pass a
@@ -43,4 +48,5 @@ private:
     std::wstring name_;          // control 217
     std::wstring outputPath_;
     bool completed_ = false;
+    HRESULT downloadResult_ = S_OK;
 };

@@ -144,18 +144,24 @@ uint32_t Win32ProtocolClock::TickMilliseconds() {
     return ::GetTickCount();
 }
 
-bool Win32ReceiveFile::Create() {
+uint32_t Win32ReceiveFile::Create() {
     handle_.reset(::CreateFileW(path_.c_str(), GENERIC_READ | GENERIC_WRITE, 0, nullptr,
                                 CREATE_ALWAYS, FILE_ATTRIBUTE_NORMAL, nullptr));
-    return static_cast<bool>(handle_);
+    return handle_ ? ERROR_SUCCESS : ::GetLastError();
 }
 
-void Win32ReceiveFile::Write(const uint8_t* bytes, size_t count) {
-    if (!handle_ || count == 0)
-        return;
+uint32_t Win32ReceiveFile::Write(const uint8_t* bytes, size_t count) {
+    if (count == 0)
+        return ERROR_SUCCESS;
+    if (!handle_)
+        return ERROR_INVALID_HANDLE;
     DWORD written = 0;
-    // A full disk shows as a short file; the receive itself goes on as the instrument expects.
-    (void)::WriteFile(handle_.get(), bytes, static_cast<DWORD>(count), &written, nullptr);
+    if (!::WriteFile(handle_.get(), bytes, static_cast<DWORD>(count), &written, nullptr)) {
+        const DWORD error = ::GetLastError();
+        return error != ERROR_SUCCESS ? error : ERROR_WRITE_FAULT;
+    }
+    // A write to a disk that has room for only part of the data stores that part and succeeds.
+    return written == count ? ERROR_SUCCESS : ERROR_DISK_FULL;
 }
 
 uint64_t Win32ReceiveFile::Position() {
@@ -165,8 +171,16 @@ uint64_t Win32ReceiveFile::Position() {
     return static_cast<uint64_t>(position.QuadPart);
 }
 
-void Win32ReceiveFile::Close() {
+uint32_t Win32ReceiveFile::Close() {
+    if (!handle_)
+        return ERROR_SUCCESS;
+    // Data the system still holds in its cache can fail to reach the disk (a network folder, a
+    // removable drive): the file counts as complete only once it has.
+    DWORD error = ERROR_SUCCESS;
+    if (!::FlushFileBuffers(handle_.get()))
+        error = ::GetLastError();
     handle_.reset();
+    return error;
 }
 
 WideString StringTableDriverTexts::Text(DriverText text) const {
@@ -185,4 +199,8 @@ WideString StringTableDriverTexts::Text(DriverText text) const {
             return LoadUiText(IDS_SERIAL_YMODEM_FILE_INFO);
     }
     return {};
+}
+
+WideString StringTableDriverTexts::SystemErrorText(uint32_t code) const {
+    return SystemMessageText(code);
 }

@@ -49,14 +49,15 @@ public:
     uint32_t TickMilliseconds() override;
 };
 
-// The output file: created (emptied) for read and write at each receive.
+// The output file: created (emptied) for read and write at each receive. Its errors are the
+// system's codes, so a full disk is reported in the system's own words.
 class Win32ReceiveFile final : public ReceiveFile {
 public:
     explicit Win32ReceiveFile(std::wstring path) : path_(std::move(path)) {}
-    bool Create() override;
-    void Write(const uint8_t* bytes, size_t count) override;
+    uint32_t Create() override;
+    uint32_t Write(const uint8_t* bytes, size_t count) override;
     uint64_t Position() override;
-    void Close() override;
+    uint32_t Close() override;
 
 private:
     std::wstring path_;
@@ -67,4 +68,5 @@ private:
 class StringTableDriverTexts final : public DriverTextSource {
 public:
     WideString Text(DriverText text) const override;
+    WideString SystemErrorText(uint32_t code) const override;
 };

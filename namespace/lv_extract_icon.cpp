@@ -12,7 +12,12 @@ HRESULT CLVExtractIcon::SetItem(PCUIDLIST_RELATIVE fullList) noexcept {
     return S_OK;
 }
 
-HRESULT CLVExtractIcon::GetIconLocation(UINT, PWSTR, UINT, int* index, UINT* locationFlags) {
+HRESULT CLVExtractIcon::GetIconLocation(UINT, PWSTR location, UINT capacity, int* index,
+                                        UINT* locationFlags) {
+    // The shell reads the location as a string whatever the flags say: always a terminated one,
+    // empty because the icon comes from Extract, not from a file.
+    if (location && capacity > 0)
+        location[0] = L'\0';
     if (!index || !locationFlags)
         return E_POINTER;
     *locationFlags = GIL_NOTFILENAME;

@@ -36,4 +36,10 @@
 #define IDS_WAITING_FOR_DOWNLOAD 1056
 #define IDS_DOWNLOAD_TITLE 1060
 #define IDS_CANCEL 1080
+// The download cannot even start: the temporary folder is missing, refuses files or is full.
+// Arguments: the folder, the system's text.
+#define IDS_TEMPORARY_FOLDER_UNUSABLE 1100
+// The external library reported success but its file cannot be trusted. Argument: the system's
+// text.
+#define IDS_DOWNLOAD_INCOMPLETE 1101
 // The results -101 and -102 use the serial driver's texts 1070 and 1053 (res/ids_serial.h).

@@ -11,6 +11,7 @@
 #include <utility>
 
 #include "support/module_instance.h"
+#include "support/read_only_file.h"
 #include "support/portable/translation_text.h"
 #include "support/unique_resource.h"
 
@@ -173,17 +174,16 @@ std::wstring FindTranslationFile(const std::wstring& modulePath, LANGID language
 }
 
 HRESULT LoadTranslationFile(const std::wstring& path, TranslationMap& map) noexcept try {
-    UniqueFileHandle file(::CreateFileW(path.c_str(), GENERIC_READ, FILE_SHARE_READ, nullptr,
-                                        OPEN_EXISTING, FILE_ATTRIBUTE_NORMAL, nullptr));
-    if (!file)
-        return HRESULT_FROM_WIN32(::GetLastError());
-    LARGE_INTEGER size{};
-    if (!::GetFileSizeEx(file.get(), &size))
-        return HRESULT_FROM_WIN32(::GetLastError());
+    UniqueFileHandle file;
+    uint64_t size = 0;
+    // No file for the user's language is the usual case, not a failure worth logging.
+    const HRESULT opened = OpenReadOnlyFile(path, file, size);
+    if (FAILED(opened))
+        return opened;
     // An empty file cannot be mapped at all; a one-byte file holds no character.
-    if (size.QuadPart < 2)
+    if (size < 2)
         return E_FAIL;
-    if (size.QuadPart > 0x7FFFFFFF)
+    if (size > 0x7FFFFFFF)
         return E_OUTOFMEMORY;
     UniqueHandle mapping(::CreateFileMappingW(file.get(), nullptr, PAGE_READONLY, 0, 0, nullptr));
     if (!mapping)
@@ -191,8 +191,7 @@ HRESULT LoadTranslationFile(const std::wstring& path, TranslationMap& map) noexc
     MappedView view(::MapViewOfFile(mapping.get(), FILE_MAP_READ, 0, 0, 0));
     if (!view.bytes())
         return HRESULT_FROM_WIN32(::GetLastError());
-    return ParseTranslationFile(view.bytes(), static_cast<size_t>(size.QuadPart), map) ? S_OK
-                                                                                       : E_FAIL;
+    return ParseTranslationFile(view.bytes(), static_cast<size_t>(size), map) ? S_OK : E_FAIL;
 } catch (const std::bad_alloc&) {
     return E_OUTOFMEMORY;
 } catch (...) {

@@ -7,12 +7,17 @@
 #include <cwchar>
 
 #include "download/download_progress_dialog.h"
+#include "download/halvek_comm.h"
 #include "download/halvek_download_progress_dialog.h"
+#include "download/portable/driver_text.h"
+#include "res/resource.h"
 #include "stations/station_list_block.h"
 #include "stations/station_models.h"
 #include "stations/station_store.h"
 #include "support/error_handling.h"
+#include "support/text_lookup.h"
 #include "support/unique_resource.h"
+#include "support/user_interface.h"
 #include "view/enum_format_etc.h"
 #include "view/stream2.h"
 
@@ -76,9 +81,8 @@ std::wstring ItemPath(const CPidlMgr& manager, LPCITEMIDLIST list) {
     return path;
 }
 
-// A unique "QRV" name in the user's temporary folder, without extension, where no file is: the
-// download writes the file itself.
-HRESULT MakeDownloadTarget(std::wstring& target) {
+// The user's temporary folder, with its trailing backslash.
+HRESULT TemporaryFolder(std::wstring& folder) {
     wchar_t directory[130];
     const DWORD length = ::GetTempPathW(ARRAYSIZE(directory), directory);
     // Failures are made into HRESULTs: a bare Win32 code would pass for success.
@@ -86,8 +90,22 @@ HRESULT MakeDownloadTarget(std::wstring& target) {
         LV_LOG_AND_RETURN(LastErrorResult());
     if (length >= ARRAYSIZE(directory))
         LV_LOG_AND_RETURN(HRESULT_FROM_WIN32(ERROR_BUFFER_OVERFLOW));
+    folder.assign(directory, length);
+    return S_OK;
+}
+
+// A unique "QRV" name in the folder, without extension, where no file is: the download writes
+// the file itself. Creating the placeholder also proves that the folder exists and takes files.
+HRESULT MakeDownloadTarget(const std::wstring& folder, std::wstring& target) {
+    // A drive with no room at all would take the placeholder (it has no data) and then fail
+    // the download at its first line: say so before the surveyor starts the instrument.
+    ULARGE_INTEGER available{};
+    if (::GetDiskFreeSpaceExW(folder.c_str(), &available, nullptr, nullptr) &&
+        available.QuadPart == 0) {
+        LV_LOG_AND_RETURN(HRESULT_FROM_WIN32(ERROR_DISK_FULL));
+    }
     wchar_t temporary[MAX_PATH];
-    if (::GetTempFileNameW(directory, L"QRV", 0, temporary) == 0)
+    if (::GetTempFileNameW(folder.c_str(), L"QRV", 0, temporary) == 0)
         LV_LOG_AND_RETURN(LastErrorResult());
     // Only the unique name is wanted, so the placeholder goes and the name loses its extension.
     (void)::DeleteFileW(temporary);  // a placeholder left behind is empty and harmless
@@ -96,6 +114,24 @@ HRESULT MakeDownloadTarget(std::wstring& target) {
     if (dot != std::wstring::npos && target.find(L'\\', dot) == std::wstring::npos)
         target.erase(dot);
     return S_OK;
+}
+
+// A download target in the user's temporary folder; when the folder cannot take it, the user is
+// told which folder and why before anything else happens, and the failure is returned.
+HRESULT PrepareDownloadTarget(HWND owner, std::wstring& target) {
+    std::wstring folder;
+    HRESULT result = TemporaryFolder(folder);
+    if (SUCCEEDED(result))
+        result = MakeDownloadTarget(folder, target);
+    if (SUCCEEDED(result))
+        return result;
+    if (folder.size() > 1 && folder.back() == L'\\')
+        folder.pop_back();
+    ShowMessageBox(owner,
+                   FormatDriverText(LoadUiText(IDS_TEMPORARY_FOLDER_UNUSABLE),
+                                    {folder, SystemResultText(result)}),
+                   LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONSTOP);
+    return result;
 }
 
 }  // namespace
@@ -205,20 +241,22 @@ HRESULT CLVDataObject::GetFileContents(LONG index, STGMEDIUM* medium) {
     if (loaded != S_OK)
         return loaded;
 
+    // The caller's active window, if any, owns the dialog so that it stays in front of it.
+    const HWND owner = ::GetActiveWindow();
     // A fresh temporary name for every request: asking twice downloads twice.
     std::wstring target;
-    RETURN_IF_FAILED(MakeDownloadTarget(target));
+    RETURN_IF_FAILED(PrepareDownloadTarget(owner, target));
 
     const bool external = IsExternalLibraryModel(station.Model);
     // The library writes its file under the given name with ".txt" added.
     const std::wstring file = external ? target + L".txt" : target;
-    // The caller's active window, if any, owns the dialog so that it stays in front of it.
-    const HWND owner = ::GetActiveWindow();
     INT_PTR answer = -1;
     bool completed = false;
+    HRESULT downloadResult = S_OK;
     const auto run = [&](CProgressDialogBase&& dialog) {
         answer = dialog.DoModal();
         completed = dialog.TransferCompleted();
+        downloadResult = dialog.DownloadResult();
     };
     if (external)
         run(CHalvekDownloadProgressDialog(owner, station, target));
@@ -231,11 +269,20 @@ HRESULT CLVDataObject::GetFileContents(LONG index, STGMEDIUM* medium) {
         (void)::DeleteFileW(file.c_str());  // usually there is none: nothing to report
         if (answer == -1)
             LV_LOG_AND_RETURN(E_FAIL);
+        // A download the system refused (a full disk) fails the copy with its reason, so that
+        // the caller reports a failure rather than a cancel; the user has seen the reason.
+        if (FAILED(downloadResult))
+            LV_LOG_AND_RETURN(downloadResult);
         return S_FALSE;
     }
 
     auto stream = MakeComObject<CStream2>();
-    RETURN_IF_FAILED(stream->Bind(file, true));
+    // A file that cannot be opened now is no download: no stream over nothing.
+    const HRESULT bound = stream->Bind(file, true);
+    if (FAILED(bound)) {
+        (void)::DeleteFileW(file.c_str());  // whatever is left of it is of no use
+        LV_LOG_AND_RETURN(bound);
+    }
     medium->tymed = TYMED_ISTREAM;
     medium->pstm = stream.Detach();
     medium->pUnkForRelease = nullptr;
@@ -249,9 +296,14 @@ HRESULT CLVDataObject::GetShellIdListArray(STGMEDIUM* medium) {
     if (!parent)
         return S_FALSE;
 
+    // The block: cidl, then one offset for the parent and one for each child (aoffset), then
+    // the parent's list and each child's one-item list, each with its terminator. Every child
+    // has its own offset, unlike the one shared slot that older versions wrote: an offset left 0
+    // makes any reader walk the header as an item-ID list and run past the block.
     const UINT parentSize = manager_.GetSize(parent.get());
     std::vector<UniquePidl> children;
-    size_t size = parentSize + sizeof(UINT) * (items_.size() + 2);
+    const size_t headerSize = sizeof(UINT) * (items_.size() + 2);
+    size_t size = headerSize + parentSize;
     for (const UniquePidl& item : items_) {
         children.emplace_back(manager_.CopyItem(manager_.GetLastItem(item.get())));
         RETURN_IF_NULL_ALLOC(children.back().get());
@@ -264,18 +316,20 @@ HRESULT CLVDataObject::GetShellIdListArray(STGMEDIUM* medium) {
         GlobalLockGuard lock(block.get());
         RETURN_IF_NULL_ALLOC(lock.data());
         auto* bytes = static_cast<BYTE*>(lock.data());
-        auto* array = static_cast<CIDA*>(lock.data());
-        array->cidl = static_cast<UINT>(items_.size());
-        UINT offset = static_cast<UINT>(sizeof(UINT) * items_.size() + 8);
-        array->aoffset[0] = offset;
+        // Written as bytes: CIDA declares a one-entry aoffset that the block outgrows.
+        const auto writeHeaderValue = [bytes](size_t slot, size_t value) {
+            const UINT field = static_cast<UINT>(value);
+            memcpy(bytes + sizeof(UINT) * slot, &field, sizeof field);
+        };
+        writeHeaderValue(0, items_.size());
+        size_t offset = headerSize;
+        writeHeaderValue(1, offset);
         memcpy(bytes + offset, parent.get(), parentSize);
         offset += parentSize;
-        for (const UniquePidl& child : children) {
-            const UINT childSize = manager_.GetSize(child.get());
-            memcpy(bytes + offset, child.get(), childSize);
-            // Every child is written to the same slot, as receivers of this format have always
-            // been given it: correct for one item, the last child's offset for several.
-            array->aoffset[1] = offset;
+        for (size_t index = 0; index < children.size(); ++index) {
+            const UINT childSize = manager_.GetSize(children[index].get());
+            writeHeaderValue(index + 2, offset);
+            memcpy(bytes + offset, children[index].get(), childSize);
             offset += childSize;
         }
     }

@@ -1,17 +1,20 @@
 // The read-once file stream behind "FileContents".
 #include "view/stream2.h"
 
+#include <algorithm>
 #include <cstring>
 #include <cwchar>
+#include <memory>
+#include <new>
 
 #include "support/error_handling.h"
+#include "support/read_only_file.h"
 
 namespace {
 
-HANDLE OpenForReading(const std::wstring& path) {
-    return ::CreateFileW(path.c_str(), GENERIC_READ, FILE_SHARE_READ, nullptr, OPEN_EXISTING,
-                         FILE_ATTRIBUTE_NORMAL, nullptr);
-}
+// CopyTo's piece: large enough that a copy of a survey takes a few calls, small enough to keep
+// off the stack of a shell thread.
+constexpr ULONG kCopyPieceBytes = 64 * 1024;
 
 }  // namespace
 
@@ -24,13 +27,15 @@ CStream2::~CStream2() {
 }
 
 HRESULT CStream2::Bind(const std::wstring& path, bool deleteWhenFinished) {
+    std::lock_guard<std::mutex> guard(lock_);
     path_ = path;
     deleteWhenFinished_ = deleteWhenFinished;
-    UniqueFileHandle file(OpenForReading(path_));
-    // The stream announces 32-bit sizes; a file it cannot open announces 0.
-    size_ = file ? ::GetFileSize(file.get(), nullptr) : 0;
-    if (size_ == INVALID_FILE_SIZE)
-        size_ = 0;
+    // Kept open from here on: the size announced and the bytes read are those of one file.
+    const HRESULT opened = OpenReadOnlyFile(path_, file_, size_);
+    if (FAILED(opened))
+        return opened;
+    position_ = 0;
+    state_ = kReading;
     return S_OK;
 }
 
@@ -40,37 +45,127 @@ IFACEMETHODIMP CStream2::QueryInterface(REFIID iid, void** object) {
     return QISearch(this, table, iid, object);
 }
 
-IFACEMETHODIMP CStream2::Read(void* buffer, ULONG wanted, ULONG* got) {
-    ULONG read = 0;
-    if (got)
-        *got = 0;
-    if (state_ == kNotOpened) {
-        file_.reset(OpenForReading(path_));
-        // As an HRESULT: the bare Win32 code (2 for a vanished file) would read as success.
-        if (!file_)
-            return LastErrorResult();
-        state_ = kReading;
-    }
-    if (state_ != kReading)
-        return S_OK;
-    if (!::ReadFile(file_.get(), buffer, wanted, &read, nullptr))
-        return LastErrorResult();
-    if (got)
-        *got = read;
-    if (read == wanted)
-        return S_OK;
+void CStream2::Finish() noexcept {
     state_ = kFinished;
     file_.reset();
     // The temporary download is gone once it has been read; a failed delete leaves it in the
     // user's temporary folder, which is not worth failing the copy for.
     if (deleteWhenFinished_)
         (void)::DeleteFileW(path_.c_str());
+}
+
+HRESULT CStream2::ReadLocked(void* buffer, ULONG wanted, ULONG* got) {
+    if (got)
+        *got = 0;
+    if (state_ == kFinished)
+        return S_OK;
+    // Bound streams hold their file open until they finish: without one there is nothing to read.
+    if (!file_)
+        return E_UNEXPECTED;
+    DWORD read = 0;
+    if (!::ReadFile(file_.get(), buffer, wanted, &read, nullptr))
+        return LastErrorResult();
+    position_ += read;
+    if (got)
+        *got = read;
+    // A short read is the end.
+    if (read < wanted)
+        Finish();
+    return S_OK;
+}
+
+IFACEMETHODIMP CStream2::Read(void* buffer, ULONG wanted, ULONG* got) {
+    if (!buffer && wanted != 0)
+        return STG_E_INVALIDPOINTER;
+    std::lock_guard<std::mutex> guard(lock_);
+    return ReadLocked(buffer, wanted, got);
+}
+
+IFACEMETHODIMP CStream2::Seek(LARGE_INTEGER move, DWORD origin, ULARGE_INTEGER* position) {
+    std::lock_guard<std::mutex> guard(lock_);
+    uint64_t base = 0;
+    switch (origin) {
+        case STREAM_SEEK_SET:
+            break;
+        case STREAM_SEEK_CUR:
+            base = position_;
+            break;
+        case STREAM_SEEK_END:
+            base = size_;
+            break;
+        default:
+            return STG_E_INVALIDFUNCTION;
+    }
+    // Before the start, or beyond what 64 bits hold, is no position.
+    uint64_t target = base;
+    if (move.QuadPart < 0) {
+        const uint64_t back = 0 - static_cast<uint64_t>(move.QuadPart);
+        if (back > base)
+            return STG_E_INVALIDFUNCTION;
+        target = base - back;
+    } else {
+        target = base + static_cast<uint64_t>(move.QuadPart);
+        if (target < base || target > static_cast<uint64_t>(INT64_MAX))
+            return STG_E_INVALIDFUNCTION;
+    }
+    // Read to its end, the file is gone: only staying where the stream ended can be honoured.
+    if (state_ == kFinished && target != position_)
+        return STG_E_INVALIDFUNCTION;
+    if (file_) {
+        LARGE_INTEGER to{};
+        to.QuadPart = static_cast<LONGLONG>(target);
+        if (!::SetFilePointerEx(file_.get(), to, nullptr, FILE_BEGIN))
+            return LastErrorResult();
+    }
+    position_ = target;
+    if (position)
+        position->QuadPart = position_;
+    return S_OK;
+}
+
+IFACEMETHODIMP CStream2::CopyTo(IStream* target, ULARGE_INTEGER count, ULARGE_INTEGER* read,
+                                ULARGE_INTEGER* written) {
+    if (read)
+        read->QuadPart = 0;
+    if (written)
+        written->QuadPart = 0;
+    if (!target)
+        return STG_E_INVALIDPOINTER;
+    std::unique_ptr<uint8_t[]> piece(new (std::nothrow) uint8_t[kCopyPieceBytes]);
+    RETURN_IF_NULL_ALLOC(piece.get());
+    std::lock_guard<std::mutex> guard(lock_);
+    uint64_t left = count.QuadPart;
+    uint64_t totalRead = 0;
+    uint64_t totalWritten = 0;
+    while (left > 0 && state_ != kFinished) {
+        const ULONG wanted = static_cast<ULONG>(std::min<uint64_t>(left, kCopyPieceBytes));
+        ULONG got = 0;
+        RETURN_IF_FAILED(ReadLocked(piece.get(), wanted, &got));
+        totalRead += got;
+        if (read)
+            read->QuadPart = totalRead;
+        if (got > 0) {
+            ULONG moved = 0;
+            RETURN_IF_FAILED(target->Write(piece.get(), got, &moved));
+            totalWritten += moved;
+            if (written)
+                written->QuadPart = totalWritten;
+            // A target that takes less than it was given has run out of room.
+            if (moved != got)
+                LV_LOG_AND_RETURN(STG_E_MEDIUMFULL);
+        }
+        left -= got;
+    }
+    // A copy that took the last byte is a read to the end, even when it asked for no more.
+    if (state_ != kFinished && position_ >= size_)
+        Finish();
     return S_OK;
 }
 
 IFACEMETHODIMP CStream2::Stat(STATSTG* statistics, DWORD flags) {
     if (!statistics)
-        return E_POINTER;
+        return STG_E_INVALIDPOINTER;
+    std::lock_guard<std::mutex> guard(lock_);
     // The whole record: a caller may free pwcsName whenever it did not pass STATFLAG_NONAME.
     *statistics = {};
     statistics->type = STGTY_STREAM;

@@ -4,20 +4,25 @@
 #include <windows.h>
 #include <objidl.h>
 
+#include <cstdint>
+#include <mutex>
 #include <string>
 
 #include "support/com_object.h"
 #include "support/unique_resource.h"
 
+// The shell's copy engine sizes the stream (Stat, or Seek to the end and back), then reads it
+// with Read or CopyTo, possibly from another thread than the one that got it. Every operation
+// it relies on either does what IStream promises or fails; none answers S_OK with nothing done.
 class CStream2 final : public ComObject<IStream> {
 public:
     CStream2() = default;
     // Deletes the file when asked to at binding and it was not read to the end.
     ~CStream2() override;
 
-    // Keeps the path and takes the file's size now (0 when it cannot be opened); the file itself
-    // is opened at the first Read. Always succeeds.
-    HRESULT Bind(const std::wstring& path, bool deleteWhenFinished);
+    // Opens the file and takes its size. Fails with the open's HRESULT when the file cannot be
+    // read: a stream over a missing file would hand the caller an empty file as a good one.
+    [[nodiscard]] HRESULT Bind(const std::wstring& path, bool deleteWhenFinished);
 
     IFACEMETHODIMP QueryInterface(REFIID iid, void** object) override;
 
@@ -25,12 +30,14 @@ public:
     // Win32 error as an HRESULT.
     IFACEMETHODIMP Read(void* buffer, ULONG wanted, ULONG* got) override;
     IFACEMETHODIMP Write(const void*, ULONG, ULONG*) override { return E_NOTIMPL; }
-    // The stream only goes forward: seeking is accepted and does nothing.
-    IFACEMETHODIMP Seek(LARGE_INTEGER, DWORD, ULARGE_INTEGER*) override { return S_OK; }
+    // Moves within the file and reports the position. Once the file is gone only a seek that
+    // stays where the stream ended can be honoured; any other fails with STG_E_INVALIDFUNCTION.
+    IFACEMETHODIMP Seek(LARGE_INTEGER move, DWORD origin, ULARGE_INTEGER* position) override;
     IFACEMETHODIMP SetSize(ULARGE_INTEGER) override { return E_NOTIMPL; }
-    IFACEMETHODIMP CopyTo(IStream*, ULARGE_INTEGER, ULARGE_INTEGER*, ULARGE_INTEGER*) override {
-        return E_NOTIMPL;
-    }
+    // Copies up to `count` bytes from the position on; a copy that reaches the end ends the
+    // stream as a read to the end does.
+    IFACEMETHODIMP CopyTo(IStream* target, ULARGE_INTEGER count, ULARGE_INTEGER* read,
+                          ULARGE_INTEGER* written) override;
     IFACEMETHODIMP Commit(DWORD) override { return E_NOTIMPL; }
     IFACEMETHODIMP Revert() override { return E_NOTIMPL; }
     IFACEMETHODIMP LockRegion(ULARGE_INTEGER, ULARGE_INTEGER, DWORD) override { return E_NOTIMPL; }
@@ -44,8 +51,14 @@ public:
 private:
     enum State : DWORD { kNotOpened = 0, kReading = 2, kFinished = 3 };
 
+    HRESULT ReadLocked(void* buffer, ULONG wanted, ULONG* got);
+    // Closes the file and, when asked at binding, deletes it; the state ends finished.
+    void Finish() noexcept;
+
+    std::mutex lock_;  // the caller may share the stream between threads
     std::wstring path_;
-    DWORD size_ = 0;
+    uint64_t size_ = 0;
+    uint64_t position_ = 0;
     State state_ = kNotOpened;
     UniqueFileHandle file_;
     bool deleteWhenFinished_ = false;

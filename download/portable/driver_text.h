@@ -1,6 +1,7 @@
 // The driver's user-visible texts: looked up by whoever runs it, formatted here.
 #pragma once
 
+#include <cstdint>
 #include <initializer_list>
 
 #include "support/portable/wide_text.h"
@@ -19,6 +20,8 @@ class DriverTextSource {
 public:
     virtual ~DriverTextSource() = default;
     virtual WideString Text(DriverText text) const = 0;
+    // The system's own text for one of its error codes (a failed write of the output file).
+    virtual WideString SystemErrorText(uint32_t code) const = 0;
 };
 
 // Replaces each %s or %d of format by the next argument, in order, and %% by %. A conversion

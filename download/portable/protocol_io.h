@@ -30,13 +30,17 @@ public:
     virtual uint32_t TickMilliseconds() = 0;
 };
 
-// The output file of one receive. Create empties an existing file.
+// The output file of one receive. Create empties an existing file. Write and Close answer the
+// system's error code, 0 when every byte is in the file: the driver must not acknowledge, nor
+// report as complete, what the disk refused.
 class ReceiveFile {
 public:
     virtual ~ReceiveFile() = default;
-    [[nodiscard]] virtual bool Create() = 0;
-    virtual void Write(const uint8_t* bytes, size_t count) = 0;
+    [[nodiscard]] virtual uint32_t Create() = 0;
+    // A write that stores fewer bytes than asked without a code of its own counts as a full disk.
+    [[nodiscard]] virtual uint32_t Write(const uint8_t* bytes, size_t count) = 0;
     // Bytes written so far.
     virtual uint64_t Position() = 0;
-    virtual void Close() = 0;
+    // Flushes and closes; later calls answer 0.
+    [[nodiscard]] virtual uint32_t Close() = 0;
 };

@@ -71,6 +71,37 @@ bool SerialProtocol::CheckTimeoutAndCancel(int64_t lastProgress) {
     return !CancelSeen();
 }
 
+void SerialProtocol::FailOutput(uint32_t error) {
+    if (fileError_ != 0)
+        return;  // the first failure is the one the user needs to see
+    fileError_ = error;
+    Report(kMessageError, texts_.SystemErrorText(error));
+}
+
+bool SerialProtocol::CreateOutputFile() {
+    fileError_ = 0;
+    const uint32_t error = file_.Create();
+    if (error != 0)
+        FailOutput(error);
+    return error == 0;
+}
+
+bool SerialProtocol::WriteOutput(const uint8_t* bytes, size_t count) {
+    if (fileError_ != 0)
+        return false;
+    const uint32_t error = file_.Write(bytes, count);
+    if (error != 0)
+        FailOutput(error);
+    return error == 0;
+}
+
+bool SerialProtocol::CloseOutputFile() {
+    const uint32_t error = file_.Close();
+    if (error != 0)
+        FailOutput(error);
+    return fileError_ == 0;
+}
+
 void SerialProtocol::SendBytes(const uint8_t* bytes, size_t count) {
     if (!portOpen_)
         return;
@@ -92,7 +123,7 @@ void SerialProtocol::SendByteWithLineEnd(uint8_t value) {
 uint32_t SerialProtocol::ReceiveLines() {
     if (!portOpen_)
         return 1;
-    if (!file_.Create())
+    if (!CreateOutputFile())
         return 1;
     port_.Purge(true, true);
     int64_t lastProgress = clock_.WallSeconds();
@@ -115,7 +146,7 @@ uint32_t SerialProtocol::ReceiveLines() {
         while (lineEnd == 0) {
             if (!CheckTimeoutAndCancel(lastProgress) || stopRequest_ ||
                 refusedHeaderLines > kMaxRefusedHeaderLines) {
-                file_.Close();
+                (void)file_.Close();  // the receive has failed: a close error adds nothing
                 return 1;
             }
             if (length < kLineCapacity) {
@@ -148,20 +179,25 @@ uint32_t SerialProtocol::ReceiveLines() {
             SendBytes(kNakLine, sizeof kNakLine);  // the instrument sends the line again
             continue;
         }
-        SendBytes(kAckLine, sizeof kAckLine);
-
-        // A line repeated because our ACK was lost is acknowledged again but written once.
+        // A line repeated because our ACK was lost is acknowledged again but written once. The
+        // line goes into the file before the instrument hears that it arrived: a line the disk
+        // refused is never acknowledged, and the receive ends with the instrument still holding it.
         if (!SameText(line.data(), previous.data(), line.size())) {
-            file_.Write(line.data(), length);
+            if (!WriteOutput(line.data(), length)) {
+                (void)file_.Close();  // the write's error is the one the user sees
+                return 1;
+            }
             std::memcpy(previous.data(), line.data(), lineEnd + 1);
         }
+        // The end line is acknowledged only once the whole file is safely closed.
+        if (finished && !CloseOutputFile())
+            return 1;
+        SendBytes(kAckLine, sizeof kAckLine);
         lastProgress = clock_.WallSeconds();
         acceptedLines = std::min(acceptedLines + 1, kProgressLines);
         callback_.SetProgress(100, acceptedLines * 100 / kProgressLines);
-        if (finished) {
-            file_.Close();
+        if (finished)
             return 0;
-        }
     }
 }
 

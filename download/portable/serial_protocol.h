@@ -28,6 +28,8 @@ public:
     void RequestStop() noexcept { stopRequest_ = true; }
     uint32_t FileSize() const noexcept { return fileSize_; }
     const std::string& YModemFileName() const noexcept { return yModemFileName_; }
+    // The system's code of the write that ended the last receive; 0 when every write succeeded.
+    uint32_t FileError() const noexcept { return fileError_; }
     uint32_t ExpectedBlockCount() const noexcept { return expectedBlockCount_; }
 
     // The line protocol: header "A,01,Z", checked lines each answered ACK or NAK, end "Z,&,".
@@ -55,6 +57,14 @@ private:
     // Reads one burst without writing; returns the count.
     size_t ReadBurst(int firstByte);
     bool CancelSeen();
+    // Writes to the output file; the first refused write is reported with the system's text and
+    // fails every later one, so that the receive ends before it acknowledges the data.
+    [[nodiscard]] bool WriteOutput(const uint8_t* bytes, size_t count);
+    // Opens the output file for a new receive and forgets an earlier write failure.
+    [[nodiscard]] bool CreateOutputFile();
+    // Closes the output file; false when the file is not complete (a write or the close failed).
+    bool CloseOutputFile();
+    void FailOutput(uint32_t error);
 
     uint32_t ReceiveRawStream();
     uint32_t ReceiveBccBlocks();
@@ -75,6 +85,7 @@ private:
     uint32_t fileSize_ = 0;
     uint32_t bytesWritten_ = 0;
     bool fileOpened_ = false;
+    uint32_t fileError_ = 0;
     uint32_t lastBlockDigit_ = 9;
     std::array<uint8_t, kBlockCapacity + 1> receiveBuffer_{};
     CrcTable crcTable_{};

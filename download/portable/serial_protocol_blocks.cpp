@@ -29,6 +29,8 @@ size_t SerialProtocol::ReadBurst(int firstByte) {
     return receiveCount_;
 }
 
+// A refused write is seen by the procedures through fileError_ right after this returns, before
+// they answer the block.
 uint8_t SerialProtocol::ReceiveBlock(int firstByte) {
     ReadBurst(firstByte);
     const uint8_t* data = receiveBuffer_.data();
@@ -45,7 +47,7 @@ uint8_t SerialProtocol::ReceiveBlock(int firstByte) {
     if (selector_ == 2) {
         if (result == kAck) {
             const uint32_t left = fileSize_ > bytesWritten_ ? fileSize_ - bytesWritten_ : 0;
-            file_.Write(data, std::min<uint32_t>(left, kBlockDataSize));
+            (void)WriteOutput(data, std::min<uint32_t>(left, kBlockDataSize));
             bytesWritten_ += kBlockDataSize;
         }
     } else if (selector_ == 1) {
@@ -53,11 +55,11 @@ uint8_t SerialProtocol::ReceiveBlock(int firstByte) {
             // A block sent again because our reply was lost carries the same digit.
             const uint32_t digit = receiveBuffer_[129];
             if (digit != lastBlockDigit_)
-                file_.Write(data, dataSize);
+                (void)WriteOutput(data, dataSize);
             lastBlockDigit_ = digit;
         }
     } else {
-        file_.Write(data, dataSize);
+        (void)WriteOutput(data, dataSize);
         if (std::memchr(data, kEot, dataSize) != nullptr)
             result = kEot;
     }
@@ -68,7 +70,7 @@ uint32_t SerialProtocol::Receive() {
     if (!portOpen_)
         return 1;
     port_.Purge(true, true);
-    if (!file_.Create())
+    if (!CreateOutputFile())
         return 1;
     uint32_t result = 1;
     switch (selector_) {
@@ -82,7 +84,9 @@ uint32_t SerialProtocol::Receive() {
             result = ReceiveRawStream();
             break;
     }
-    file_.Close();
+    // A receive that ended well but left an incomplete file has failed.
+    if (!CloseOutputFile())
+        result = 1;
     return result;
 }
 
@@ -99,6 +103,8 @@ uint32_t SerialProtocol::ReceiveRawStream() {
         counter = std::min(counter + 1, 10u);
         callback_.SetProgress(100, counter * 10);
         const uint8_t result = ReceiveBlock(first);
+        if (fileError_ != 0)
+            return 1;
         lastProgress = clock_.WallSeconds();
         if (result == kEot)
             return 0;
@@ -123,6 +129,8 @@ uint32_t SerialProtocol::ReceiveBccBlocks() {
         }
         result = ReceiveBlock(-1);
     }
+    if (fileError_ != 0)
+        return 1;
 
     uint8_t reply = kAck;
     uint32_t counter = 1;
@@ -132,6 +140,8 @@ uint32_t SerialProtocol::ReceiveBccBlocks() {
         for (int tries = 1;; ++tries) {
             SendByteWithLineEnd(reply);
             reply = MapBccReply(ReceiveBlock(-1));
+            if (fileError_ != 0)
+                return 1;
             if (reply != kNak)
                 break;
             if (tries == kBccTries) {
@@ -188,6 +198,8 @@ uint32_t SerialProtocol::ReceiveYModem() {
     int naksInARow = 0;
     for (;;) {
         const uint8_t result = ReceiveBlock(-1);
+        if (fileError_ != 0)
+            return 1;
         if (result == kNak) {
             SendBytes(&result, 1);
             if (++naksInARow >= kYModemNakLimit) {

@@ -25,13 +25,16 @@
 constexpr wchar_t kStationList[] = L"Quorvel Total Stations";  // the clipboard format's name
 constexpr wchar_t kNorthFile[] = L"Quorvel Digital Level\\North\\file1.lv";
 
-// Answers every modal dialog at once without showing it, and counts the runs.
+// Answers every modal dialog at once without showing it, and counts the runs; message boxes
+// are recorded and answered OK.
 class ScriptedDialogs : public UserInterface {
 public:
     explicit ScriptedDialogs(INT_PTR answer) : answer_(answer) {}
-    int ShowMessageBox(HWND, const std::wstring&, const std::wstring&, UINT) override {
+    int ShowMessageBox(HWND, const std::wstring& text, const std::wstring&, UINT) override {
+        messages.push_back(text);
         return IDOK;
     }
+    std::vector<std::wstring> messages;
     INT_PTR RunModalDialog(HINSTANCE, UINT, HWND, DLGPROC, LPARAM) override {
         ++runs;
         return answer_;

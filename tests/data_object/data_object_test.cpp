@@ -4,7 +4,9 @@
 
 #include <gtest/gtest.h>
 
+#include <cstring>
 #include <utility>
+#include <vector>
 
 #include "tests/data_object/data_object_fixture.h"
 
@@ -132,29 +134,88 @@ TEST_F(DataObject, SetDataReleasesTheMediumOnlyWhenItIsHandedOver) {
     }
 }
 
-TEST_F(DataObject, ShellIdListArrayOfThreeItemsKeepsItsHistoricOffsets) {
-    ComPtr<IDataObject> data =
-        Over({L"Quorvel Digital Level\\North", L"Quorvel Digital Level\\South",
-              L"Quorvel Digital Level\\East"});
-    UniqueStgMedium medium;
-    ASSERT_EQ(S_OK, Get(data.Get(), CFSTR_SHELLIDLIST, TYMED_HGLOBAL, medium));
-    GlobalLockGuard lock(medium.get().hGlobal);
-    const auto* bytes = static_cast<const BYTE*>(lock.data());
-    const auto* array = static_cast<const CIDA*>(lock.data());
-    ASSERT_EQ(3u, array->cidl);
-    EXPECT_EQ(4u * 3 + 8, array->aoffset[0]);
-    const UINT* offsets = array->aoffset;
-    EXPECT_EQ(0u, offsets[2]);
-    EXPECT_EQ(0u, offsets[3]);
+namespace {
 
-    const auto* parent = reinterpret_cast<LPCITEMIDLIST>(bytes + offsets[0]);
-    EXPECT_EQ(1u, manager_.GetItemCount(parent));
-    EXPECT_EQ(L"Quorvel Digital Level", manager_.GetItemName(parent));
-    const auto* child = reinterpret_cast<LPCITEMIDLIST>(bytes + offsets[1]);
-    EXPECT_EQ(L"East", manager_.GetItemName(child)) << "the slot holds the last item's child";
-    EXPECT_GE(lock.size(), offsets[1] + manager_.GetSize(child))
-        << "the last child lies inside the block";
+// A strict reader of a "Shell IDList Array": every offset and every item-ID list it names must
+// lie wholly inside the block, or the block is refused (an empty result). Gives the parent's list
+// and then each child's, each with its terminator.
+std::vector<std::vector<BYTE>> StrictIdLists(const BYTE* block, size_t size) {
+    UINT count = 0;
+    if (size < sizeof count)
+        return {};
+    memcpy(&count, block, sizeof count);
+    if (sizeof(UINT) * (static_cast<size_t>(count) + 2) > size)
+        return {};  // the offsets themselves do not fit
+    std::vector<std::vector<BYTE>> lists;
+    for (UINT slot = 0; slot <= count; ++slot) {
+        UINT offset = 0;
+        memcpy(&offset, block + sizeof(UINT) * (slot + 1), sizeof offset);
+        size_t end = offset;
+        for (;;) {
+            USHORT itemSize = 0;
+            if (end + sizeof itemSize > size)
+                return {};
+            memcpy(&itemSize, block + end, sizeof itemSize);
+            end += itemSize == 0 ? sizeof itemSize : itemSize;
+            if (itemSize == 0)
+                break;
+            if (itemSize < sizeof itemSize)
+                return {};
+        }
+        if (offset < sizeof(UINT) * (count + 2))
+            return {};  // a list inside the header is the header misread
+        lists.emplace_back(block + offset, block + end);
+    }
+    return lists;
+}
 
+}  // namespace
+
+// One to five stations: every child has its own offset inside the block, names its station, and
+// the system's own reader of the format sees the same items.
+TEST_F(DataObject, ShellIdListArrayGivesEveryChildItsOwnOffsetInsideTheBlock) {
+    const wchar_t* const names[] = {L"North", L"South", L"East", L"West", L"Centre"};
+    for (size_t count = 1; count <= 5; ++count) {
+        SCOPED_TRACE(count);
+        auto object = MakeComObject<CLVDataObject>();
+        for (size_t index = 0; index < count; ++index) {
+            const std::wstring path = std::wstring(L"Quorvel Digital Level\\") + names[index];
+            UniquePidl list(manager_.CreatePidlFromPath(path.c_str()));
+            ASSERT_EQ(S_OK, object->SetItem(reinterpret_cast<PCUIDLIST_RELATIVE>(list.get())));
+        }
+        UniqueStgMedium medium;
+        ASSERT_EQ(S_OK, Get(object.Get(), CFSTR_SHELLIDLIST, TYMED_HGLOBAL, medium));
+        std::vector<std::vector<BYTE>> lists;
+        {
+            GlobalLockGuard lock(medium.get().hGlobal);
+            lists = StrictIdLists(static_cast<const BYTE*>(lock.data()), lock.size());
+        }
+        ASSERT_EQ(count + 1, lists.size()) << "an offset or a list outside the block";
+        const auto* parent = reinterpret_cast<LPCITEMIDLIST>(lists[0].data());
+        EXPECT_EQ(1u, manager_.GetItemCount(parent));
+        EXPECT_EQ(L"Quorvel Digital Level", manager_.GetItemName(parent));
+        for (size_t index = 0; index < count; ++index) {
+            const auto* child = reinterpret_cast<LPCITEMIDLIST>(lists[index + 1].data());
+            EXPECT_EQ(1u, manager_.GetItemCount(child));
+            EXPECT_EQ(names[index], manager_.GetItemName(child));
+        }
+
+        // The system's reader combines the parent with each child by the same offsets.
+        ComPtr<IShellItemArray> items;
+        ASSERT_EQ(S_OK, ::SHCreateShellItemArrayFromDataObject(object.Get(), IID_PPV_ARGS(&items)));
+        DWORD itemCount = 0;
+        ASSERT_EQ(S_OK, items->GetCount(&itemCount));
+        ASSERT_EQ(count, itemCount);
+        for (DWORD index = 0; index < itemCount; ++index) {
+            ComPtr<IShellItem> item;
+            ASSERT_EQ(S_OK, items->GetItemAt(index, &item));
+            UniquePidl full;
+            ASSERT_EQ(S_OK, ::SHGetIDListFromObject(
+                                item.Get(), reinterpret_cast<PIDLIST_ABSOLUTE*>(full.put())));
+            ASSERT_EQ(2u, manager_.GetItemCount(full.get()));
+            EXPECT_EQ(names[index], manager_.GetItemName(manager_.GetLastItem(full.get())));
+        }
+    }
     UniqueStgMedium none;
     EXPECT_EQ(S_FALSE,
               Get(Over({L"Quorvel Digital Level"}).Get(), CFSTR_SHELLIDLIST, TYMED_HGLOBAL, none))

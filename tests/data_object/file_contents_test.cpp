@@ -21,7 +21,8 @@ constexpr char kContent[] = "A,01,Z\r\n1,0.000,12.5,!,\r\n";
 // written to its output file; then reports the transfer's end, or sends a stray IDOK and Cancel.
 class PlayedDialogs : public ScriptedDialogs {
 public:
-    explicit PlayedDialogs(bool completes) : ScriptedDialogs(-1), completes_(completes) {}
+    explicit PlayedDialogs(bool completes, std::string content = kContent)
+        : ScriptedDialogs(-1), completes_(completes), content_(std::move(content)) {}
 
     INT_PTR RunModalDialog(HINSTANCE instance, UINT templateId, HWND parent, DLGPROC procedure,
                            LPARAM parameter) override {
@@ -52,7 +53,9 @@ private:
         UniqueFileHandle file(::CreateFileW(writtenPath.c_str(), GENERIC_WRITE, 0, nullptr,
                                             CREATE_ALWAYS, 0, nullptr));
         DWORD written = 0;
-        EXPECT_TRUE(::WriteFile(file.get(), kContent, sizeof kContent - 1, &written, nullptr));
+        EXPECT_TRUE(::WriteFile(file.get(), content_.data(), static_cast<DWORD>(content_.size()),
+                                &written, nullptr));
+        file.reset();
         if (!completes_) {
             ::PostMessageW(window, WM_COMMAND, IDOK, 0);
             ::PostMessageW(window, WM_COMMAND, IDCANCEL, 0);
@@ -66,6 +69,7 @@ private:
 
     static inline PlayedDialogs* current_ = nullptr;
     const bool completes_;
+    const std::string content_;
     CProgressDialogBase* dialog_ = nullptr;
 };
 
@@ -155,6 +159,32 @@ TEST_F(FileContents, TemporaryFolderFailuresAreFailureResultsAndRunNoDialog) {
             EXPECT_EQ(expected, result);
         }
         EXPECT_EQ(0, dialogs.runs);
+        // The surveyor is told which folder and why, before any dialog asks for the instrument.
+        ASSERT_EQ(1u, dialogs.messages.size());
+        EXPECT_EQ(0u, dialogs.messages[0].find(L"The download cannot be saved in the temporary "
+                                               L"folder "))
+            << dialogs.messages[0];
+        if (expected == 0) {
+            EXPECT_NE(std::wstring::npos, dialogs.messages[0].find(folder)) << dialogs.messages[0];
+        }
     }
     ASSERT_TRUE(::SetEnvironmentVariableW(L"TMP", saved));
+}
+
+// The external library's word is not taken for a file: one that is empty when the library
+// reports success fails the copy with a failure result, after the surveyor was told.
+TEST_F(FileContents, AnEmptyFileFromTheLibraryIsAFailedDownload) {
+    const std::vector<std::wstring> before = TemporaryDownloads();
+    PlayedDialogs dialogs(true, std::string());
+    ScopedUserInterface scope(dialogs);
+    UniqueStgMedium medium;
+    EXPECT_EQ(HRESULT_FROM_WIN32(ERROR_INVALID_DATA),
+              DownloadFile(L"Quorvel Digital Level\\South\\file1.hvr", medium));
+    EXPECT_EQ(static_cast<DWORD>(TYMED_NULL), medium.get().tymed);
+    EXPECT_EQ(IDCANCEL, dialogs.result);
+    ASSERT_EQ(1u, dialogs.messages.size());
+    EXPECT_EQ(0u, dialogs.messages[0].find(L"The downloaded file is not complete"))
+        << dialogs.messages[0];
+    EXPECT_FALSE(FileExists(dialogs.writtenPath));
+    EXPECT_EQ(before, TemporaryDownloads());
 }

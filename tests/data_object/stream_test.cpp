@@ -3,12 +3,16 @@
 
 #include <gtest/gtest.h>
 
+#include <climits>
 #include <cstring>
 #include <fstream>
 #include <utility>
 #include <vector>
 
+#include <wrl/client.h>
+
 #include "support/module_lock.h"
+#include "support/unique_resource.h"
 #include "tests/data_object/data_object_fixture.h"
 #include "view/stream2.h"
 
@@ -84,17 +88,191 @@ TEST(Stream2, StatFillsTheWholeRecordAndNamesTheFileOnlyWhenAsked) {
     ::CoTaskMemFree(statistics.pwcsName);  // what a caller does: the copy must be its own
 }
 
-TEST(Stream2, MissingFileHasSizeZeroAndReadFailsWithTheWin32ErrorAsAnHresult) {
+TEST(Stream2, FileThatCannotBeOpenedIsNoStream) {
     auto stream = MakeComObject<CStream2>();
-    ASSERT_EQ(S_OK, stream->Bind(L"C:\\no such folder\\QRV1.tmp", true));
-    STATSTG statistics{};
-    ASSERT_EQ(S_OK, stream->Stat(&statistics, STATFLAG_NONAME));
-    EXPECT_EQ(0u, statistics.cbSize.QuadPart);
+    EXPECT_EQ(HRESULT_FROM_WIN32(ERROR_PATH_NOT_FOUND),
+              stream->Bind(L"C:\\no such folder\\QRV1.tmp", true))
+        << "an empty stream would pass for an empty download";
     char buffer[4];
     ULONG got = 7;
-    EXPECT_EQ(HRESULT_FROM_WIN32(ERROR_PATH_NOT_FOUND), stream->Read(buffer, 4, &got))
-        << "the bare code 3 would read as success";
+    EXPECT_TRUE(FAILED(stream->Read(buffer, 4, &got)));
     EXPECT_EQ(0u, got);
     EXPECT_EQ(E_NOTIMPL, stream->Write(buffer, 4, &got));
-    EXPECT_EQ(S_OK, stream->Seek({}, STREAM_SEEK_SET, nullptr));
+}
+
+namespace {
+
+constexpr size_t kStreamSize = 1000;
+constexpr uint64_t kUnchanged = UINT64_MAX;
+
+// One call on the stream and what it must give: the HRESULT, the position Seek reports or the
+// count Read gives (Read's bytes must be the file's from `from`), and whether the file is there.
+struct StreamStep {
+    enum Kind { kSeek, kRead } kind;
+    LONGLONG move;  // Seek: the move; Read: unused
+    DWORD origin;   // Seek: the origin; Read: the bytes asked for
+    HRESULT result;
+    uint64_t expected;  // Seek: the position reported; Read: the count
+    uint64_t from;      // Read: where the bytes come from in the file
+    bool fileAfter;
+};
+
+StreamStep Seek(LONGLONG move, DWORD origin, HRESULT result, uint64_t position, bool file = true) {
+    return {StreamStep::kSeek, move, origin, result, position, 0, file};
+}
+StreamStep Read(ULONG wanted, uint64_t got, uint64_t from, bool file = true) {
+    return {StreamStep::kRead, 0, wanted, S_OK, got, from, file};
+}
+
+struct StreamScenario {
+    const char* what;
+    std::vector<StreamStep> steps;
+};
+
+}  // namespace
+
+// Every origin of Seek before, during and after the read, as a copy engine uses them: sizing the
+// stream by seeking to its end and back, reading from the middle, and seeking after the end.
+TEST(Stream2, SeekMovesWithinTheFileAndFailsWhereItCannotBeHonoured) {
+    const StreamScenario scenarios[] = {
+        {"sized by seeking to the end and back, then read whole",
+         {Seek(0, STREAM_SEEK_END, S_OK, kStreamSize), Seek(0, STREAM_SEEK_SET, S_OK, 0),
+          Read(600, 600, 0), Read(600, 400, 600, false)}},
+        {"each origin before the first read",
+         {Seek(10, STREAM_SEEK_SET, S_OK, 10), Seek(5, STREAM_SEEK_CUR, S_OK, 15),
+          Seek(-10, STREAM_SEEK_END, S_OK, kStreamSize - 10), Seek(-1, STREAM_SEEK_SET,
+          STG_E_INVALIDFUNCTION, kUnchanged), Seek(0, 7, STG_E_INVALIDFUNCTION, kUnchanged),
+          Seek(0, STREAM_SEEK_CUR, S_OK, kStreamSize - 10), Read(20, 10, kStreamSize - 10, false)}},
+        {"during the read: back, forward and relative",
+         {Read(100, 100, 0), Seek(0, STREAM_SEEK_CUR, S_OK, 100), Seek(50, STREAM_SEEK_SET, S_OK, 50),
+          Read(10, 10, 50), Seek(-30, STREAM_SEEK_CUR, S_OK, 30), Read(5, 5, 30),
+          Seek(LLONG_MIN, STREAM_SEEK_CUR, STG_E_INVALIDFUNCTION, kUnchanged)}},
+        {"past the end reads nothing and ends the stream",
+         {Seek(5, STREAM_SEEK_END, S_OK, kStreamSize + 5), Read(10, 0, 0, false)}},
+        {"after the end only staying put is honoured",
+         {Read(2000, kStreamSize, 0, false), Seek(0, STREAM_SEEK_CUR, S_OK, kStreamSize, false),
+          Seek(0, STREAM_SEEK_END, S_OK, kStreamSize, false),
+          Seek(0, STREAM_SEEK_SET, STG_E_INVALIDFUNCTION, kUnchanged, false),
+          Seek(-1, STREAM_SEEK_CUR, STG_E_INVALIDFUNCTION, kUnchanged, false),
+          Read(10, 0, 0, false)}},
+    };
+    for (const StreamScenario& scenario : scenarios) {
+        SCOPED_TRACE(scenario.what);
+        const std::wstring path = WriteTemporaryFile(kStreamSize);
+        auto stream = MakeComObject<CStream2>();
+        ASSERT_EQ(S_OK, stream->Bind(path, true));
+        for (size_t index = 0; index < scenario.steps.size(); ++index) {
+            const StreamStep& step = scenario.steps[index];
+            SCOPED_TRACE(index);
+            if (step.kind == StreamStep::kSeek) {
+                ULARGE_INTEGER position;
+                position.QuadPart = 0xDEADBEEF;
+                LARGE_INTEGER move;
+                move.QuadPart = step.move;
+                EXPECT_EQ(step.result, stream->Seek(move, step.origin, &position));
+                if (step.expected != kUnchanged) {
+                    EXPECT_EQ(step.expected, position.QuadPart);
+                }
+            } else {
+                std::vector<char> buffer(step.origin);
+                ULONG got = 0xFFFF;
+                EXPECT_EQ(step.result, stream->Read(buffer.data(), step.origin, &got));
+                ASSERT_EQ(step.expected, got);
+                for (ULONG i = 0; i < got; ++i)
+                    ASSERT_EQ(static_cast<char>('A' + (step.from + i) % 26), buffer[i]) << i;
+            }
+            EXPECT_EQ(step.fileAfter, FileExists(path));
+        }
+        STATSTG statistics{};
+        EXPECT_EQ(S_OK, stream->Stat(&statistics, STATFLAG_NONAME));
+        EXPECT_EQ(kStreamSize, statistics.cbSize.QuadPart) << "the size outlives the file";
+        stream.Reset();
+        ::DeleteFileW(path.c_str());
+    }
+}
+
+// CopyTo of the whole stream and of parts; a copy that takes the last byte ends the stream.
+TEST(Stream2, CopyToCopiesFromThePositionAndEndsTheStreamAtTheLastByte) {
+    struct Copy {
+        uint64_t count;
+        uint64_t copied;
+        bool fileAfter;
+    };
+    const struct {
+        const char* what;
+        uint64_t startAt;
+        std::vector<Copy> copies;
+    } cases[] = {
+        {"the whole stream at once", 0, {{UINT64_MAX, kStreamSize, false}}},
+        {"exactly the size, with no short read", 0, {{kStreamSize, kStreamSize, false}}},
+        {"in two parts", 0, {{400, 400, true}, {UINT64_MAX, kStreamSize - 400, false}}},
+        {"the rest after a seek", 300, {{UINT64_MAX, kStreamSize - 300, false}}},
+        {"nothing, then the rest", 0, {{0, 0, true}, {UINT64_MAX, kStreamSize, false}}},
+        {"more after the end copies nothing", 0,
+         {{UINT64_MAX, kStreamSize, false}, {UINT64_MAX, 0, false}}},
+    };
+    for (const auto& test : cases) {
+        SCOPED_TRACE(test.what);
+        const std::wstring path = WriteTemporaryFile(kStreamSize);
+        auto stream = MakeComObject<CStream2>();
+        ASSERT_EQ(S_OK, stream->Bind(path, true));
+        LARGE_INTEGER start;
+        start.QuadPart = static_cast<LONGLONG>(test.startAt);
+        ASSERT_EQ(S_OK, stream->Seek(start, STREAM_SEEK_SET, nullptr));
+        Microsoft::WRL::ComPtr<IStream> target;
+        ASSERT_EQ(S_OK, ::CreateStreamOnHGlobal(nullptr, TRUE, &target));
+        uint64_t total = 0;
+        for (const Copy& copy : test.copies) {
+            ULARGE_INTEGER count, read, written;
+            count.QuadPart = copy.count;
+            ASSERT_EQ(S_OK, stream->CopyTo(target.Get(), count, &read, &written));
+            EXPECT_EQ(copy.copied, read.QuadPart);
+            EXPECT_EQ(copy.copied, written.QuadPart);
+            EXPECT_EQ(copy.fileAfter, FileExists(path));
+            total += copy.copied;
+        }
+        STATSTG statistics{};
+        ASSERT_EQ(S_OK, target->Stat(&statistics, STATFLAG_NONAME));
+        ASSERT_EQ(total, statistics.cbSize.QuadPart);
+        HGLOBAL memory = nullptr;
+        ASSERT_EQ(S_OK, ::GetHGlobalFromStream(target.Get(), &memory));
+        GlobalLockGuard lock(memory);
+        const auto* bytes = static_cast<const char*>(lock.data());
+        for (uint64_t i = 0; i < total; ++i)
+            ASSERT_EQ(static_cast<char>('A' + (test.startAt + i) % 26), bytes[i]) << i;
+        stream.Reset();
+        ::DeleteFileW(path.c_str());
+    }
+}
+
+// The temporary file goes once: a file that appears at the same path after the stream ended
+// (the next download may be given the same name) is not the stream's to delete.
+TEST(Stream2, TheFileIsDeletedExactlyOnce) {
+    for (const bool byCopy : {false, true}) {
+        SCOPED_TRACE(byCopy ? "CopyTo" : "Read");
+        const std::wstring path = WriteTemporaryFile(kStreamSize);
+        {
+            auto stream = MakeComObject<CStream2>();
+            ASSERT_EQ(S_OK, stream->Bind(path, true));
+            if (byCopy) {
+                Microsoft::WRL::ComPtr<IStream> target;
+                ASSERT_EQ(S_OK, ::CreateStreamOnHGlobal(nullptr, TRUE, &target));
+                ULARGE_INTEGER all;
+                all.QuadPart = UINT64_MAX;
+                ASSERT_EQ(S_OK, stream->CopyTo(target.Get(), all, nullptr, nullptr));
+            } else {
+                std::vector<char> buffer(2 * kStreamSize);
+                ULONG got = 0;
+                ASSERT_EQ(S_OK, stream->Read(buffer.data(), 2 * kStreamSize, &got));
+            }
+            ASSERT_FALSE(FileExists(path));
+            std::ofstream(std::filesystem::path(path)) << "the next download";
+            ULONG got = 0;
+            char byte;
+            EXPECT_EQ(S_OK, stream->Read(&byte, 1, &got));
+            EXPECT_EQ(0u, got);
+        }
+        EXPECT_TRUE(FileExists(path)) << "deleted a second time";
+        ::DeleteFileW(path.c_str());
+    }
 }

@@ -254,4 +254,55 @@ TEST(YModem, SendingAHeaderWaitsForTheReceiverAndResendsUntilAck) {
     EXPECT_EQ(sends, 3);
 }
 
+
+// Each block procedure on a disk that fills up part-way through the second block: the receive
+// fails at that write, with the system's text, and the block that did not fit is not answered
+// as received (no ACK after it).
+TEST(BlockProcedures, ARefusedWriteFailsTheReceiveAtThatBlock) {
+    const WideString diskFull = WIDE_TEXT("System error 112");
+    {
+        SCOPED_TRACE("raw stream");
+        ProtocolRun run(0);
+        run.file.capacity = 20;
+        run.port.Deliver("first burst ");
+        run.port.onSilence = [sent = false](FakePort& port) mutable {
+            if (!std::exchange(sent, true))
+                port.Queue(ToBytes("second burst\x04"));
+        };
+        EXPECT_EQ(run.protocol.Receive(), 1u);
+        EXPECT_EQ(run.callback.messages, OnlyMessage(4, diskFull));
+        EXPECT_EQ(run.protocol.FileError(), MemoryFile::kDiskFull);
+        EXPECT_FALSE(run.file.open);
+    }
+    {
+        SCOPED_TRACE("BCC blocks");
+        BccRun run;
+        run.file.capacity = 128 + 10;
+        EXPECT_EQ(run.Receive(), 1u);
+        EXPECT_EQ(run.callback.messages, OnlyMessage(4, diskFull));
+        // ENQ, then the ACK of block 0; block 1 is left unanswered.
+        EXPECT_EQ(run.port.writes, (std::vector<Bytes>{kEnqLine, kAckLine}));
+        EXPECT_FALSE(run.file.open);
+    }
+    {
+        SCOPED_TRACE("Y-Modem");
+        YModemRun run(Bytes(400, 'L'));
+        run.file.capacity = 128 + 10;
+        EXPECT_EQ(run.Receive(), 1u);
+        EXPECT_EQ(run.callback.messages.back(), (RecordedMessage{4, diskFull}));
+        // 'C', the header's ACK 'C', the first block's ACK: nothing after the second block.
+        EXPECT_EQ(run.port.writes,
+                  (std::vector<Bytes>{Bytes{0x43}, Bytes{0x06, 0x43}, Bytes{0x06}}));
+        EXPECT_FALSE(run.file.open);
+    }
+}
+
+TEST(BlockProcedures, AFileThatFailsToCloseFailsAnOtherwiseGoodReceive) {
+    BccRun run;
+    run.file.closeError = 1784;
+    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_EQ(run.file.Text(), BlocksText(3));
+    EXPECT_EQ(run.callback.messages, OnlyMessage(4, WIDE_TEXT("System error 1784")));
+}
+
 }  // namespace

@@ -113,25 +113,39 @@ private:
     std::deque<Bytes> incoming_;
 };
 
+// A file on a disk of `capacity` bytes: a write past it stores what fits and fails as a full
+// disk does; closeError makes the close fail.
 class MemoryFile final : public ReceiveFile {
 public:
-    bool Create() override {
+    static constexpr uint32_t kDiskFull = 112;  // the system's code for a full disk
+
+    uint32_t Create() override {
         ++creates;
         content.clear();
-        open = true;
-        return true;
+        open = createError == 0;
+        return createError;
     }
-    void Write(const uint8_t* bytes, size_t count) override {
-        content.insert(content.end(), bytes, bytes + count);
+    uint32_t Write(const uint8_t* bytes, size_t count) override {
+        ++writeCalls;
+        const size_t room = capacity > content.size() ? capacity - content.size() : 0;
+        content.insert(content.end(), bytes, bytes + std::min(room, count));
+        return count <= room ? 0 : kDiskFull;
     }
     uint64_t Position() override { return content.size(); }
-    void Close() override { open = false; }
+    uint32_t Close() override {
+        open = false;
+        return closeError;
+    }
 
     std::string Text() const { return std::string(content.begin(), content.end()); }
 
     Bytes content;
     bool open = false;
     int creates = 0;
+    int writeCalls = 0;
+    size_t capacity = SIZE_MAX;
+    uint32_t closeError = 0;
+    uint32_t createError = 0;
 };
 
 struct RecordedMessage {
@@ -173,6 +187,9 @@ public:
             WIDE_TEXT("Y-Modem File Info: %s (size=%s)"),
         };
         return kTexts[static_cast<size_t>(text)];
+    }
+    WideString SystemErrorText(uint32_t code) const override {
+        return WIDE_TEXT("System error ") + DecimalText(code);
     }
 };
 

@@ -229,3 +229,58 @@ TEST(LineProtocol, BytesAfterALineAreDroppedByThePurge) {
 }
 
 }  // namespace
+
+// The disk refuses part of the file: the line that did not fit is never acknowledged, the
+// system's text is shown once, and the receive fails there. Whether the disk runs out at the
+// header, in the middle or at the end line, nothing after the refused line is asked for.
+TEST(LineProtocol, ARefusedWriteFailsTheReceiveBeforeTheLineIsAcknowledged) {
+    const std::vector<std::string> lines = Transfer(5);
+    for (size_t full = 0; full < lines.size(); ++full) {
+        SCOPED_TRACE(full);
+        LineRun run(lines);
+        // Room for the lines before `full` and part of that one.
+        run.file.capacity = Joined(lines, full).size() + 3;
+        EXPECT_EQ(run.Receive(), 1u);
+        EXPECT_EQ(run.port.writes, std::vector<Bytes>(full, kAckLine))
+            << "the refused line must not be acknowledged";
+        EXPECT_EQ(run.callback.messages,
+                  OnlyMessage(kMessageError, WIDE_TEXT("System error 112")));
+        EXPECT_EQ(run.protocol.FileError(), MemoryFile::kDiskFull);
+        EXPECT_EQ(run.file.writeCalls, static_cast<int>(full) + 1) << "no write after the first";
+        EXPECT_FALSE(run.file.open);
+    }
+}
+
+TEST(LineProtocol, AFileThatFailsToCloseFailsTheReceiveBeforeTheEndLineIsAcknowledged) {
+    LineRun run(Transfer(2));
+    run.file.closeError = 1784;  // a delayed write that the disk refused at the flush
+    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_EQ(run.port.writes, std::vector<Bytes>(3, kAckLine)) << "the end line stays unanswered";
+    EXPECT_EQ(run.callback.messages, OnlyMessage(kMessageError, WIDE_TEXT("System error 1784")));
+}
+
+TEST(LineProtocol, AWriteFailureOfOneReceiveIsForgottenByTheNext) {
+    LineRun run(Transfer(1));
+    run.file.capacity = 4;
+    ASSERT_EQ(run.Receive(), 1u);
+    LineRun again(Transfer(1));
+    again.file.capacity = 4;
+    ASSERT_EQ(again.Receive(), 1u);
+    // The same driver receives again on a disk with room.
+    run.file.capacity = SIZE_MAX;
+    run.next = 0;
+    run.attempt = 0;
+    run.callback.messages.clear();
+    EXPECT_EQ(run.Receive(), 0u);
+    EXPECT_EQ(run.protocol.FileError(), 0u);
+    EXPECT_EQ(run.file.Text(), Joined(run.lines));
+}
+
+TEST(LineProtocol, AnOutputFileThatCannotBeCreatedIsReportedAndNothingIsAcknowledged) {
+    LineRun run(Transfer(1));
+    run.file.createError = 3;  // the temporary folder vanished
+    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_TRUE(run.port.writes.empty());
+    EXPECT_EQ(run.callback.messages, OnlyMessage(kMessageError, WIDE_TEXT("System error 3")));
+    EXPECT_EQ(run.protocol.FileError(), 3u);
+}
