@@ -57,10 +57,17 @@ bool TAZComm::IsPortOpen() const noexcept {
 }
 
 uint32_t TAZComm::ReceiveLines() {
+    // The time-outs are set per procedure: lines are framed by CR LF, blocks by silence.
+    const DCB& dcb = params_->DeviceControlBlock;
+    const uint32_t bitsPerCharacter =
+        1 + dcb.ByteSize + (dcb.Parity != NOPARITY ? 1 : 0) + (dcb.StopBits == ONESTOPBIT ? 1 : 2);
+    // A port that refuses them keeps the block time-outs: slower per line, still correct.
+    (void)port_->SetTimeouts(ToCommTimeouts(MakeLineTimeouts(dcb.BaudRate, bitsPerCharacter)));
     return protocol_->ReceiveLines();
 }
 
 uint32_t TAZComm::Receive() {
+    (void)port_->SetTimeouts(params_->Timeouts);  // as opened; refused only by a port gone bad
     return protocol_->Receive();
 }
 

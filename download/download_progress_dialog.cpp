@@ -77,10 +77,10 @@ void CDownloadProgressDialog::OnThreadMessage(WPARAM code, LPARAM text) {
         return;
     }
     if (code == kMessageError || code == kMessagePortNotOpened) {
-        // The dialog stays open: the thread ends and closes it.
-        const std::wstring shown(message);
+        // The dialog stays open: the thread ends and closes it. The text is freed once the box
+        // is closed, which is what the thread waits for before it shows a box of its own.
+        ShowMessageBox(Window(), message, LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONSTOP);
         CLVDownloadThread::FreeMessageText(text);
-        ShowMessageBox(Window(), shown, LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONSTOP);
         return;
     }
     // The progress text only switches the status line; its percent is not shown.

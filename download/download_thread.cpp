@@ -3,6 +3,8 @@
 
 #include <algorithm>
 #include <cwchar>
+#include <chrono>
+#include <condition_variable>
 #include <mutex>
 #include <string>
 #include <unordered_map>
@@ -26,8 +28,13 @@ constexpr size_t kPortNameLength = 14;
 // the thread that posted it, which outlives its window.
 struct LiveTexts {
     std::mutex lock;
+    std::condition_variable freed;  // notified whenever a text is freed
     std::unordered_map<wchar_t*, const CLVDownloadThread*> owners;
 };
+
+// How long a thread waits for the dialog to close the boxes of its texts before it shows its own:
+// long enough for a reader, short enough that a lost text cannot hold the download's end.
+constexpr auto kMessageBoxWait = std::chrono::minutes(10);
 
 LiveTexts& PostedTexts() {
     static LiveTexts texts;
@@ -106,6 +113,9 @@ std::unique_ptr<TAZCommParams> CLVDownloadThread::MakeConnectionRecord(
 DWORD CLVDownloadThread::Run() {
     const DWORD result = driver_ ? driver_->ReceiveLines() : kGeneralFailure;
     if (result == kReceiveFailed) {
+        // The dialog shows the driver's own messages (a full disk, say) in boxes of its own: one
+        // box after the other, the reason before the summary, not two at once from two threads.
+        WaitForShownTexts();
         // One text for every failed receive (time-out, cancel, refused lines), as users know it.
         ShowMessageBox(notifyWindow_, LoadUiText(IDS_SERIAL_WAIT_EXPIRED),
                        LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONEXCLAMATION);
@@ -117,6 +127,24 @@ DWORD CLVDownloadThread::Run() {
     else if (!received_)
         result_ = S_FALSE;
     return 0;
+}
+
+void CLVDownloadThread::WaitForShownTexts() noexcept {
+    LiveTexts& texts = PostedTexts();
+    std::unique_lock<std::mutex> guard(texts.lock);
+    const auto deadline = std::chrono::steady_clock::now() + kMessageBoxWait;
+    const auto settled = [&] {
+        // A dialog that is gone shows nothing more; texts it never took are freed with us.
+        if (!::IsWindow(notifyWindow_))
+            return true;
+        for (const auto& [text, owner] : texts.owners)
+            if (owner == this)
+                return false;
+        return true;
+    };
+    // Woken by each freed text, and every so often to notice a dialog that went away.
+    while (!settled() && std::chrono::steady_clock::now() < deadline)
+        texts.freed.wait_for(guard, std::chrono::milliseconds(200));
 }
 
 void CLVDownloadThread::OnEnd() {
@@ -178,8 +206,10 @@ void CLVDownloadThread::FreeMessageText(LPARAM text) noexcept {
     LiveTexts& texts = PostedTexts();
     std::lock_guard<std::mutex> guard(texts.lock);
     // A text its thread already reclaimed is not freed twice.
-    if (texts.owners.erase(copy) != 0)
+    if (texts.owners.erase(copy) != 0) {
         delete[] copy;
+        texts.freed.notify_all();
+    }
 }
 
 long CLVDownloadThread::LiveMessageTexts() noexcept {

@@ -50,6 +50,9 @@ private:
     static std::unique_ptr<TAZCommParams> MakeConnectionRecord(const Station& station,
                                                                const std::wstring& outputPath);
     void PostToWindow(UINT message, WPARAM wParam, LPARAM lParam) noexcept;
+    // Returns once the dialog has freed every text this thread posted (their boxes are closed),
+    // the dialog is gone, or a long time has passed.
+    void WaitForShownTexts() noexcept;
 
     std::wstring outputPath_;
     std::unique_ptr<TAZComm> driver_;

@@ -76,6 +76,17 @@ DWORD Win32SerialPort::Open(const wchar_t* portName, const DCB& dcb,
     return ERROR_SUCCESS;
 }
 
+bool Win32SerialPort::SetTimeouts(const COMMTIMEOUTS& timeouts) noexcept {
+    if (!handle_)
+        return false;
+    COMMTIMEOUTS applied = timeouts;
+    if (!::SetCommTimeouts(handle_.get(), &applied))
+        return false;
+    readTotalConstant_ = timeouts.ReadTotalTimeoutConstant;
+    writeTotalConstant_ = timeouts.WriteTotalTimeoutConstant;
+    return true;
+}
+
 size_t Win32SerialPort::Read(uint8_t* buffer, size_t count) {
     if (!handle_ || count == 0)
         return 0;

@@ -28,6 +28,10 @@ public:
                              const COMMTIMEOUTS& timeouts) noexcept;
     [[nodiscard]] bool IsValid() const noexcept { return static_cast<bool>(handle_); }
 
+    // Replaces the time-outs of an open port; false when the port refuses them (it then keeps
+    // those it had).
+    [[nodiscard]] bool SetTimeouts(const COMMTIMEOUTS& timeouts) noexcept;
+
     size_t Read(uint8_t* buffer, size_t count) override;
     size_t Write(const uint8_t* bytes, size_t count) override;
     void Purge(bool transmit, bool receive) override;

@@ -40,6 +40,12 @@ HRESULT CQuorvelShellFolderBase::SetUp(CQuorvelShellFolderBase* parent,
         ownIdentifier_.reset(identifier ? manager_.CopyPidl(identifier)
                                         : manager_.CreateRootPidl());
         RETURN_IF_NULL_ALLOC(ownIdentifier_.get());
+        // A folder bound from a placed parent is placed below it; the root keeps its own.
+        if (parent && parent->Location() && identifier) {
+            location_.reset(reinterpret_cast<LPITEMIDLIST>(
+                ::ILCombine(parent->Location(), reinterpret_cast<PCUIDLIST_RELATIVE>(identifier))));
+            RETURN_IF_NULL_ALLOC(location_.get());
+        }
         parsingPrefix_.clear();
         if (manager_.IsRoot(ownIdentifier_.get())) {
             parsingPrefix_.resize(manager_.GetParsingPrefix(nullptr, 0));
@@ -222,6 +228,23 @@ HRESULT CQuorvelShellFolderBase::SetNameOf(HWND, PCUITEMID_CHILD, LPCWSTR, SHGDN
     return E_NOTIMPL;
 }
 
-HRESULT CQuorvelShellFolderBase::Initialize(PCIDLIST_ABSOLUTE) {
+HRESULT CQuorvelShellFolderBase::Initialize(PCIDLIST_ABSOLUTE location) {
+    if (location) {
+        location_.reset(reinterpret_cast<LPITEMIDLIST>(::ILClone(location)));
+        RETURN_IF_NULL_ALLOC(location_.get());
+    } else {
+        location_.reset();
+    }
     return SetUp(nullptr, nullptr);
+}
+
+HRESULT CQuorvelShellFolderBase::GetCurFolder(PIDLIST_ABSOLUTE* location) {
+    if (!location)
+        return E_POINTER;
+    *location = nullptr;
+    if (!location_)
+        return S_FALSE;
+    *location = reinterpret_cast<PIDLIST_ABSOLUTE>(::ILClone(Location()));
+    RETURN_IF_NULL_ALLOC(*location);
+    return S_OK;
 }

@@ -10,7 +10,7 @@
 
 #include "namespace/pidl_manager.h"
 
-class CQuorvelShellFolderBase : public IShellFolder, public IPersistFolder {
+class CQuorvelShellFolderBase : public IShellFolder, public IPersistFolder2 {
 public:
     CQuorvelShellFolderBase() noexcept;
     CQuorvelShellFolderBase(const CQuorvelShellFolderBase&) = delete;
@@ -34,8 +34,12 @@ public:
     IFACEMETHODIMP SetNameOf(HWND window, PCUITEMID_CHILD item, LPCWSTR name, SHGDNF flags,
                              PITEMID_CHILD* newItem) override;
 
-    // IPersistFolder: the shell's identifier is not needed, the folder always starts as the root.
-    IFACEMETHODIMP Initialize(PCIDLIST_ABSOLUTE ignored) override;
+    // IPersistFolder: the folder always starts as the root; the shell's identifier of it is kept
+    // only to name the folder to the shell (GetCurFolder, the parent of "Shell IDList Array").
+    IFACEMETHODIMP Initialize(PCIDLIST_ABSOLUTE location) override;
+    // IPersistFolder2: a copy of where the shell placed this folder; S_FALSE and null when the
+    // folder was never given a place.
+    IFACEMETHODIMP GetCurFolder(PIDLIST_ABSOLUTE* location) override;
 
     // Keeps the parent (one reference) and a copy of the identifier, or the root item when none is
     // given; then the parsing prefix (root only) and the own path.
@@ -51,6 +55,10 @@ public:
     PCUIDLIST_RELATIVE OwnIdentifier() const noexcept {
         return reinterpret_cast<PCUIDLIST_RELATIVE>(ownIdentifier_.get());
     }
+    // The shell's identifier of this folder, from the desktop; null when it has none.
+    PCIDLIST_ABSOLUTE Location() const noexcept {
+        return reinterpret_cast<PCIDLIST_ABSOLUTE>(location_.get());
+    }
 
 protected:
     virtual ~CQuorvelShellFolderBase();
@@ -62,6 +70,7 @@ protected:
 
 private:
     UniquePidl ownIdentifier_;
+    UniquePidl location_;  // the shell's identifier: the parent's and then this folder's item
     Microsoft::WRL::ComPtr<CQuorvelShellFolderBase> parent_;
     Microsoft::WRL::ComPtr<IMalloc> allocator_;
     std::wstring parsingPrefix_;  // empty unless the folder is the root

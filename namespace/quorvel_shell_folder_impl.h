@@ -80,7 +80,7 @@ public:
             if (iid == IID_IQueryInfo)
                 return CreateItemObject<QueryInfo>(items[0], iid, object);
             if (iid == IID_IDataObject)
-                return CreateItemObject<DataObject>(items[0], iid, object);
+                return CreateDataObject(items[0], iid, object);
             if (iid == IID_IDropTarget)
                 return CreateItemObject<DropTarget>(items[0], iid, object);
             // An item context menu among them: the view carries the item commands.
@@ -90,6 +90,17 @@ public:
     }
 
 private:
+    // A data object also learns where the folder is, to name the items' parent to the shell.
+    HRESULT CreateDataObject(PCUITEMID_CHILD item, REFIID iid, void** object) {
+        UniquePidl fullList;
+        RETURN_IF_FAILED(CreateFullList(item, fullList));
+        auto dataObject = MakeComObject<DataObject>();
+        RETURN_IF_FAILED(
+            dataObject->SetItem(reinterpret_cast<PCUIDLIST_RELATIVE>(fullList.get())));
+        RETURN_IF_FAILED(dataObject->SetFolderLocation(this->Location()));
+        return dataObject->QueryInterface(iid, object);
+    }
+
     // The object keeps its own copy of the item's full list; ours is freed on return.
     template <typename ItemObject>
     HRESULT CreateItemObject(PCUITEMID_CHILD item, REFIID iid, void** object) {

@@ -4,8 +4,9 @@
 HRESULT CLVShellFolder::QueryInterface(REFIID iid, void** object) {
     static const QITAB table[] = {
         QITABENT(CLVShellFolder, IShellFolder),
-        QITABENT(CLVShellFolder, IPersistFolder),
-        QITABENTMULTI(CLVShellFolder, IPersist, IPersistFolder),
+        QITABENT(CLVShellFolder, IPersistFolder2),
+        QITABENTMULTI(CLVShellFolder, IPersistFolder, IPersistFolder2),
+        QITABENTMULTI(CLVShellFolder, IPersist, IPersistFolder2),
         {},
     };
     return QISearch(this, table, iid, object);

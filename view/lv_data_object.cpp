@@ -107,6 +107,10 @@ HRESULT MakeDownloadTarget(const std::wstring& folder, std::wstring& target) {
     wchar_t temporary[MAX_PATH];
     if (::GetTempFileNameW(folder.c_str(), L"QRV", 0, temporary) == 0)
         LV_LOG_AND_RETURN(LastErrorResult());
+    // Windows makes the placeholder or fails; Wine hands out a name on a read-only drive without
+    // one. No placeholder means the folder takes no files.
+    if (::GetFileAttributesW(temporary) == INVALID_FILE_ATTRIBUTES)
+        LV_LOG_AND_RETURN(HRESULT_FROM_WIN32(ERROR_ACCESS_DENIED));
     // Only the unique name is wanted, so the placeholder goes and the name loses its extension.
     (void)::DeleteFileW(temporary);  // a placeholder left behind is empty and harmless
     target = temporary;
@@ -149,6 +153,15 @@ HRESULT CLVDataObject::SetItem(PCUIDLIST_RELATIVE fullList) {
         return S_OK;
     }
     CATCH_RETURN()
+}
+
+HRESULT CLVDataObject::SetFolderLocation(PCIDLIST_ABSOLUTE folder) {
+    folderLocation_.reset();
+    if (!folder)
+        return S_OK;
+    folderLocation_.reset(reinterpret_cast<LPITEMIDLIST>(::ILClone(folder)));
+    RETURN_IF_NULL_ALLOC(folderLocation_.get());
+    return S_OK;
 }
 
 void CLVDataObject::SetDragImage(HIMAGELIST images, HWND view, int xOffset, int yOffset) noexcept {
@@ -292,9 +305,15 @@ HRESULT CLVDataObject::GetFileContents(LONG index, STGMEDIUM* medium) {
 HRESULT CLVDataObject::GetShellIdListArray(STGMEDIUM* medium) {
     if (items_.empty())
         return S_FALSE;
-    UniquePidl parent(manager_.CopyParent(items_.front().get()));
-    if (!parent)
+    // The parent is the folder's identifier from the desktop, as readers of the format bind it:
+    // the items' own lists start inside the namespace, and a reader would take them for items
+    // of the desktop. Items must still name a parent inside the namespace, as always.
+    UniquePidl internalParent(manager_.CopyParent(items_.front().get()));
+    if (!internalParent || !folderLocation_)
         return S_FALSE;
+    UniquePidl parent(reinterpret_cast<LPITEMIDLIST>(
+        ::ILClone(reinterpret_cast<PCIDLIST_ABSOLUTE>(folderLocation_.get()))));
+    RETURN_IF_NULL_ALLOC(parent.get());
 
     // The block: cidl, then one offset for the parent and one for each child (aoffset), then
     // the parent's list and each child's one-item list, each with its terminator. Every child

@@ -23,6 +23,10 @@ public:
     // Appends a copy of one item's internal full identifier (root, station, and file if any).
     HRESULT SetItem(PCUIDLIST_RELATIVE fullList);
     HRESULT AddItem(PCUIDLIST_RELATIVE fullList) { return SetItem(fullList); }
+    // Where the shell has the folder the items were taken from (its identifier from the desktop):
+    // the parent that "Shell IDList Array" names. Without one the format is not given, since the
+    // items' own lists start inside the namespace and would be taken for the desktop's.
+    HRESULT SetFolderLocation(PCIDLIST_ABSOLUTE folder);
 
     // The drag image that the view's drag start prepared; the object destroys the list when the
     // drag ends.
@@ -58,6 +62,7 @@ private:
 
     CPidlMgr manager_;
     std::vector<UniquePidl> items_;
+    UniquePidl folderLocation_;
 
     UniqueHImageList dragImages_;
     HWND dragView_ = nullptr;

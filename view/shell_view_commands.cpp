@@ -166,7 +166,18 @@ HRESULT CLVShellView::AddSelectedItems(CLVDataObject& dataObject,
         RETURN_IF_FAILED(dataObject.AddItem(reinterpret_cast<PCUIDLIST_RELATIVE>(full.get())));
         added = true;
     }
-    return added ? S_OK : S_FALSE;
+    if (!added)
+        return S_FALSE;
+    // Where the shell has our folder, for the parent of "Shell IDList Array". A folder that was
+    // never placed (S_FALSE) leaves that format out; the others still carry the selection.
+    Microsoft::WRL::ComPtr<IPersistFolder2> persist;
+    UniqueCoTaskMem location;
+    if (SUCCEEDED(folder_.As(&persist)) &&
+        persist->GetCurFolder(reinterpret_cast<PIDLIST_ABSOLUTE*>(location.put())) == S_OK) {
+        RETURN_IF_FAILED(
+            dataObject.SetFolderLocation(static_cast<PCIDLIST_ABSOLUTE>(location.get())));
+    }
+    return S_OK;
 }
 
 void CLVShellView::PasteStations() {

@@ -256,8 +256,13 @@ void CLVShellView::OnColumnClick(int column) {
 
 void CLVShellView::ReadColumnWidths() noexcept {
     // The list has one column; the second width is kept as the control reports it (0).
+    int widths[kDisplayColumnCount] = {};
     for (size_t column = 0; column < kDisplayColumnCount; ++column)
-        SetDisplayColumnWidth(column, static_cast<int>(list_.Send(LVM_GETCOLUMNWIDTH, column)));
+        widths[column] = static_cast<int>(list_.Send(LVM_GETCOLUMNWIDTH, column));
+    // Stored now, while the change is fresh: the library's unload runs under the loader lock,
+    // where no registry call may be made. A failed write is in the error log and is made again
+    // at the next change; the view goes on with the new widths either way.
+    (void)StoreDisplayColumnWidths(widths);
 }
 
 void CLVShellView::OnGetDisplayInfo(NMLVDISPINFOW& info) {

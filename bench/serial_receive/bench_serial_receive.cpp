@@ -1,22 +1,37 @@
-// Receiving a generated file from lvsim through the real serial path: wall time against wire time.
+// Receiving a generated file from lvsim through the real serial path at several baud rates: the
+// time from the acknowledged header to the last answer against what the cable allows.
 #include <windows.h>
 
 #include <cstdio>
 #include <cwchar>
 #include <string>
+#include <vector>
 
 #include "download/az_comm.h"
 #include "support/unique_resource.h"
 
 namespace {
 
-class QuietCallback final : public TParserCallBack {
+// Notes when each line was answered: the driver reports progress right after each ACK.
+class TimingCallback final : public TParserCallBack {
 public:
     void ShowMessage(uint32_t code, const wchar_t* text) override {
         std::fprintf(stderr, "driver message %u: %ls\n", code, text);
     }
-    void SetProgress(uint32_t, uint32_t) override {}
+    void SetProgress(uint32_t, uint32_t current) override {
+        if (current == 0)
+            return;  // the start, before any line
+        LARGE_INTEGER now;
+        ::QueryPerformanceCounter(&now);
+        if (answers++ == 0)
+            headerAnswered = now;
+        lastAnswered = now;
+    }
     bool IsCancelled() override { return false; }
+
+    unsigned answers = 0;
+    LARGE_INTEGER headerAnswered{};
+    LARGE_INTEGER lastAnswered{};
 };
 
 double Seconds(const FILETIME& time) {
@@ -26,6 +41,12 @@ double Seconds(const FILETIME& time) {
     return static_cast<double>(value.QuadPart) / 1e7;
 }
 
+double ProcessCpuSeconds() {
+    FILETIME created, exited, kernel, user;
+    ::GetProcessTimes(::GetCurrentProcess(), &created, &exited, &kernel, &user);
+    return Seconds(kernel) + Seconds(user);
+}
+
 std::wstring ExecutableDirectory() {
     wchar_t path[MAX_PATH];
     const DWORD length = ::GetModuleFileNameW(nullptr, path, MAX_PATH);
@@ -33,77 +54,107 @@ std::wstring ExecutableDirectory() {
     return directory.substr(0, directory.find_last_of(L"\\/"));
 }
 
-}  // namespace
-
-int wmain(int argc, wchar_t** argv) {
+struct Options {
     std::wstring driverPort = L"COM22";
     std::wstring simulatorPort = L"COM23";
     unsigned lines = 1000;
-    unsigned lineLength = 60;
-    for (int i = 1; i + 1 < argc; i += 2) {
-        const std::wstring option = argv[i];
-        if (option == L"--driver-port")
-            driverPort = argv[i + 1];
-        else if (option == L"--sim-port")
-            simulatorPort = argv[i + 1];
-        else if (option == L"--lines")
-            lines = static_cast<unsigned>(std::wcstoul(argv[i + 1], nullptr, 10));
-    }
-    const std::wstring output = ExecutableDirectory() + L"\\bench-received.lv";
+    unsigned lineLength = 60;  // CR LF included
+    unsigned turnaroundMs = 10;
+    std::vector<unsigned> rates = {9600, 19200, 38400};
+    bool wholeWrites = false;
+};
 
+// One transfer at one rate; false when the receive failed.
+bool RunAt(const Options& options, unsigned baud) {
+    const std::wstring output = ExecutableDirectory() + L"\\bench-received.lv";
     TAZCommParams params;
-    params.DeviceControlBlock.BaudRate = 9600;
+    params.DeviceControlBlock.BaudRate = baud;
     params.DeviceControlBlock.ByteSize = 7;
     params.DeviceControlBlock.Parity = 2;
     params.DeviceControlBlock.StopBits = 0;
-    const std::wstring device = L"\\\\.\\" + driverPort;
+    const std::wstring device = L"\\\\.\\" + options.driverPort;
     wcsncpy(params.PortName, device.c_str(), 14);
     params.OutputPath = output;
-    QuietCallback callback;
+    TimingCallback callback;
     TAZComm driver(&callback, &params);
     if (!driver.IsPortOpen())
-        return 1;
+        return false;
 
     std::wstring command = L"\"" + ExecutableDirectory() + L"\\lvsim.exe\" --port " +
-                           simulatorPort + L" --baud 9600 --parity even --lines " +
-                           std::to_wstring(lines) + L" --line-length " +
-                           std::to_wstring(lineLength);
+                           options.simulatorPort + L" --baud " + std::to_wstring(baud) +
+                           L" --parity even --lines " + std::to_wstring(options.lines) +
+                           L" --line-length " + std::to_wstring(options.lineLength) +
+                           L" --turnaround " + std::to_wstring(options.turnaroundMs) +
+                           (options.wholeWrites ? L" --whole-writes" : L"");
     STARTUPINFOW startup{};
     startup.cb = sizeof startup;
     PROCESS_INFORMATION process{};
-    LARGE_INTEGER frequency, start, end;
+    LARGE_INTEGER frequency;
     ::QueryPerformanceFrequency(&frequency);
-    FILETIME created, exited, kernelBefore, userBefore, kernelAfter, userAfter;
-    ::GetProcessTimes(::GetCurrentProcess(), &created, &exited, &kernelBefore, &userBefore);
-    ::QueryPerformanceCounter(&start);
     if (!::CreateProcessW(nullptr, command.data(), nullptr, nullptr, FALSE, 0, nullptr, nullptr,
                           &startup, &process))
-        return 1;
+        return false;
     UniqueHandle simulator(process.hProcess);
     UniqueHandle thread(process.hThread);
+    const double cpuBefore = ProcessCpuSeconds();
     const uint32_t result = driver.ReceiveLines();
-    ::QueryPerformanceCounter(&end);
-    ::GetProcessTimes(::GetCurrentProcess(), &created, &exited, &kernelAfter, &userAfter);
+    const double cpu = ProcessCpuSeconds() - cpuBefore;
     ::WaitForSingleObject(simulator.get(), 30000);
 
     WIN32_FILE_ATTRIBUTE_DATA attributes{};
     ::GetFileAttributesExW(output.c_str(), GetFileExInfoStandard, &attributes);
-    const double received = attributes.nFileSizeLow;
-    const unsigned acceptedLines = lines + 2;     // header and end line
-    const double answered = acceptedLines * 6.0;  // one ACK line each
-    const double wall = static_cast<double>(end.QuadPart - start.QuadPart) / frequency.QuadPart;
-    const double wire = (received + answered) * 10.0 / 9600.0;
-    const double cpu =
-        Seconds(kernelAfter) - Seconds(kernelBefore) + Seconds(userAfter) - Seconds(userBefore);
-    std::printf("serial receive, line protocol, 9600 baud 7E1, %u lines of %u characters\n", lines,
-                lineLength);
-    std::printf("result                 %u (%s)\n", result, result == 0 ? "complete" : "FAILED");
-    std::printf("bytes                  %.0f received, %.0f answered\n", received, answered);
-    std::printf("wall time              %.3f s\n", wall);
-    std::printf("wire-time limit        %.3f s\n", wire);
-    std::printf("wall / wire            %.2f\n", wall / wire);
-    std::printf("per line beyond wire   %.1f ms (port read interval 50 ms)\n",
-                (wall - wire) * 1000.0 / acceptedLines);
-    std::printf("driver CPU time        %.3f s (%.1f%% of wall)\n", cpu, 100.0 * cpu / wall);
-    return result == 0 ? 0 : 1;
+    // After the header: every data line and the end line, each answered by a 6-byte ACK line
+    // after which the instrument pauses for its turn-around before the next.
+    const unsigned headerBytes = 8;
+    const unsigned timedLines = options.lines + 1;
+    const double received = static_cast<double>(attributes.nFileSizeLow) - headerBytes;
+    const double answered = timedLines * 6.0;
+    const double wall =
+        static_cast<double>(callback.lastAnswered.QuadPart - callback.headerAnswered.QuadPart) /
+        frequency.QuadPart;
+    const double limit =
+        (received + answered) * 10.0 / baud + timedLines * options.turnaroundMs / 1000.0;
+    std::printf("%6u  %-8s  %8.0f  %7.0f  %8.2f  %8.2f  %6.3f  %6.3f (%.2f%% of wall)\n", baud,
+                result == 0 ? "complete" : "FAILED", received, answered, wall, limit,
+                wall / limit, cpu, 100.0 * cpu / wall);
+    return result == 0;
+}
+
+}  // namespace
+
+int wmain(int argc, wchar_t** argv) {
+    Options options;
+    for (int i = 1; i < argc; ++i) {
+        const std::wstring option = argv[i];
+        const bool hasValue = i + 1 < argc;
+        if (option == L"--whole-writes") {
+            options.wholeWrites = true;
+        } else if (option == L"--driver-port" && hasValue) {
+            options.driverPort = argv[++i];
+        } else if (option == L"--sim-port" && hasValue) {
+            options.simulatorPort = argv[++i];
+        } else if (option == L"--lines" && hasValue) {
+            options.lines = static_cast<unsigned>(std::wcstoul(argv[++i], nullptr, 10));
+        } else if (option == L"--baud" && hasValue) {
+            options.rates = {static_cast<unsigned>(std::wcstoul(argv[++i], nullptr, 10))};
+        } else {
+            std::fprintf(stderr,
+                         "usage: bench_serial_receive [--lines N] [--baud B] [--whole-writes] "
+                         "[--driver-port COMn] [--sim-port COMn]\n");
+            return 2;
+        }
+    }
+    std::printf("serial receive, line protocol, 7E1, %u lines of %u characters, lvsim %s, "
+                "turn-around %u ms\n",
+                options.lines, options.lineLength,
+                options.wholeWrites ? "writing whole lines" : "pacing every byte",
+                options.turnaroundMs);
+    std::printf("timed from the header's ACK to the last ACK; limit = bytes both ways x 10 bits "
+                "/ baud + turn-around a line\n");
+    std::printf("%6s  %-8s  %8s  %7s  %8s  %8s  %6s  %s\n", "baud", "result", "received",
+                "answered", "time (s)", "limit (s)", "ratio", "driver CPU (s)");
+    bool allComplete = true;
+    for (const unsigned baud : options.rates)
+        allComplete = RunAt(options, baud) && allComplete;
+    return allComplete ? 0 : 1;
 }

@@ -33,8 +33,9 @@ struct DeviceControlFields {
 // and XOFF are data bytes (they occur inside BCC and Y-Modem blocks).
 DeviceControlFields MakeDeviceControlFields(uint32_t protocolSelector) noexcept;
 
-// Milliseconds. A read returns after 50 ms of silence between bytes or after 100 ms plus 1 ms
-// per byte asked for: this interval is the protocol's whole pacing, there is no other wait.
+// Milliseconds. The block procedures' time-outs: a read returns after 50 ms of silence between
+// bytes or after 100 ms plus 1 ms per byte asked for. A burst (a block) is framed by that silence,
+// so this interval is those procedures' whole pacing; there is no other wait.
 struct PortTimeouts {
     uint32_t ReadInterval = 50;
     uint32_t ReadTotalMultiplier = 1;
@@ -44,3 +45,12 @@ struct PortTimeouts {
 };
 
 PortTimeouts MakePortTimeouts() noexcept;
+
+// The line protocol's time-outs at a baud rate and framing: a read returns once the bytes stop
+// for about two character times, or after 100 ms when nothing comes. A line is framed by its
+// CR LF, not by silence, so the 50 ms interval of the block procedures would only add its length
+// to every line (up to three quarters of a transfer at 38400 baud); this is a deliberate
+// difference from those time-outs. The read time-outs' other documented mode for this
+// ("return as soon as any byte is there": interval and multiplier MAXDWORD) is not honoured by
+// Wine's serial layer, and a short interval does the same job on both.
+PortTimeouts MakeLineTimeouts(uint32_t baudRate, uint32_t bitsPerCharacter) noexcept;

@@ -4,9 +4,13 @@
 #include <cstddef>
 #include <cstdint>
 
-// A configured COM port. Read follows the port's time-outs: it returns what arrived once 50 ms
-// pass without a byte or the total time-out (100 ms + 1 ms a byte) ends, so a silent line costs
-// the caller about 100 ms per call and never a spin.
+// A configured COM port. Read follows the port's time-outs, which its owner sets per receive
+// procedure (port_setup.h):
+// - block procedures: Read returns what arrived once 50 ms pass without a byte or the total
+//   time-out (100 ms + 1 ms a byte) ends; that silence is what ends a block;
+// - line protocol: Read returns as soon as the bytes stop for about two character times, so a
+//   line's CR LF is seen right after it arrives; the caller looks for CR LF, not for silence.
+// In both, a silent line costs the caller about 100 ms per call and never a spin.
 class SerialPort {
 public:
     virtual ~SerialPort() = default;

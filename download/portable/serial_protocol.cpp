@@ -182,8 +182,10 @@ uint32_t SerialProtocol::ReceiveLines() {
         // A line repeated because our ACK was lost is acknowledged again but written once. The
         // line goes into the file before the instrument hears that it arrived: a line the disk
         // refused is never acknowledged, and the receive ends with the instrument still holding it.
+        // Only the line itself is written: bytes that came after its CR LF in the same read
+        // belong to no accepted line and go the way of those the purge drops.
         if (!SameText(line.data(), previous.data(), line.size())) {
-            if (!WriteOutput(line.data(), length)) {
+            if (!WriteOutput(line.data(), lineEnd)) {
                 (void)file_.Close();  // the write's error is the one the user sees
                 return 1;
             }

@@ -172,12 +172,19 @@ std::vector<std::vector<BYTE>> StrictIdLists(const BYTE* block, size_t size) {
 }  // namespace
 
 // One to five stations: every child has its own offset inside the block, names its station, and
-// the system's own reader of the format sees the same items.
+// the system's own reader of the format sees the same items below the folder's place in the
+// shell (here My Computer stands in for it).
 TEST_F(DataObject, ShellIdListArrayGivesEveryChildItsOwnOffsetInsideTheBlock) {
     const wchar_t* const names[] = {L"North", L"South", L"East", L"West", L"Centre"};
+    UniquePidl folder;
+    ASSERT_EQ(S_OK, ::SHGetSpecialFolderLocation(
+                        nullptr, CSIDL_DRIVES, reinterpret_cast<PIDLIST_ABSOLUTE*>(folder.put())));
+    const UINT folderSize = manager_.GetSize(folder.get());
     for (size_t count = 1; count <= 5; ++count) {
         SCOPED_TRACE(count);
         auto object = MakeComObject<CLVDataObject>();
+        ASSERT_EQ(S_OK, object->SetFolderLocation(
+                            reinterpret_cast<PCIDLIST_ABSOLUTE>(folder.get())));
         for (size_t index = 0; index < count; ++index) {
             const std::wstring path = std::wstring(L"Quorvel Digital Level\\") + names[index];
             UniquePidl list(manager_.CreatePidlFromPath(path.c_str()));
@@ -191,9 +198,9 @@ TEST_F(DataObject, ShellIdListArrayGivesEveryChildItsOwnOffsetInsideTheBlock) {
             lists = StrictIdLists(static_cast<const BYTE*>(lock.data()), lock.size());
         }
         ASSERT_EQ(count + 1, lists.size()) << "an offset or a list outside the block";
-        const auto* parent = reinterpret_cast<LPCITEMIDLIST>(lists[0].data());
-        EXPECT_EQ(1u, manager_.GetItemCount(parent));
-        EXPECT_EQ(L"Quorvel Digital Level", manager_.GetItemName(parent));
+        ASSERT_EQ(folderSize, lists[0].size());
+        EXPECT_EQ(0, memcmp(lists[0].data(), folder.get(), folderSize))
+            << "the parent is the folder's place from the desktop";
         for (size_t index = 0; index < count; ++index) {
             const auto* child = reinterpret_cast<LPCITEMIDLIST>(lists[index + 1].data());
             EXPECT_EQ(1u, manager_.GetItemCount(child));
@@ -212,14 +219,20 @@ TEST_F(DataObject, ShellIdListArrayGivesEveryChildItsOwnOffsetInsideTheBlock) {
             UniquePidl full;
             ASSERT_EQ(S_OK, ::SHGetIDListFromObject(
                                 item.Get(), reinterpret_cast<PIDLIST_ABSOLUTE*>(full.put())));
-            ASSERT_EQ(2u, manager_.GetItemCount(full.get()));
+            ASSERT_EQ(manager_.GetItemCount(folder.get()) + 1, manager_.GetItemCount(full.get()));
             EXPECT_EQ(names[index], manager_.GetItemName(manager_.GetLastItem(full.get())));
         }
     }
+    // Without a place the items' lists would be taken for the desktop's: the format is left out.
     UniqueStgMedium none;
-    EXPECT_EQ(S_FALSE,
-              Get(Over({L"Quorvel Digital Level"}).Get(), CFSTR_SHELLIDLIST, TYMED_HGLOBAL, none))
-        << "no parent";
+    EXPECT_EQ(S_FALSE, Get(Over({L"Quorvel Digital Level\\North"}).Get(), CFSTR_SHELLIDLIST,
+                           TYMED_HGLOBAL, none))
+        << "no place";
+    auto rootOnly = MakeComObject<CLVDataObject>();
+    UniquePidl root(manager_.CreatePidlFromPath(L"Quorvel Digital Level"));
+    ASSERT_EQ(S_OK, rootOnly->SetItem(reinterpret_cast<PCUIDLIST_RELATIVE>(root.get())));
+    ASSERT_EQ(S_OK, rootOnly->SetFolderLocation(reinterpret_cast<PCIDLIST_ABSOLUTE>(folder.get())));
+    EXPECT_EQ(S_FALSE, Get(rootOnly.Get(), CFSTR_SHELLIDLIST, TYMED_HGLOBAL, none)) << "no parent";
 }
 
 TEST_F(DataObject, StationListOnTheOleClipboardCarriesTheLoadableStations) {

@@ -1,6 +1,7 @@
 // InstrumentSimulator: the instrument's side of the line, BCC and Y-Modem protocols.
 #include "tools/lvsim/instrument_simulator.h"
 
+#include <algorithm>
 #include <cstdio>
 #include <ctime>
 
@@ -42,30 +43,56 @@ std::vector<std::string> GenerateSurveyLines(uint32_t count, uint32_t length) {
     return lines;
 }
 
-bool InstrumentSimulator::SendPaced(const std::string& bytes) {
-    LARGE_INTEGER frequency, start, now;
-    ::QueryPerformanceFrequency(&frequency);
-    ::QueryPerformanceCounter(&start);
+void InstrumentSimulator::Turnaround() const {
+    // The instrument takes its own time before it sends again, whatever the answer.
+    if (options_.TurnaroundMs)
+        ::Sleep(options_.TurnaroundMs);
+}
+
+bool InstrumentSimulator::WriteAll(const char* bytes, size_t count) {
     size_t sent = 0;
-    while (sent < bytes.size()) {
+    while (sent < count) {
         const size_t moved =
-            port_.Write(reinterpret_cast<const uint8_t*>(bytes.data()) + sent, bytes.size() - sent);
+            port_.Write(reinterpret_cast<const uint8_t*>(bytes) + sent, count - sent);
         if (moved == 0)
             return false;
         sent += moved;
     }
+    return true;
+}
+
+bool InstrumentSimulator::SendPaced(const std::string& bytes) {
+    LARGE_INTEGER frequency, start, now;
+    ::QueryPerformanceFrequency(&frequency);
+    ::QueryPerformanceCounter(&start);
+    const double characterSeconds =
+        static_cast<double>(options_.BitsPerCharacter) / options_.BaudRate;
+    const auto elapsed = [&] {
+        ::QueryPerformanceCounter(&now);
+        return static_cast<double>(now.QuadPart - start.QuadPart) / frequency.QuadPart;
+    };
+    if (options_.WholeWrites && !WriteAll(bytes.data(), bytes.size()))
+        return false;
+    size_t sent = options_.WholeWrites ? bytes.size() : 0;
+    while (sent < bytes.size()) {
+        // The bytes whose start bit is due by now go out together: at high rates several fall
+        // within one wake-up of the thread, as they would arrive in one read from a cable.
+        const size_t due =
+            std::min(bytes.size(), static_cast<size_t>(elapsed() / characterSeconds) + 1);
+        if (due > sent) {
+            if (!WriteAll(bytes.data() + sent, due - sent))
+                return false;
+            sent = due;
+        } else {
+            ::Sleep(1);
+        }
+    }
     bytesSent_ += bytes.size();
     // A real line takes its time: wait until the last bit would have left the wire.
-    const double wireSeconds =
-        static_cast<double>(bytes.size()) * options_.BitsPerCharacter / options_.BaudRate;
-    for (;;) {
-        ::QueryPerformanceCounter(&now);
-        const double spent =
-            static_cast<double>(now.QuadPart - start.QuadPart) / frequency.QuadPart;
-        if (spent >= wireSeconds)
-            return true;
+    const double wireSeconds = static_cast<double>(bytes.size()) * characterSeconds;
+    for (double spent = elapsed(); spent < wireSeconds; spent = elapsed())
         ::Sleep(static_cast<DWORD>((wireSeconds - spent) * 1000) + 1);
-    }
+    return true;
 }
 
 std::string InstrumentSimulator::ReadAnswer(uint32_t timeoutMs) {
@@ -95,6 +122,7 @@ bool InstrumentSimulator::SendLineUntilAcknowledged(const std::string& line, boo
         if (options_.Verbose)
             std::fprintf(stderr, "lvsim: sent %zu bytes, answer %s\n", sent.size(),
                          AnswerName(answer));
+        Turnaround();
         if (!answer.empty() && static_cast<uint8_t>(answer[0]) == kAck) {
             if (loseFirstAck && attempt == 0)
                 continue;  // as if the ACK was lost on the line: the same line goes again
@@ -183,6 +211,7 @@ int InstrumentSimulator::SendBccBlocks(const std::vector<std::string>& dataLines
             return !answer.empty() && static_cast<uint8_t>(answer[0]) == kAck ? 0 : 1;
         if (options_.Verbose)
             std::fprintf(stderr, "lvsim: sent block %zu, answer %s\n", i + 1, AnswerName(answer));
+        Turnaround();
         if (!answer.empty() && static_cast<uint8_t>(answer[0]) == kAck) {
             ++i;
             resends = 0;
@@ -239,6 +268,7 @@ int InstrumentSimulator::SendYModem(const std::string& name, const std::string& 
         const std::string answer = ReadAnswer(options_.AnswerTimeoutMs);
         if (options_.Verbose)
             std::fprintf(stderr, "lvsim: sent block %zu, answer %s\n", i + 1, AnswerName(answer));
+        Turnaround();
         if (!answer.empty() && static_cast<uint8_t>(answer[0]) == kAck) {
             ++i;
             resends = 0;

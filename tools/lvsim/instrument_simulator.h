@@ -22,6 +22,10 @@ struct SimulatorOptions {
                                        // (raw stream: was sent), and say nothing more
     uint32_t LineGapMs = 0;            // raw stream: pause after each line, so that each line
                                        // reaches the receiver as a burst of its own
+    uint32_t TurnaroundMs = 10;        // the instrument's pause between an answer and its next
+                                       // line or block
+    bool WholeWrites = false;          // hand each line to the port at once and then wait its
+                                       // wire time, instead of byte by byte as a cable does
     bool Verbose = false;
 };
 
@@ -45,8 +49,12 @@ public:
     uint64_t BytesReceived() const { return bytesReceived_; }
 
 private:
-    // Writes at the wire speed of the configured baud rate and framing.
+    // Writes at the wire speed of the configured baud rate and framing: each byte leaves when
+    // the one before it would have left the wire (or, with WholeWrites, all at once and the
+    // call then waits out the wire time).
     bool SendPaced(const std::string& bytes);
+    bool WriteAll(const char* bytes, size_t count);
+    void Turnaround() const;
     // Reads until a CR LF ends an answer, or the answer time-out passes; empty when none.
     std::string ReadAnswer(uint32_t timeoutMs);
     bool SendLineUntilAcknowledged(const std::string& line, bool corruptFirst, bool loseFirstAck);

@@ -35,6 +35,10 @@ const char kUsage[] =
     "  --max-resends N        give up after N resends of one line or block (default 20)\n"
     "  --start-delay MS       wait before the first byte, to let the receiver start (default 0)\n"
     "  --gap MS               raw stream: pause after each line (default 0)\n"
+    "  --turnaround MS        pause after each answer before the next line or block\n"
+    "                         (default 10)\n"
+    "  --whole-writes         hand each line to the port at once, then wait its wire time\n"
+    "                         (default: byte by byte at the baud rate, as a cable delivers)\n"
     "Faults:\n"
     "  --bad-check K          line (or block) K goes first with a wrong check character\n"
     "  --lose-ack K           the ACK of line K is ignored once, so line K is sent again\n"
@@ -122,6 +126,10 @@ int wmain(int argc, wchar_t** argv) {
             startDelay = number();
         } else if (option == L"--gap") {
             options.LineGapMs = number();
+        } else if (option == L"--turnaround") {
+            options.TurnaroundMs = number();
+        } else if (option == L"--whole-writes") {
+            options.WholeWrites = true;
         } else if (option == L"--bad-check") {
             options.BadCheckLine = number();
         } else if (option == L"--lose-ack") {
@@ -170,8 +178,10 @@ int wmain(int argc, wchar_t** argv) {
     dcb.fBinary = TRUE;
     dcb.fDtrControl = DTR_CONTROL_ENABLE;
     dcb.fRtsControl = RTS_CONTROL_ENABLE;
+    // An answer is seen as soon as its bytes stop (the turn-around is a pause of its own): a
+    // coarse interval here would add its length to every line of the transfer.
     COMMTIMEOUTS timeouts{};
-    timeouts.ReadIntervalTimeout = 20;
+    timeouts.ReadIntervalTimeout = 1;
     timeouts.ReadTotalTimeoutConstant = 100;
     timeouts.WriteTotalTimeoutConstant = 1000;
     const std::wstring device = L"\\\\.\\" + port;

@@ -118,6 +118,31 @@ TEST(PortSetup, FlowControlOnlyForSelectorZero) {
         EXPECT_EQ(MakeDeviceControlFields(selector).Flags, 0x1093u) << selector;
 }
 
+// Lines are framed by CR LF: a read ends once the bytes stop for about two character times.
+// Blocks keep the 50 ms silence that frames them.
+TEST(PortSetup, LineTimeoutsWaitAboutTwoCharacterTimesAfterTheLastByte) {
+    const struct {
+        uint32_t baud;
+        uint32_t bits;
+        uint32_t interval;
+    } cases[] = {
+        {300, 10, 67}, {1200, 10, 17}, {9600, 10, 3}, {19200, 10, 2},
+        {38400, 10, 1}, {115200, 10, 1}, {9600, 11, 3}, {4800, 11, 5},
+    };
+    for (const auto& test : cases) {
+        const PortTimeouts line = MakeLineTimeouts(test.baud, test.bits);
+        EXPECT_EQ(line.ReadInterval, test.interval) << test.baud << " baud, " << test.bits;
+        EXPECT_EQ(line.ReadTotalMultiplier, 0u);
+        EXPECT_EQ(line.ReadTotalConstant, 100u) << "a silent line still waits 100 ms a read";
+        EXPECT_EQ(line.WriteTotalConstant, MakePortTimeouts().WriteTotalConstant);
+    }
+    const PortTimeouts blocks = MakePortTimeouts();
+    EXPECT_EQ(blocks.ReadInterval, 50u);
+    EXPECT_EQ(blocks.ReadTotalMultiplier, 1u);
+    EXPECT_EQ(blocks.ReadTotalConstant, 100u);
+    EXPECT_EQ(MakeLineTimeouts(0, 10).ReadInterval, 50u) << "no rate: the block time-outs";
+}
+
 TEST(DriverTextFormat, ArgumentsFillConversionsInOrderAndMissingOnesAreDropped) {
     EXPECT_EQ(FormatDriverText(WIDE_TEXT("block %d: %d!=%d, 100%%"),
                                {WIDE_TEXT("2"), WIDE_TEXT("17"), WIDE_TEXT("18")}),

@@ -217,6 +217,41 @@ TEST(LineProtocol, StopRequestEndsWithoutAMessage) {
     EXPECT_EQ(run.port.closes, 0);
 }
 
+// With the line time-outs a read may end anywhere: between CR and LF, or after bytes that
+// followed the CR LF. A line is one line however its bytes were cut into reads, and what follows
+// its CR LF in the same read is dropped as the purge drops what is still queued.
+TEST(LineProtocol, LinesAreFramedByCrLfWhateverTheReadsCarry) {
+    const std::vector<std::string> lines = Transfer(3);
+    const struct {
+        const char* what;
+        std::function<std::vector<std::string>(const std::string&)> cut;
+    } cases[] = {
+        {"CR and LF in different reads",
+         [](const std::string& line) {
+             return std::vector<std::string>{line.substr(0, line.size() - 1), "\n"};
+         }},
+        {"every byte its own read",
+         [](const std::string& line) {
+             std::vector<std::string> bytes;
+             for (const char byte : line)
+                 bytes.push_back(std::string(1, byte));
+             return bytes;
+         }},
+        {"the next line's first bytes in the read of the CR LF",
+         [](const std::string& line) { return std::vector<std::string>{line + "B,9,"}; }},
+    };
+    for (const auto& test : cases) {
+        SCOPED_TRACE(test.what);
+        LineRun run(lines);
+        run.sendAs = [&](size_t index, int, const std::string& line) {
+            return index == 2 ? test.cut(line) : std::vector<std::string>{line};
+        };
+        EXPECT_EQ(run.Receive(), 0u);
+        EXPECT_EQ(run.file.Text(), Joined(lines));
+        EXPECT_EQ(run.port.writes, std::vector<Bytes>(lines.size(), kAckLine));
+    }
+}
+
 TEST(LineProtocol, BytesAfterALineAreDroppedByThePurge) {
     LineRun run(Transfer(2));
     // The stale bytes are already in the queue when the driver purges for the next line.
