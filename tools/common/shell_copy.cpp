@@ -30,11 +30,18 @@ CLIPFORMAT Format(const wchar_t* name) {
 
 }  // namespace
 
-StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring& folder) {
+StationFileObject GetStationFileDataObject(const std::wstring& station) {
+    StationFileObject object;
+    const auto fail = [&object](const std::wstring& what, HRESULT code) {
+        object.data.Reset();
+        object.failure = what;
+        object.code = code;
+        return std::move(object);
+    };
     ComPtr<IShellFolder> desktop;
     HRESULT result = ::SHGetDesktopFolder(&desktop);
     if (FAILED(result))
-        return Failed(L"the desktop folder is not available", result);
+        return fail(L"the desktop folder is not available", result);
 
     std::wstring path = std::wstring(kFolderPath) + L"\\" + station;
     UniqueCoTaskMem stationList;
@@ -42,7 +49,7 @@ StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring&
         desktop->ParseDisplayName(nullptr, nullptr, path.data(), nullptr,
                                   reinterpret_cast<PIDLIST_RELATIVE*>(stationList.put()), nullptr);
     if (FAILED(result)) {
-        return Failed(L"\"Quorvel Digital Levels\" has no station \"" + station +
+        return fail(L"\"Quorvel Digital Levels\" has no station \"" + station +
                         L"\" (is the extension registered?)",
                     result);
     }
@@ -50,24 +57,33 @@ StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring&
     result = desktop->BindToObject(static_cast<PCUIDLIST_RELATIVE>(stationList.get()), nullptr,
                                    IID_PPV_ARGS(&stationFolder));
     if (FAILED(result))
-        return Failed(L"the station folder cannot be opened", result);
+        return fail(L"the station folder cannot be opened", result);
 
     ComPtr<IEnumIDList> items;
     result = stationFolder->EnumObjects(nullptr, SHCONTF_NONFOLDERS, &items);
     if (result != S_OK)
-        return Failed(L"the station folder cannot be listed", result);
+        return fail(L"the station folder cannot be listed", result);
     UniqueCoTaskMem file;
     ULONG fetched = 0;
     if (items->Next(1, reinterpret_cast<PITEMID_CHILD*>(file.put()), &fetched) != S_OK ||
         fetched != 1) {
-        return Failed(L"the station folder shows no file", E_FAIL);
+        return fail(L"the station folder shows no file", E_FAIL);
     }
 
-    ComPtr<IDataObject> data;
     PCUITEMID_CHILD child = static_cast<PCUITEMID_CHILD>(file.get());
-    result = stationFolder->GetUIObjectOf(nullptr, 1, &child, IID_IDataObject, nullptr, &data);
-    if (FAILED(result))
-        return Failed(L"the file cannot be copied", result);
+    result = stationFolder->GetUIObjectOf(nullptr, 1, &child, IID_IDataObject, nullptr,
+                                          &object.data);
+    if (FAILED(result) || !object.data)
+        return fail(L"the file cannot be copied", FAILED(result) ? result : E_POINTER);
+    return object;
+}
+
+StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring& folder) {
+    StationFileObject object = GetStationFileDataObject(station);
+    if (!object.data)
+        return Failed(object.failure, object.code);
+    const ComPtr<IDataObject> data = std::move(object.data);
+    HRESULT result = S_OK;
 
     FORMATETC descriptorFormat = {Format(CFSTR_FILEDESCRIPTORW), nullptr, DVASPECT_CONTENT, -1,
                                   TYMED_HGLOBAL};

@@ -3,6 +3,8 @@
 #pragma once
 
 #include <windows.h>
+#include <objidl.h>
+#include <wrl/client.h>
 
 #include <string>
 
@@ -15,6 +17,17 @@ struct StationFileCopy {
     std::wstring failure;       // what went wrong, when failed
     HRESULT code = S_OK;        // its result code
 };
+
+// The data object of a station's one file, as the station folder hands it to the shell on copy.
+struct StationFileObject {
+    Microsoft::WRL::ComPtr<IDataObject> data;  // null when it could not be had
+    std::wstring failure;                      // what went wrong, when data is null
+    HRESULT code = S_OK;                       // its result code
+};
+
+// Binds "Quorvel Digital Levels\STATION" through the desktop folder, lists the station's file and
+// asks the station folder's GetUIObjectOf for its data object. OLE must be initialised.
+StationFileObject GetStationFileDataObject(const std::wstring& station);
 
 // OLE must be initialised on the calling thread. folder is a full path without a trailing "\".
 StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring& folder);

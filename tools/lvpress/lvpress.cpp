@@ -5,14 +5,20 @@
 #include <cstdio>
 #include <cwchar>
 #include <string>
+#include <vector>
+
+#include "tools/common/console_output.h"
 
 namespace {
 
 const wchar_t kUsage[] =
     L"Usage: lvpress --title TITLE --button TEXT [--after SECONDS] [--timeout SECONDS]\n"
+    L"               [--print-text]\n"
     L"Waits until a visible dialog titled TITLE exists, waits SECONDS more (default 0), then\n"
-    L"clicks its button labelled TEXT. Exit codes: 0 pressed, 1 no such dialog or button in "
-    L"time.\n";
+    L"clicks its button labelled TEXT. With --print-text it first prints each text the dialog\n"
+    L"shows (its static controls), one line each as \"text: ...\", line breaks made spaces,\n"
+    L"and after the click waits until the dialog has gone.\n"
+    L"Exit codes: 0 pressed, 1 no such dialog or button in time.\n";
 
 struct Search {
     const wchar_t* title;
@@ -49,21 +55,61 @@ HWND FindButton(HWND dialog, const std::wstring& label) {
     return nullptr;
 }
 
+// The texts a user reads in the dialog: its static controls that show text, in tab order. A
+// message box's text is one of them; its icon is a static too, without text.
+std::vector<std::wstring> StaticTexts(HWND dialog) {
+    std::vector<std::wstring> texts;
+    for (HWND child = ::GetWindow(dialog, GW_CHILD); child;
+         child = ::GetWindow(child, GW_HWNDNEXT)) {
+        wchar_t className[16] = {};
+        ::GetClassNameW(child, className, ARRAYSIZE(className));
+        const LONG_PTR type = ::GetWindowLongPtrW(child, GWL_STYLE) & SS_TYPEMASK;
+        const bool showsText = type == SS_LEFT || type == SS_CENTER || type == SS_RIGHT ||
+                               type == SS_SIMPLE || type == SS_LEFTNOWORDWRAP;
+        if (_wcsicmp(className, L"Static") != 0 || !showsText)
+            continue;
+        std::wstring text(static_cast<size_t>(::GetWindowTextLengthW(child)) + 1, L'\0');
+        text.resize(::GetWindowTextW(child, text.data(), static_cast<int>(text.size())));
+        // A system message ends with a line break and may hold several: one line each here.
+        std::wstring line;
+        for (wchar_t c : text) {
+            const bool lineBreak = c == L'\r' || c == L'\n';
+            if (!lineBreak)
+                line += c;
+            else if (!line.empty() && line.back() != L' ')
+                line += L' ';
+        }
+        while (!line.empty() && line.back() == L' ')
+            line.pop_back();
+        if (!line.empty())
+            texts.push_back(line);
+    }
+    return texts;
+}
+
 }  // namespace
 
 int wmain(int argc, wchar_t** argv) {
     std::wstring title, button;
     double after = 0, timeout = 60;
-    for (int i = 1; i + 1 < argc; i += 2) {
+    bool printText = false;
+    for (int i = 1; i < argc; ++i) {
         const std::wstring option = argv[i];
+        if (option == L"--print-text") {
+            printText = true;
+            continue;
+        }
+        if (i + 1 >= argc)
+            break;
+        const wchar_t* value = argv[++i];
         if (option == L"--title")
-            title = argv[i + 1];
+            title = value;
         else if (option == L"--button")
-            button = argv[i + 1];
+            button = value;
         else if (option == L"--after")
-            after = _wtof(argv[i + 1]);
+            after = _wtof(value);
         else if (option == L"--timeout")
-            timeout = _wtof(argv[i + 1]);
+            timeout = _wtof(value);
     }
     if (title.empty() || button.empty()) {
         fputws(kUsage, stdout);
@@ -81,10 +127,20 @@ int wmain(int argc, wchar_t** argv) {
         return 1;
     }
     ::Sleep(static_cast<DWORD>(after * 1000));
+    if (printText) {
+        for (const std::wstring& text : StaticTexts(search.found))
+            PrintUtf8(L"text: " + text + L"\n");
+    }
     while (::GetTickCount64() < deadline) {
         if (HWND target = FindButton(search.found, button)) {
             // The click goes through the dialog's own message loop, exactly as a mouse click.
             ::PostMessageW(target, BM_CLICK, 0, 0);
+            // A caller reading texts dialog by dialog must not meet this one again: wait until it
+            // has gone (or the time is up) before saying it was pressed.
+            while (printText && ::IsWindow(search.found) && ::IsWindowVisible(search.found) &&
+                   ::GetTickCount64() < deadline) {
+                ::Sleep(50);
+            }
             return 0;
         }
         ::Sleep(100);
