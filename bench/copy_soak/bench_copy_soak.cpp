@@ -188,7 +188,9 @@ int wmain(int argc, wchar_t** argv) {
         StartPresser presser;
         for (int copy = 0; copy < copies; ++copy) {
             const auto start = std::chrono::steady_clock::now();
-            const StationFileCopy result = CopyStationFile(station, folder);
+            CopyOptions options;
+            options.overwrite = true;  // the same file, copied again and again
+            const StationFileCopy result = CopyStationFile(station, folder, options);
             seconds.push_back(
                 std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count());
             if (result.result != StationFileCopy::kCopied) {

@@ -8,6 +8,7 @@
 #include <vector>
 
 #include "support/unique_resource.h"
+#include "tools/common/portable/output_name.h"
 
 using Microsoft::WRL::ComPtr;
 
@@ -78,7 +79,52 @@ StationFileObject GetStationFileDataObject(const std::wstring& station) {
     return object;
 }
 
-StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring& folder) {
+namespace {
+
+// The copy's name: the file's own, or the pattern's with the time of the copy.
+bool TargetName(const std::wstring& station, const std::wstring& fileName,
+                const std::wstring& pattern, std::wstring& name, std::wstring& error) {
+    if (pattern.empty()) {
+        name = fileName;
+        return true;
+    }
+    SYSTEMTIME now{};
+    ::GetLocalTime(&now);
+    OutputNameParts parts;
+    parts.station = station;
+    parts.fileName = fileName;
+    parts.year = now.wYear;
+    parts.month = now.wMonth;
+    parts.day = now.wDay;
+    parts.hour = now.wHour;
+    parts.minute = now.wMinute;
+    parts.second = now.wSecond;
+    return ExpandOutputName(pattern, parts, name, error);
+}
+
+bool Exists(const std::wstring& path) {
+    return ::GetFileAttributesW(path.c_str()) != INVALID_FILE_ATTRIBUTES;
+}
+
+// A file in the folder that goes unless it is kept: the copy until it has its name.
+class PartialFile {
+public:
+    explicit PartialFile(std::wstring path) : path_(std::move(path)) {}
+    ~PartialFile() {
+        if (!kept_)
+            (void)::DeleteFileW(path_.c_str());  // a failed copy leaves nothing behind
+    }
+    void Keep() { kept_ = true; }
+
+private:
+    std::wstring path_;
+    bool kept_ = false;
+};
+
+}  // namespace
+
+StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring& folder,
+                                const CopyOptions& options) {
     StationFileObject object = GetStationFileDataObject(station);
     if (!object.data)
         return Failed(object.failure, object.code);
@@ -102,6 +148,17 @@ StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring&
     if (name.empty() || name.find_first_of(L"\\/:") != std::wstring::npos) {
         return Failed(L"bad file name", E_FAIL);
     }
+    std::wstring targetName, nameError;
+    if (!TargetName(station, name, options.namePattern, targetName, nameError))
+        return Failed(L"bad --name pattern: " + nameError, E_INVALIDARG);
+    const std::wstring target = folder + L"\\" + targetName;
+    // Before the download: nobody should press keys on an instrument for a copy that cannot land.
+    if (!options.overwrite && Exists(target)) {
+        StationFileCopy exists;
+        exists.result = StationFileCopy::kExists;
+        exists.target = target;
+        return exists;
+    }
 
     const auto start = std::chrono::steady_clock::now();
     FORMATETC contentsFormat = {Format(CFSTR_FILECONTENTS), nullptr, DVASPECT_CONTENT, 0,
@@ -117,8 +174,11 @@ StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring&
         return Failed(L"the download failed", result);
     }
 
-    const std::wstring target = folder + L"\\" + name;
-    UniqueFileHandle out(::CreateFileW(target.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS,
+    wchar_t partialPath[MAX_PATH];
+    if (::GetTempFileNameW(folder.c_str(), L"lvc", 0, partialPath) == 0)
+        return Failed(L"cannot write in " + folder, HRESULT_FROM_WIN32(::GetLastError()));
+    PartialFile partial(partialPath);
+    UniqueFileHandle out(::CreateFileW(partialPath, GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS,
                                        FILE_ATTRIBUTE_NORMAL, nullptr));
     if (!out)
         return Failed(L"cannot write " + target, HRESULT_FROM_WIN32(::GetLastError()));
@@ -140,6 +200,20 @@ StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring&
         if (got < buffer.size())
             break;
     }
+    out.reset();
+    // Only a whole file takes the name, and it replaces one only when asked to.
+    if (!::MoveFileExW(partialPath, target.c_str(),
+                       options.overwrite ? MOVEFILE_REPLACE_EXISTING : 0)) {
+        const DWORD error = ::GetLastError();
+        if (error == ERROR_ALREADY_EXISTS || error == ERROR_FILE_EXISTS) {
+            StationFileCopy exists;
+            exists.result = StationFileCopy::kExists;
+            exists.target = target;
+            return exists;
+        }
+        return Failed(L"cannot write " + target, HRESULT_FROM_WIN32(error));
+    }
+    partial.Keep();
     StationFileCopy copied;
     copied.result = StationFileCopy::kCopied;
     copied.target = target;

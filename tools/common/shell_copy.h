@@ -9,7 +9,8 @@
 #include <string>
 
 struct StationFileCopy {
-    enum Result { kCopied, kCancelled, kFailed };
+    // kExists: the target is there already and was left alone; nothing was downloaded.
+    enum Result { kCopied, kCancelled, kFailed, kExists };
     Result result = kFailed;
     std::wstring target;        // the file written, when copied
     unsigned long long bytes = 0;
@@ -29,5 +30,14 @@ struct StationFileObject {
 // asks the station folder's GetUIObjectOf for its data object. OLE must be initialised.
 StationFileObject GetStationFileDataObject(const std::wstring& station);
 
+struct CopyOptions {
+    bool overwrite = false;     // replace a file of the same name; otherwise it is kExists
+    std::wstring namePattern;   // the copy's name (see output_name.h); empty: the file's own
+};
+
 // OLE must be initialised on the calling thread. folder is a full path without a trailing "\".
-StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring& folder);
+// The file arrives under a temporary name in the folder and takes its own name only once every
+// byte is there, so a failed copy leaves no short file, and an existing file of that name is
+// replaced only when the options say so.
+StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring& folder,
+                                const CopyOptions& options = {});
