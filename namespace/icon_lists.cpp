@@ -1,4 +1,4 @@
-// The module's two shared image lists, built at start and read by the icon extractor.
+// The module's two shared image lists, built at start-up and read by the extractor and the view.
 #include "namespace/icon_lists.h"
 
 #include "res/resource.h"
@@ -6,8 +6,22 @@
 
 namespace {
 
-UniqueHImageList g_smallIcons;
-UniqueHImageList g_largeIcons;
+struct SharedIconLists {
+    UniqueHImageList small;
+    UniqueHImageList large;
+};
+
+// Never destroyed: the module's static destructors run in DllMain, under the loader lock, where
+// no image-list call may be made. DestroySharedIconLists is the one place the lists go.
+union NeverDestroyed {
+    NeverDestroyed() : lists() {}
+    ~NeverDestroyed() {}  // leaves the lists alone on purpose
+    SharedIconLists lists;
+};
+
+NeverDestroyed g_storage;
+UniqueHImageList& g_smallIcons = g_storage.lists.small;
+UniqueHImageList& g_largeIcons = g_storage.lists.large;
 
 // In index order: station, root, file.
 constexpr int kListedIcons[] = {IDI_STATION, IDI_ROOT, IDI_FILE};

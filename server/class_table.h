@@ -19,9 +19,10 @@ struct ClassTableEntry {
 // In registration order; the context-menu class is not in it (its script is never run).
 std::span<const ClassTableEntry> ClassTable() noexcept;
 
-// DllGetClassObject: the class's factory (made on first request, then cached for the module's
-// life) asked for the interface; CLASS_E_CLASSNOTAVAILABLE for a class not in the table.
+// DllGetClassObject: the class's factory (made on first request, then cached until the module
+// tears down) asked for the interface; CLASS_E_CLASSNOTAVAILABLE for a class not in the table.
 [[nodiscard]] HRESULT GetClassObject(REFCLSID classId, REFIID iid, void** object) noexcept;
 
-// Releases the cached factories; the module calls this when it is unloaded.
+// Releases the cached factories, made again on the next request. Only while no client holds a
+// factory and no GetClassObject runs: the module's tear-down, when DllCanUnloadNow answers S_OK.
 void ReleaseClassFactories() noexcept;

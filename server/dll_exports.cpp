@@ -5,42 +5,37 @@
 #include "server/class_table.h"
 #include "server/module_app.h"
 #include "server/registration.h"
-#include "support/module_lock.h"
 
 namespace {
 HMODULE g_module = nullptr;
 }
 
-BOOL WINAPI DllMain(HINSTANCE instance, DWORD reason, LPVOID reserved) {
-    // Only what is safe under the loader lock: the start-up work waits for the first export.
-    switch (reason) {
-        case DLL_PROCESS_ATTACH:
-            g_module = instance;
-            ::DisableThreadLibraryCalls(instance);
-            break;
-        case DLL_PROCESS_DETACH:
-            // A non-null reserved pointer means the process is ending, not FreeLibrary: the
-            // process takes memory and handles with it, and other modules may be gone already.
-            if (!reserved)
-                CModuleApp::ExitInstance();
-            break;
-        default:
-            break;
+BOOL WINAPI DllMain(HINSTANCE instance, DWORD reason, LPVOID) {
+    // Bookkeeping only, under the loader lock: no registry, window, image-list or COM call and
+    // no waiting. Start-up waits for the first export; what it made is torn down when
+    // DllCanUnloadNow answers S_OK, and the display settings are saved when they change, so the
+    // detach has nothing left to do. A library freed without being asked first leaves the
+    // icon lists and factories of its last start-up to the process.
+    if (reason == DLL_PROCESS_ATTACH) {
+        g_module = instance;
+        ::DisableThreadLibraryCalls(instance);
     }
     return TRUE;
 }
 
 STDAPI DllGetClassObject(REFCLSID classId, REFIID iid, void** object) {
-    CModuleApp::EnsureStarted(g_module);
+    // The scope holds the module until the factory, asked for the interface, holds it itself.
+    const CModuleApp::StartedScope started = CModuleApp::EnsureStarted(g_module);
     return GetClassObject(classId, iid, object);
 }
 
 STDAPI DllCanUnloadNow() {
-    return ModuleLockCount() == 0 ? S_OK : S_FALSE;
+    return CModuleApp::CanUnloadNow();
 }
 
 STDAPI DllRegisterServer() {
-    CModuleApp::EnsureStarted(g_module);
+    // Held for the whole registration: DllCanUnloadNow on another thread answers S_FALSE meanwhile.
+    const CModuleApp::StartedScope started = CModuleApp::EnsureStarted(g_module);
     return RegisterServer(g_module);
 }
 

@@ -7,12 +7,41 @@
 #include <cstring>
 
 #include "stations/station_store.h"
+#include "support/error_handling.h"
 #include "support/unique_resource.h"
 
 namespace {
 
 constexpr int kDefaultWidth = 100;
 std::atomic<int> g_widths[kDisplayColumnCount] = {kDefaultWidth, kDefaultWidth};
+
+// Held from comparing the widths to writing them, so that two views ending a column drag at
+// once cannot leave the older widths in the store. A slim lock needs no clean-up at unload.
+SRWLOCK g_storeLock = SRWLOCK_INIT;
+bool g_writeRefused = false;  // guarded by g_storeLock
+
+class StoreLock {
+public:
+    StoreLock() noexcept { ::AcquireSRWLockExclusive(&g_storeLock); }
+    StoreLock(const StoreLock&) = delete;
+    StoreLock& operator=(const StoreLock&) = delete;
+    ~StoreLock() { ::ReleaseSRWLockExclusive(&g_storeLock); }
+};
+
+HRESULT WriteWidths() {
+    UniqueRegKey root;
+    RETURN_IF_WIN32_ERROR(::RegCreateKeyExW(HKEY_CURRENT_USER, StationRootKeyPath().c_str(), 0,
+                                            nullptr, REG_OPTION_NON_VOLATILE, KEY_ALL_ACCESS,
+                                            nullptr, root.put(), nullptr));
+    BYTE data[12] = {};  // the last four bytes carry nothing
+    for (size_t column = 0; column < kDisplayColumnCount; ++column) {
+        const int32_t width = g_widths[column];
+        memcpy(data + 4 * column, &width, sizeof width);
+    }
+    RETURN_IF_WIN32_ERROR(
+        ::RegSetValueExW(root.get(), L"Display Settings", 0, REG_BINARY, data, sizeof(data)));
+    return S_OK;
+}
 
 }  // namespace
 
@@ -52,17 +81,22 @@ bool LoadDisplaySettings() {
 }
 
 bool SaveDisplaySettings() {
-    UniqueRegKey root;
-    if (::RegCreateKeyExW(HKEY_CURRENT_USER, StationRootKeyPath().c_str(), 0, nullptr,
-                          REG_OPTION_NON_VOLATILE, KEY_ALL_ACCESS, nullptr, root.put(),
-                          nullptr) != ERROR_SUCCESS) {
-        return false;
-    }
-    BYTE data[12] = {};  // the last four bytes carry nothing
-    for (size_t column = 0; column < kDisplayColumnCount; ++column) {
-        const int32_t width = g_widths[column];
-        memcpy(data + 4 * column, &width, sizeof width);
-    }
-    return ::RegSetValueExW(root.get(), L"Display Settings", 0, REG_BINARY, data, sizeof(data)) ==
-           ERROR_SUCCESS;
+    return SUCCEEDED(WriteWidths());
 }
+
+HRESULT StoreDisplayColumnWidths(const int (&widths)[kDisplayColumnCount]) noexcept try {
+    StoreLock guard;
+    bool changed = g_writeRefused;
+    for (size_t column = 0; column < kDisplayColumnCount; ++column) {
+        if (g_widths[column].exchange(widths[column]) != widths[column])
+            changed = true;
+    }
+    if (!changed)
+        return S_OK;
+    // Refused until written: a write that failed (or threw) is made again by the next call.
+    g_writeRefused = true;
+    RETURN_IF_FAILED(WriteWidths());
+    g_writeRefused = false;
+    return S_OK;
+}
+CATCH_RETURN()

@@ -1,7 +1,8 @@
-// The widths of the view's first two columns: loaded when the module starts, read and changed
-// by the view, saved when the library is freed. The value "Display Settings" beside the
-// stations holds them.
+// The widths of the view's first two columns: loaded when the module starts, saved by the view
+// whenever they change. The value "Display Settings" beside the stations holds them.
 #pragma once
+
+#include <windows.h>
 
 #include <cstddef>
 
@@ -13,5 +14,11 @@ void SetDisplayColumnWidth(size_t column, int width) noexcept;
 
 // Both widths back to 100, then those of a well-formed stored value; false when there is none.
 bool LoadDisplaySettings();
-// Writes the two widths as the 12-byte binary value; false when the registry refuses.
+// Writes the two widths as the 12-byte binary value; false, and logged, when the registry refuses.
 bool SaveDisplaySettings();
+
+// The widths a view shows now. When one differs from the width kept (or an earlier write
+// failed), keeps them and writes the value at once, as SaveDisplaySettings does; views on
+// several threads take turns, so that the value stored is always the widths kept. A failed
+// write is logged and returned; the widths are kept all the same and the next call writes.
+[[nodiscard]] HRESULT StoreDisplayColumnWidths(const int (&widths)[kDisplayColumnCount]) noexcept;

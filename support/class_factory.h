@@ -22,10 +22,10 @@ HRESULT CreateComInstance(REFIID iid, void** object) noexcept {
     CATCH_RETURN()
 }
 
-// Factories are cached for the module's life with one reference of the cache's own. That
-// reference does not hold the module (or it could never unload); every reference beyond it is a
-// client's, and while any is held the module stays loaded, so that a client may keep a factory
-// without LockServer and still call it.
+// Factories are cached until the module's tear-down (when DllCanUnloadNow answers S_OK), with one
+// reference of the cache's own. That reference does not hold the module (or it could never
+// unload); every reference beyond it is a client's, and while any is held the module stays
+// loaded, so that a client may keep a factory without LockServer and still call it.
 class ClassFactory final : public ComObjectImpl<false, IClassFactory> {
 public:
     explicit ClassFactory(CreateInstanceFunction create) noexcept : create_(create) {}

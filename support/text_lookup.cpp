@@ -3,11 +3,13 @@
 
 #include <shlwapi.h>
 
+#include <atomic>
 #include <clocale>
 #include <cstdint>
 #include <map>
 #include <memory>
 #include <mutex>
+#include <new>
 #include <utility>
 
 #include "support/module_instance.h"
@@ -42,11 +44,21 @@ struct TranslationCache {
 };
 
 // Made once, on first use from any thread, and never destroyed: callers may still be about at
-// unload. A function-local static rather than std::call_once, whose bookkeeping is
-// thread-local and so allocated anew on every download thread.
+// unload. A one-time initialisation of the system's rather than a function-local static or
+// std::call_once: with this runtime both leave a handle and a TLS slot behind at every load of
+// the library, which a host that loads and frees it again and again would run out of.
+INIT_ONCE g_cacheOnce = INIT_ONCE_STATIC_INIT;
+TranslationCache* g_cache = nullptr;
+
+BOOL CALLBACK MakeCache(INIT_ONCE*, void*, void**) {
+    g_cache = new (std::nothrow) TranslationCache;
+    return g_cache != nullptr;  // out of memory: tried again on the next use
+}
+
 TranslationCache& Cache() {
-    static TranslationCache* const cache = new TranslationCache;
-    return *cache;
+    if (!::InitOnceExecuteOnce(&g_cacheOnce, &MakeCache, nullptr, nullptr))
+        throw std::bad_alloc();
+    return *g_cache;
 }
 
 std::shared_ptr<const TranslationMap> TranslationsFor(const std::wstring& modulePath,
@@ -199,7 +211,9 @@ HRESULT LoadTranslationFile(const std::wstring& path, TranslationMap& map) noexc
 }
 
 void ClearTranslationCache() noexcept {
-    TranslationCache& cache = Cache();
+    if (!::InitOnceExecuteOnce(&g_cacheOnce, &MakeCache, nullptr, nullptr))
+        return;  // no cache: nothing to clear
+    TranslationCache& cache = *g_cache;
     std::lock_guard<std::mutex> guard(cache.lock);
     cache.fileByModuleAndLanguage.clear();
     cache.mapByFile.clear();
@@ -209,14 +223,25 @@ void ClearTranslationCache() noexcept {
 // set with SetThreadUILanguage back through GetThreadUILanguage (Wine does not). It is kept in a
 // system TLS slot, which costs no allocation: a C++ thread_local is allocated for every thread
 // that touches it, every download thread among them, and its clean-up is left to the thread
-// notifications that this module turns off. The slot lives as long as the process.
+// notifications that this module turns off. The slot is taken only by a thread that selects a
+// language (a test, a tool), once per load, and lives as long as the process.
+INIT_ONCE g_slotOnce = INIT_ONCE_STATIC_INIT;
+std::atomic<DWORD> g_languageSlot{TLS_OUT_OF_INDEXES};
+
+BOOL CALLBACK AllocateLanguageSlot(INIT_ONCE*, void*, void**) {
+    g_languageSlot = ::TlsAlloc();
+    return TRUE;  // a slot that could not be had leaves the system's language in charge
+}
+
+// The slot, taken on first need; TLS_OUT_OF_INDEXES when none could be had.
 DWORD LanguageSlot() noexcept {
-    static const DWORD slot = ::TlsAlloc();
-    return slot;
+    (void)::InitOnceExecuteOnce(&g_slotOnce, &AllocateLanguageSlot, nullptr, nullptr);
+    return g_languageSlot;
 }
 
 LANGID UiLanguage() noexcept {
-    const DWORD slot = LanguageSlot();
+    // Only read: a thread that never selected a language takes no slot.
+    const DWORD slot = g_languageSlot;
     const auto selected = static_cast<LANGID>(
         slot != TLS_OUT_OF_INDEXES ? reinterpret_cast<uintptr_t>(::TlsGetValue(slot)) : 0);
     return selected != 0 ? selected : ::GetThreadUILanguage();
