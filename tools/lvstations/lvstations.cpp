@@ -1,4 +1,5 @@
-// lvstations: the station store from the command line, as the extension sees it.
+// lvstations: the station store from the command line, as the extension sees it, and station
+// files to provision many computers alike.
 #include <windows.h>
 #include <commctrl.h>
 
@@ -13,6 +14,7 @@
 #include "support/text_lookup.h"
 #include "support/unique_resource.h"
 #include "tools/common/console_output.h"
+#include "tools/lvstations/station_file_commands.h"
 
 namespace {
 
@@ -30,7 +32,18 @@ const wchar_t kUsage[] =
     L"                                  Add command does (exit code 0 OK, 1 Cancel)\n"
     L"  lvstations properties NAME      opens the station sheet on a stored station (exit code 0\n"
     L"                                  OK, 1 Cancel, 2 no such station)\n"
-    L"  lvstations delete NAME          deletes a station\n";
+    L"  lvstations delete NAME          deletes a station\n"
+    L"  lvstations export FILE          writes every station to FILE, a UTF-8 text file: one\n"
+    L"                                  [station name] section each, then Key = value lines\n"
+    L"                                  named as in the registry (Port, BaudRate, ...)\n"
+    L"  lvstations import FILE [--replace]\n"
+    L"                                  adds the file's stations once the whole file is checked;\n"
+    L"                                  a name already taken is skipped, or overwritten with\n"
+    L"                                  --replace. A port this computer does not list is kept,\n"
+    L"                                  with a warning.\n"
+    L"      exit codes: 0 done; 1 import: names skipped, export: no stations or a value that\n"
+    L"      cannot come back as stored; 2 usage; 3 a bad file, nothing imported; 4 a file or\n"
+    L"      the store could not be read or written\n";
 
 std::wstring ParityName(DWORD parity) {
     return LoadUiText(parity == 0   ? IDS_PARITY_NONE
@@ -159,6 +172,12 @@ int wmain(int argc, wchar_t** argv) {
         return Properties(argv[2]);
     if (command == L"delete" && argc == 3)
         return Delete(argv[2]);
+    const auto printLine = [](const std::wstring& line) { PrintUtf8(line + L"\n"); };
+    if (command == L"export" && argc == 3)
+        return ExportStations(argv[2], printLine);
+    const bool replace = argc == 4 && std::wstring(argv[3]) == L"--replace";
+    if (command == L"import" && (argc == 3 || replace))
+        return ImportStations(argv[2], replace, printLine);
     PrintUtf8(kUsage);
-    return command == L"--help" || command == L"-h" ? 0 : 2;
+    return command == L"--help" || command == L"-h" ? kExitDone : kExitUsage;
 }

@@ -1,0 +1,60 @@
+// The twelve fields of a station by their registry value names, and the values each may take.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <optional>
+#include <span>
+
+#include "stations/portable/station.h"
+
+// In the order in which the store writes a station's values.
+enum class StationField : uint8_t {
+    kName,
+    kPort,
+    kBaudRate,
+    kStopBits,
+    kParity,
+    kDataBits,
+    kManufacturer,
+    kModel,
+    kSoftware,
+    kProtocol,
+    kFlow,
+    kCheckSum,
+};
+
+inline constexpr size_t kStationFieldCount = 12;
+
+// The store reads every text with a buffer of 520 bytes, terminator included: a longer text would
+// be written but could never be read back (a longer name is a station nobody finds).
+inline constexpr size_t kMaximumStationTextLength = 259;
+
+struct StationFieldInfo {
+    StationField field;
+    const WideChar* valueName;  // the registry value's name, e.g. "BaudRate"
+    WideString Station::*text;  // set for the five texts
+    uint32_t Station::*number;  // set for the seven numbers (REG_DWORD)
+};
+
+// All twelve, in the store's write order.
+std::span<const StationFieldInfo> StationFields() noexcept;
+
+const StationFieldInfo& StationFieldOf(StationField field) noexcept;
+
+// The field whose value name this is, compared without regard to ASCII letter case, as the
+// registry compares value names.
+std::optional<StationField> StationFieldNamed(WideStringView valueName) noexcept;
+
+// Why a number is refused, or nullopt when the field may hold it. The station sheet offers the
+// baud rates 300 to 9600 and the three parities; the fields it does not show take the codes their
+// consumers know: stop bits 0 to 2 (one, one and a half, two), data bits 5 to 8, protocol
+// selectors 0 to 3, flow selectors 0 to 2, block checksums 0 or 1.
+std::optional<WideString> RefusedNumber(StationField field, uint32_t value);
+
+// Why a text is refused, or nullopt. Every text is at most kMaximumStationTextLength units and
+// holds no NUL (the store's texts end at the first one). A name follows IsValidStationName; a
+// model is one of modelTexts (exact comparison). Ports are any text: whether this computer has
+// the port is a warning for the caller, since COM numbers differ between computers.
+std::optional<WideString> RefusedText(StationField field, WideStringView text,
+                                      std::span<const WideString> modelTexts);
