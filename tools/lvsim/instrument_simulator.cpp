@@ -43,10 +43,14 @@ std::vector<std::string> GenerateSurveyLines(uint32_t count, uint32_t length) {
     return lines;
 }
 
-void InstrumentSimulator::Turnaround() const {
-    // The instrument takes its own time before it sends again, whatever the answer.
-    if (options_.TurnaroundMs)
+void InstrumentSimulator::Turnaround() {
+    // The instrument takes its own time before it sends again, whatever the answer. What the
+    // receiver says meanwhile (a NAK for the silence of a long pause) answers nothing the
+    // instrument is about to send, and would be taken for the answer to the next block.
+    if (options_.TurnaroundMs) {
         ::Sleep(options_.TurnaroundMs);
+        port_.Purge(false, true);
+    }
 }
 
 bool InstrumentSimulator::WriteAll(const char* bytes, size_t count) {

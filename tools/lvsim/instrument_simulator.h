@@ -54,7 +54,7 @@ private:
     // call then waits out the wire time).
     bool SendPaced(const std::string& bytes);
     bool WriteAll(const char* bytes, size_t count);
-    void Turnaround() const;
+    void Turnaround();
     // Reads until a CR LF ends an answer, or the answer time-out passes; empty when none.
     std::string ReadAnswer(uint32_t timeoutMs);
     bool SendLineUntilAcknowledged(const std::string& line, bool corruptFirst, bool loseFirstAck);
