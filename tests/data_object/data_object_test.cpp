@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "tests/data_object/data_object_fixture.h"
+#include "tools/lvconsume/portable/strict_id_list_array.h"
 
 using Microsoft::WRL::ComPtr;
 
@@ -134,43 +135,6 @@ TEST_F(DataObject, SetDataReleasesTheMediumOnlyWhenItIsHandedOver) {
     }
 }
 
-namespace {
-
-// A strict reader of a "Shell IDList Array": every offset and every item-ID list it names must
-// lie wholly inside the block, or the block is refused (an empty result). Gives the parent's list
-// and then each child's, each with its terminator.
-std::vector<std::vector<BYTE>> StrictIdLists(const BYTE* block, size_t size) {
-    UINT count = 0;
-    if (size < sizeof count)
-        return {};
-    memcpy(&count, block, sizeof count);
-    if (sizeof(UINT) * (static_cast<size_t>(count) + 2) > size)
-        return {};  // the offsets themselves do not fit
-    std::vector<std::vector<BYTE>> lists;
-    for (UINT slot = 0; slot <= count; ++slot) {
-        UINT offset = 0;
-        memcpy(&offset, block + sizeof(UINT) * (slot + 1), sizeof offset);
-        size_t end = offset;
-        for (;;) {
-            USHORT itemSize = 0;
-            if (end + sizeof itemSize > size)
-                return {};
-            memcpy(&itemSize, block + end, sizeof itemSize);
-            end += itemSize == 0 ? sizeof itemSize : itemSize;
-            if (itemSize == 0)
-                break;
-            if (itemSize < sizeof itemSize)
-                return {};
-        }
-        if (offset < sizeof(UINT) * (count + 2))
-            return {};  // a list inside the header is the header misread
-        lists.emplace_back(block + offset, block + end);
-    }
-    return lists;
-}
-
-}  // namespace
-
 // One to five stations: every child has its own offset inside the block, names its station, and
 // the system's own reader of the format sees the same items below the folder's place in the
 // shell (here My Computer stands in for it).
@@ -192,10 +156,15 @@ TEST_F(DataObject, ShellIdListArrayGivesEveryChildItsOwnOffsetInsideTheBlock) {
         }
         UniqueStgMedium medium;
         ASSERT_EQ(S_OK, Get(object.Get(), CFSTR_SHELLIDLIST, TYMED_HGLOBAL, medium));
+        // Every offset and every list must lie wholly inside the block, as a strict reader sees it.
         std::vector<std::vector<BYTE>> lists;
         {
             GlobalLockGuard lock(medium.get().hGlobal);
-            lists = StrictIdLists(static_cast<const BYTE*>(lock.data()), lock.size());
+            const auto* bytes = static_cast<const BYTE*>(lock.data());
+            const StrictIdListArray array = ReadIdListArrayStrictly(bytes, lock.size());
+            EXPECT_TRUE(array.valid()) << array.fault;
+            for (const IdListSpan& span : array.lists)
+                lists.emplace_back(bytes + span.offset, bytes + span.offset + span.length);
         }
         ASSERT_EQ(count + 1, lists.size()) << "an offset or a list outside the block";
         ASSERT_EQ(folderSize, lists[0].size());
