@@ -1,11 +1,10 @@
-// CThread: start, state tracking, suspension and waiting around one worker thread.
+// CThread: start, state tracking and waiting around one worker thread.
 #include "download/thread.h"
 
 #include "support/text_lookup.h"
 
 namespace {
 constexpr DWORD kNotApplicable = 0xFFFFFFFF;
-constexpr DWORD kMaximumSuspendCount = 127;
 }  // namespace
 
 CThread::CThread() noexcept : language_(UiLanguage()) {}
@@ -14,7 +13,7 @@ CThread::~CThread() = default;
 
 HANDLE CThread::Start() {
     const uint32_t state = state_.load();
-    if (state == kRunning || state == kSuspended)
+    if (state == kRunning)
         return thread_.get();
     thread_.reset();
     state_ = kRunning;  // before the worker can finish and set its own state
@@ -33,26 +32,6 @@ uint32_t CThread::GetStatus() {
     return state_.load();
 }
 
-DWORD CThread::Suspend() {
-    const uint32_t state = state_.load();
-    if (state != kRunning && state != kSuspended)
-        return kNotApplicable;
-    const DWORD previous = ::SuspendThread(thread_.get());
-    if (previous < kMaximumSuspendCount)
-        state_ = kSuspended;
-    return previous;
-}
-
-DWORD CThread::Resume() {
-    if (state_.load() != kSuspended)
-        return kNotApplicable;
-    const DWORD previous = ::ResumeThread(thread_.get());
-    // Only the last resume lets the thread run again.
-    if (previous == 1)
-        state_ = kRunning;
-    return previous;
-}
-
 DWORD CThread::Wait(DWORD milliseconds) {
     if (state_.load() != kRunning)
         return kNotApplicable;
@@ -62,10 +41,6 @@ DWORD CThread::Wait(DWORD milliseconds) {
 DWORD CThread::StopAndWait(DWORD milliseconds) {
     Stop();
     return Wait(milliseconds);
-}
-
-bool CThread::Sleep(DWORD milliseconds, bool alertable) {
-    return ::SleepEx(milliseconds, alertable ? TRUE : FALSE) == WAIT_IO_COMPLETION;
 }
 
 DWORD CThread::GetExitCode() const {

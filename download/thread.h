@@ -10,7 +10,7 @@
 
 class CThread {
 public:
-    enum State : uint32_t { kCreated = 0, kRunning = 1, kSuspended = 2, kFinished = 3 };
+    enum State : uint32_t { kCreated = 0, kRunning = 1, kFinished = 3 };
     // The exit code of a worker whose OnStart, Run or OnEnd threw (E_FAIL's bits).
     static constexpr DWORD kThreadFailed = 0x80004005;
 
@@ -21,20 +21,14 @@ public:
     // Closes the thread handle; does not stop the thread (call StopAndWait first).
     virtual ~CThread();
 
-    // Starts the worker unless it is running or suspended; returns the thread's handle, null
-    // when it could not be created.
+    // Starts the worker unless it is running; returns the thread's handle, null when it could not
+    // be created.
     HANDLE Start();
     // The state; a running thread whose exit code is no longer STILL_ACTIVE becomes finished.
     uint32_t GetStatus();
-    // The previous suspend count, or 0xFFFFFFFF when neither running nor suspended.
-    DWORD Suspend();
-    // The previous suspend count, or 0xFFFFFFFF when not suspended.
-    DWORD Resume();
     // The wait result for the thread's handle, or 0xFFFFFFFF when not running.
     DWORD Wait(DWORD milliseconds);
     DWORD StopAndWait(DWORD milliseconds);
-    // True when woken by an I/O completion (only when alertable).
-    static bool Sleep(DWORD milliseconds, bool alertable);
     DWORD GetExitCode() const;
 
     // Runs first on the worker thread.

@@ -14,4 +14,4 @@ inline constexpr BYTE kShellFolderAttributes[4] = {0x00, 0x00, 0x00, 0xA0};
 // Removes the classes' registrations (the first failure stops that step) and the type library,
 // then removes the folder's Attributes value, which leaves an empty ShellFolder key behind.
 // Always S_OK.
-HRESULT UnregisterServer(HMODULE module) noexcept;
+[[nodiscard]] HRESULT UnregisterServer(HMODULE module) noexcept;

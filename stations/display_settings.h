@@ -13,9 +13,9 @@ int DisplayColumnWidth(size_t column) noexcept;
 void SetDisplayColumnWidth(size_t column, int width) noexcept;
 
 // Both widths back to 100, then those of a well-formed stored value; false when there is none.
-bool LoadDisplaySettings();
+[[nodiscard]] bool LoadDisplaySettings();
 // Writes the two widths as the 12-byte binary value; false, and logged, when the registry refuses.
-bool SaveDisplaySettings();
+[[nodiscard]] bool SaveDisplaySettings();
 
 // The widths a view shows now. When one differs from the width kept (or an earlier write
 // failed), keeps them and writes the value at once, as SaveDisplaySettings does; views on

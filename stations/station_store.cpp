@@ -21,14 +21,10 @@ namespace {
 constexpr DWORD kNameValueBytes = 520;  // names of up to 259 characters
 constexpr DWORD kKeyNameCapacity = 260;
 
-UniqueRegKey OpenStationsKey() {
-    UniqueRegKey key;
-    if (::RegCreateKeyExW(HKEY_CURRENT_USER, StationsKeyPath().c_str(), 0, nullptr,
-                          REG_OPTION_NON_VOLATILE, KEY_ALL_ACCESS, nullptr, key.put(),
-                          nullptr) != ERROR_SUCCESS) {
-        return {};
-    }
-    return key;
+// Opens the "Stations" key for writing, creating it when missing; the registry's status.
+[[nodiscard]] LONG OpenStationsKey(UniqueRegKey& key) {
+    return ::RegCreateKeyExW(HKEY_CURRENT_USER, StationsKeyPath().c_str(), 0, nullptr,
+                             REG_OPTION_NON_VOLATILE, KEY_ALL_ACCESS, nullptr, key.put(), nullptr);
 }
 
 LONG ReadText(HKEY key, const wchar_t* name, std::wstring& field) {
@@ -115,8 +111,8 @@ Station DefaultStation() {
 }
 
 HRESULT FindStation(Station& station, wchar_t* keyName, DWORD* keyNameCapacity) {
-    UniqueRegKey stations = OpenStationsKey();
-    if (!stations)
+    UniqueRegKey stations;
+    if (OpenStationsKey(stations) != ERROR_SUCCESS)
         return E_FAIL;
     const bool found = VisitStationKeys(
         stations.get(), KEY_ALL_ACCESS,
@@ -142,8 +138,8 @@ HRESULT AddStation(const Station& station) {
     if (FindStation(existing) == S_OK)
         return E_INVALIDARG;
 
-    UniqueRegKey stations = OpenStationsKey();
-    if (!stations)
+    UniqueRegKey stations;
+    if (OpenStationsKey(stations) != ERROR_SUCCESS)
         return E_FAIL;
 
     // The lowest free "Station %d" is taken, so a deleted station's number is reused. Numbers
@@ -180,12 +176,11 @@ HRESULT UpdateStation(const std::wstring& oldName, const Station& station) {
     if (subkeyName[0] == L'\0')
         return E_FAIL;
 
+    // From here on a failure is the registry's own code, not an HRESULT (see the header).
     UniqueRegKey stations;
-    LONG status = ::RegCreateKeyExW(HKEY_CURRENT_USER, StationsKeyPath().c_str(), 0, nullptr,
-                                    REG_OPTION_NON_VOLATILE, KEY_ALL_ACCESS, nullptr,
-                                    stations.put(), nullptr);
+    LONG status = OpenStationsKey(stations);
     if (status != ERROR_SUCCESS)
-        return status;  // the raw registry error is the result
+        return status;
 
     UniqueRegKey subkey;
     DWORD disposition = 0;
@@ -210,10 +205,10 @@ HRESULT DeleteStation(const Station& station) {
     if (subkeyName[0] == L'\0')
         return E_FAIL;
 
-    UniqueRegKey stations = OpenStationsKey();
-    if (!stations)
+    UniqueRegKey stations;
+    if (OpenStationsKey(stations) != ERROR_SUCCESS)
         return E_FAIL;
-    return DeleteKeyRecursive(stations.get(), subkeyName);  // a raw registry error on failure
+    return DeleteKeyRecursive(stations.get(), subkeyName);  // the registry's own code (header)
 }
 
 LONG LoadStationValues(Station& station, HKEY stationKey) {

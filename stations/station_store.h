@@ -21,23 +21,28 @@ Station DefaultStation();
 // the station's subkey name is copied out (at most *keyNameCapacity characters) and
 // *keyNameCapacity set to its length plus one. S_OK when found; E_FAIL when not found or the
 // store cannot be opened.
-HRESULT FindStation(Station& station, wchar_t* keyName = nullptr, DWORD* keyNameCapacity = nullptr);
+[[nodiscard]] HRESULT FindStation(Station& station, wchar_t* keyName = nullptr, DWORD* keyNameCapacity = nullptr);
 
 // Writes the station under the lowest free "Station %d". E_INVALIDARG when the name is taken;
 // E_FAIL when the store cannot be opened or a key cannot be created.
-HRESULT AddStation(const Station& station);
+[[nodiscard]] HRESULT AddStation(const Station& station);
 
+// Update and delete pass the registry's own error code through as their result when the store
+// refuses the change, as the store has always answered. Such a code is positive (5 for access
+// denied) and so passes SUCCEEDED: callers compare the result with S_OK.
+//
 // Rewrites the station now called oldName (this is also the rename); no uniqueness check.
-// E_INVALIDARG when there is no such station; a raw registry error when its key cannot be
+// E_INVALIDARG when there is no such station; the registry's code when its key cannot be
 // opened; S_OK, with nothing saved, when the key vanished since the look-up.
-HRESULT UpdateStation(const std::wstring& oldName, const Station& station);
+[[nodiscard]] HRESULT UpdateStation(const std::wstring& oldName, const Station& station);
 
-// E_INVALIDARG when there is no such station; otherwise the raw result of the recursive delete.
-HRESULT DeleteStation(const Station& station);
+// E_INVALIDARG when there is no such station; otherwise the registry's code of the recursive
+// delete (ERROR_SUCCESS, which is S_OK, when it went).
+[[nodiscard]] HRESULT DeleteStation(const Station& station);
 
 // Reads the twelve values of one open station key in their fixed order, stopping at the first
 // failing read; returns that registry error (or the status of the last read).
-LONG LoadStationValues(Station& station, HKEY stationKey);
+[[nodiscard]] LONG LoadStationValues(Station& station, HKEY stationKey);
 // Writes them in the same order, stopping at the first failure, which nobody is told of.
 void SaveStationValues(const Station& station, HKEY stationKey);
 

@@ -9,14 +9,14 @@
 // Reads a REG_SZ value of at most maxBytes bytes (terminator included). A value of another type
 // gives ERROR_UNSUPPORTED_TYPE, a longer one ERROR_MORE_DATA; a stored text that lacks its
 // terminator is cut at the value's end.
-LONG ReadStringValue(HKEY key, const wchar_t* name, DWORD maxBytes, std::wstring& text);
+[[nodiscard]] LONG ReadStringValue(HKEY key, const wchar_t* name, DWORD maxBytes, std::wstring& text);
 
 // Reads a REG_DWORD value; any other type or size gives ERROR_UNSUPPORTED_TYPE.
-LONG ReadDwordValue(HKEY key, const wchar_t* name, DWORD& value);
+[[nodiscard]] LONG ReadDwordValue(HKEY key, const wchar_t* name, DWORD& value);
 
 // Writes the text with its terminating zero.
-LONG WriteStringValue(HKEY key, const wchar_t* name, const std::wstring& text);
-LONG WriteDwordValue(HKEY key, const wchar_t* name, DWORD value);
+[[nodiscard]] LONG WriteStringValue(HKEY key, const wchar_t* name, const std::wstring& text);
+[[nodiscard]] LONG WriteDwordValue(HKEY key, const wchar_t* name, DWORD value);
 
 // Deletes a key with all its subkeys, depth-first.
-LONG DeleteKeyRecursive(HKEY parent, const wchar_t* subkey);
+[[nodiscard]] LONG DeleteKeyRecursive(HKEY parent, const wchar_t* subkey);

@@ -44,12 +44,12 @@ void ClearTranslationCache() noexcept;
 LANGID UiLanguage() noexcept;
 
 // Makes language this thread's UI language only (a worker taking over its creator's language).
-bool SelectThreadUiLanguage(LANGID language) noexcept;
+[[nodiscard]] bool SelectThreadUiLanguage(LANGID language) noexcept;
 
 // Makes language this thread's UI language and, where the system offers it, the process's
 // preferred UI language; also sets the C runtime locale. False when the thread's language could
 // not be set.
-bool SelectUiLanguage(LANGID language) noexcept;
+[[nodiscard]] bool SelectUiLanguage(LANGID language) noexcept;
 
 // The text to show for a string-table id of this module, in this thread's UI language.
 std::wstring LoadUiText(UINT id);

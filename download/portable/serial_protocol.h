@@ -39,7 +39,7 @@ public:
     // Sends a Y-Modem header block once the receiver has sent anything, until acknowledged.
     uint32_t SendYModemHeader(const YModemBlock& block);
     // Checks an input file of BCC blocks (see CheckBccBlocks); false only on a BCC mismatch.
-    bool CheckInputFile(const uint8_t* bytes, size_t size);
+    [[nodiscard]] bool CheckInputFile(const uint8_t* bytes, size_t size);
 
     // Break, restore and close the port; the protocol is unusable afterwards.
     void ClosePort() noexcept;
@@ -63,7 +63,7 @@ private:
     // Opens the output file for a new receive and forgets an earlier write failure.
     [[nodiscard]] bool CreateOutputFile();
     // Closes the output file; false when the file is not complete (a write or the close failed).
-    bool CloseOutputFile();
+    [[nodiscard]] bool CloseOutputFile();
     void FailOutput(uint32_t error);
 
     uint32_t ReceiveRawStream();

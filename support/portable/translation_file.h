@@ -22,7 +22,7 @@ WideString DecodeTranslationEscapes(WideStringView text);
 // is still waiting for its translation; every other line is a comment. The first pair of an
 // English text wins. False, with map unchanged, when the bytes cannot be a translation file
 // (fewer than 2 bytes, or UTF-16 big-endian).
-bool ParseTranslationFile(const uint8_t* bytes, size_t size, TranslationMap& map);
+[[nodiscard]] bool ParseTranslationFile(const uint8_t* bytes, size_t size, TranslationMap& map);
 
 // The file's bytes as UTF-16 text by the rules above; false for the rejected forms.
-bool DecodeTranslationFileText(const uint8_t* bytes, size_t size, WideString& text);
+[[nodiscard]] bool DecodeTranslationFileText(const uint8_t* bytes, size_t size, WideString& text);

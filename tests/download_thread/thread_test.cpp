@@ -79,31 +79,6 @@ TEST(Thread, FinishedThreadStartsAgainInTheCreatorsLanguageAndStopEndsTheWork) {
     EXPECT_EQ(gated.GetExitCode(), 7u);
 }
 
-TEST(Thread, SuspendAndResumeTrackTheCount) {
-    GatedThread thread;
-    EXPECT_EQ(thread.Suspend(), 0xFFFFFFFFu);
-    EXPECT_EQ(thread.Resume(), 0xFFFFFFFFu);
-    const HANDLE worker = thread.Start();
-    ASSERT_NE(worker, nullptr);
-    EXPECT_EQ(thread.Resume(), 0xFFFFFFFFu);  // running, not suspended
-    EXPECT_EQ(thread.Suspend(), 0u);
-    EXPECT_EQ(thread.GetStatus(), CThread::kSuspended);
-    EXPECT_EQ(thread.Suspend(), 1u);
-    EXPECT_EQ(thread.Wait(0), 0xFFFFFFFFu);  // suspended is not running
-    EXPECT_EQ(thread.Resume(), 2u);
-    EXPECT_EQ(thread.GetStatus(), CThread::kSuspended);
-    EXPECT_EQ(thread.Resume(), 1u);
-    EXPECT_EQ(thread.GetStatus(), CThread::kRunning);
-    thread.Release();
-    ::WaitForSingleObject(worker, INFINITE);
-}
-
-TEST(Thread, AlertableSleepReportsCompletion) {
-    EXPECT_FALSE(CThread::Sleep(1, true));
-    ASSERT_NE(::QueueUserAPC([](ULONG_PTR) {}, ::GetCurrentThread(), 0), 0u);
-    EXPECT_TRUE(CThread::Sleep(1000, true));
-}
-
 TEST(Thread, WorkThatThrowsEndsTheThreadNotTheProcess) {
     GatedThread thread(true);
     ASSERT_NE(nullptr, thread.Start());

@@ -170,16 +170,6 @@ TEST_F(ExplorerHost, MenusNotImplemented_AnswersENotImplAsWinesBrowsersDo) {
     EXPECT_EQ(L"", window_->StatusText(0));
 }
 
-// Whether the browser answers ICommDlgBrowser at all is seen by the view's menu tests.
-TEST_F(ExplorerHost, CommonDialogMode_CountsDefaultCommands) {
-    Open({.commonDialog = true});
-    ComPtr<ICommDlgBrowser> dialog;
-    ASSERT_EQ(S_OK, Browser()->QueryInterface(IID_PPV_ARGS(&dialog)));
-    EXPECT_EQ(S_OK, dialog->OnDefaultCommand(nullptr));
-    EXPECT_EQ(S_OK, dialog->OnDefaultCommand(nullptr));
-    EXPECT_EQ(2, window_->DefaultCommandCount());
-}
-
 TEST_F(ExplorerHost, BrowseObject_FollowsRelativeParentAndBackRequests) {
     Open();
     ASSERT_EQ(S_OK, window_->BrowseToParsingName(L"C:\\windows"));
@@ -195,7 +185,6 @@ TEST_F(ExplorerHost, BrowseObject_FollowsRelativeParentAndBackRequests) {
         EXPECT_EQ(S_OK, Browser()->BrowseObject(step.list, step.flags)) << std::hex << step.flags;
         EXPECT_TRUE(IsAt(step.place)) << Place();
     }
-    EXPECT_EQ(3, window_->BrowseRequestCount());
 }
 
 TEST_F(ExplorerHost, BrowsingAway_DeactivatesAndDestroysTheOldView) {

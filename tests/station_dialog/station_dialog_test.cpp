@@ -172,7 +172,7 @@ TEST_F(StationDialog, AGermanUiRelabelsTheSheetAndItsRefusals) {
         page.Press(PSBTN_OK);
         page.Press(PSBTN_CANCEL);
     });
-    SelectThreadUiLanguage(before);
+    EXPECT_TRUE(SelectThreadUiLanguage(before));
     const auto boxes = user_.MessageBoxes();
     ASSERT_EQ(1u, boxes.size());
     EXPECT_EQ(L"Bitte einen gültigen Gerätenamen eingeben!", boxes[0].text);

@@ -206,22 +206,20 @@ TEST_F(StationStore, SerialPortListStopsAtTheFirstNonTextValue) {
     EXPECT_EQ(Names{L"COM3"}, ListSerialPorts());
 }
 
-TEST_F(StationStore, StationListBlockRoundTripsAndIsBoundByItsRealSize) {
+// The records' own format is tested in the portable tests; here the memory block around them.
+TEST_F(StationStore, StationListBlockIsReadOnlyUpToItsRealSize) {
     std::vector<Station> stations = {Named(L"One"), Named(L"Two")};
     stations[1].Port = L"COM12";
     UniqueHGlobal block(SerializeStationList(stations));
     ASSERT_TRUE(block);
-    std::vector<Station> parsed;
-    EXPECT_EQ(S_OK, ParseStationList(block.get(), parsed));
-    EXPECT_EQ(stations, parsed);
-
     // A block whose count lies is read only up to GlobalSize.
     {
         GlobalLockGuard lock(block.get());
         *static_cast<uint32_t*>(lock.data()) = 1000;
     }
+    std::vector<Station> parsed;
     EXPECT_EQ(S_OK, ParseStationList(block.get(), parsed));
-    EXPECT_EQ(2u, parsed.size());
+    EXPECT_EQ(stations, parsed);
     EXPECT_EQ(S_OK, ParseStationList(nullptr, parsed));
     EXPECT_TRUE(parsed.empty());
 }

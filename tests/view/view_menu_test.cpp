@@ -113,7 +113,7 @@ TEST_F(ShellViewTest, AGermanUiTranslatesTheEntryTheMenusAndTheStatusText) {
     const std::wstring create = Entry(bar, 1280).text;
     const std::wstring copy = Entry(bar, 1281).text;
     const std::wstring status = browser.StatusText();
-    SelectThreadUiLanguage(before);
+    EXPECT_TRUE(SelectThreadUiLanguage(before));
     EXPECT_EQ(std::vector<std::wstring>{L"Neues Digitalnivellier hinzufügen"}, entry);
     EXPECT_EQ(L"Öffnen", open);
     EXPECT_EQ(L"Digitalnivellier anlegen", create);

@@ -24,19 +24,19 @@ bool IsBrowserCommand(UINT id) noexcept;
 // insertion gets a fresh set.
 using BrowserPopups = std::array<UniqueMenu, 3>;
 
-HRESULT CreateBrowserPopups(BrowserPopups& popups) noexcept;
+[[nodiscard]] HRESULT CreateBrowserPopups(BrowserPopups& popups) noexcept;
 
 // The frame's own menu bar, with a set of popups that it owns.
-HRESULT CreateBrowserMenuBar(UniqueMenu& bar) noexcept;
+[[nodiscard]] HRESULT CreateBrowserMenuBar(UniqueMenu& bar) noexcept;
 
 // Puts the popups in front of whatever the shared menu holds, each item carrying its popup's
 // shell id (FCIDM_MENU_FILE, _EDIT, _VIEW) so that a view finds it by command, and fills the
 // browser's groups of the widths (File and Edit, then View). All or nothing.
-HRESULT InsertBrowserPopups(HMENU shared, const BrowserPopups& popups,
+[[nodiscard]] HRESULT InsertBrowserPopups(HMENU shared, const BrowserPopups& popups,
                             OLEMENUGROUPWIDTHS* widths) noexcept;
 
 // Takes the popups out of the shared menu without destroying them; true when any was there.
 bool RemoveBrowserPopups(HMENU shared, const BrowserPopups& popups) noexcept;
 
 // F5 refreshes, Alt+Left goes back, Backspace goes up.
-HRESULT CreateBrowserAccelerators(UniqueAccelerators& table) noexcept;
+[[nodiscard]] HRESULT CreateBrowserAccelerators(UniqueAccelerators& table) noexcept;

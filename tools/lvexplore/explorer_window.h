@@ -43,16 +43,16 @@ enum class BrowseStep {
 // release the window only after it.
 class CExplorerWindow final : public ComObject<IShellBrowser, ICommDlgBrowser> {
 public:
-    static HRESULT Create(const ExplorerOptions& options,
+    [[nodiscard]] static HRESULT Create(const ExplorerOptions& options,
                           Microsoft::WRL::ComPtr<CExplorerWindow>& window);
 
     // Binds the folder from the desktop, asks it for its view and shows that view in place of the
     // current one; the current folder goes into the history for Back.
-    HRESULT BrowseTo(PCIDLIST_ABSOLUTE folder);
+    [[nodiscard]] HRESULT BrowseTo(PCIDLIST_ABSOLUTE folder);
     // SHParseDisplayName, then BrowseTo.
-    HRESULT BrowseToParsingName(const wchar_t* parsingName);
+    [[nodiscard]] HRESULT BrowseToParsingName(const wchar_t* parsingName);
     // Shows a view the caller made (from a folder of its own) as the view of that folder.
-    HRESULT BrowseToView(IShellView* view, PCIDLIST_ABSOLUTE folder);
+    [[nodiscard]] HRESULT BrowseToView(IShellView* view, PCIDLIST_ABSOLUTE folder);
     BrowseStep FailedStep() const noexcept { return failedStep_; }
 
     // False when there is nothing to go back or up to, or the browse failed.
@@ -70,7 +70,6 @@ public:
     std::wstring StatusText(int part = 0) const;
     int StatusPartCount() const;
     int BrowseRequestCount() const noexcept { return browseRequests_; }
-    int DefaultCommandCount() const noexcept { return defaultCommands_; }
 
     // The view's TranslateAccelerator first (S_OK: handled), then the frame's own keys (F5,
     // Alt+Left, Backspace). True when the message must not be dispatched.
@@ -122,12 +121,12 @@ private:
     explicit CExplorerWindow(const ExplorerOptions& options);
     ~CExplorerWindow() override;
 
-    HRESULT CreateFrame() noexcept;
-    HRESULT CreateControls(HWND frame) noexcept;
-    HRESULT Navigate(PCIDLIST_ABSOLUTE folder, bool remember);
-    HRESULT ShowView(IShellView* view, PCIDLIST_ABSOLUTE folder, bool remember);
-    HRESULT NavigateBack();
-    HRESULT NavigateUp();
+    [[nodiscard]] HRESULT CreateFrame() noexcept;
+    [[nodiscard]] HRESULT CreateControls(HWND frame) noexcept;
+    [[nodiscard]] HRESULT Navigate(PCIDLIST_ABSOLUTE folder, bool remember);
+    [[nodiscard]] HRESULT ShowView(IShellView* view, PCIDLIST_ABSOLUTE folder, bool remember);
+    [[nodiscard]] HRESULT NavigateBack();
+    [[nodiscard]] HRESULT NavigateUp();
     FOLDERSETTINGS NextFolderSettings() const noexcept;
     void ReleaseView() noexcept;
     void ForgetLentPopups(bool all) noexcept;
@@ -153,7 +152,6 @@ private:
     std::vector<UniqueAbsoluteIdList> history_;
     BrowseStep failedStep_ = BrowseStep::None;
     int browseRequests_ = 0;
-    int defaultCommands_ = 0;
     bool quitWhenDestroyed_ = false;
 };
 

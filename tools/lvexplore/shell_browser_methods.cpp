@@ -194,7 +194,6 @@ IFACEMETHODIMP CExplorerWindow::SetToolbarItems(TBBUTTON*, UINT count, UINT flag
 
 IFACEMETHODIMP CExplorerWindow::OnDefaultCommand(IShellView*) {
     Trace(L"OnDefaultCommand");
-    ++defaultCommands_;
     return S_OK;
 }
 

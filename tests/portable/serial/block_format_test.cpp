@@ -62,19 +62,6 @@ TEST(YModemBlock, HeaderParseStaysInsideAnUnterminatedBlock) {
     EXPECT_TRUE(info.SizeText.empty());
 }
 
-TEST(Replies, BlockProtocolMapping) {
-    const std::pair<uint8_t, uint8_t> mapping[] = {
-        {0x00, 0x15}, {0x03, 0x06}, {0x04, 0x04}, {0x15, 0x15}, {0x41, 0x41}};
-    for (const auto& [validated, reply] : mapping)
-        EXPECT_EQ(MapBccReply(validated), reply) << int(validated);
-    CrcTable table{};
-    uint16_t check = 0;
-    const uint8_t eot[kBlockCapacity] = {0x04};
-    const uint8_t other[kBlockCapacity] = {'Q'};
-    EXPECT_EQ(ValidateBlock(eot, 1, table, check), 0x04);
-    EXPECT_EQ(ValidateBlock(other, 1, table, check), 0x15);
-}
-
 std::vector<uint8_t> BlockFile(int blocks, bool endWithEot) {
     std::vector<uint8_t> file;
     for (int i = 0; i < blocks; ++i) {
