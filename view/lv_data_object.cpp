@@ -6,45 +6,20 @@
 #include <cstring>
 #include <cwchar>
 
-#include "download/download_progress_dialog.h"
-#include "download/halvek_comm.h"
-#include "download/halvek_download_progress_dialog.h"
-#include "download/portable/driver_text.h"
-#include "res/resource.h"
+#include "download/dialog_station_downloader.h"
+#include "download/download_target.h"
 #include "stations/station_list_block.h"
 #include "stations/station_models.h"
 #include "stations/station_store.h"
+#include "support/clipboard_formats.h"
 #include "support/error_handling.h"
-#include "support/text_lookup.h"
 #include "support/unique_resource.h"
-#include "support/user_interface.h"
 #include "view/enum_format_etc.h"
 #include "view/stream2.h"
 
 namespace {
 
 constexpr UINT kSharedMemoryFlags = GMEM_MOVEABLE | GMEM_ZEROINIT | GMEM_SHARE;
-
-// Registered by name on every use: the system hands back the same number each time.
-CLIPFORMAT Format(const wchar_t* name) noexcept {
-    return static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(name));
-}
-
-CLIPFORMAT FileContentsFormat() noexcept {
-    return Format(CFSTR_FILECONTENTS);
-}
-CLIPFORMAT FileGroupDescriptorFormat() noexcept {
-    return Format(CFSTR_FILEDESCRIPTORW);
-}
-CLIPFORMAT ShellIdListFormat() noexcept {
-    return Format(CFSTR_SHELLIDLIST);
-}
-CLIPFORMAT StationListFormat() noexcept {
-    return Format(L"Quorvel Total Stations");
-}
-CLIPFORMAT PreferredDropEffectFormat() noexcept {
-    return Format(CFSTR_PREFERREDDROPEFFECT);
-}
 
 bool IsHGlobalRequest(const FORMATETC& format, CLIPFORMAT wanted) noexcept {
     return format.cfFormat == wanted && format.tymed == TYMED_HGLOBAL;
@@ -81,64 +56,12 @@ std::wstring ItemPath(const CPidlMgr& manager, LPCITEMIDLIST list) {
     return path;
 }
 
-// The user's temporary folder, with its trailing backslash.
-HRESULT TemporaryFolder(std::wstring& folder) {
-    wchar_t directory[130];
-    const DWORD length = ::GetTempPathW(ARRAYSIZE(directory), directory);
-    // Failures are made into HRESULTs: a bare Win32 code would pass for success.
-    if (length == 0)
-        LV_LOG_AND_RETURN(LastErrorResult());
-    if (length >= ARRAYSIZE(directory))
-        LV_LOG_AND_RETURN(HRESULT_FROM_WIN32(ERROR_BUFFER_OVERFLOW));
-    folder.assign(directory, length);
-    return S_OK;
-}
-
-// A unique "QRV" name in the folder, without extension, where no file is: the download writes
-// the file itself. Creating the placeholder also proves that the folder exists and takes files.
-HRESULT MakeDownloadTarget(const std::wstring& folder, std::wstring& target) {
-    // A drive with no room at all would take the placeholder (it has no data) and then fail
-    // the download at its first line: say so before the surveyor starts the instrument.
-    ULARGE_INTEGER available{};
-    if (::GetDiskFreeSpaceExW(folder.c_str(), &available, nullptr, nullptr) &&
-        available.QuadPart == 0) {
-        LV_LOG_AND_RETURN(HRESULT_FROM_WIN32(ERROR_DISK_FULL));
-    }
-    wchar_t temporary[MAX_PATH];
-    if (::GetTempFileNameW(folder.c_str(), L"QRV", 0, temporary) == 0)
-        LV_LOG_AND_RETURN(LastErrorResult());
-    // Windows makes the placeholder or fails; Wine hands out a name on a read-only drive without
-    // one. No placeholder means the folder takes no files.
-    if (::GetFileAttributesW(temporary) == INVALID_FILE_ATTRIBUTES)
-        LV_LOG_AND_RETURN(HRESULT_FROM_WIN32(ERROR_ACCESS_DENIED));
-    // Only the unique name is wanted, so the placeholder goes and the name loses its extension.
-    (void)::DeleteFileW(temporary);  // a placeholder left behind is empty and harmless
-    target = temporary;
-    const size_t dot = target.rfind(L'.');
-    if (dot != std::wstring::npos && target.find(L'\\', dot) == std::wstring::npos)
-        target.erase(dot);
-    return S_OK;
-}
-
-// A download target in the user's temporary folder; when the folder cannot take it, the user is
-// told which folder and why before anything else happens, and the failure is returned.
-HRESULT PrepareDownloadTarget(HWND owner, std::wstring& target) {
-    std::wstring folder;
-    HRESULT result = TemporaryFolder(folder);
-    if (SUCCEEDED(result))
-        result = MakeDownloadTarget(folder, target);
-    if (SUCCEEDED(result))
-        return result;
-    if (folder.size() > 1 && folder.back() == L'\\')
-        folder.pop_back();
-    ShowMessageBox(owner,
-                   FormatDriverText(LoadUiText(IDS_TEMPORARY_FOLDER_UNUSABLE),
-                                    {folder, SystemResultText(result)}),
-                   LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONSTOP);
-    return result;
-}
-
 }  // namespace
+
+CLVDataObject::CLVDataObject() : CLVDataObject(MakeDialogStationDownloader()) {}
+
+CLVDataObject::CLVDataObject(std::shared_ptr<StationDownloader> downloader)
+    : downloader_(std::move(downloader)) {}
 
 CLVDataObject::~CLVDataObject() {
     EndDragImage();
@@ -260,32 +183,17 @@ HRESULT CLVDataObject::GetFileContents(LONG index, STGMEDIUM* medium) {
     std::wstring target;
     RETURN_IF_FAILED(PrepareDownloadTarget(owner, target));
 
-    const bool external = IsExternalLibraryModel(station.Model);
-    // The library writes its file under the given name with ".txt" added.
-    const std::wstring file = external ? target + L".txt" : target;
-    INT_PTR answer = -1;
-    bool completed = false;
-    HRESULT downloadResult = S_OK;
-    const auto run = [&](CProgressDialogBase&& dialog) {
-        answer = dialog.DoModal();
-        completed = dialog.TransferCompleted();
-        downloadResult = dialog.DownloadResult();
-    };
-    if (external)
-        run(CHalvekDownloadProgressDialog(owner, station, target));
-    else
-        run(CDownloadProgressDialog(owner, station, target));
-    // The dialogs are gone, and with them the download thread: nothing writes the file now.
-    // Only a transfer that reported its end makes a file; an IDOK from anywhere else, a cancel
-    // or a dialog that could not run leaves at most a partial file, which goes.
-    if (answer != IDOK || !completed) {
+    RETURN_HR_IF(E_UNEXPECTED, !downloader_);
+    std::wstring file;
+    const HRESULT downloaded = downloader_->Download(owner, station, target, file);
+    // Only a complete file is handed on: a cancel or a failure leaves at most a partial file,
+    // which goes.
+    if (downloaded != S_OK) {
         (void)::DeleteFileW(file.c_str());  // usually there is none: nothing to report
-        if (answer == -1)
-            LV_LOG_AND_RETURN(E_FAIL);
-        // A download the system refused (a full disk) fails the copy with its reason, so that
-        // the caller reports a failure rather than a cancel; the user has seen the reason.
-        if (FAILED(downloadResult))
-            LV_LOG_AND_RETURN(downloadResult);
+        // A failure fails the copy with its reason, so that the caller reports a failure rather
+        // than a cancel.
+        if (FAILED(downloaded))
+            LV_LOG_AND_RETURN(downloaded);
         return S_FALSE;
     }
 

@@ -8,8 +8,10 @@
 #include <oleidl.h>
 #include <shlobj.h>
 
+#include <memory>
 #include <vector>
 
+#include "download/station_downloader.h"
 #include "namespace/pidl_manager.h"
 #include "support/unique_resource.h"
 #include "stations/portable/station.h"
@@ -17,7 +19,10 @@
 
 class CLVDataObject final : public ComObject<IDataObject, IDropSource> {
 public:
-    CLVDataObject() = default;
+    // Its file's download runs the progress dialogs (may throw bad_alloc).
+    CLVDataObject();
+    // Its file's download goes through the downloader given, which must not be null.
+    explicit CLVDataObject(std::shared_ptr<StationDownloader> downloader);
     ~CLVDataObject() override;
 
     // Appends a copy of one item's internal full identifier (root, station, and file if any).
@@ -60,6 +65,7 @@ private:
     HRESULT LoadItemStation(LPCITEMIDLIST item, Station& station) const;
     void EndDragImage() noexcept;
 
+    std::shared_ptr<StationDownloader> downloader_;
     CPidlMgr manager_;
     std::vector<UniquePidl> items_;
     UniquePidl folderLocation_;

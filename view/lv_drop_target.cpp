@@ -5,14 +5,14 @@
 
 #include "namespace/portable/item_id_layout.h"
 #include "stations/station_store.h"
+#include "support/clipboard_formats.h"
 #include "support/error_handling.h"
 #include "view/source_parser.h"
 
 namespace {
 
-HRESULT QueryFormat(IDataObject* dataObject, const wchar_t* name, CLIPFORMAT known, DWORD tymed) {
-    FORMATETC format{known ? known : static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(name)),
-                     nullptr, DVASPECT_CONTENT, -1, tymed};
+HRESULT QueryFormat(IDataObject* dataObject, CLIPFORMAT wanted, DWORD tymed) {
+    FORMATETC format{wanted, nullptr, DVASPECT_CONTENT, -1, tymed};
     return dataObject->QueryGetData(&format);
 }
 
@@ -23,11 +23,6 @@ std::wstring StationNameOf(const CPidlMgr& manager, LPCITEMIDLIST fullList) {
     return StationNameFromPath(path);
 }
 
-DroppedSourcesReceiver& Receiver() {
-    static DroppedSourcesReceiver receiver;
-    return receiver;
-}
-
 // Parses what was dropped; the parse's result when it fails.
 HRESULT ParseDrop(IDataObject* dataObject, std::shared_ptr<TSourceList>& sources) {
     TSourceParser parser(true);
@@ -36,27 +31,33 @@ HRESULT ParseDrop(IDataObject* dataObject, std::shared_ptr<TSourceList>& sources
     return S_OK;
 }
 
-void HandOver(const std::wstring& station, const std::shared_ptr<TSourceList>& sources) {
-    if (Receiver())
-        Receiver()(station, sources);
+void HandOver(const DroppedSourcesReceiver& receiver, const std::wstring& station,
+              const std::shared_ptr<TSourceList>& sources) {
+    if (receiver)
+        receiver(station, sources);
+}
+
+// Copies a receiver into a target's field: the copy may meet an allocation failure.
+HRESULT KeepReceiver(DroppedSourcesReceiver& field, const DroppedSourcesReceiver& receiver) {
+    try {
+        field = receiver;
+        return S_OK;
+    }
+    CATCH_RETURN()
 }
 
 }  // namespace
 
-void SetDroppedSourcesReceiver(DroppedSourcesReceiver receiver) {
-    Receiver() = std::move(receiver);
-}
-
 HRESULT AcceptDropSource(IDataObject* dataObject) noexcept {
     if (!dataObject)
         return E_INVALIDARG;
-    if (QueryFormat(dataObject, nullptr, CF_HDROP, TYMED_HGLOBAL) == S_OK)
+    if (QueryFormat(dataObject, CF_HDROP, TYMED_HGLOBAL) == S_OK)
         return S_OK;
-    if (QueryFormat(dataObject, CFSTR_SHELLIDLIST, 0, TYMED_HGLOBAL) == S_OK)
+    if (QueryFormat(dataObject, ShellIdListFormat(), TYMED_HGLOBAL) == S_OK)
         return S_OK;
     // Virtual files are only worth taking when their contents come with them.
-    if (QueryFormat(dataObject, CFSTR_FILEDESCRIPTORW, 0, TYMED_HGLOBAL) == S_OK &&
-        QueryFormat(dataObject, CFSTR_FILECONTENTS, 0, TYMED_ISTREAM) == S_OK)
+    if (QueryFormat(dataObject, FileGroupDescriptorFormat(), TYMED_HGLOBAL) == S_OK &&
+        QueryFormat(dataObject, FileContentsFormat(), TYMED_ISTREAM) == S_OK)
         return S_OK;
     return E_INVALIDARG;
 }
@@ -69,8 +70,13 @@ HRESULT CLVDropTarget::SetItem(PCUIDLIST_RELATIVE fullList) noexcept {
 }
 
 HRESULT CLVDropTarget::QueryInterface(REFIID iid, void** object) {
-    static const QITAB table[] = {QITABENT(CLVDropTarget, IDropTarget), {}};
+    static const QITAB table[] = {
+        QITABENT(CLVDropTarget, IDropTarget), QITABENT(CLVDropTarget, IDroppedSourcesTarget), {}};
     return QISearch(this, table, iid, object);
+}
+
+HRESULT CLVDropTarget::SetReceiver(const DroppedSourcesReceiver& receiver) {
+    return KeepReceiver(receiver_, receiver);
 }
 
 // The caller's drop effect is left as it came, accepted or not.
@@ -85,7 +91,7 @@ HRESULT CLVDropTarget::Drop(IDataObject* dataObject, DWORD, POINTL, DWORD*) {
         if (manager_.GetLastItemKind(item_.get()) == PT_STATION) {
             Station station;
             station.Name = StationNameOf(manager_, item_.get());
-            HandOver(station.Name, sources);
+            HandOver(receiver_, station.Name, sources);
         }
         // Parsed, and nothing sent: this version hands no file to the instrument.
         return S_FALSE;
@@ -104,8 +110,14 @@ HRESULT CLVDropTargetOnListView::SetUp(HWND list, IShellView* view,
 }
 
 HRESULT CLVDropTargetOnListView::QueryInterface(REFIID iid, void** object) {
-    static const QITAB table[] = {QITABENT(CLVDropTargetOnListView, IDropTarget), {}};
+    static const QITAB table[] = {QITABENT(CLVDropTargetOnListView, IDropTarget),
+                                  QITABENT(CLVDropTargetOnListView, IDroppedSourcesTarget),
+                                  {}};
     return QISearch(this, table, iid, object);
+}
+
+HRESULT CLVDropTargetOnListView::SetReceiver(const DroppedSourcesReceiver& receiver) {
+    return KeepReceiver(receiver_, receiver);
 }
 
 HRESULT CLVDropTargetOnListView::DragEnter(IDataObject* dataObject, DWORD, POINTL, DWORD*) {
@@ -160,6 +172,12 @@ HRESULT CLVDropTargetOnListView::Drop(IDataObject* dataObject, DWORD keys, POINT
             RETURN_HR_IF(E_UNEXPECTED, !view_);
             Microsoft::WRL::ComPtr<IDropTarget> station;
             RETURN_IF_FAILED(view_->GetItemObject(SVGIO_SELECTION, IID_PPV_ARGS(&station)));
+            // Whoever receives the list's drops receives the station's drop too.
+            if (receiver_) {
+                Microsoft::WRL::ComPtr<IDroppedSourcesTarget> handedOn;
+                if (SUCCEEDED(station.As(&handedOn)))
+                    RETURN_IF_FAILED(handedOn->SetReceiver(receiver_));
+            }
             return station->Drop(dataObject, keys, point, effect);
         }
         std::shared_ptr<TSourceList> sources;
@@ -168,7 +186,7 @@ HRESULT CLVDropTargetOnListView::Drop(IDataObject* dataObject, DWORD keys, POINT
         station.Name = StationNameOf(manager_, folder_.get());
         // Loaded for the sending that a later version does; nothing is sent yet.
         if (SUCCEEDED(FindStation(station)))
-            HandOver(station.Name, sources);
+            HandOver(receiver_, station.Name, sources);
         return E_INVALIDARG;
     }
     CATCH_RETURN()

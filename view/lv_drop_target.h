@@ -18,16 +18,26 @@
 #include "view/source_parser.h"
 
 // Where a drop's parsed sources go: the station they were dropped on and the list. This version
-// sends nothing, so nothing receives them unless a receiver is set (tests set one). Set and called
-// on the thread of the views.
+// sends nothing, so a target has no receiver unless one is handed to it (tests hand one). Called
+// on the thread that the drop arrives on.
 using DroppedSourcesReceiver =
     std::function<void(const std::wstring& station, const std::shared_ptr<TSourceList>& sources)>;
-void SetDroppedSourcesReceiver(DroppedSourcesReceiver receiver);
+
+// The two targets' own interface, through which a receiver reaches a target known only as an
+// IDropTarget: the list's target hands its receiver on to the station's target that the view
+// gives it for a drop on a station row.
+struct IDroppedSourcesTarget : public IUnknown {
+    // The receiver of what is dropped from now on; an empty one receives nothing.
+    virtual HRESULT STDMETHODCALLTYPE SetReceiver(const DroppedSourcesReceiver& receiver) = 0;
+};
+// {AEAD47F9-B75A-4FF9-ACF4-888934DC8AB6}
+__CRT_UUID_DECL(IDroppedSourcesTarget, 0xAEAD47F9, 0xB75A, 0x4FF9, 0xAC, 0xF4, 0x88, 0x89, 0x34,
+                0xDC, 0x8A, 0xB6)
 
 // S_OK when the source offers files, shell items, or virtual files with their contents.
 HRESULT AcceptDropSource(IDataObject* dataObject) noexcept;
 
-class CLVDropTarget final : public ComObject<IDropTarget> {
+class CLVDropTarget final : public ComObject<IDropTarget, IDroppedSourcesTarget> {
 public:
     CLVDropTarget() noexcept = default;
 
@@ -41,12 +51,16 @@ public:
     IFACEMETHODIMP DragLeave() override { return S_OK; }
     IFACEMETHODIMP Drop(IDataObject* dataObject, DWORD keys, POINTL point, DWORD* effect) override;
 
+    // IDroppedSourcesTarget
+    IFACEMETHODIMP SetReceiver(const DroppedSourcesReceiver& receiver) override;
+
 private:
     CPidlMgr manager_;
     UniquePidl item_;
+    DroppedSourcesReceiver receiver_;
 };
 
-class CLVDropTargetOnListView final : public ComObject<IDropTarget> {
+class CLVDropTargetOnListView final : public ComObject<IDropTarget, IDroppedSourcesTarget> {
 public:
     CLVDropTargetOnListView() noexcept = default;
 
@@ -61,6 +75,9 @@ public:
     IFACEMETHODIMP DragLeave() override { return S_OK; }
     IFACEMETHODIMP Drop(IDataObject* dataObject, DWORD keys, POINTL point, DWORD* effect) override;
 
+    // IDroppedSourcesTarget: the receiver is handed on to a station row's target at its drop.
+    IFACEMETHODIMP SetReceiver(const DroppedSourcesReceiver& receiver) override;
+
 private:
     bool ShowsOneStation() const noexcept;
     // The station row under the point, selected and focused; -1 for no row or the first one.
@@ -70,4 +87,5 @@ private:
     HWND list_ = nullptr;
     Microsoft::WRL::ComPtr<IShellView> view_;
     UniquePidl folder_;
+    DroppedSourcesReceiver receiver_;
 };

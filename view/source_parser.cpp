@@ -4,6 +4,7 @@
 
 #include <shlwapi.h>
 
+#include "support/clipboard_formats.h"
 #include "support/error_handling.h"
 #include "support/unique_resource.h"
 #include "view/portable/drop_blocks.h"
@@ -11,14 +12,15 @@
 namespace {
 
 constexpr wchar_t kSource[] = L"SourceParser";
+// The log's line numbers of three reports, kept as they have always been written: support tools
+// and those who read the log match on them. The parser's other reports give their real line.
+constexpr int kNullDataObjectLine = 57;     // ParseDataObject was handed no data object
+constexpr int kMarshallingFailedLine = 64;  // the data object could not be marshalled
+constexpr int kNullOutPointerLine = 249;    // GetDataObject was handed no out-pointer
 constexpr DWORD kLongPathCapacity = 32768;
 
 FORMATETC HGlobalFormat(CLIPFORMAT format) {
     return FORMATETC{format, nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
-}
-
-CLIPFORMAT RegisteredFormat(const wchar_t* name) {
-    return static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(name));
 }
 
 // Results of several sources: S_OK when any succeeded, else the last failure, else S_OK.
@@ -83,14 +85,15 @@ HRESULT TSourceParser::ParseDataObject(IDataObject* dataObject, const std::wstri
                                        bool deep) {
     cancelled_ = false;
     if (!dataObject) {
-        ReportError(kSource, E_INVALIDARG, L"TSourceParser::ParseDataObject", 57);
+        ReportError(kSource, E_INVALIDARG, L"TSourceParser::ParseDataObject", kNullDataObjectLine);
         return E_INVALIDARG;
     }
     if (!marshalledOnce_) {
         const HRESULT marshalled = ::CoMarshalInterThreadInterfaceInStream(
             IID_IDataObject, dataObject, marshalled_.ReleaseAndGetAddressOf());
         if (FAILED(marshalled)) {
-            ReportError(kSource, marshalled, L"TSourceParser::ParseDataObject", 64);
+            ReportError(kSource, marshalled, L"TSourceParser::ParseDataObject",
+                        kMarshallingFailedLine);
             return marshalled;
         }
         marshalledOnce_ = true;
@@ -110,15 +113,15 @@ HRESULT TSourceParser::ParseDataObject(IDataObject* dataObject, const std::wstri
         return ParseDropFiles(dataObject, dropFiles);
 
     std::wstring root = rootPath;
-    FORMATETC items = HGlobalFormat(RegisteredFormat(CFSTR_SHELLIDLIST));
+    FORMATETC items = HGlobalFormat(ShellIdListFormat());
     const bool offersItems = dataObject->QueryGetData(&items) == S_OK;
     if (root.empty() && offersItems)
         (void)ParseItemArray(dataObject, items, true, root);  // a failure leaves the root empty
 
-    FORMATETC ansiGroup = HGlobalFormat(RegisteredFormat(CFSTR_FILEDESCRIPTORA));
+    FORMATETC ansiGroup = HGlobalFormat(AnsiFileGroupDescriptorFormat());
     if (dataObject->QueryGetData(&ansiGroup) == S_OK)
         return ParseFileGroup(dataObject, ansiGroup, false, root);
-    FORMATETC wideGroup = HGlobalFormat(RegisteredFormat(CFSTR_FILEDESCRIPTORW));
+    FORMATETC wideGroup = HGlobalFormat(FileGroupDescriptorFormat());
     const HRESULT offersWideGroup = dataObject->QueryGetData(&wideGroup);
     if (offersWideGroup == S_OK)
         return ParseFileGroup(dataObject, wideGroup, true, root);
@@ -200,7 +203,7 @@ HRESULT TSourceParser::ParsePIDL(PCIDLIST_ABSOLUTE parent, PCUITEMID_CHILD child
                      : desktop->BindToObject(parent, nullptr, IID_PPV_ARGS(&folder));
     }
     if (FAILED(result)) {
-        ReportError(kSource, result, L"TSourceParser::ParsePIDL", 390);
+        ReportError(kSource, result, L"TSourceParser::ParsePIDL", __LINE__);
         return result;
     }
     UniqueAbsoluteIdList item(::ILCombine(parent, child));
@@ -218,7 +221,7 @@ HRESULT TSourceParser::ParsePIDL(PCIDLIST_ABSOLUTE parent, PCUITEMID_CHILD child
     result = folder->GetUIObjectOf(nullptr, 1, &child, IID_IDataObject, nullptr,
                                    reinterpret_cast<void**>(itemData.GetAddressOf()));
     if (FAILED(result)) {
-        ReportError(kSource, result, L"TSourceParser::ParsePIDL", 412);
+        ReportError(kSource, result, L"TSourceParser::ParsePIDL", __LINE__);
         return result;
     }
     return ParseDataObject(itemData.Get(), DirectoryPart(itemName), false);
@@ -232,7 +235,7 @@ HRESULT TSourceParser::ParsePath(const std::wstring& path, const std::wstring& r
     const DWORD attributes = ::GetFileAttributesW(path.c_str());
     if (attributes == INVALID_FILE_ATTRIBUTES) {
         const HRESULT result = LastErrorResult();
-        ReportError(kSource, result, L"TSourceParser::ParsePath", 330, path.c_str());
+        ReportError(kSource, result, L"TSourceParser::ParsePath", __LINE__, path.c_str());
         return result;
     }
     if (attributes & FILE_ATTRIBUTE_DIRECTORY)
@@ -315,7 +318,7 @@ HRESULT TSourceParser::ParseFolder(const std::wstring& path, const std::wstring&
 
 HRESULT TSourceParser::GetDataObject(IDataObject** dataObject) {
     if (!dataObject) {
-        ReportError(kSource, E_INVALIDARG, L"TSourceParser::GetDataObject", 249);
+        ReportError(kSource, E_INVALIDARG, L"TSourceParser::GetDataObject", kNullOutPointerLine);
         return E_INVALIDARG;
     }
     *dataObject = nullptr;

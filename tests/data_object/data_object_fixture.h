@@ -8,12 +8,15 @@
 #include <gtest/gtest.h>
 
 #include <filesystem>
+#include <memory>
 #include <string>
 #include <vector>
 
+#include "download/station_downloader.h"
 #include "namespace/pidl_manager.h"
 #include "stations/station_list_block.h"
 #include "stations/station_store.h"
+#include "support/clipboard_formats.h"
 #include "support/module_lock.h"
 #include "support/registered_messages.h"
 #include "support/unique_resource.h"
@@ -22,7 +25,6 @@
 #include "tests/support/registry_override.h"
 #include "view/lv_data_object.h"
 
-constexpr wchar_t kStationList[] = L"Quorvel Total Stations";  // the clipboard format's name
 constexpr wchar_t kNorthFile[] = L"Quorvel Digital Level\\North\\file1.lv";
 
 // Answers every modal dialog at once without showing it, and counts the runs; message boxes
@@ -45,12 +47,8 @@ private:
     INT_PTR answer_;
 };
 
-inline CLIPFORMAT Format(const wchar_t* name) {
-    return static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(name));
-}
-
 inline FORMATETC Request(const wchar_t* name, DWORD tymed, LONG index = -1) {
-    return {Format(name), nullptr, DVASPECT_CONTENT, index, tymed};
+    return {RegisteredClipboardFormat(name), nullptr, DVASPECT_CONTENT, index, tymed};
 }
 
 inline bool FileExists(const std::wstring& path) {
@@ -83,9 +81,13 @@ protected:
         EXPECT_EQ(0, ModuleLockCount()) << "a reference was leaked";
     }
 
-    // A data object over items given by their paths inside the namespace.
-    Microsoft::WRL::ComPtr<IDataObject> Over(std::initializer_list<const wchar_t*> paths) {
-        auto object = MakeComObject<CLVDataObject>();
+    // A data object over items given by their paths inside the namespace; its downloads run the
+    // progress dialogs unless a downloader is given.
+    Microsoft::WRL::ComPtr<IDataObject> Over(
+        std::initializer_list<const wchar_t*> paths,
+        std::shared_ptr<StationDownloader> downloader = nullptr) {
+        auto object = downloader ? MakeComObject<CLVDataObject>(std::move(downloader))
+                                 : MakeComObject<CLVDataObject>();
         for (const wchar_t* path : paths) {
             UniquePidl list(manager_.CreatePidlFromPath(path));
             EXPECT_EQ(S_OK, object->SetItem(reinterpret_cast<PCUIDLIST_RELATIVE>(list.get())));
@@ -109,7 +111,7 @@ protected:
     static std::vector<Station> StationsIn(IDataObject* data) {
         UniqueStgMedium medium;
         std::vector<Station> stations;
-        EXPECT_EQ(S_OK, Get(data, kStationList, TYMED_HGLOBAL, medium));
+        EXPECT_EQ(S_OK, Get(data, kStationListFormatName, TYMED_HGLOBAL, medium));
         EXPECT_EQ(S_OK, ParseStationList(medium.get().hGlobal, stations));
         return stations;
     }

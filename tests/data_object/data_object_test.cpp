@@ -15,8 +15,8 @@ using Microsoft::WRL::ComPtr;
 
 TEST_F(DataObject, QueryGetDataAnswersEachFormatOnlyWithItsTymed) {
     ComPtr<IDataObject> data = Over({kNorthFile});
-    for (const wchar_t* name :
-         {CFSTR_FILEDESCRIPTORW, CFSTR_SHELLIDLIST, kStationList, CFSTR_PREFERREDDROPEFFECT}) {
+    for (const wchar_t* name : {CFSTR_FILEDESCRIPTORW, CFSTR_SHELLIDLIST, kStationListFormatName,
+                                CFSTR_PREFERREDDROPEFFECT}) {
         FORMATETC format = Request(name, TYMED_HGLOBAL);
         EXPECT_EQ(S_OK, data->QueryGetData(&format)) << name;
         format.tymed = TYMED_HGLOBAL | TYMED_ISTREAM;
@@ -41,9 +41,9 @@ TEST_F(DataObject, EnumerationListsFourFormatsButNotTheDropEffectWhichIsAlwaysCo
     ASSERT_EQ(S_OK, formats->Next(10, entries, &fetched));
     ASSERT_EQ(4u, fetched);
     const wchar_t* names[] = {CFSTR_FILECONTENTS, CFSTR_FILEDESCRIPTORW, CFSTR_SHELLIDLIST,
-                              kStationList};
+                              kStationListFormatName};
     for (ULONG i = 0; i < 4; ++i) {
-        EXPECT_EQ(Format(names[i]), entries[i].cfFormat) << i;
+        EXPECT_EQ(RegisteredClipboardFormat(names[i]), entries[i].cfFormat) << i;
         EXPECT_EQ(-1, entries[i].lindex);
         EXPECT_EQ(static_cast<DWORD>(i == 0 ? TYMED_ISTREAM : TYMED_HGLOBAL), entries[i].tymed);
     }
@@ -58,9 +58,9 @@ TEST_F(DataObject, EnumerationListsFourFormatsButNotTheDropEffectWhichIsAlwaysCo
     ComPtr<IEnumFORMATETC> clone;
     ASSERT_EQ(S_OK, formats->Clone(&clone));
     ASSERT_EQ(S_OK, clone->Next(1, entries, nullptr));
-    EXPECT_EQ(Format(CFSTR_SHELLIDLIST), entries[0].cfFormat);
+    EXPECT_EQ(ShellIdListFormat(), entries[0].cfFormat);
     ASSERT_EQ(S_OK, formats->Next(1, entries, nullptr));
-    EXPECT_EQ(Format(CFSTR_SHELLIDLIST), entries[0].cfFormat);
+    EXPECT_EQ(ShellIdListFormat(), entries[0].cfFormat);
 
     UniqueStgMedium medium;
     ASSERT_EQ(S_OK, Get(data.Get(), CFSTR_PREFERREDDROPEFFECT, TYMED_HGLOBAL, medium));

@@ -15,16 +15,13 @@
 #include <string>
 #include <vector>
 
+#include "support/clipboard_formats.h"
 #include "support/com_object.h"
 #include "support/unique_resource.h"
 #include "view/source_parser.h"
 
 using Microsoft::WRL::ComPtr;
 using Bytes = std::vector<uint8_t>;
-
-inline CLIPFORMAT Format(const wchar_t* name) {
-    return static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(name));
-}
 
 // Descriptors print as their text in failure messages.
 inline void PrintTo(const TSourceDescriptor& source, std::ostream* out) {
@@ -67,7 +64,7 @@ public:
     }
     IFACEMETHODIMP GetDataHere(FORMATETC*, STGMEDIUM*) override { return E_NOTIMPL; }
     IFACEMETHODIMP QueryGetData(FORMATETC* format) override {
-        if (contents && format->cfFormat == Format(CFSTR_FILECONTENTS))
+        if (contents && format->cfFormat == FileContentsFormat())
             return (format->tymed & TYMED_ISTREAM) ? S_OK : DV_E_TYMED;
         return blocks.count(format->cfFormat) && (format->tymed & TYMED_HGLOBAL) ? S_OK
                                                                                  : DV_E_FORMATETC;

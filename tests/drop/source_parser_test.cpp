@@ -107,8 +107,9 @@ TEST_F(SourceParserTest, AVeryDeepFolderIsWalkedDownToTheDepthLimitOnly) {
 TEST_F(SourceParserTest, FileGroupsSkipDirectoriesAndKeepTheIndexes) {
     for (bool wide : {true, false}) {
         auto data = MakeComObject<BlockDataObject>();
-        data->blocks[Format(wide ? CFSTR_FILEDESCRIPTORW : CFSTR_FILEDESCRIPTORA)] = FileGroupBlock(
-            {{L"one.lv", 0}, {L"folder", FILE_ATTRIBUTE_DIRECTORY}, {L"two.lv", 0}}, wide);
+        data->blocks[wide ? FileGroupDescriptorFormat() : AnsiFileGroupDescriptorFormat()] =
+            FileGroupBlock({{L"one.lv", 0}, {L"folder", FILE_ATTRIBUTE_DIRECTORY}, {L"two.lv", 0}},
+                           wide);
         EXPECT_EQ((std::vector<TSourceDescriptor>{{L"", L"one.lv", 0}, {L"", L"two.lv", 2}}),
                   Parse(data.Get()))
             << wide;
@@ -123,9 +124,9 @@ TEST_F(SourceParserTest, DropSourcesAreAcceptedByTheirFormats) {
         HRESULT expected;
     } cases[] = {
         {"files", {CF_HDROP}, false, S_OK},
-        {"shell items", {Format(CFSTR_SHELLIDLIST)}, false, S_OK},
-        {"virtual files with contents", {Format(CFSTR_FILEDESCRIPTORW)}, true, S_OK},
-        {"virtual files without contents", {Format(CFSTR_FILEDESCRIPTORW)}, false, E_INVALIDARG},
+        {"shell items", {ShellIdListFormat()}, false, S_OK},
+        {"virtual files with contents", {FileGroupDescriptorFormat()}, true, S_OK},
+        {"virtual files without contents", {FileGroupDescriptorFormat()}, false, E_INVALIDARG},
         {"text", {CF_UNICODETEXT}, false, E_INVALIDARG},
     };
     for (const auto& c : cases) {
@@ -145,7 +146,7 @@ TEST_F(SourceParserTest, ShellItemsUnderARealFolderAreParsedAsTheirFiles) {
     ASSERT_EQ(S_OK, ::SHParseDisplayName(first.c_str(), nullptr, &one, 0, nullptr));
     ASSERT_EQ(S_OK, ::SHParseDisplayName(second.c_str(), nullptr, &two, 0, nullptr));
     auto data = MakeComObject<BlockDataObject>();
-    data->blocks[Format(CFSTR_SHELLIDLIST)] =
+    data->blocks[ShellIdListFormat()] =
         IdListArrayBlock(folder, {::ILFindLastID(one), ::ILFindLastID(two)});
     ::ILFree(folder);
     ::ILFree(one);
@@ -210,7 +211,7 @@ TEST_F(SourceParserTest, BlocksThatLieAreReadOnlyWithinThemselves) {
     } cases[] = {
         {"file list offset past the block", CF_HDROP, pastTheEnd, 0},
         {"file list without terminators", CF_HDROP, unterminated, 0},
-        {"file group announcing too many records", Format(CFSTR_FILEDESCRIPTORW), group, 1},
+        {"file group announcing too many records", FileGroupDescriptorFormat(), group, 1},
     };
     for (const auto& c : cases) {
         auto data = MakeComObject<BlockDataObject>();

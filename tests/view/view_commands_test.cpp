@@ -4,6 +4,7 @@
 
 #include "stations/portable/station_list_format.h"
 #include "stations/station_list_block.h"
+#include "support/clipboard_formats.h"
 
 #include <cstring>
 
@@ -18,7 +19,7 @@ void PutBlockOnClipboard(const std::vector<uint8_t>& block) {
         GlobalLockGuard lock(memory.get());
         std::memcpy(lock.data(), block.data(), block.size());
     }
-    if (::SetClipboardData(::RegisterClipboardFormatW(L"Quorvel Total Stations"), memory.get()))
+    if (::SetClipboardData(StationListFormat(), memory.get()))
         (void)memory.release();  // the clipboard's now
     ::CloseClipboard();
 }

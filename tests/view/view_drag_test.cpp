@@ -3,6 +3,8 @@
 // QueryContinueDrag sees no button held and drops at once.
 #include "tests/view/view_fixture.h"
 
+#include "support/clipboard_formats.h"
+
 namespace {
 
 class RecordingDropTarget final : public ComObjectImpl<false, IDropTarget> {
@@ -22,8 +24,7 @@ public:
     IFACEMETHODIMP DragLeave() override { return S_OK; }
     // Reads only the file's name: asking for its contents would start a download.
     IFACEMETHODIMP Drop(IDataObject* data, DWORD, POINTL, DWORD* effect) override {
-        FORMATETC format{static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(CFSTR_FILEDESCRIPTORW)),
-                         nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
+        FORMATETC format{FileGroupDescriptorFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
         STGMEDIUM medium{};
         if (SUCCEEDED(data->GetData(&format, &medium))) {
             GlobalLockGuard lock(medium.hGlobal);

@@ -11,25 +11,18 @@ namespace {
 
 class ViewDropTest : public ShellViewTest {
 protected:
-    void SetUp() override {
-        ShellViewTest::SetUp();
-        SetDroppedSourcesReceiver([this](const std::wstring& station,
-                                         const std::shared_ptr<TSourceList>& sources) {
-            received_.push_back({station, *sources});
-        });
-    }
-    void TearDown() override {
-        SetDroppedSourcesReceiver(nullptr);
-        ShellViewTest::TearDown();
-    }
-
-    // The target the view registers on its list, made the same way for the folder it shows.
+    // The target the view registers on its list, made the same way for the folder it shows, and
+    // handed a receiver that records what is dropped.
     ComPtr<CLVDropTargetOnListView> ListTarget(CExplorerWindow& browser,
                                                const std::wstring& folderPath) {
         auto target = MakeComObject<CLVDropTargetOnListView>();
         UniquePidl folder(manager_.CreatePidlFromPath(folderPath.c_str()));
         EXPECT_EQ(S_OK, target->SetUp(List(browser), browser.View(),
                                       reinterpret_cast<PCUIDLIST_RELATIVE>(folder.get())));
+        EXPECT_EQ(S_OK, target->SetReceiver([this](const std::wstring& station,
+                                                   const std::shared_ptr<TSourceList>& sources) {
+            received_.push_back({station, *sources});
+        }));
         return target;
     }
 
@@ -135,7 +128,7 @@ TEST_F(ViewDropTest, AStationsFileDraggedAsAShellItemIsParsedThroughItsOwnDataOb
     ASSERT_EQ(S_OK, items->Next(1, reinterpret_cast<PITEMID_CHILD*>(file.put()), nullptr));
 
     auto data = MakeComObject<BlockDataObject>();
-    data->blocks[Format(CFSTR_SHELLIDLIST)] =
+    data->blocks[ShellIdListFormat()] =
         IdListArrayBlock(station.get(), {reinterpret_cast<PCUITEMID_CHILD>(file.get())});
     TSourceParser parser(true);
     EXPECT_EQ(S_OK, parser.ParseDataObject(data.Get(), L"", true));
@@ -166,6 +159,11 @@ TEST_F(ViewDropTest, TwoFilesDraggedFromAnotherThreadReachTheStationUnderTheCurs
     const std::wstring first = scratch_.File(L"a.lv");
     const std::wstring second = scratch_.File(L"b.lv");
     CExplorerWindow& browser = Open(L"", Details());
+    // The view registered a target on its list; one made the same way, with a receiver that
+    // records, takes its place for the drag.
+    ASSERT_EQ(S_OK, ::RevokeDragDrop(List(browser)));
+    ASSERT_EQ(S_OK, ::RegisterDragDrop(List(browser),
+                                       ListTarget(browser, L"Quorvel Digital Level").Get()));
     const POINTL south = RowPoint(browser, 2);
     ASSERT_TRUE(::SetCursorPos(south.x, south.y));
     browser.PumpMessages(50);

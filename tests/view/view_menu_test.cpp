@@ -2,6 +2,7 @@
 // file dialog and in a browser without menus; and the folder's background menu object.
 #include "tests/view/view_fixture.h"
 
+#include "support/clipboard_formats.h"
 #include "view/lv_context_menu.h"
 
 namespace {
@@ -132,7 +133,7 @@ TEST_F(ShellViewTest, ABrowserWithoutMenusLeavesAWorkingView) {
     EXPECT_EQ((std::vector<std::wstring>{kEntry, L"North"}), Texts(browser));
     Select(browser, {1});
     EXPECT_EQ(S_OK, Command(browser, 1281));
-    EXPECT_TRUE(::IsClipboardFormatAvailable(::RegisterClipboardFormatW(L"Quorvel Total Stations")));
+    EXPECT_TRUE(::IsClipboardFormatAvailable(StationListFormat()));
     EXPECT_EQ(S_OK, Command(browser, 1288));
     EXPECT_TRUE(ListStationNames().empty());
 }

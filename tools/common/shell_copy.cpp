@@ -7,6 +7,7 @@
 #include <chrono>
 #include <vector>
 
+#include "support/clipboard_formats.h"
 #include "support/unique_resource.h"
 #include "tools/common/portable/output_name.h"
 
@@ -23,10 +24,6 @@ StationFileCopy Failed(const std::wstring& what, HRESULT code) {
     copy.failure = what;
     copy.code = code;
     return copy;
-}
-
-CLIPFORMAT Format(const wchar_t* name) {
-    return static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(name));
 }
 
 }  // namespace
@@ -131,7 +128,7 @@ StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring&
     const ComPtr<IDataObject> data = std::move(object.data);
     HRESULT result = S_OK;
 
-    FORMATETC descriptorFormat = {Format(CFSTR_FILEDESCRIPTORW), nullptr, DVASPECT_CONTENT, -1,
+    FORMATETC descriptorFormat = {FileGroupDescriptorFormat(), nullptr, DVASPECT_CONTENT, -1,
                                   TYMED_HGLOBAL};
     UniqueStgMedium descriptor;
     result = data->GetData(&descriptorFormat, descriptor.put());
@@ -161,8 +158,7 @@ StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring&
     }
 
     const auto start = std::chrono::steady_clock::now();
-    FORMATETC contentsFormat = {Format(CFSTR_FILECONTENTS), nullptr, DVASPECT_CONTENT, 0,
-                                TYMED_ISTREAM};
+    FORMATETC contentsFormat = {FileContentsFormat(), nullptr, DVASPECT_CONTENT, 0, TYMED_ISTREAM};
     UniqueStgMedium contents;
     result = data->GetData(&contentsFormat, contents.put());
     if (result == S_FALSE) {

@@ -12,6 +12,7 @@
 #include <string>
 #include <vector>
 
+#include "support/clipboard_formats.h"
 #include "support/unique_resource.h"
 #include "tools/common/console_output.h"
 #include "tools/common/shell_copy.h"
@@ -53,10 +54,6 @@ constexpr ULONGLONG kAllTheRest = ~0ULL;  // CopyTo's count for "up to the end"
 constexpr int kExitWritten = 0;
 constexpr int kExitCancelled = 1;
 constexpr int kExitFailed = 2;
-
-CLIPFORMAT Format(const wchar_t* name) {
-    return static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(name));
-}
 
 std::wstring Hex(HRESULT code) {
     wchar_t text[16];
@@ -175,8 +172,7 @@ private:
 
     // Every offset and every item-ID list must lie inside the block that GlobalSize measures.
     bool ReadIdListArrayStrictlyStep() {
-        FORMATETC format = {Format(CFSTR_SHELLIDLIST), nullptr, DVASPECT_CONTENT, -1,
-                            TYMED_HGLOBAL};
+        FORMATETC format = {ShellIdListFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
         UniqueStgMedium medium;
         const HRESULT result = data_->GetData(&format, medium.put());
         if (result != S_OK || !medium.global())
@@ -263,7 +259,7 @@ private:
     // The block must hold every record that cItems announces; the file is the first record with
     // a usable name, and its position is the lindex of its contents.
     bool ReadFileGroupDescriptor() {
-        FORMATETC format = {Format(CFSTR_FILEDESCRIPTORW), nullptr, DVASPECT_CONTENT, -1,
+        FORMATETC format = {FileGroupDescriptorFormat(), nullptr, DVASPECT_CONTENT, -1,
                             TYMED_HGLOBAL};
         UniqueStgMedium medium;
         const HRESULT result = data_->GetData(&format, medium.put());
@@ -303,7 +299,7 @@ private:
 
     // Asks as Explorer does, for any of the three media; only a stream is taken.
     int GetFileContents() {
-        FORMATETC format = {Format(CFSTR_FILECONTENTS), nullptr, DVASPECT_CONTENT, fileIndex_,
+        FORMATETC format = {FileContentsFormat(), nullptr, DVASPECT_CONTENT, fileIndex_,
                             TYMED_HGLOBAL | TYMED_ISTREAM | TYMED_ISTORAGE};
         const HRESULT result = data_->GetData(&format, contents_.put());
         if (result == S_FALSE) {
@@ -525,7 +521,8 @@ private:
             }
             *static_cast<DWORD*>(lock.data()) = DROPEFFECT_COPY;
         }
-        FORMATETC format = {Format(formatName), nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
+        FORMATETC format = {RegisteredClipboardFormat(formatName), nullptr, DVASPECT_CONTENT, -1,
+                            TYMED_HGLOBAL};
         STGMEDIUM medium{};
         medium.tymed = TYMED_HGLOBAL;
         medium.hGlobal = block.get();

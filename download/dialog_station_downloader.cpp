@@ -1,0 +1,41 @@
+// The progress dialogs behind the data object's download: which one runs, and what its end means.
+#include "download/dialog_station_downloader.h"
+
+#include "download/download_progress_dialog.h"
+#include "download/halvek_download_progress_dialog.h"
+#include "stations/station_models.h"
+
+HRESULT DialogStationDownloader::Download(HWND owner, const Station& station,
+                                          const std::wstring& target, std::wstring& file) {
+    const bool external = IsExternalLibraryModel(station.Model);
+    // The library writes its file under the given name with ".txt" added.
+    file = external ? target + L".txt" : target;
+    INT_PTR answer = -1;
+    bool completed = false;
+    HRESULT downloadResult = S_OK;
+    const auto run = [&](CProgressDialogBase&& dialog) {
+        answer = dialog.DoModal();
+        completed = dialog.TransferCompleted();
+        downloadResult = dialog.DownloadResult();
+    };
+    if (external)
+        run(CHalvekDownloadProgressDialog(owner, station, target));
+    else
+        run(CDownloadProgressDialog(owner, station, target));
+    // The dialogs are gone, and with them the download thread: nothing writes the file now.
+    // Only a transfer that reported its end makes a file; an IDOK from anywhere else, a cancel
+    // or a dialog that could not run leaves at most a partial file.
+    if (answer == IDOK && completed)
+        return S_OK;
+    if (answer == -1)
+        return E_FAIL;
+    // A download the system refused (a full disk) fails with its reason, so that the copy is
+    // reported as a failure rather than a cancel; the user has seen the reason.
+    if (FAILED(downloadResult))
+        return downloadResult;
+    return S_FALSE;
+}
+
+std::shared_ptr<StationDownloader> MakeDialogStationDownloader() {
+    return std::make_shared<DialogStationDownloader>();
+}

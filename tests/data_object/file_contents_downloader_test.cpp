@@ -1,0 +1,125 @@
+// "FileContents" over a scripted downloader: what the data object makes of each way a download
+// ends, with no dialog run and no instrument.
+#include <windows.h>
+#include <shlobj.h>
+
+#include <gtest/gtest.h>
+
+#include <memory>
+#include <optional>
+#include <string>
+
+#include "download/station_downloader.h"
+#include "tests/data_object/data_object_fixture.h"
+
+using Microsoft::WRL::ComPtr;
+
+namespace {
+
+constexpr char kContent[] = "A,01,Z\r\n1,0.000,12.5,!,\r\n";
+
+// Answers a download with a set result after writing the given bytes, if any, to the file it
+// names; records what it was asked.
+class ScriptedDownloader final : public StationDownloader {
+public:
+    ScriptedDownloader(HRESULT result, std::optional<std::string> written)
+        : result_(result), written_(std::move(written)) {}
+
+    HRESULT Download(HWND, const Station& station, const std::wstring& target,
+                     std::wstring& file) override {
+        ++runs;
+        stationName = station.Name;
+        file = target + L".part";
+        writtenPath = file;
+        if (written_) {
+            UniqueFileHandle out(
+                ::CreateFileW(file.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS, 0, nullptr));
+            DWORD count = 0;
+            EXPECT_TRUE(::WriteFile(out.get(), written_->data(),
+                                    static_cast<DWORD>(written_->size()), &count, nullptr));
+        }
+        return result_;
+    }
+
+    int runs = 0;
+    std::wstring stationName;
+    std::wstring writtenPath;
+
+private:
+    const HRESULT result_;
+    const std::optional<std::string> written_;
+};
+
+std::string ReadToEnd(IStream* stream) {
+    std::string content;
+    char buffer[7];
+    ULONG got = 0;
+    do {
+        EXPECT_EQ(S_OK, stream->Read(buffer, sizeof buffer, &got));
+        content.append(buffer, got);
+    } while (got == sizeof buffer);
+    return content;
+}
+
+class FileContentsDownloader : public DataObject {};
+
+TEST_F(FileContentsDownloader, OnlyAReportedCompleteFileBecomesAStreamAndNothingIsLeftBehind) {
+    const std::string partial = "A,01,Z\r\n1,0.0";
+    struct Case {
+        const char* what;
+        HRESULT download;                    // what the downloader answers
+        std::optional<std::string> written;  // what it left in the file
+        HRESULT expected;                    // what GetData answers
+    } const cases[] = {
+        {"complete", S_OK, kContent, S_OK},
+        {"cancelled half way", S_FALSE, partial, S_FALSE},
+        {"cancelled before any data", S_FALSE, std::nullopt, S_FALSE},
+        {"refused by a full disk", HRESULT_FROM_WIN32(ERROR_DISK_FULL), partial,
+         HRESULT_FROM_WIN32(ERROR_DISK_FULL)},
+        {"found incomplete after the transfer", HRESULT_FROM_WIN32(ERROR_INVALID_DATA),
+         std::string(), HRESULT_FROM_WIN32(ERROR_INVALID_DATA)},
+        {"unable to run", E_FAIL, std::nullopt, E_FAIL},
+        // A success with no file behind it is no download: nothing to open, no stream.
+        {"complete without a file", S_OK, std::nullopt, HRESULT_FROM_WIN32(ERROR_FILE_NOT_FOUND)},
+    };
+    const std::vector<std::wstring> before = TemporaryDownloads();
+    for (const Case& test : cases) {
+        SCOPED_TRACE(test.what);
+        ScriptedDialogs dialogs(IDOK);
+        ScopedUserInterface scope(dialogs);
+        auto downloader = std::make_shared<ScriptedDownloader>(test.download, test.written);
+        UniqueStgMedium medium;
+        EXPECT_EQ(test.expected, Get(Over({kNorthFile}, downloader).Get(), CFSTR_FILECONTENTS,
+                                     TYMED_ISTREAM, medium, 0));
+        EXPECT_EQ(1, downloader->runs);
+        EXPECT_EQ(L"North", downloader->stationName);
+        EXPECT_EQ(0, dialogs.runs);
+        EXPECT_TRUE(dialogs.messages.empty());
+        if (test.expected == S_OK) {
+            ASSERT_EQ(static_cast<DWORD>(TYMED_ISTREAM), medium.get().tymed);
+            EXPECT_EQ(kContent, ReadToEnd(medium.get().pstm));
+        } else {
+            EXPECT_EQ(static_cast<DWORD>(TYMED_NULL), medium.get().tymed);
+            EXPECT_FALSE(FileExists(downloader->writtenPath)) << "a partial file must go";
+        }
+        medium.reset();
+        EXPECT_FALSE(FileExists(downloader->writtenPath));
+    }
+    EXPECT_EQ(before, TemporaryDownloads());
+}
+
+// Asking twice downloads twice, each time into a fresh name.
+TEST_F(FileContentsDownloader, EachRequestRunsItsOwnDownloadUnderAFreshName) {
+    ScriptedDialogs dialogs(IDOK);
+    ScopedUserInterface scope(dialogs);
+    auto downloader = std::make_shared<ScriptedDownloader>(S_FALSE, std::nullopt);
+    ComPtr<IDataObject> data = Over({kNorthFile}, downloader);
+    UniqueStgMedium medium;
+    EXPECT_EQ(S_FALSE, Get(data.Get(), CFSTR_FILECONTENTS, TYMED_ISTREAM, medium, 0));
+    const std::wstring first = downloader->writtenPath;
+    EXPECT_EQ(S_FALSE, Get(data.Get(), CFSTR_FILECONTENTS, TYMED_ISTREAM, medium, 0));
+    EXPECT_EQ(2, downloader->runs);
+    EXPECT_NE(first, downloader->writtenPath);
+}
+
+}  // namespace
