@@ -1,4 +1,4 @@
-// The clipboard formats the folder offers, reads and is told about, in one place.
+// The clipboard formats the folder offers and reads, in one place.
 //
 // Each is registered by its name on every use and never kept: the system hands back the same
 // number for the same name, in every process, for as long as the session lasts.
