@@ -92,11 +92,10 @@ public:
 private:
     // A data object also learns where the folder is, to name the items' parent to the shell.
     HRESULT CreateDataObject(PCUITEMID_CHILD item, REFIID iid, void** object) {
-        UniquePidl fullList;
+        UniqueRelativePidl fullList;
         RETURN_IF_FAILED(CreateFullList(item, fullList));
         auto dataObject = MakeComObject<DataObject>();
-        RETURN_IF_FAILED(
-            dataObject->SetItem(reinterpret_cast<PCUIDLIST_RELATIVE>(fullList.get())));
+        RETURN_IF_FAILED(dataObject->SetItem(fullList.get()));
         RETURN_IF_FAILED(dataObject->SetFolderLocation(this->Location()));
         return dataObject->QueryInterface(iid, object);
     }
@@ -104,10 +103,10 @@ private:
     // The object keeps its own copy of the item's full list; ours is freed on return.
     template <typename ItemObject>
     HRESULT CreateItemObject(PCUITEMID_CHILD item, REFIID iid, void** object) {
-        UniquePidl fullList;
+        UniqueRelativePidl fullList;
         RETURN_IF_FAILED(CreateFullList(item, fullList));
         auto itemObject = MakeComObject<ItemObject>();
-        RETURN_IF_FAILED(itemObject->SetItem(reinterpret_cast<PCUIDLIST_RELATIVE>(fullList.get())));
+        RETURN_IF_FAILED(itemObject->SetItem(fullList.get()));
         return itemObject->QueryInterface(iid, object);
     }
 };
