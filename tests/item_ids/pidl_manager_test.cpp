@@ -1,6 +1,8 @@
-// CPidlMgr through its slots and list operations. The item bytes, paths (cut ones included) and
-// comparison scaling themselves are proved natively by the portable item-layout tests;
-// comparison through CompareIDs and the refusal of malformed lists by the shell folder tests.
+// CPidlMgr: creation from paths, kind tests, copies and joins, the parsing prefix and validity.
+// The item bytes, paths (cut ones included) and comparison scaling themselves are proved natively
+// by the portable item-layout tests; comparison through CompareIDs and the refusal of malformed
+// lists by the shell folder tests; counting and copying from an index through ParseDisplayName,
+// and a list's last item and parent through the data object's "Shell IDList Array".
 #include <windows.h>
 #include <shlobj.h>
 
@@ -19,12 +21,6 @@ class PidlManager : public ::testing::Test {
 protected:
     UniqueRelativePidl Path(const wchar_t* path) {
         return UniqueRelativePidl(manager_.CreatePidlFromPath(path));
-    }
-
-    std::wstring PathText(PCUIDLIST_RELATIVE list) {
-        wchar_t text[260] = {};
-        manager_.GetPath(list, text, 260);
-        return text;
     }
 
     std::vector<DWORD> KindsOf(PCUIDLIST_RELATIVE list) {
@@ -79,33 +75,6 @@ TEST_F(PidlManager, CreationFromPathsAndKindTestsOfTheLastItem) {
     EXPECT_TRUE(manager_.IsRoot(root.get()));
     EXPECT_TRUE(manager_.IsFolder(root.get()));
     EXPECT_FALSE(manager_.IsFile(PCUIDLIST_RELATIVE{}));
-}
-
-TEST_F(PidlManager, ListOperations) {
-    UniqueRelativePidl full = Path(L"Quorvel Digital Level\\S1\\file1.lv");
-    EXPECT_EQ(3u, manager_.GetItemCount(full.get()));
-    EXPECT_EQ(L"file1.lv", manager_.GetItemName(manager_.GetLastItem(full.get())));
-
-    UniqueRelativePidl parent(manager_.CopyParent(full.get()));
-    EXPECT_EQ(L"Quorvel Digital Level\\S1", PathText(parent.get()));
-    UniqueRelativePidl single(manager_.CopyItem(full.get()));
-    EXPECT_EQ(1u, manager_.GetItemCount(single.get()));
-    EXPECT_FALSE(UniqueRelativePidl(manager_.CopyParent(single.get())));
-
-    UniqueRelativePidl tail(manager_.CopyFromIndex(full.get(), 1));
-    EXPECT_EQ(L"S1\\file1.lv", PathText(tail.get()));
-    EXPECT_FALSE(UniqueRelativePidl(manager_.CopyFromIndex(full.get(), 3)));
-
-    UniqueRelativePidl joined(manager_.ConcatPidls(parent.get(), nullptr));
-    EXPECT_EQ(manager_.GetSize(parent.get()), manager_.GetSize(joined.get()));
-    EXPECT_FALSE(UniqueRelativePidl(manager_.ConcatPidls(nullptr, nullptr)));
-    EXPECT_EQ(nullptr, manager_.GetLastItem(PCUIDLIST_RELATIVE{}));
-    EXPECT_EQ(0u, manager_.GetSize(PCUIDLIST_RELATIVE{}));
-    EXPECT_EQ(0, manager_.ComparePidls(1, nullptr, full.get()));
-
-    const USHORT empty = 0;
-    EXPECT_EQ(2u, manager_.GetSize(reinterpret_cast<PCUIDLIST_RELATIVE>(&empty)));
-    EXPECT_EQ(nullptr, manager_.GetLastItem(reinterpret_cast<PCUIDLIST_RELATIVE>(&empty)));
 }
 
 TEST_F(PidlManager, ParsingPrefixIsCopiedWithoutTerminatorWhenCut) {
