@@ -8,8 +8,8 @@
 
 CEnumIDListImpl::~CEnumIDListImpl() = default;
 
-bool CEnumIDListImpl::AddToEnumList(LPITEMIDLIST item) noexcept {
-    UniquePidl owned(item);
+bool CEnumIDListImpl::AddToEnumList(PITEMID_CHILD item) noexcept {
+    UniqueChildPidl owned(item);
     if (!owned)
         return false;
     try {
@@ -34,10 +34,10 @@ HRESULT CEnumIDListImpl::Next(ULONG count, PITEMID_CHILD* items, ULONG* fetched)
     if (count > 0 && !items)
         return E_INVALIDARG;
     // Nothing is handed out half: the copies stay owned here until all of them are made.
-    std::vector<UniquePidl> copies;
+    std::vector<UniqueChildPidl> copies;
     try {
         for (size_t next = position_; copies.size() < count && next < items_.size(); ++next) {
-            copies.emplace_back(manager_.CopyPidl(items_[next].get()));
+            copies.emplace_back(manager_.CopyItem(items_[next].get()));
             if (!copies.back())
                 return E_OUTOFMEMORY;
         }
@@ -46,7 +46,7 @@ HRESULT CEnumIDListImpl::Next(ULONG count, PITEMID_CHILD* items, ULONG* fetched)
     }
     const ULONG copied = static_cast<ULONG>(copies.size());
     for (ULONG index = 0; index < copied; ++index)
-        items[index] = reinterpret_cast<PITEMID_CHILD>(copies[index].release());
+        items[index] = copies[index].release();
     position_ += copied;
     if (fetched)
         *fetched = copied;

@@ -24,12 +24,12 @@ protected:
     virtual ~CEnumIDListImpl();
 
     // Takes the item over. False (the item freed) when there is no memory for it.
-    [[nodiscard]] bool AddToEnumList(LPITEMIDLIST item) noexcept;
+    [[nodiscard]] bool AddToEnumList(PITEMID_CHILD item) noexcept;
     void DeleteList() noexcept;
 
     CPidlMgr manager_;  // the enumerator's own, gone with it
 
 private:
-    std::vector<UniquePidl> items_;
+    std::vector<UniqueChildPidl> items_;
     size_t position_ = 0;
 };

@@ -43,7 +43,7 @@ HRESULT CLVEnumIDList::Fill(const wchar_t* folderPath, SHCONTF flags) noexcept {
                                               ? StationFileName(station.Model)
                                               : StationFileName(std::wstring());
             const std::vector<uint8_t> name = ItemNameBytes(fileName);
-            LPITEMIDLIST item =
+            PITEMID_CHILD item =
                 manager_.CreateItem(PT_FILE, name.data(), static_cast<UINT>(name.size()));
             // An item that cannot be made is left out; only a node that cannot be added fails.
             if (item && !AddToEnumList(item))
@@ -59,7 +59,7 @@ HRESULT CLVEnumIDList::AddStations(const std::wstring& rootName) noexcept {
         // A store that cannot be read lists no station, silently.
         for (const std::wstring& name : ListStationNames()) {
             const std::wstring itemPath = rootName + L"\\" + name;
-            LPITEMIDLIST item = manager_.CreateItemPidl(itemPath.c_str());
+            PITEMID_CHILD item = manager_.CreateItemPidl(itemPath.c_str());
             if (item && !AddToEnumList(item))
                 return E_OUTOFMEMORY;
         }

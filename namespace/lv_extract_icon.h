@@ -30,6 +30,6 @@ public:
     IFACEMETHODIMP Extract(PCWSTR file, UINT index, HICON* large, HICON* small, UINT size) override;
 
 private:
-    UniquePidl fullList_;
+    UniqueRelativePidl fullList_;
     CPidlMgr manager_;
 };

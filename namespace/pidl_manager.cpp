@@ -8,75 +8,89 @@
 
 namespace {
 
-const uint8_t* Bytes(LPCITEMIDLIST list) noexcept {
+const uint8_t* Bytes(PCUIDLIST_RELATIVE list) noexcept {
     return reinterpret_cast<const uint8_t*>(list);
+}
+
+// Bytes the manager wrote as a list: whole items and the terminator.
+PIDLIST_RELATIVE ListAt(uint8_t* bytes) noexcept {
+    return reinterpret_cast<PIDLIST_RELATIVE>(bytes);
 }
 
 }  // namespace
 
-CQuorvelPidlManagerBase::CQuorvelPidlManagerBase() noexcept {
+CPidlMgr::CPidlMgr() noexcept {
     // Without an allocator every creation below returns null, which callers already handle.
     (void)::SHGetMalloc(&allocator_);
 }
 
-CQuorvelPidlManagerBase::~CQuorvelPidlManagerBase() = default;
+CPidlMgr::~CPidlMgr() = default;
 
-LPITEMIDLIST CQuorvelPidlManagerBase::GetNextItem(LPCITEMIDLIST list) const noexcept {
+PITEMID_CHILD CPidlMgr::AsChild(PIDLIST_RELATIVE list) noexcept {
+    return reinterpret_cast<PITEMID_CHILD>(list);
+}
+
+PCUITEMID_CHILD CPidlMgr::AsChild(PCUIDLIST_RELATIVE list) noexcept {
+    return reinterpret_cast<PCUITEMID_CHILD>(list);
+}
+
+PCUIDLIST_RELATIVE CPidlMgr::GetNextItem(PCUIDLIST_RELATIVE list) const noexcept {
     if (!list)
         return nullptr;
-    return reinterpret_cast<LPITEMIDLIST>(const_cast<uint8_t*>(Bytes(list)) + list->mkid.cb);
+    return reinterpret_cast<PCUIDLIST_RELATIVE>(Bytes(list) + list->mkid.cb);
 }
 
-LPITEMIDLIST CQuorvelPidlManagerBase::GetLastItem(LPCITEMIDLIST list) const noexcept {
+PCUITEMID_CHILD CPidlMgr::GetLastItem(PCUIDLIST_RELATIVE list) const noexcept {
     if (!list || list->mkid.cb == 0)
         return nullptr;
-    LPCITEMIDLIST last = list;
-    for (LPCITEMIDLIST item = list; item->mkid.cb != 0; item = GetNextItem(item))
+    PCUIDLIST_RELATIVE last = list;
+    for (PCUIDLIST_RELATIVE item = list; item->mkid.cb != 0; item = GetNextItem(item))
         last = item;
-    return const_cast<LPITEMIDLIST>(last);
+    // The last item is followed by the terminator: it is a list of one item.
+    return AsChild(last);
 }
 
-UINT CQuorvelPidlManagerBase::GetItemCount(LPCITEMIDLIST list) const noexcept {
+UINT CPidlMgr::GetItemCount(PCUIDLIST_RELATIVE list) const noexcept {
     UINT count = 0;
-    for (LPCITEMIDLIST item = list; item && item->mkid.cb != 0; item = GetNextItem(item))
+    for (PCUIDLIST_RELATIVE item = list; item && item->mkid.cb != 0; item = GetNextItem(item))
         ++count;
     return count;
 }
 
-UINT CQuorvelPidlManagerBase::GetSize(LPCITEMIDLIST list) const noexcept {
+UINT CPidlMgr::GetSize(PCUIDLIST_RELATIVE list) const noexcept {
     if (!list)
         return 0;
     UINT size = kListTerminatorSize;
-    for (LPCITEMIDLIST item = list; item->mkid.cb != 0; item = GetNextItem(item)) {
+    for (PCUIDLIST_RELATIVE item = list; item->mkid.cb != 0; item = GetNextItem(item)) {
         size += item->mkid.cb;
     }
     return size;
 }
 
-LPITEMIDLIST CQuorvelPidlManagerBase::CopyPidl(LPCITEMIDLIST list) const noexcept {
+PIDLIST_RELATIVE CPidlMgr::CopyPidl(PCUIDLIST_RELATIVE list) const noexcept {
     if (!list || !allocator_)
         return nullptr;
     const UINT size = GetSize(list);
-    auto* copy = static_cast<LPITEMIDLIST>(allocator_->Alloc(size));
-    if (copy)
-        memcpy(copy, list, size);
-    return copy;
+    auto* copy = static_cast<uint8_t*>(allocator_->Alloc(size));
+    if (!copy)
+        return nullptr;
+    memcpy(copy, list, size);
+    return ListAt(copy);
 }
 
-LPITEMIDLIST CQuorvelPidlManagerBase::CopyItem(LPCITEMIDLIST list) const noexcept {
+PITEMID_CHILD CPidlMgr::CopyItem(PCUIDLIST_RELATIVE list) const noexcept {
     if (!list)
         return nullptr;
-    return CopyLeadingBytes(list, list->mkid.cb);
+    return AsChild(CopyLeadingBytes(list, list->mkid.cb));
 }
 
-LPITEMIDLIST CQuorvelPidlManagerBase::CopyParent(LPCITEMIDLIST list) const noexcept {
+PIDLIST_RELATIVE CPidlMgr::CopyParent(PCUIDLIST_RELATIVE list) const noexcept {
     if (GetItemCount(list) < 2)
         return nullptr;
     return CopyLeadingBytes(list, static_cast<UINT>(Bytes(GetLastItem(list)) - Bytes(list)));
 }
 
-LPITEMIDLIST CQuorvelPidlManagerBase::CopyLeadingBytes(LPCITEMIDLIST list,
-                                                       UINT size) const noexcept {
+PIDLIST_RELATIVE CPidlMgr::CopyLeadingBytes(PCUIDLIST_RELATIVE list, UINT size) const noexcept {
     if (!allocator_)
         return nullptr;
     auto* copy = static_cast<uint8_t*>(allocator_->Alloc(size + kListTerminatorSize));
@@ -84,13 +98,13 @@ LPITEMIDLIST CQuorvelPidlManagerBase::CopyLeadingBytes(LPCITEMIDLIST list,
         return nullptr;
     memcpy(copy, list, size);
     memset(copy + size, 0, kListTerminatorSize);
-    return reinterpret_cast<LPITEMIDLIST>(copy);
+    return ListAt(copy);
 }
 
-LPITEMIDLIST CQuorvelPidlManagerBase::CopyFromIndex(LPCITEMIDLIST list, UINT index) const noexcept {
+PIDLIST_RELATIVE CPidlMgr::CopyFromIndex(PCUIDLIST_RELATIVE list, UINT index) const noexcept {
     if (!list || index >= GetItemCount(list))
         return nullptr;
-    LPCITEMIDLIST item = list;
+    PCUIDLIST_RELATIVE item = list;
     for (UINT skipped = 0; skipped < index; ++skipped) {
         if (item->mkid.cb == 0)
             return nullptr;
@@ -99,8 +113,8 @@ LPITEMIDLIST CQuorvelPidlManagerBase::CopyFromIndex(LPCITEMIDLIST list, UINT ind
     return CopyPidl(item);
 }
 
-LPITEMIDLIST CQuorvelPidlManagerBase::ConcatPidls(LPCITEMIDLIST first,
-                                                  LPCITEMIDLIST second) const noexcept {
+PIDLIST_RELATIVE CPidlMgr::ConcatPidls(PCUIDLIST_RELATIVE first,
+                                       PCUIDLIST_RELATIVE second) const noexcept {
     if (!first && !second)
         return nullptr;
     if (!first)
@@ -116,11 +130,10 @@ LPITEMIDLIST CQuorvelPidlManagerBase::ConcatPidls(LPCITEMIDLIST first,
         return nullptr;
     memcpy(joined, first, firstSize);
     memcpy(joined + firstSize, second, secondSize);
-    return reinterpret_cast<LPITEMIDLIST>(joined);
+    return ListAt(joined);
 }
 
-LPITEMIDLIST CQuorvelPidlManagerBase::CreateItem(DWORD kind, const void* data,
-                                                 UINT byteCount) const noexcept {
+PITEMID_CHILD CPidlMgr::CreateItem(DWORD kind, const void* data, UINT byteCount) const noexcept {
     // cb is 16 bits wide: larger names cannot be carried.
     if (!allocator_ || byteCount + kItemSizeOverhead > 0xFFFF)
         return nullptr;
@@ -128,15 +141,15 @@ LPITEMIDLIST CQuorvelPidlManagerBase::CreateItem(DWORD kind, const void* data,
     if (!item)
         return nullptr;
     WriteItem(item, kind, data, byteCount);
-    return reinterpret_cast<LPITEMIDLIST>(item);
+    return AsChild(ListAt(item));
 }
 
-void CQuorvelPidlManagerBase::FreePidl(LPITEMIDLIST list) const noexcept {
+void CPidlMgr::FreePidl(PIDLIST_RELATIVE list) const noexcept {
     if (list && allocator_)
         allocator_->Free(list);
 }
 
-LPITEMIDLIST CPidlMgr::CreateNamedItem(DWORD kind, const std::wstring& name) const noexcept {
+PITEMID_CHILD CPidlMgr::CreateNamedItem(DWORD kind, const std::wstring& name) const noexcept {
     try {
         const std::vector<uint8_t> bytes = ItemNameBytes(name);
         return CreateItem(kind, bytes.data(), static_cast<UINT>(bytes.size()));
@@ -145,11 +158,11 @@ LPITEMIDLIST CPidlMgr::CreateNamedItem(DWORD kind, const std::wstring& name) con
     }
 }
 
-LPITEMIDLIST CPidlMgr::CreateRootPidl() const {
+PITEMID_CHILD CPidlMgr::CreateRootPidl() const {
     return CreateNamedItem(PT_ROOT, kRootItemName);
 }
 
-LPITEMIDLIST CPidlMgr::CreateItemPidl(const wchar_t* path) const {
+PITEMID_CHILD CPidlMgr::CreateItemPidl(const wchar_t* path) const {
     if (!path)
         return nullptr;
     const std::vector<std::wstring> components = SplitPathComponents(path);
@@ -160,16 +173,16 @@ LPITEMIDLIST CPidlMgr::CreateItemPidl(const wchar_t* path) const {
     return CreateNamedItem(PT_ROOT, components[0]);
 }
 
-LPITEMIDLIST CPidlMgr::CreatePidlFromPath(const wchar_t* path) const {
+PIDLIST_RELATIVE CPidlMgr::CreatePidlFromPath(const wchar_t* path) const {
     if (!path)
         return nullptr;
     const std::vector<std::wstring> components = SplitPathComponents(path);
     if (components.empty())
         return nullptr;
-    UniquePidl list(CreateNamedItem(PT_ROOT, components[0]));
+    UniqueRelativePidl list(CreateNamedItem(PT_ROOT, components[0]));
     const DWORD kinds[] = {PT_STATION, PT_FILE};
     for (size_t index = 1; list && index < components.size() && index < 3; ++index) {
-        UniquePidl item(CreateNamedItem(kinds[index - 1], components[index]));
+        UniqueChildPidl item(CreateNamedItem(kinds[index - 1], components[index]));
         if (!item)
             return nullptr;
         list.reset(ConcatPidls(list.get(), item.get()));
@@ -186,7 +199,7 @@ UINT CPidlMgr::GetParsingPrefix(wchar_t* buffer, UINT capacity) const {
     return copied;
 }
 
-bool CPidlMgr::IsValid(LPCITEMIDLIST list) const {
+bool CPidlMgr::IsValid(PCUIDLIST_RELATIVE list) const {
     if (!list)
         return false;
     if (ItemKind(Bytes(list)) != PT_STATION)
@@ -196,48 +209,44 @@ bool CPidlMgr::IsValid(LPCITEMIDLIST list) const {
     return FindStation(station) == S_OK;
 }
 
-DWORD CPidlMgr::GetLastItemKind(LPCITEMIDLIST list) const noexcept {
+DWORD CPidlMgr::GetLastItemKind(PCUIDLIST_RELATIVE list) const noexcept {
     if (!list)
         return 0;
     // An empty list reads its own first bytes, as callers never pass one.
-    LPCITEMIDLIST last = GetLastItem(list);
+    PCUIDLIST_RELATIVE last = GetLastItem(list);
     return ItemKind(Bytes(last ? last : list));
 }
 
-std::wstring CPidlMgr::GetItemName(LPCITEMIDLIST item) const {
+std::wstring CPidlMgr::GetItemName(PCUIDLIST_RELATIVE item) const {
     if (!item || item->mkid.cb == 0)
         return {};
     return ItemName(Bytes(item));
 }
 
-bool CPidlMgr::IsWellFormedList(LPCITEMIDLIST list) const noexcept {
+bool CPidlMgr::IsWellFormedList(PCUIDLIST_RELATIVE list) const noexcept {
     if (!list || list->mkid.cb == 0)
         return false;
-    for (LPCITEMIDLIST item = list; item->mkid.cb != 0; item = GetNextItem(item)) {
+    for (PCUIDLIST_RELATIVE item = list; item->mkid.cb != 0; item = GetNextItem(item)) {
         if (!IsWellFormedItem(Bytes(item)))
             return false;
     }
     return true;
 }
 
-bool CPidlMgr::IsRoot(LPCITEMIDLIST list) const {
+bool CPidlMgr::IsRoot(PCUIDLIST_RELATIVE list) const {
     return GetLastItemKind(list) == PT_ROOT;
 }
 
-bool CPidlMgr::IsFolder(LPCITEMIDLIST list) const {
+bool CPidlMgr::IsFolder(PCUIDLIST_RELATIVE list) const {
     const DWORD kind = GetLastItemKind(list);
     return kind == PT_ROOT || kind == PT_STATION;
 }
 
-bool CPidlMgr::IsFile(LPCITEMIDLIST list) const {
+bool CPidlMgr::IsFile(PCUIDLIST_RELATIVE list) const {
     return GetLastItemKind(list) == PT_FILE;
 }
 
-bool CPidlMgr::IsRootItem(LPCITEMIDLIST list) const {
-    return GetLastItemKind(list) == PT_ROOT;
-}
-
-UINT CPidlMgr::GetPath(LPCITEMIDLIST list, wchar_t* buffer, UINT capacity) const {
+UINT CPidlMgr::GetPath(PCUIDLIST_RELATIVE list, wchar_t* buffer, UINT capacity) const {
     try {
         return static_cast<UINT>(BuildListPath(Bytes(list), buffer, capacity));
     } catch (...) {
@@ -247,7 +256,7 @@ UINT CPidlMgr::GetPath(LPCITEMIDLIST list, wchar_t* buffer, UINT capacity) const
     }
 }
 
-int CPidlMgr::ComparePidls(int sign, LPCITEMIDLIST first, LPCITEMIDLIST second) const {
+int CPidlMgr::ComparePidls(int sign, PCUIDLIST_RELATIVE first, PCUIDLIST_RELATIVE second) const {
     if (!first || !second)
         return 0;
     if (ItemKind(Bytes(first)) != ItemKind(Bytes(second)))

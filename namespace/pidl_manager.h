@@ -1,96 +1,132 @@
 // The item-ID manager: creates, copies, joins, tests, names and compares the namespace's lists.
 // Every list it returns comes from the shell's task allocator and is owned by the caller.
+//
+// Parameters and results are typed for what they are: a child is one item (PITEMID_CHILD), a
+// relative list any run of items (PIDLIST_RELATIVE), which is what the namespace's own full lists
+// are, as they start at its root and not at the desktop. Every pointer kind converts to a relative
+// one, so the read-only operations take any list. The manager builds its lists from bytes and
+// knows what each is: the only conversions between the kinds are here (AsChild), never at callers.
 #pragma once
 
 #include <windows.h>
 #include <shlobj.h>
 #include <wrl/client.h>
 
+#include <string>
+
 #include "namespace/portable/item_id_layout.h"
 #include "support/unique_resource.h"
 
-class CQuorvelPidlManagerBase {
+class CPidlMgr final {
 public:
-    CQuorvelPidlManagerBase() noexcept;
-    CQuorvelPidlManagerBase(const CQuorvelPidlManagerBase&) = delete;
-    CQuorvelPidlManagerBase& operator=(const CQuorvelPidlManagerBase&) = delete;
-    virtual ~CQuorvelPidlManagerBase();
+    CPidlMgr() noexcept;
+    CPidlMgr(const CPidlMgr&) = delete;
+    CPidlMgr& operator=(const CPidlMgr&) = delete;
+    ~CPidlMgr();
 
     // All null-safe: a null list gives null or 0.
-    LPITEMIDLIST GetNextItem(LPCITEMIDLIST list) const noexcept;
-    LPITEMIDLIST GetLastItem(LPCITEMIDLIST list) const noexcept;
-    UINT GetItemCount(LPCITEMIDLIST list) const noexcept;
-    UINT GetSize(LPCITEMIDLIST list) const noexcept;
-    LPITEMIDLIST CopyPidl(LPCITEMIDLIST list) const noexcept;
-    LPITEMIDLIST CopyItem(LPCITEMIDLIST list) const noexcept;
-    LPITEMIDLIST CopyParent(LPCITEMIDLIST list) const noexcept;
-    LPITEMIDLIST CopyFromIndex(LPCITEMIDLIST list, UINT index) const noexcept;
-    LPITEMIDLIST ConcatPidls(LPCITEMIDLIST first, LPCITEMIDLIST second) const noexcept;
-    LPITEMIDLIST CreateItem(DWORD kind, const void* data, UINT byteCount) const noexcept;
-    void FreePidl(LPITEMIDLIST list) const noexcept;
+    PCUIDLIST_RELATIVE GetNextItem(PCUIDLIST_RELATIVE list) const noexcept;
+    PCUITEMID_CHILD GetLastItem(PCUIDLIST_RELATIVE list) const noexcept;
+    UINT GetItemCount(PCUIDLIST_RELATIVE list) const noexcept;
+    UINT GetSize(PCUIDLIST_RELATIVE list) const noexcept;
+    PIDLIST_RELATIVE CopyPidl(PCUIDLIST_RELATIVE list) const noexcept;
+    // The first item alone.
+    PITEMID_CHILD CopyItem(PCUIDLIST_RELATIVE list) const noexcept;
+    // All items but the last; null for fewer than two.
+    PIDLIST_RELATIVE CopyParent(PCUIDLIST_RELATIVE list) const noexcept;
+    PIDLIST_RELATIVE CopyFromIndex(PCUIDLIST_RELATIVE list, UINT index) const noexcept;
+    PIDLIST_RELATIVE ConcatPidls(PCUIDLIST_RELATIVE first,
+                                 PCUIDLIST_RELATIVE second) const noexcept;
+    PITEMID_CHILD CreateItem(DWORD kind, const void* data, UINT byteCount) const noexcept;
+    void FreePidl(PIDLIST_RELATIVE list) const noexcept;
 
-protected:
+    // One PT_ROOT item named "Quorvel Digital Level".
+    PITEMID_CHILD CreateRootPidl() const;
+    // A PT_STATION item of component 1 when there is one, else a PT_ROOT item of component 0.
+    PITEMID_CHILD CreateItemPidl(const wchar_t* path) const;
+    // PT_ROOT of component 0, then PT_STATION of component 1 and PT_FILE of component 2.
+    PIDLIST_RELATIVE CreatePidlFromPath(const wchar_t* path) const;
+    UINT GetParsingPrefix(wchar_t* buffer, UINT capacity) const;
+    // A station item is valid only while the store holds a station of exactly that name; only the
+    // first item is looked at.
+    bool IsValid(PCUIDLIST_RELATIVE list) const;
+    // The kind tests read the list's last item.
+    bool IsRoot(PCUIDLIST_RELATIVE list) const;
+    bool IsFolder(PCUIDLIST_RELATIVE list) const;
+    bool IsFile(PCUIDLIST_RELATIVE list) const;
+    UINT GetPath(PCUIDLIST_RELATIVE list, wchar_t* buffer, UINT capacity) const;
+    // 0 when either is null or the first items' kinds differ; else the case-insensitive order
+    // of the two paths, multiplied by a non-zero sign.
+    int ComparePidls(int sign, PCUIDLIST_RELATIVE first, PCUIDLIST_RELATIVE second) const;
+
+    // Kind of a list's last item (0 for an empty list), and the name of its first item (empty
+    // for an empty list).
+    DWORD GetLastItemKind(PCUIDLIST_RELATIVE list) const noexcept;
+    std::wstring GetItemName(PCUIDLIST_RELATIVE item) const;
+
+    // Every item of a non-empty list is well formed (IsWellFormedItem). Lists that the shell hands
+    // back are checked with this before any name in them is read.
+    bool IsWellFormedList(PCUIDLIST_RELATIVE list) const noexcept;
+
+#ifdef STRICT_TYPED_ITEMIDS
+    // The view still holds its lists untyped (UniquePidl, LPCITEMIDLIST): these take them as the
+    // relative lists that every kind is. They go with the view's last untyped list.
+    PCUIDLIST_RELATIVE GetNextItem(LPCITEMIDLIST list) const noexcept {
+        return GetNextItem(AsRelative(list));
+    }
+    PCUITEMID_CHILD GetLastItem(LPCITEMIDLIST list) const noexcept {
+        return GetLastItem(AsRelative(list));
+    }
+    UINT GetSize(LPCITEMIDLIST list) const noexcept {
+        return GetSize(AsRelative(list));
+    }
+    PIDLIST_RELATIVE CopyPidl(LPCITEMIDLIST list) const noexcept {
+        return CopyPidl(AsRelative(list));
+    }
+    PIDLIST_RELATIVE CopyParent(LPCITEMIDLIST list) const noexcept {
+        return CopyParent(AsRelative(list));
+    }
+    bool IsFile(LPCITEMIDLIST list) const {
+        return IsFile(AsRelative(list));
+    }
+    UINT GetPath(LPCITEMIDLIST list, wchar_t* buffer, UINT capacity) const {
+        return GetPath(AsRelative(list), buffer, capacity);
+    }
+    DWORD GetLastItemKind(LPCITEMIDLIST list) const noexcept {
+        return GetLastItemKind(AsRelative(list));
+    }
+    std::wstring GetItemName(LPCITEMIDLIST item) const {
+        return GetItemName(AsRelative(item));
+    }
+#endif
+
+private:
+    PITEMID_CHILD CreateNamedItem(DWORD kind, const std::wstring& name) const noexcept;
     // The first size bytes of a list (whole items) as a new list with its terminator.
-    LPITEMIDLIST CopyLeadingBytes(LPCITEMIDLIST list, UINT size) const noexcept;
+    PIDLIST_RELATIVE CopyLeadingBytes(PCUIDLIST_RELATIVE list, UINT size) const noexcept;
+
+    // A list the manager made or walked to, of exactly one item, as the child it is.
+    static PITEMID_CHILD AsChild(PIDLIST_RELATIVE list) noexcept;
+    static PCUITEMID_CHILD AsChild(PCUIDLIST_RELATIVE list) noexcept;
+#ifdef STRICT_TYPED_ITEMIDS
+    // A list of no stated kind: any list is at least a relative one.
+    static PCUIDLIST_RELATIVE AsRelative(LPCITEMIDLIST list) noexcept {
+        return static_cast<PCUIDLIST_RELATIVE>(list);
+    }
+#endif
 
     Microsoft::WRL::ComPtr<IMalloc> allocator_;
 };
 
-template <typename ItemKind, typename ItemData>
-class CQuorvelPidlManagerImpl : public CQuorvelPidlManagerBase {
-public:
-    ~CQuorvelPidlManagerImpl() override = default;
-    virtual LPITEMIDLIST CreateRootPidl() const = 0;
-    virtual LPITEMIDLIST CreateItemPidl(const wchar_t* path) const = 0;
-    virtual LPITEMIDLIST CreatePidlFromPath(const wchar_t* path) const = 0;
-    virtual UINT GetParsingPrefix(wchar_t* buffer, UINT capacity) const = 0;
-    virtual bool IsValid(LPCITEMIDLIST list) const = 0;
-    virtual bool IsRoot(LPCITEMIDLIST list) const = 0;
-    virtual bool IsFolder(LPCITEMIDLIST list) const = 0;
-    virtual bool IsFile(LPCITEMIDLIST list) const = 0;
-    virtual bool IsRootItem(LPCITEMIDLIST list) const = 0;
-    virtual UINT GetPath(LPCITEMIDLIST list, wchar_t* buffer, UINT capacity) const = 0;
-    virtual int ComparePidls(int sign, LPCITEMIDLIST first, LPCITEMIDLIST second) const = 0;
-};
-
-class CPidlMgr final : public CQuorvelPidlManagerImpl<tagPIDLTYPE, tagPIDLDATA> {
-public:
-    ~CPidlMgr() override = default;
-
-    // One PT_ROOT item named "Quorvel Digital Level".
-    LPITEMIDLIST CreateRootPidl() const override;
-    // A PT_STATION item of component 1 when there is one, else a PT_ROOT item of component 0.
-    LPITEMIDLIST CreateItemPidl(const wchar_t* path) const override;
-    // PT_ROOT of component 0, then PT_STATION of component 1 and PT_FILE of component 2.
-    LPITEMIDLIST CreatePidlFromPath(const wchar_t* path) const override;
-    UINT GetParsingPrefix(wchar_t* buffer, UINT capacity) const override;
-    // A station item is valid only while the store holds a station of exactly that name.
-    bool IsValid(LPCITEMIDLIST list) const override;
-    bool IsRoot(LPCITEMIDLIST list) const override;
-    bool IsFolder(LPCITEMIDLIST list) const override;
-    bool IsFile(LPCITEMIDLIST list) const override;
-    bool IsRootItem(LPCITEMIDLIST list) const override;
-    UINT GetPath(LPCITEMIDLIST list, wchar_t* buffer, UINT capacity) const override;
-    // 0 when either is null or the first items' kinds differ; else the case-insensitive order
-    // of the two paths, multiplied by a non-zero sign.
-    int ComparePidls(int sign, LPCITEMIDLIST first, LPCITEMIDLIST second) const override;
-
-    // Kind and name of a list's last item (kind 0 and an empty name for an empty list).
-    DWORD GetLastItemKind(LPCITEMIDLIST list) const noexcept;
-    std::wstring GetItemName(LPCITEMIDLIST item) const;
-
-    // Every item of a non-empty list is well formed (IsWellFormedItem). Lists that the shell hands
-    // back are checked with this before any name in them is read.
-    bool IsWellFormedList(LPCITEMIDLIST list) const noexcept;
-
-private:
-    LPITEMIDLIST CreateNamedItem(DWORD kind, const std::wstring& name) const noexcept;
-};
-
-// An item-ID list owned by one holder and freed through the task allocator, which made it.
+// An item-ID list owned by one holder and freed through the task allocator, which made it; one
+// owner type per kind of list.
+template <typename ItemIdPointer>
 struct PidlTraits {
-    using Type = LPITEMIDLIST;
+    using Type = ItemIdPointer;
     static Type Invalid() noexcept { return nullptr; }
     static void Close(Type value) noexcept { ::CoTaskMemFree(value); }
 };
-using UniquePidl = UniqueResource<PidlTraits>;
+using UniqueRelativePidl = UniqueResource<PidlTraits<PIDLIST_RELATIVE>>;
+using UniqueChildPidl = UniqueResource<PidlTraits<PITEMID_CHILD>>;
+// A list held without its kind, as the view still holds its lists.
+using UniquePidl = UniqueResource<PidlTraits<LPITEMIDLIST>>;

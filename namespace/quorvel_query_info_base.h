@@ -24,7 +24,7 @@ protected:
     virtual ~CQuorvelQueryInfoBase();
 
 private:
-    UniquePidl fullList_;
+    UniqueRelativePidl fullList_;
     Microsoft::WRL::ComPtr<IMalloc> allocator_;
     CPidlMgr manager_;
 };

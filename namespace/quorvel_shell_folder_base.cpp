@@ -1,4 +1,4 @@
-// The shell-folder framework's base: parsing, attributes, names, comparison and set-up.
+// The shell folder's base: parsing, attributes, names, comparison and set-up.
 #include "namespace/quorvel_shell_folder_base.h"
 
 #include <cwchar>
@@ -42,8 +42,7 @@ HRESULT CQuorvelShellFolderBase::SetUp(CQuorvelShellFolderBase* parent,
         RETURN_IF_NULL_ALLOC(ownIdentifier_.get());
         // A folder bound from a placed parent is placed below it; the root keeps its own.
         if (parent && parent->Location() && identifier) {
-            location_.reset(reinterpret_cast<LPITEMIDLIST>(
-                ::ILCombine(parent->Location(), reinterpret_cast<PCUIDLIST_RELATIVE>(identifier))));
+            location_.reset(::ILCombine(parent->Location(), identifier));
             RETURN_IF_NULL_ALLOC(location_.get());
         }
         parsingPrefix_.clear();
@@ -79,12 +78,12 @@ bool CQuorvelShellFolderBase::GetFolderPath(wchar_t* buffer, size_t capacity,
 }
 
 HRESULT CQuorvelShellFolderBase::CreateFullList(PCUITEMID_CHILD item,
-                                                UniquePidl& fullList) const noexcept {
+                                                UniqueRelativePidl& fullList) const noexcept {
     wchar_t folderPath[kMaximumPath] = {};
     // A path that does not fit leaves a shorter one: the list then names fewer folders, as the
     // consumers of the full list only read names from it.
     (void)GetFolderPath(folderPath, ARRAYSIZE(folderPath), false);
-    UniquePidl folderList(manager_.CreatePidlFromPath(folderPath));
+    UniqueRelativePidl folderList(manager_.CreatePidlFromPath(folderPath));
     fullList.reset(manager_.ConcatPidls(folderList.get(), item));
     RETURN_IF_NULL_ALLOC(fullList.get());
     return S_OK;
@@ -106,7 +105,7 @@ HRESULT CQuorvelShellFolderBase::ParseDisplayName(HWND, IBindCtx*, LPWSTR name, 
             !AppendToPath(fullPath, ARRAYSIZE(fullPath), true, name)) {
             return E_INVALIDARG;
         }
-        UniquePidl fullList(manager_.CreatePidlFromPath(fullPath));
+        UniqueRelativePidl fullList(manager_.CreatePidlFromPath(fullPath));
         if (!fullList)
             return E_INVALIDARG;
         const size_t itemCount = manager_.GetItemCount(fullList.get());
@@ -115,10 +114,10 @@ HRESULT CQuorvelShellFolderBase::ParseDisplayName(HWND, IBindCtx*, LPWSTR name, 
         // something deeper than a file.
         if (nameCount == 0 || nameCount >= itemCount)
             return E_INVALIDARG;
-        LPITEMIDLIST parsed =
+        PIDLIST_RELATIVE parsed =
             manager_.CopyFromIndex(fullList.get(), static_cast<UINT>(itemCount - nameCount));
         RETURN_IF_NULL_ALLOC(parsed);
-        *list = reinterpret_cast<PIDLIST_RELATIVE>(parsed);
+        *list = parsed;
         return S_OK;
     }
     CATCH_RETURN()
@@ -230,7 +229,7 @@ HRESULT CQuorvelShellFolderBase::SetNameOf(HWND, PCUITEMID_CHILD, LPCWSTR, SHGDN
 
 HRESULT CQuorvelShellFolderBase::Initialize(PCIDLIST_ABSOLUTE location) {
     if (location) {
-        location_.reset(reinterpret_cast<LPITEMIDLIST>(::ILClone(location)));
+        location_.reset(::ILCloneFull(location));
         RETURN_IF_NULL_ALLOC(location_.get());
     } else {
         location_.reset();
@@ -244,7 +243,7 @@ HRESULT CQuorvelShellFolderBase::GetCurFolder(PIDLIST_ABSOLUTE* location) {
     *location = nullptr;
     if (!location_)
         return S_FALSE;
-    *location = reinterpret_cast<PIDLIST_ABSOLUTE>(::ILClone(Location()));
+    *location = ::ILCloneFull(Location());
     RETURN_IF_NULL_ALLOC(*location);
     return S_OK;
 }

@@ -1,5 +1,6 @@
-// The shell-folder framework's base: the IShellFolder and IPersistFolder operations that create no
-// objects of other classes, the folder set-up and the folder path.
+// The shell folder's base: the IShellFolder and IPersistFolder operations that create no objects
+// of other classes, the folder set-up and the folder path. The folder that creates the enumerator,
+// the view and the item objects derives from it in server/, above the layers of those classes.
 #pragma once
 
 #include <windows.h>
@@ -52,25 +53,23 @@ public:
     [[nodiscard]] bool GetFolderPath(wchar_t* buffer, size_t capacity,
                                      bool withPrefix) const noexcept;
 
-    PCUIDLIST_RELATIVE OwnIdentifier() const noexcept {
-        return reinterpret_cast<PCUIDLIST_RELATIVE>(ownIdentifier_.get());
-    }
+    PCUIDLIST_RELATIVE OwnIdentifier() const noexcept { return ownIdentifier_.get(); }
     // The shell's identifier of this folder, from the desktop; null when it has none.
-    PCIDLIST_ABSOLUTE Location() const noexcept {
-        return reinterpret_cast<PCIDLIST_ABSOLUTE>(location_.get());
-    }
+    PCIDLIST_ABSOLUTE Location() const noexcept { return location_.get(); }
 
 protected:
     virtual ~CQuorvelShellFolderBase();
 
     // The item's internal full identifier: the folder's path as a list, then the item.
-    [[nodiscard]] HRESULT CreateFullList(PCUITEMID_CHILD item, UniquePidl& fullList) const noexcept;
+    [[nodiscard]] HRESULT CreateFullList(PCUITEMID_CHILD item,
+                                         UniqueRelativePidl& fullList) const noexcept;
 
     CPidlMgr manager_;
 
 private:
-    UniquePidl ownIdentifier_;
-    UniquePidl location_;  // the shell's identifier: the parent's and then this folder's item
+    UniqueRelativePidl ownIdentifier_;
+    // The shell's identifier, made by the shell: the parent's and then this folder's item.
+    UniqueAbsoluteIdList location_;
     Microsoft::WRL::ComPtr<CQuorvelShellFolderBase> parent_;
     Microsoft::WRL::ComPtr<IMalloc> allocator_;
     std::wstring parsingPrefix_;  // empty unless the folder is the root

@@ -114,7 +114,7 @@ HRESULT MakeTopFolderView(TopFolderView& made) {
     UniqueAbsoluteIdList computer;
     if (FAILED(result = ::SHGetSpecialFolderLocation(nullptr, CSIDL_DRIVES, computer.put())))
         return result;
-    UniquePidl own(manager.CreateRootPidl());
+    UniqueChildPidl own(manager.CreateRootPidl());
     made.absolute.reset(manager.ConcatPidls(computer.get(), own.get()));
     return made.absolute ? S_OK : E_OUTOFMEMORY;
 }

@@ -140,7 +140,7 @@ TEST_F(DataObject, SetDataReleasesTheMediumOnlyWhenItIsHandedOver) {
 // shell (here My Computer stands in for it).
 TEST_F(DataObject, ShellIdListArrayGivesEveryChildItsOwnOffsetInsideTheBlock) {
     const wchar_t* const names[] = {L"North", L"South", L"East", L"West", L"Centre"};
-    UniquePidl folder;
+    UniqueAbsoluteIdList folder;
     ASSERT_EQ(S_OK, ::SHGetSpecialFolderLocation(
                         nullptr, CSIDL_DRIVES, reinterpret_cast<PIDLIST_ABSOLUTE*>(folder.put())));
     const UINT folderSize = manager_.GetSize(folder.get());
@@ -171,7 +171,7 @@ TEST_F(DataObject, ShellIdListArrayGivesEveryChildItsOwnOffsetInsideTheBlock) {
         EXPECT_EQ(0, memcmp(lists[0].data(), folder.get(), folderSize))
             << "the parent is the folder's place from the desktop";
         for (size_t index = 0; index < count; ++index) {
-            const auto* child = reinterpret_cast<LPCITEMIDLIST>(lists[index + 1].data());
+            const auto child = reinterpret_cast<PCUITEMID_CHILD>(lists[index + 1].data());
             EXPECT_EQ(1u, manager_.GetItemCount(child));
             EXPECT_EQ(names[index], manager_.GetItemName(child));
         }
@@ -185,7 +185,7 @@ TEST_F(DataObject, ShellIdListArrayGivesEveryChildItsOwnOffsetInsideTheBlock) {
         for (DWORD index = 0; index < itemCount; ++index) {
             ComPtr<IShellItem> item;
             ASSERT_EQ(S_OK, items->GetItemAt(index, &item));
-            UniquePidl full;
+            UniqueAbsoluteIdList full;
             ASSERT_EQ(S_OK, ::SHGetIDListFromObject(
                                 item.Get(), reinterpret_cast<PIDLIST_ABSOLUTE*>(full.put())));
             ASSERT_EQ(manager_.GetItemCount(folder.get()) + 1, manager_.GetItemCount(full.get()));

@@ -1,6 +1,8 @@
-// CPidlMgr through its slots and list operations. The item bytes, paths (cut ones included) and
-// comparison scaling themselves are proved natively by the portable item-layout tests;
-// comparison through CompareIDs and the refusal of malformed lists by the shell folder tests.
+// CPidlMgr: creation from paths, kind tests, copies and joins, the parsing prefix and validity.
+// The item bytes, paths (cut ones included) and comparison scaling themselves are proved natively
+// by the portable item-layout tests; comparison through CompareIDs and the refusal of malformed
+// lists by the shell folder tests; counting and copying from an index through ParseDisplayName,
+// and a list's last item and parent through the data object's "Shell IDList Array".
 #include <windows.h>
 #include <shlobj.h>
 
@@ -17,17 +19,14 @@ namespace {
 
 class PidlManager : public ::testing::Test {
 protected:
-    UniquePidl Path(const wchar_t* path) { return UniquePidl(manager_.CreatePidlFromPath(path)); }
-
-    std::wstring PathText(LPCITEMIDLIST list) {
-        wchar_t text[260] = {};
-        manager_.GetPath(list, text, 260);
-        return text;
+    UniqueRelativePidl Path(const wchar_t* path) {
+        return UniqueRelativePidl(manager_.CreatePidlFromPath(path));
     }
 
-    std::vector<DWORD> KindsOf(LPCITEMIDLIST list) {
+    std::vector<DWORD> KindsOf(PCUIDLIST_RELATIVE list) {
         std::vector<DWORD> kinds;
-        for (LPCITEMIDLIST item = list; item && item->mkid.cb; item = manager_.GetNextItem(item))
+        for (PCUIDLIST_RELATIVE item = list; item && item->mkid.cb;
+             item = manager_.GetNextItem(item))
             kinds.push_back(ItemKind(reinterpret_cast<const uint8_t*>(item)));
         return kinds;
     }
@@ -40,22 +39,22 @@ using Kinds = std::vector<DWORD>;
 }  // namespace
 
 TEST_F(PidlManager, CopiesAndJoinsCarryTheSlackBytes) {
-    UniquePidl item(manager_.CreateItemPidl(L"Quorvel Digital Level\\A"));
+    UniqueChildPidl item(manager_.CreateItemPidl(L"Quorvel Digital Level\\A"));
     ASSERT_TRUE(item);
     EXPECT_EQ(25u, manager_.GetSize(item.get()));
     // Copies and joins step by cb, so the five slack bytes travel along.
-    UniquePidl root(manager_.CreateRootPidl());
-    UniquePidl joined(manager_.ConcatPidls(root.get(), item.get()));
+    UniqueChildPidl root(manager_.CreateRootPidl());
+    UniqueRelativePidl joined(manager_.ConcatPidls(root.get(), item.get()));
     EXPECT_EQ(root.get()->mkid.cb + 23u + 2u, manager_.GetSize(joined.get()));
-    UniquePidl copy(manager_.CopyPidl(joined.get()));
+    UniqueRelativePidl copy(manager_.CopyPidl(joined.get()));
     ASSERT_EQ(manager_.GetSize(joined.get()), manager_.GetSize(copy.get()));
     EXPECT_EQ(0, memcmp(joined.get(), copy.get(), manager_.GetSize(copy.get())));
 }
 
 TEST_F(PidlManager, CreationFromPathsAndKindTestsOfTheLastItem) {
-    UniquePidl full = Path(L"Quorvel Digital Level\\S1\\file1.lv");
-    UniquePidl station = Path(L"Quorvel Digital Level\\S1");
-    UniquePidl root = Path(L"Quorvel Digital Level");
+    UniqueRelativePidl full = Path(L"Quorvel Digital Level\\S1\\file1.lv");
+    UniqueRelativePidl station = Path(L"Quorvel Digital Level\\S1");
+    UniqueRelativePidl root = Path(L"Quorvel Digital Level");
     EXPECT_EQ((Kinds{PT_ROOT, PT_STATION, PT_FILE}), KindsOf(full.get()));
     EXPECT_EQ((Kinds{PT_ROOT}), KindsOf(root.get()));
     EXPECT_EQ((Kinds{PT_ROOT, PT_STATION, PT_FILE}), KindsOf(Path(L"\\A\\\\B\\C\\D\\E").get()))
@@ -63,9 +62,9 @@ TEST_F(PidlManager, CreationFromPathsAndKindTestsOfTheLastItem) {
     for (const wchar_t* nothing : {L"", L"\\\\", static_cast<const wchar_t*>(nullptr)})
         EXPECT_FALSE(Path(nothing));
 
-    UniquePidl stationItem(manager_.CreateItemPidl(L"Quorvel Digital Level\\S1\\file1.lv"));
+    UniqueChildPidl stationItem(manager_.CreateItemPidl(L"Quorvel Digital Level\\S1\\file1.lv"));
     EXPECT_EQ((Kinds{PT_STATION}), KindsOf(stationItem.get()));
-    UniquePidl rootItem(manager_.CreateItemPidl(L"\\Quorvel Digital Level"));
+    UniqueChildPidl rootItem(manager_.CreateItemPidl(L"\\Quorvel Digital Level"));
     EXPECT_EQ((Kinds{PT_ROOT}), KindsOf(rootItem.get()));
     EXPECT_EQ(L"Quorvel Digital Level", manager_.GetItemName(rootItem.get()));
 
@@ -74,36 +73,8 @@ TEST_F(PidlManager, CreationFromPathsAndKindTestsOfTheLastItem) {
     EXPECT_TRUE(manager_.IsFolder(station.get()));
     EXPECT_FALSE(manager_.IsRoot(station.get()));
     EXPECT_TRUE(manager_.IsRoot(root.get()));
-    EXPECT_TRUE(manager_.IsRootItem(root.get()));
     EXPECT_TRUE(manager_.IsFolder(root.get()));
-    EXPECT_FALSE(manager_.IsFile(nullptr));
-}
-
-TEST_F(PidlManager, ListOperations) {
-    UniquePidl full = Path(L"Quorvel Digital Level\\S1\\file1.lv");
-    EXPECT_EQ(3u, manager_.GetItemCount(full.get()));
-    EXPECT_EQ(L"file1.lv", manager_.GetItemName(manager_.GetLastItem(full.get())));
-
-    UniquePidl parent(manager_.CopyParent(full.get()));
-    EXPECT_EQ(L"Quorvel Digital Level\\S1", PathText(parent.get()));
-    UniquePidl single(manager_.CopyItem(full.get()));
-    EXPECT_EQ(1u, manager_.GetItemCount(single.get()));
-    EXPECT_FALSE(UniquePidl(manager_.CopyParent(single.get())));
-
-    UniquePidl tail(manager_.CopyFromIndex(full.get(), 1));
-    EXPECT_EQ(L"S1\\file1.lv", PathText(tail.get()));
-    EXPECT_FALSE(UniquePidl(manager_.CopyFromIndex(full.get(), 3)));
-
-    UniquePidl joined(manager_.ConcatPidls(parent.get(), nullptr));
-    EXPECT_EQ(manager_.GetSize(parent.get()), manager_.GetSize(joined.get()));
-    EXPECT_FALSE(UniquePidl(manager_.ConcatPidls(nullptr, nullptr)));
-    EXPECT_EQ(nullptr, manager_.GetLastItem(nullptr));
-    EXPECT_EQ(0u, manager_.GetSize(nullptr));
-    EXPECT_EQ(0, manager_.ComparePidls(1, nullptr, full.get()));
-
-    const USHORT empty = 0;
-    EXPECT_EQ(2u, manager_.GetSize(reinterpret_cast<LPCITEMIDLIST>(&empty)));
-    EXPECT_EQ(nullptr, manager_.GetLastItem(reinterpret_cast<LPCITEMIDLIST>(&empty)));
+    EXPECT_FALSE(manager_.IsFile(PCUIDLIST_RELATIVE{}));
 }
 
 TEST_F(PidlManager, ParsingPrefixIsCopiedWithoutTerminatorWhenCut) {
@@ -119,10 +90,10 @@ TEST_F(PidlManager, ParsingPrefixIsCopiedWithoutTerminatorWhenCut) {
 TEST_F(PidlManager, ValidityFollowsTheStore) {
     RegistryOverride registry;
     AddStationOfModel(L"Station 1");
-    UniquePidl station(manager_.CreateItemPidl(L"Quorvel Digital Level\\Station 1"));
-    UniquePidl otherCase(manager_.CreateItemPidl(L"Quorvel Digital Level\\station 1"));
-    UniquePidl file = Path(L"Quorvel Digital Level\\Gone\\file1.lv");
-    UniquePidl fileItem(manager_.CopyFromIndex(file.get(), 2));
+    UniqueChildPidl station(manager_.CreateItemPidl(L"Quorvel Digital Level\\Station 1"));
+    UniqueChildPidl otherCase(manager_.CreateItemPidl(L"Quorvel Digital Level\\station 1"));
+    UniqueRelativePidl file = Path(L"Quorvel Digital Level\\Gone\\file1.lv");
+    UniqueRelativePidl fileItem(manager_.CopyFromIndex(file.get(), 2));
     EXPECT_TRUE(manager_.IsValid(station.get()));
     EXPECT_FALSE(manager_.IsValid(otherCase.get())) << "the store compares names case-sensitively";
     EXPECT_TRUE(manager_.IsValid(fileItem.get()));

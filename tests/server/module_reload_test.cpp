@@ -283,7 +283,7 @@ public:
             return;
         // The browser's record of where it is: My Computer, then the folder's own item.
         CPidlMgr manager;
-        UniquePidl own(manager.CreateRootPidl());
+        UniqueChildPidl own(manager.CreateRootPidl());
         PIDLIST_ABSOLUTE computer = nullptr;
         EXPECT_EQ(S_OK, ::SHGetSpecialFolderLocation(nullptr, CSIDL_DRIVES, &computer));
         UniquePidl absolute(manager.ConcatPidls(computer, own.get()));

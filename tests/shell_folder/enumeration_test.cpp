@@ -99,8 +99,7 @@ TEST_F(ShellFolderTest, FillingFromPaths) {
           std::tuple{L"Quorvel Digital Level\\Station 1", SHCONTF_NONFOLDERS, L"file1.hvr"}}) {
         ASSERT_EQ(S_OK, list->Fill(path, flags));
         ASSERT_EQ(S_OK, list->Next(1, &item, nullptr));
-        EXPECT_EQ(name,
-                  manager_.GetItemName(UniquePidl(reinterpret_cast<LPITEMIDLIST>(item)).get()));
+        EXPECT_EQ(name, manager_.GetItemName(UniqueChildPidl(item).get()));
     }
     EXPECT_EQ(S_FALSE, list->Next(1, &item, nullptr));
 }

@@ -5,7 +5,7 @@
 #include <cstring>
 
 TEST_F(ShellFolderTest, DisplayNameFlagRules) {
-    UniquePidl station = StationItem(L"Station 1");
+    UniqueChildPidl station = StationItem(L"Station 1");
     const std::wstring full = std::wstring(kPrefix) + L"\\Station 1";
     const struct {
         SHGDNF flags;
@@ -33,7 +33,7 @@ TEST_F(ShellFolderTest, DisplayNameFlagRules) {
 
 TEST_F(ShellFolderTest, DisplayNamesOfLongNamesStayWithinThePathLength) {
     // A station whose name is near the registry's limit: its folder path no longer fits.
-    UniquePidl station = StationItem(std::wstring(255, L'L'));
+    UniqueChildPidl station = StationItem(std::wstring(255, L'L'));
     std::wstring name;
     ASSERT_EQ(S_OK, DisplayName(root_.Get(), station, SHGDN_FORPARSING, name));
     EXPECT_LT(name.size(), 260u);
@@ -45,7 +45,7 @@ TEST_F(ShellFolderTest, DisplayNamesOfLongNamesStayWithinThePathLength) {
               DisplayName(stationFolder.Get(), FileItem(L"file1.lv"), SHGDN_FORPARSING, name));
     EXPECT_LT(name.size(), 260u);
     // Parsing in a folder whose own path does not fit fails instead of naming something else.
-    UniquePidl parsed;
+    UniqueRelativePidl parsed;
     EXPECT_EQ(E_INVALIDARG, Parse(stationFolder.Get(), L"file1.lv", parsed));
     // Nor does it list the root's stations as its own items.
     AddStationOfModel(L"Station 1");
@@ -54,10 +54,10 @@ TEST_F(ShellFolderTest, DisplayNamesOfLongNamesStayWithinThePathLength) {
 
 TEST_F(ShellFolderTest, AttributesByKindAndValidation) {
     AddStationOfModel(L"Station 1");
-    UniquePidl station = StationItem(L"Station 1");
-    UniquePidl deleted = StationItem(L"Gone");
-    UniquePidl file = FileItem(L"file1.lv");
-    UniquePidl root(manager_.CreateRootPidl());
+    UniqueChildPidl station = StationItem(L"Station 1");
+    UniqueChildPidl deleted = StationItem(L"Gone");
+    UniqueChildPidl file = FileItem(L"file1.lv");
+    UniqueChildPidl root(manager_.CreateRootPidl());
     const SFGAOF stationBits = 0x20000100;
     const struct {
         const char* rule;
@@ -95,7 +95,7 @@ TEST_F(ShellFolderTest, AttributesByKindAndValidation) {
 
 TEST_F(ShellFolderTest, AllocationFailureWhileValidatingIsAResultNotAnException) {
     AddStationOfModel(L"Station 1");
-    UniquePidl station = StationItem(L"Station 1");
+    UniqueChildPidl station = StationItem(L"Station 1");
     PCUITEMID_CHILD item = Child(station);
     SFGAOF attributes = SFGAO_VALIDATE;
     HRESULT result = S_OK;
@@ -109,18 +109,18 @@ TEST_F(ShellFolderTest, AllocationFailureWhileValidatingIsAResultNotAnException)
 
 TEST_F(ShellFolderTest, MalformedItemsAreRefusedBeforeTheirNamesAreRead) {
     // A station item whose name runs to the end of its cb without a terminator.
-    UniquePidl unterminated = StationItem(L"AB");
+    UniqueChildPidl unterminated = StationItem(L"AB");
     memset(reinterpret_cast<uint8_t*>(unterminated.get()) + kItemNameOffset, 'x',
            unterminated.get()->mkid.cb - kItemNameOffset);
     // An item too short to hold a kind and a name, followed by the list terminator.
     uint8_t tiny[] = {4, 0, 2, 0, 0, 0};
-    UniquePidl unknownKind = StationItem(L"K");
+    UniqueChildPidl unknownKind = StationItem(L"K");
     reinterpret_cast<uint8_t*>(unknownKind.get())[kItemKindOffset] = 9;
-    UniquePidl good = StationItem(L"S");
+    UniqueChildPidl good = StationItem(L"S");
 
-    for (LPITEMIDLIST bad :
-         {unterminated.get(), reinterpret_cast<LPITEMIDLIST>(tiny), unknownKind.get()}) {
-        PCUITEMID_CHILD item = reinterpret_cast<PCUITEMID_CHILD>(bad);
+    const PCUITEMID_CHILD malformed[] = {
+        unterminated.get(), reinterpret_cast<PCUITEMID_CHILD>(tiny), unknownKind.get()};
+    for (PCUITEMID_CHILD item : malformed) {
         STRRET text{};
         EXPECT_EQ(E_INVALIDARG, root_->GetDisplayNameOf(item, SHGDN_NORMAL, &text));
         SFGAOF attributes = SFGAO_VALIDATE;
@@ -137,11 +137,11 @@ TEST_F(ShellFolderTest, MalformedItemsAreRefusedBeforeTheirNamesAreRead) {
 }
 
 TEST_F(ShellFolderTest, CompareIDsReturnsTheSignedOrderUnfolded) {
-    UniquePidl alpha = StationItem(L"alpha");
-    UniquePidl beta = StationItem(L"Beta");
-    UniquePidl alphaUpper = StationItem(L"ALPHA");
-    UniquePidl file = FileItem(L"zzz");
-    auto compare = [&](LPARAM column, const UniquePidl& first, const UniquePidl& second) {
+    UniqueChildPidl alpha = StationItem(L"alpha");
+    UniqueChildPidl beta = StationItem(L"Beta");
+    UniqueChildPidl alphaUpper = StationItem(L"ALPHA");
+    UniqueChildPidl file = FileItem(L"zzz");
+    auto compare = [&](LPARAM column, const UniqueChildPidl& first, const UniqueChildPidl& second) {
         return root_->CompareIDs(column, Child(first), Child(second));
     };
     const HRESULT order = compare(0, alpha, beta);

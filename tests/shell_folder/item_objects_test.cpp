@@ -22,8 +22,8 @@ LONG IconWidth(HICON icon) {
 }  // namespace
 
 TEST_F(ShellFolderTest, UIObjectsNeedExactlyOneItem) {
-    UniquePidl first = StationItem(L"A");
-    UniquePidl second = StationItem(L"B");
+    UniqueChildPidl first = StationItem(L"A");
+    UniqueChildPidl second = StationItem(L"B");
     PCUITEMID_CHILD items[] = {Child(first), Child(second)};
     for (REFIID iid :
          {IID_IExtractIconW, IID_IQueryInfo, IID_IDataObject, IID_IDropTarget, IID_IUnknown}) {
@@ -41,7 +41,7 @@ TEST_F(ShellFolderTest, UIObjectsNeedExactlyOneItem) {
 }
 
 TEST_F(ShellFolderTest, InfoTipIsThePathOfTheFullIdentifier) {
-    UniquePidl station = StationItem(L"Station 1");
+    UniqueChildPidl station = StationItem(L"Station 1");
     ComPtr<IQueryInfo> info;
     ASSERT_EQ(S_OK, UIObject(root_.Get(), station, IID_IQueryInfo, &info));
     PWSTR tip = nullptr;
@@ -53,7 +53,7 @@ TEST_F(ShellFolderTest, InfoTipIsThePathOfTheFullIdentifier) {
 
     ComPtr<IShellFolder> stationFolder = Bind(root_.Get(), station);
     ASSERT_TRUE(stationFolder);
-    UniquePidl file = FileItem(L"file1.hvr");
+    UniqueChildPidl file = FileItem(L"file1.hvr");
     ASSERT_EQ(S_OK, UIObject(stationFolder.Get(), file, IID_IQueryInfo, &info));
     // The folder's own copy of the list is gone; the tip object keeps its own.
     file.reset();
@@ -63,13 +63,13 @@ TEST_F(ShellFolderTest, InfoTipIsThePathOfTheFullIdentifier) {
 }
 
 TEST_F(ShellFolderTest, IconLocationByKindOfTheLastItem) {
-    UniquePidl station = StationItem(L"Station 1");
-    UniquePidl rootItem(manager_.CreateRootPidl());
+    UniqueChildPidl station = StationItem(L"Station 1");
+    UniqueChildPidl rootItem(manager_.CreateRootPidl());
     ComPtr<IShellFolder> stationFolder = Bind(root_.Get(), station);
     ASSERT_TRUE(stationFolder);
-    UniquePidl file = FileItem(L"file1.lv");
+    UniqueChildPidl file = FileItem(L"file1.lv");
 
-    const std::tuple<IShellFolder*, const UniquePidl*, int> cases[] = {
+    const std::tuple<IShellFolder*, const UniqueChildPidl*, int> cases[] = {
         {root_.Get(), &station, 0}, {stationFolder.Get(), &file, 2}, {root_.Get(), &rootItem, 1}};
     for (const auto& [folder, item, expectedIndex] : cases) {
         ComPtr<IExtractIconW> icon;

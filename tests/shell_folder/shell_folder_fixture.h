@@ -42,34 +42,33 @@ protected:
         EXPECT_EQ(0, ModuleLockCount());
     }
 
-    static ComPtr<IShellFolder> Bind(IShellFolder* parent, const UniquePidl& item) {
+    static ComPtr<IShellFolder> Bind(IShellFolder* parent, const UniqueChildPidl& item) {
         ComPtr<IShellFolder> folder;
-        EXPECT_EQ(S_OK, parent->BindToObject(Child(item), nullptr, IID_PPV_ARGS(&folder)));
+        EXPECT_EQ(S_OK, parent->BindToObject(item.get(), nullptr, IID_PPV_ARGS(&folder)));
         return folder;
     }
 
-    UniquePidl StationItem(const std::wstring& name) const {
-        return UniquePidl(manager_.CreateItemPidl((L"Quorvel Digital Level\\" + name).c_str()));
+    UniqueChildPidl StationItem(const std::wstring& name) const {
+        return UniqueChildPidl(
+            manager_.CreateItemPidl((L"Quorvel Digital Level\\" + name).c_str()));
     }
-    UniquePidl FileItem(const std::wstring& name) const {
-        UniquePidl full(
+    UniqueChildPidl FileItem(const std::wstring& name) const {
+        UniqueRelativePidl full(
             manager_.CreatePidlFromPath((L"Quorvel Digital Level\\S\\" + name).c_str()));
-        return UniquePidl(manager_.CopyFromIndex(full.get(), 2));
+        return UniqueChildPidl(manager_.CopyItem(manager_.GetLastItem(full.get())));
     }
-    static PCUITEMID_CHILD Child(const UniquePidl& list) {
-        return reinterpret_cast<PCUITEMID_CHILD>(list.get());
-    }
+    static PCUITEMID_CHILD Child(const UniqueChildPidl& item) { return item.get(); }
 
     // ParseDisplayName of a (writable copy of the) name; the list is null after a failure.
-    static HRESULT Parse(IShellFolder* folder, std::wstring name, UniquePidl& list) {
+    static HRESULT Parse(IShellFolder* folder, std::wstring name, UniqueRelativePidl& list) {
         PIDLIST_RELATIVE parsed = reinterpret_cast<PIDLIST_RELATIVE>(1);
         const HRESULT result =
             folder->ParseDisplayName(nullptr, nullptr, name.data(), nullptr, &parsed, nullptr);
-        list.reset(reinterpret_cast<LPITEMIDLIST>(parsed));
+        list.reset(parsed);
         return result;
     }
 
-    static HRESULT DisplayName(IShellFolder* folder, const UniquePidl& item, SHGDNF flags,
+    static HRESULT DisplayName(IShellFolder* folder, const UniqueChildPidl& item, SHGDNF flags,
                                std::wstring& name) {
         STRRET text{};
         const HRESULT result = folder->GetDisplayNameOf(Child(item), flags, &text);
@@ -81,16 +80,16 @@ protected:
         return result;
     }
 
-    static HRESULT UIObject(IShellFolder* folder, const UniquePidl& item, REFIID iid,
+    static HRESULT UIObject(IShellFolder* folder, const UniqueChildPidl& item, REFIID iid,
                             void** object) {
         PCUITEMID_CHILD child = Child(item);
         return folder->GetUIObjectOf(nullptr, 1, &child, iid, nullptr, object);
     }
 
     // Kind and name of every item of a list; none for no list.
-    Items ItemsOf(const UniquePidl& list) const {
+    Items ItemsOf(const UniqueRelativePidl& list) const {
         Items items;
-        for (LPCITEMIDLIST item = list.get(); item && item->mkid.cb;
+        for (PCUIDLIST_RELATIVE item = list.get(); item && item->mkid.cb;
              item = manager_.GetNextItem(item)) {
             items.emplace_back(ItemKind(reinterpret_cast<const uint8_t*>(item)),
                                manager_.GetItemName(item));
@@ -105,7 +104,7 @@ protected:
         EXPECT_EQ(S_OK, folder->EnumObjects(nullptr, flags, &enumerator));
         PITEMID_CHILD item = nullptr;
         while (enumerator && enumerator->Next(1, &item, nullptr) == S_OK) {
-            UniquePidl owned(reinterpret_cast<LPITEMIDLIST>(item));
+            UniqueChildPidl owned(item);
             items.emplace_back(manager_.GetLastItemKind(owned.get()),
                                manager_.GetItemName(owned.get()));
         }

@@ -20,12 +20,13 @@ TEST_F(ShellFolderTest, RootAndStationFolderPathsWithAndWithoutPrefix) {
     EXPECT_EQ(kPrefix, FolderPath(*root.Get(), true));
     // Whatever identifier the shell passes, the folder it initialises is the root.
     auto elsewhere = MakeComObject<CLVShellFolder>();
-    UniquePidl other = StationItem(L"Elsewhere");
-    ASSERT_EQ(S_OK, elsewhere->Initialize(reinterpret_cast<PCIDLIST_ABSOLUTE>(other.get())));
+    UniqueAbsoluteIdList elsewhereLocation;
+    ASSERT_EQ(S_OK, ::SHGetSpecialFolderLocation(nullptr, CSIDL_DRIVES, elsewhereLocation.put()));
+    ASSERT_EQ(S_OK, elsewhere->Initialize(elsewhereLocation.get()));
     EXPECT_EQ(L"\\Quorvel Digital Level", FolderPath(*elsewhere.Get(), false));
 
     auto station = MakeComObject<CLVShellFolder>();
-    UniquePidl item = StationItem(L"Station 1");
+    UniqueChildPidl item = StationItem(L"Station 1");
     ASSERT_EQ(S_OK, station->SetUp(root.Get(), Child(item)));
     EXPECT_EQ(L"\\Quorvel Digital Level\\Station 1", FolderPath(*station.Get(), false));
     EXPECT_EQ(std::wstring(kPrefix) + L"\\Station 1", FolderPath(*station.Get(), true));
@@ -47,7 +48,7 @@ TEST_F(ShellFolderTest, ParseDisplayNameInTheRoot) {
         {L"\\\\Station 2\\", {{PT_STATION, L"Station 2"}}},  // extra separators name nothing
         {longest, {{PT_STATION, longest}}},
     };
-    UniquePidl list;
+    UniqueRelativePidl list;
     for (const auto& [name, items] : parsed) {
         ASSERT_EQ(S_OK, Parse(root_.Get(), name, list));
         EXPECT_EQ(items, ItemsOf(list));
@@ -66,25 +67,27 @@ TEST_F(ShellFolderTest, BindToStationThenParseAndNameItsFile) {
     // The station folder keeps its parent alive: the shell may release the root first.
     root_.Reset();
 
-    UniquePidl file;
+    UniqueRelativePidl file;
     ASSERT_EQ(S_OK, Parse(stationFolder.Get(), L"file1.lv", file));
     EXPECT_EQ((Items{{PT_FILE, L"file1.lv"}}), ItemsOf(file));
+    // One item, as the shell then hands it back: a child.
+    const UniqueChildPidl fileItem(manager_.CopyItem(file.get()));
     std::wstring text;
-    ASSERT_EQ(S_OK, DisplayName(stationFolder.Get(), file, SHGDN_FORPARSING, text));
+    ASSERT_EQ(S_OK, DisplayName(stationFolder.Get(), fileItem, SHGDN_FORPARSING, text));
     EXPECT_EQ(std::wstring(kPrefix) + L"\\Station 1\\file1.lv", text);
-    ASSERT_EQ(S_OK, DisplayName(stationFolder.Get(), file, SHGDN_NORMAL, text));
+    ASSERT_EQ(S_OK, DisplayName(stationFolder.Get(), fileItem, SHGDN_NORMAL, text));
     EXPECT_EQ(L"file1.lv", text);
 
     // Two names in a station folder: the station itself and a file named by the first, the rest
     // ignored (the whole path can hold a root, a station and a file, nothing more).
-    UniquePidl pair;
+    UniqueRelativePidl pair;
     ASSERT_EQ(S_OK, Parse(stationFolder.Get(), L"A\\B", pair));
     EXPECT_EQ((Items{{PT_STATION, L"Station 1"}, {PT_FILE, L"A"}}), ItemsOf(pair));
 }
 
 TEST_F(ShellFolderTest, RefusedObjectsComeBackNull) {
-    UniquePidl file = FileItem(L"file1.lv");
-    UniquePidl station = StationItem(L"S");
+    UniqueChildPidl file = FileItem(L"file1.lv");
+    UniqueChildPidl station = StationItem(L"S");
     void* object = reinterpret_cast<void*>(1);
     EXPECT_EQ(E_INVALIDARG, root_->BindToObject(Child(file), nullptr, IID_IShellFolder, &object));
     EXPECT_EQ(nullptr, object);

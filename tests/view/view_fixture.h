@@ -111,9 +111,10 @@ protected:
         ComPtr<IPersistFolder> persist;
         EXPECT_EQ(S_OK, folder.As(&persist));
         EXPECT_EQ(S_OK, persist->Initialize(nullptr));
-        UniquePidl own(manager_.CreateRootPidl());
+        UniqueRelativePidl own(manager_.CreateRootPidl());
         if (!station.empty()) {
-            UniquePidl item(manager_.CreateItemPidl((L"Quorvel Digital Level\\" + station).c_str()));
+            UniqueChildPidl item(
+                manager_.CreateItemPidl((L"Quorvel Digital Level\\" + station).c_str()));
             ComPtr<IShellFolder> stationFolder;
             EXPECT_EQ(S_OK, folder->BindToObject(reinterpret_cast<PCUIDLIST_RELATIVE>(item.get()),
                                                  nullptr, IID_PPV_ARGS(&stationFolder)));
