@@ -1,6 +1,7 @@
 // The namespace's folder: its interfaces, its class identifier and the objects it creates.
 #include "server/lv_shell_folder.h"
 
+#include "download/dialog_station_downloader.h"
 #include "namespace/lv_enum_id_list.h"
 #include "namespace/lv_extract_icon.h"
 #include "namespace/lv_query_info.h"
@@ -106,7 +107,7 @@ HRESULT CLVShellFolder::GetUIObjectOf(HWND, UINT count, PCUITEMID_CHILD_ARRAY it
 HRESULT CLVShellFolder::CreateDataObject(PCUITEMID_CHILD item, REFIID iid, void** object) {
     UniqueRelativePidl fullList;
     RETURN_IF_FAILED(CreateFullList(item, fullList));
-    auto dataObject = MakeComObject<CLVDataObject>();
+    auto dataObject = MakeComObject<CLVDataObject>(MakeDialogStationDownloader());
     RETURN_IF_FAILED(dataObject->SetItem(fullList.get()));
     RETURN_IF_FAILED(dataObject->SetFolderLocation(Location()));
     return dataObject->QueryInterface(iid, object);
