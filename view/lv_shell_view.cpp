@@ -13,7 +13,6 @@
 namespace {
 
 constexpr wchar_t kViewWindowClass[] = L"LVViewNSClass";
-constexpr UINT kReadColumnWidthsMessage = WM_APP + 1;
 
 bool RegisterViewWindowClass(WNDPROC procedure) noexcept {
     WNDCLASSEXW windowClass{};
@@ -34,23 +33,24 @@ bool RegisterViewWindowClass(WNDPROC procedure) noexcept {
 CLVShellView::~CLVShellView() {
     // A browser that released the view without destroying its window (or a failed creation)
     // leaves no window, thread or menu behind.
-    StopFillThreads();
-    RemoveMenus();
+    list_.StopFill();
+    menus_.RemoveMenus();
     notifyWindow_.Destroy();
-    if (window_)
-        ::DestroyWindow(window_);
+    window_.reset();
 }
 
 HRESULT CLVShellView::SetUp(IShellFolder* folder, PCUIDLIST_RELATIVE own) noexcept {
     RETURN_HR_IF(E_INVALIDARG, !folder || !own);
     try {
-        folder_ = folder;
-        ownIdentifier_.reset(manager_.CopyPidl(own));
-        RETURN_IF_NULL_ALLOC(ownIdentifier_.get());
-        folderKind_ = manager_.GetLastItemKind(own);
-        folderPath_ = kRootItemName;
-        if (folderKind_ == PT_STATION)
-            folderPath_ += L'\\' + manager_.GetItemName(manager_.GetLastItem(own));
+        CPidlMgr manager;
+        folder_.folder = folder;
+        folder_.kind = manager.GetLastItemKind(own);
+        folder_.path = kRootItemName;
+        if (folder_.kind == PT_STATION)
+            folder_.path += L'\\' + manager.GetItemName(manager.GetLastItem(own));
+        RETURN_IF_FAILED(menus_.SetUp(folder_, own));
+        list_.SetUp(folder_);
+        commands_.SetUp(folder_);
         return S_OK;
     }
     CATCH_RETURN()
@@ -69,16 +69,13 @@ HRESULT CLVShellView::QueryInterface(REFIID iid, void** object) {
 HRESULT CLVShellView::GetWindow(HWND* window) {
     if (!window)
         return E_POINTER;
-    *window = window_;
+    *window = window_.get();
     return window_ ? S_OK : E_FAIL;
 }
 
 HRESULT CLVShellView::TranslateAccelerator(MSG* message) {
-    if (message && window_ && accelerators_ &&
-        ::TranslateAcceleratorW(window_, accelerators_.get(), message)) {
-        translatedKey_ = message->wParam;
-        translatedKeyTime_ = static_cast<LONG>(message->time);
-    }
+    if (message)
+        commands_.TranslateAccelerator(*message);
     // S_FALSE even for a translated key: the browser goes on processing the message, as the
     // folder always let it.
     return S_FALSE;
@@ -88,13 +85,13 @@ HRESULT CLVShellView::UIActivate(UINT state) {
     try {
         switch (state) {
             case SVUIA_DEACTIVATE:
-                SetActivation(ViewActivation::Deactivated);
+                menus_.SetActivation(ViewActivation::Deactivated);
                 break;
             case SVUIA_ACTIVATE_NOFOCUS:
-                SetActivation(ViewActivation::ActiveWithoutFocus);
+                menus_.SetActivation(ViewActivation::ActiveWithoutFocus);
                 break;
             default:
-                SetActivation(ViewActivation::ActiveWithFocus);
+                menus_.SetActivation(ViewActivation::ActiveWithFocus);
                 break;
         }
         return S_OK;
@@ -103,14 +100,7 @@ HRESULT CLVShellView::UIActivate(UINT state) {
 }
 
 HRESULT CLVShellView::Refresh() {
-    if (!list_.Window())
-        return E_FAIL;
-    try {
-        list_.Send(LVM_DELETEALLITEMS);
-        StartFill();
-        return S_OK;
-    }
-    CATCH_RETURN()
+    return list_.Refresh();
 }
 
 HRESULT CLVShellView::CreateViewWindow(IShellView*, LPCFOLDERSETTINGS settings,
@@ -120,32 +110,37 @@ HRESULT CLVShellView::CreateViewWindow(IShellView*, LPCFOLDERSETTINGS settings,
     *window = nullptr;
     RETURN_HR_IF(E_INVALIDARG, !settings || !browser || !area);
     // A view made by its class factory has no folder to show.
-    RETURN_HR_IF(E_UNEXPECTED, window_ != nullptr || !folder_);
+    RETURN_HR_IF(E_UNEXPECTED, window_ || !folder_.folder);
     try {
         RETURN_HR_IF(E_FAIL, !RegisterViewWindowClass(&WindowProcedure));
         browser_ = browser;
-        dialogBrowser_.Reset();
         // Only a file dialog's browser is meant to offer it; Explorer's answers too, and then
         // the view says "Select" where it means "Open", as on Windows.
-        (void)browser->QueryInterface(IID_PPV_ARGS(&dialogBrowser_));
-        settings_ = *settings;
-        if (settings_.ViewMode < FVM_ICON || settings_.ViewMode > FVM_DETAILS)
-            settings_.ViewMode = FVM_ICON;
+        Microsoft::WRL::ComPtr<ICommDlgBrowser> dialogBrowser;
+        (void)browser->QueryInterface(IID_PPV_ARGS(&dialogBrowser));
+        menus_.SetBrowser(browser, dialogBrowser != nullptr);
+        commands_.SetBrowser(browser, dialogBrowser.Get());
+        folderFlags_ = settings->fFlags;
+        UINT viewMode = settings->ViewMode;
+        if (viewMode < FVM_ICON || viewMode > FVM_DETAILS)
+            viewMode = FVM_ICON;
+        list_.SetViewMode(viewMode);
         // No buttons of ours for the browser's toolbar; a browser without one says so, which
         // changes nothing.
         (void)browser->SetToolbarItems(nullptr, 0, FCT_MERGE);
-        RETURN_IF_FAILED(browser->GetWindow(&parent_));
+        HWND parent = nullptr;
+        RETURN_IF_FAILED(browser->GetWindow(&parent));
 
+        // The window procedure takes the window into window_ with its first message.
         const HWND created =
             ::CreateWindowExW(0, kViewWindowClass, L"", WS_CHILD | WS_VISIBLE | WS_CLIPSIBLINGS,
                               area->left, area->top, area->right - area->left,
-                              area->bottom - area->top, parent_, nullptr, ThisModule(), this);
+                              area->bottom - area->top, parent, nullptr, ThisModule(), this);
         RETURN_HR_IF(E_FAIL, !created);
-        accelerators_.reset(
-            ::LoadAcceleratorsW(ThisModule(), MAKEINTRESOURCEW(IDR_VIEW_ACCELERATORS)));
+        commands_.LoadAccelerators();
         // Without the window the view only misses other views' changes.
-        (void)notifyWindow_.Create(window_);
-        *window = window_;
+        (void)notifyWindow_.Create(window_.get());
+        *window = window_.get();
         return S_OK;
     }
     CATCH_RETURN()
@@ -153,21 +148,20 @@ HRESULT CLVShellView::CreateViewWindow(IShellView*, LPCFOLDERSETTINGS settings,
 
 HRESULT CLVShellView::DestroyViewWindow() {
     try {
-        SetActivation(ViewActivation::Deactivated);
+        menus_.SetActivation(ViewActivation::Deactivated);
     }
     CATCH_LOG()
-    StopFillThreads();
+    list_.StopFill();
     notifyWindow_.Destroy();
-    if (window_)
-        ::DestroyWindow(window_);
-    accelerators_.reset();
+    window_.reset();
+    commands_.UnloadAccelerators();
     return S_OK;
 }
 
 HRESULT CLVShellView::GetCurrentInfo(LPFOLDERSETTINGS settings) {
     if (!settings)
         return E_POINTER;
-    *settings = settings_;
+    *settings = FOLDERSETTINGS{list_.ViewMode(), folderFlags_};
     return S_OK;
 }
 
@@ -178,12 +172,12 @@ HRESULT CLVShellView::GetItemObject(UINT item, REFIID iid, void** object) {
     if ((item & SVGIO_TYPE_MASK) != SVGIO_SELECTION)
         return E_NOINTERFACE;
     try {
-        const std::vector<SelectedItem> selection = Selection();
+        const std::vector<CShellViewList::SelectedItem> selection = list_.Selection();
         if (selection.empty())
             return E_INVALIDARG;
         // A multiple selection still gives an object for its first item only.
         PCUITEMID_CHILD first = selection.front().item;
-        return folder_->GetUIObjectOf(window_, 1, &first, iid, nullptr, object);
+        return folder_.folder->GetUIObjectOf(window_.get(), 1, &first, iid, nullptr, object);
     }
     CATCH_RETURN()
 }
@@ -205,7 +199,7 @@ HRESULT CLVShellView::Exec(const GUID* group, DWORD command, DWORD, VARIANT*, VA
     if (!group || (*group != CGID_Explorer && *group != CGID_ShellDocView))
         return OLECMDERR_E_UNKNOWNGROUP;
     try {
-        OnCommand(command);
+        commands_.OnCommand(command);
         return S_OK;
     }
     CATCH_RETURN()
@@ -217,80 +211,85 @@ LRESULT CALLBACK CLVShellView::WindowProcedure(HWND window, UINT message, WPARAM
     if (message == WM_NCCREATE) {
         view = static_cast<CLVShellView*>(reinterpret_cast<CREATESTRUCTW*>(lParam)->lpCreateParams);
         ::SetWindowLongPtrW(window, GWLP_USERDATA, reinterpret_cast<LONG_PTR>(view));
-        view->window_ = window;
+        view->SetViewWindow(window);
     }
     if (!view)
         return ::DefWindowProcW(window, message, wParam, lParam);
     // A window procedure is the edge of the view's code: nothing may unwind into the system.
     try {
-        return view->HandleMessage(message, wParam, lParam);
+        return view->HandleMessage(window, message, wParam, lParam);
     }
     CATCH_LOG()
     return ::DefWindowProcW(window, message, wParam, lParam);
 }
 
-LRESULT CLVShellView::HandleMessage(UINT message, WPARAM wParam, LPARAM lParam) {
-    const HWND window = window_;
+void CLVShellView::SetViewWindow(HWND window) noexcept {
+    if (window)
+        window_.reset(window);
+    else
+        (void)window_.release();  // the window is going of itself, or window_ let it go already
+    menus_.SetViewWindow(window);
+    commands_.SetViewWindow(window);
+}
+
+void CLVShellView::ActivateWithFocus() {
+    if (browser_)
+        (void)browser_->OnViewWindowActive(this);
+    menus_.SetActivation(ViewActivation::ActiveWithFocus);
+}
+
+LRESULT CLVShellView::HandleMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
     switch (message) {
         case WM_CREATE:
-            if (!CreateList())
+            if (!list_.Create(window, this))
                 return -1;
-            StartFill();
+            list_.StartFill();
             return 0;
         case WM_DESTROY:
-            StopFillThreads();
-            // The drop target holds this view: revoking it ends that cycle.
-            if (dropTargetRegistered_)
-                (void)::RevokeDragDrop(list_.Window());
-            dropTargetRegistered_ = false;
             list_.Destroy();
-            animation_.reset();
             return 0;
         case WM_NCDESTROY:
             ::SetWindowLongPtrW(window, GWLP_USERDATA, 0);
-            window_ = nullptr;
+            SetViewWindow(nullptr);
             break;
         case WM_SIZE:
-            ::MoveWindow(list_.Window(), 0, 0, LOWORD(lParam), HIWORD(lParam), TRUE);
+            list_.Resize(LOWORD(lParam), HIWORD(lParam));
             return 0;
         case WM_ACTIVATE:
             if (LOWORD(wParam) != WA_INACTIVE)
-                SetActivation(ViewActivation::ActiveWithFocus);
+                menus_.SetActivation(ViewActivation::ActiveWithFocus);
             return 0;
         case WM_SETFOCUS:
-            // The browser has to know which view to send its keys to.
-            if (browser_)
-                (void)browser_->OnViewWindowActive(this);
-            SetActivation(ViewActivation::ActiveWithFocus);
+            ActivateWithFocus();
             ::SetFocus(list_.Window());
             return 0;
         case WM_KILLFOCUS:
-            if (activation_ == ViewActivation::ActiveWithFocus)
-                SetActivation(ViewActivation::ActiveWithoutFocus);
+            if (menus_.Activation() == ViewActivation::ActiveWithFocus)
+                menus_.SetActivation(ViewActivation::ActiveWithoutFocus);
             return 0;
         case WM_SETTINGCHANGE:
-            ApplyViewModeStyle();
+            list_.ApplyViewModeStyle();
             return 0;
         case WM_NOTIFY:
             return OnNotify(*reinterpret_cast<const NMHDR*>(lParam));
         case WM_CONTEXTMENU:
-            ShowPopupMenu(POINT{GET_X_LPARAM(lParam), GET_Y_LPARAM(lParam)});
+            menus_.ShowPopupMenu(POINT{GET_X_LPARAM(lParam), GET_Y_LPARAM(lParam)});
             return 0;
         case WM_COMMAND:
-            OnCommand(LOWORD(wParam));
+            commands_.OnCommand(LOWORD(wParam));
             return 0;
         case kReadColumnWidthsMessage:
-            ReadColumnWidths();
+            list_.ReadColumnWidths();
             return 0;
         default:
             break;
     }
     if (message != 0 && message == g_registeredMessages.getEnumIdList) {
-        OnEnumeratorReady(reinterpret_cast<IEnumIDList*>(lParam));
+        list_.OnEnumeratorReady(reinterpret_cast<IEnumIDList*>(lParam));
         return 0;
     }
     if (message != 0 && message == g_registeredMessages.globalNotify) {
-        if (wParam == 1 && static_cast<DWORD>(lParam) == folderKind_)
+        if (wParam == 1 && static_cast<DWORD>(lParam) == folder_.kind)
             (void)Refresh();  // fails only without a list, which there is nothing to refresh in
         return 0;
     }
@@ -300,64 +299,43 @@ LRESULT CLVShellView::HandleMessage(UINT message, WPARAM wParam, LPARAM lParam) 
 LRESULT CLVShellView::OnNotify(const NMHDR& header) {
     // The header's notifications reach the view through the list.
     if (header.code == HDN_ENDTRACKW || header.code == HDN_ENDTRACKA) {
-        // The header applies the new width after this notification: read it back afterwards.
-        ::PostMessageW(window_, kReadColumnWidthsMessage, 0, 0);
+        list_.OnHeaderEndTrack();
         return 0;
     }
     if (header.hwndFrom != list_.Window())
         return 0;
     switch (header.code) {
         case NM_SETFOCUS:
-            if (browser_)
-                (void)browser_->OnViewWindowActive(this);
-            SetActivation(ViewActivation::ActiveWithFocus);
+            ActivateWithFocus();
             return 0;
         case NM_KILLFOCUS:
-            SetActivation(ViewActivation::Deactivated);
+            menus_.SetActivation(ViewActivation::Deactivated);
             return 0;
         case LVN_GETDISPINFOW:
-            OnGetDisplayInfo(*reinterpret_cast<NMLVDISPINFOW*>(const_cast<NMHDR*>(&header)));
+            list_.OnGetDisplayInfo(*reinterpret_cast<NMLVDISPINFOW*>(const_cast<NMHDR*>(&header)));
             return 0;
-        case LVN_DELETEITEM: {
-            const auto& item = reinterpret_cast<const NMLISTVIEW&>(header);
-            UniquePidl owned(reinterpret_cast<LPITEMIDLIST>(item.lParam));
+        case LVN_DELETEITEM:
+            list_.OnDeleteItem(reinterpret_cast<const NMLISTVIEW&>(header));
             return 0;
-        }
         case LVN_COLUMNCLICK:
-            OnColumnClick(reinterpret_cast<const NMLISTVIEW&>(header).iSubItem);
+            list_.OnColumnClick(reinterpret_cast<const NMLISTVIEW&>(header).iSubItem);
             return 0;
         case LVN_KEYDOWN:
-            OnListKeyDown(reinterpret_cast<const NMLVKEYDOWN&>(header).wVKey);
+            commands_.OnListKeyDown(reinterpret_cast<const NMLVKEYDOWN&>(header).wVKey);
             return 0;
         case LVN_ITEMACTIVATE:
-            OpenSelection();
+            commands_.OpenSelection();
             return 0;
         case LVN_BEGINDRAG:
-            BeginDrag();
+            commands_.BeginDrag();
             return 0;
         case LVN_ITEMCHANGED:
             // The menus' enabled states follow the selection.
             if (reinterpret_cast<const NMLISTVIEW&>(header).uChanged & LVIF_STATE)
-                UpdateMenuStates();
+                menus_.UpdateMenuStates();
             return 0;
         default:
             break;
     }
     return 0;
-}
-
-void CLVShellView::OnListKeyDown(WORD key) {
-    // The message being dispatched is the one the browser already gave to TranslateAccelerator.
-    if (translatedKey_ == key && translatedKeyTime_ == ::GetMessageTime()) {
-        translatedKey_ = 0;
-        return;
-    }
-    if (!accelerators_)
-        return;
-    MSG message{};
-    message.hwnd = list_.Window();
-    message.message = WM_KEYDOWN;
-    message.wParam = key;
-    message.time = static_cast<DWORD>(::GetMessageTime());
-    ::TranslateAcceleratorW(window_, accelerators_.get(), &message);
 }

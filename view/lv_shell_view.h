@@ -1,5 +1,6 @@
-// CLVShellView: the folder's own view in a shell browser: a list of the folder's items, its
-// commands in the browser's menus, its status text, and every view of the same kind kept in step.
+// CLVShellView: the folder's own view in a shell browser: its COM face and its window, which hands
+// the list's notifications and the browser's keys and commands to the view's list, menus and
+// commands, and keeps every view of the same kind in step.
 #pragma once
 
 #include <windows.h>
@@ -8,19 +9,13 @@
 #include <shlobj.h>
 #include <wrl/client.h>
 
-#include <string>
-#include <vector>
-
-#include "namespace/pidl_manager.h"
 #include "support/com_object.h"
 #include "support/unique_resource.h"
-#include "view/portable/menu_rules.h"
-#include "view/shell_view_list_window.h"
+#include "view/shell_view_commands.h"
+#include "view/shell_view_folder.h"
+#include "view/shell_view_list.h"
+#include "view/shell_view_menus.h"
 #include "view/view_notify_window.h"
-
-class CLVDataObject;
-
-enum class ViewActivation { Deactivated, ActiveWithoutFocus, ActiveWithFocus };
 
 class CLVShellView final : public ComObject<IShellView, IOleCommandTarget> {
 public:
@@ -62,83 +57,21 @@ public:
 private:
     static LRESULT CALLBACK WindowProcedure(HWND window, UINT message, WPARAM wParam,
                                             LPARAM lParam);
-    LRESULT HandleMessage(UINT message, WPARAM wParam, LPARAM lParam);
+    LRESULT HandleMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
     LRESULT OnNotify(const NMHDR& header);
-    // A key pressed in the list that no browser translated (Wine's never call
-    // TranslateAccelerator).
-    void OnListKeyDown(WORD key);
+    // The view window, from its first message to its last; the parts that act through it are told.
+    void SetViewWindow(HWND window) noexcept;
+    // The view or its list got the focus: the browser must know which view to send its keys to.
+    void ActivateWithFocus();
 
-    // Activation, menus and status text (shell_view_menus.cpp).
-    void SetActivation(ViewActivation state);
-    void RemoveMenus() noexcept;
-    void BuildMenus();
-    // Enabled states and radio mark of the merged items, after the selection changed.
-    void UpdateMenuStates() noexcept;
-    void ShowStatusText();
-    void ShowPopupMenu(POINT screenPosition);
-    MenuContext CurrentMenuContext() const;
-
-    // The list (shell_view_list.cpp).
-    bool CreateList();
-    void ApplyViewModeStyle() noexcept;
-    void ResetColumnsAndImages();
-    void StartFill();
-    void OnEnumeratorReady(IEnumIDList* enumerator);
-    void Sort(int columnArgument);
-    void OnColumnClick(int column);
-    void ReadColumnWidths() noexcept;
-    void OnGetDisplayInfo(NMLVDISPINFOW& info);
-    void StopFillThreads() noexcept;
-    static DWORD WINAPI FillThread(void* parameter);
-
-    // Commands (shell_view_commands.cpp).
-    void OnCommand(UINT command);
-    void AddStation();
-    void OpenSelection();
-    void DeleteSelection();
-    void EditSelectedStations();
-    void CopySelection();
-    void PasteStations();
-    void SetViewMode(UINT mode);
-    void BeginDrag();
-    void ChangedStations();
-
-    // The list's items: index and identifier (null for the entry) of each selected one, in list
-    // order.
-    struct SelectedItem {
-        int index;
-        PCUITEMID_CHILD item;
-    };
-    std::vector<SelectedItem> Selection() const;
-    // The selected items with an identifier, added to the data object by their full identifiers;
-    // S_FALSE when the selection held none.
-    HRESULT AddSelectedItems(CLVDataObject& dataObject,
-                             const std::vector<SelectedItem>& selection) const;
-    // Items' internal full identifiers: the folder's path, then the item.
-    LPITEMIDLIST CreateFullItem(PCUITEMID_CHILD item) const;
-    bool IsTopFolder() const noexcept;
-
-    CPidlMgr manager_;
-    Microsoft::WRL::ComPtr<IShellFolder> folder_;
-    UniquePidl ownIdentifier_;
-    DWORD folderKind_ = 0;
-    std::wstring folderPath_;  // "Quorvel Digital Level", then "\" and the station for a station
-
+    ShellViewFolder folder_;
     Microsoft::WRL::ComPtr<IShellBrowser> browser_;
-    Microsoft::WRL::ComPtr<ICommDlgBrowser> dialogBrowser_;
-    FOLDERSETTINGS settings_{FVM_ICON, 0};
-    HWND parent_ = nullptr;
-    HWND window_ = nullptr;
-    CShellViewListWindow list_;
-    bool dropTargetRegistered_ = false;
-    UniqueWindow animation_;
+    UINT folderFlags_ = 0;  // as the browser gave them; the view mode is the list's
+
+    CShellViewList list_;
+    CShellViewMenus menus_{list_};
+    CShellViewCommands commands_{list_, menus_, *this};
     CViewNotifyWindow notifyWindow_;
-    UniqueAccelerators accelerators_;
-    // The last key that TranslateAccelerator turned into a command: when the browser goes on to
-    // dispatch that same message, the list must not turn it into a command again.
-    WPARAM translatedKey_ = 0;
-    LONG translatedKeyTime_ = 0;
-    ViewActivation activation_ = ViewActivation::Deactivated;
-    UniqueMenu menu_;
-    std::vector<UniqueHandle> fillThreads_;
+    // Declared last: should the members go while the window is still there, it goes first.
+    UniqueWindow window_;
 };

@@ -1,9 +1,10 @@
-// The view's commands: add, open, delete, edit, copy and paste stations, the view modes, and the
-// drag of a station's file.
-#include "view/lv_shell_view.h"
+// The view's commands: add, open, delete, edit, copy and paste stations, the view modes, the
+// drag of a station's file, and the keys that ask for them.
+#include "view/shell_view_commands.h"
 
 #include "res/ids_stations.h"
 #include "res/ids_view.h"
+#include "support/module_instance.h"
 #include "stations/portable/station_names.h"
 #include "stations/station_dialog.h"
 #include "stations/station_list_block.h"
@@ -11,6 +12,7 @@
 #include "support/error_handling.h"
 #include "support/text_lookup.h"
 #include "view/lv_data_object.h"
+#include "view/view_notify_window.h"
 
 namespace {
 
@@ -31,14 +33,49 @@ POINT DragImageOffset(HWND list, POINT imageOrigin) {
 
 }  // namespace
 
-void CLVShellView::OnCommand(UINT command) {
+void CShellViewCommands::SetBrowser(IShellBrowser* browser,
+                                    ICommDlgBrowser* dialogBrowser) noexcept {
+    browser_ = browser;
+    dialogBrowser_ = dialogBrowser;
+}
+
+void CShellViewCommands::LoadAccelerators() noexcept {
+    accelerators_.reset(
+        ::LoadAcceleratorsW(ThisModule(), MAKEINTRESOURCEW(IDR_VIEW_ACCELERATORS)));
+}
+
+void CShellViewCommands::TranslateAccelerator(MSG& message) noexcept {
+    if (window_ && accelerators_ &&
+        ::TranslateAcceleratorW(window_, accelerators_.get(), &message)) {
+        translatedKey_ = message.wParam;
+        translatedKeyTime_ = static_cast<LONG>(message.time);
+    }
+}
+
+void CShellViewCommands::OnListKeyDown(WORD key) {
+    // The message being dispatched is the one the browser already gave to TranslateAccelerator.
+    if (translatedKey_ == key && translatedKeyTime_ == ::GetMessageTime()) {
+        translatedKey_ = 0;
+        return;
+    }
+    if (!accelerators_)
+        return;
+    MSG message{};
+    message.hwnd = list_.Window();
+    message.message = WM_KEYDOWN;
+    message.wParam = key;
+    message.time = static_cast<DWORD>(::GetMessageTime());
+    ::TranslateAcceleratorW(window_, accelerators_.get(), &message);
+}
+
+void CShellViewCommands::OnCommand(UINT command) {
     if (const UINT mode = ViewModeOfCommand(command)) {
         SetViewMode(mode);
         return;
     }
     switch (command) {
         case IDM_REFRESH:
-            (void)Refresh();  // without a list there is nothing to refresh
+            (void)list_.Refresh();  // without a list there is nothing to refresh
             break;
         case IDM_CREATE_STATION:
             AddStation();
@@ -63,12 +100,12 @@ void CLVShellView::OnCommand(UINT command) {
     }
 }
 
-void CLVShellView::ChangedStations() {
-    (void)Refresh();
-    BroadcastStationsChanged(folderKind_);
+void CShellViewCommands::ChangedStations() {
+    (void)list_.Refresh();
+    BroadcastStationsChanged(folder_.kind);
 }
 
-void CLVShellView::AddStation() {
+void CShellViewCommands::AddStation() {
     Station station = DefaultStation();
     station.Name = MakeUniqueStationName(LoadUiText(IDS_NEW_DIGITAL_LEVEL));
     CStationDialog dialog(window_, station, true);
@@ -77,12 +114,12 @@ void CLVShellView::AddStation() {
         ChangedStations();
 }
 
-void CLVShellView::OpenSelection() {
-    const std::vector<SelectedItem> selection = Selection();
+void CShellViewCommands::OpenSelection() {
+    const std::vector<SelectedItem> selection = list_.Selection();
     if (selection.empty())
         return;
     const SelectedItem& first = selection.front();
-    if (IsTopFolder() && !first.item) {
+    if (folder_.IsTopFolder() && !first.item) {
         AddStation();
         return;
     }
@@ -90,7 +127,7 @@ void CLVShellView::OpenSelection() {
         return;
     // Browsing destroys this view and its list (Wine's browsers do it before returning): keep
     // the view and the identifier alive across the call.
-    Microsoft::WRL::ComPtr<CLVShellView> keepAlive(this);
+    Microsoft::WRL::ComPtr<IShellView> keepAlive(&view_);
     Microsoft::WRL::ComPtr<ICommDlgBrowser> dialogBrowser = dialogBrowser_;
     UniquePidl item(manager_.CopyPidl(reinterpret_cast<LPCITEMIDLIST>(first.item)));
     if (!item)
@@ -98,14 +135,14 @@ void CLVShellView::OpenSelection() {
     if (FAILED(browser_->BrowseObject(reinterpret_cast<PCUIDLIST_RELATIVE>(item.get()), SBSP_DEFBROWSER | SBSP_RELATIVE)) &&
         dialogBrowser) {
         // A file is not a folder to browse to: in a file dialog, opening it chooses it.
-        (void)dialogBrowser->OnDefaultCommand(this);
+        (void)dialogBrowser->OnDefaultCommand(&view_);
     }
 }
 
-void CLVShellView::DeleteSelection() {
-    if (!IsTopFolder())
+void CShellViewCommands::DeleteSelection() {
+    if (!folder_.IsTopFolder())
         return;
-    const std::vector<SelectedItem> selection = Selection();
+    const std::vector<SelectedItem> selection = list_.Selection();
     if (selection.empty())
         return;
     for (const SelectedItem& selected : selection) {
@@ -119,10 +156,10 @@ void CLVShellView::DeleteSelection() {
     ChangedStations();
 }
 
-void CLVShellView::EditSelectedStations() {
+void CShellViewCommands::EditSelectedStations() {
     // The names first: each OK refreshes the list, which frees the items' identifiers.
     std::vector<std::wstring> names;
-    for (const SelectedItem& selected : Selection()) {
+    for (const SelectedItem& selected : list_.Selection()) {
         if (selected.item)
             names.push_back(manager_.GetItemName(reinterpret_cast<LPCITEMIDLIST>(selected.item)));
     }
@@ -136,15 +173,15 @@ void CLVShellView::EditSelectedStations() {
             continue;
         CStationDialog dialog(window_, station, false);
         if (dialog.DoModal() == IDOK)
-            (void)Refresh();
+            (void)list_.Refresh();
     }
-    BroadcastStationsChanged(folderKind_);
+    BroadcastStationsChanged(folder_.kind);
 }
 
-void CLVShellView::CopySelection() {
-    if (folderKind_ != PT_ROOT && folderKind_ != PT_STATION)
+void CShellViewCommands::CopySelection() {
+    if (folder_.kind != PT_ROOT && folder_.kind != PT_STATION)
         return;
-    const std::vector<SelectedItem> selection = Selection();
+    const std::vector<SelectedItem> selection = list_.Selection();
     if (selection.empty())
         return;
     auto dataObject = MakeComObject<CLVDataObject>();
@@ -154,8 +191,8 @@ void CLVShellView::CopySelection() {
         (void)::OleSetClipboard(dataObject.Get());
 }
 
-HRESULT CLVShellView::AddSelectedItems(CLVDataObject& dataObject,
-                                       const std::vector<SelectedItem>& selection) const {
+HRESULT CShellViewCommands::AddSelectedItems(CLVDataObject& dataObject,
+                                             const std::vector<SelectedItem>& selection) const {
     bool added = false;
     for (const SelectedItem& selected : selection) {
         if (!selected.item)
@@ -172,7 +209,7 @@ HRESULT CLVShellView::AddSelectedItems(CLVDataObject& dataObject,
     // never placed (S_FALSE) leaves that format out; the others still carry the selection.
     Microsoft::WRL::ComPtr<IPersistFolder2> persist;
     UniqueCoTaskMem location;
-    if (SUCCEEDED(folder_.As(&persist)) &&
+    if (SUCCEEDED(folder_.folder.As(&persist)) &&
         persist->GetCurFolder(reinterpret_cast<PIDLIST_ABSOLUTE*>(location.put())) == S_OK) {
         RETURN_IF_FAILED(
             dataObject.SetFolderLocation(static_cast<PCIDLIST_ABSOLUTE>(location.get())));
@@ -180,8 +217,8 @@ HRESULT CLVShellView::AddSelectedItems(CLVDataObject& dataObject,
     return S_OK;
 }
 
-void CLVShellView::PasteStations() {
-    if (!IsTopFolder())
+void CShellViewCommands::PasteStations() {
+    if (!folder_.IsTopFolder())
         return;
     Microsoft::WRL::ComPtr<IDataObject> clipboard;
     if (FAILED(::OleGetClipboard(&clipboard)) || !clipboard)
@@ -206,22 +243,20 @@ void CLVShellView::PasteStations() {
     ChangedStations();
 }
 
-void CLVShellView::SetViewMode(UINT mode) {
-    settings_.ViewMode = mode;
-    ApplyViewModeStyle();
-    ResetColumnsAndImages();
-    (void)Refresh();
+void CShellViewCommands::SetViewMode(UINT mode) {
+    list_.SetViewMode(mode);
+    (void)list_.Refresh();
     if (mode == FVM_ICON)
         list_.Send(LVM_ARRANGE, LVA_SNAPTOGRID);
     // Rebuilt, so that the radio mark moves.
-    BuildMenus();
+    menus_.BuildMenus();
 }
 
-void CLVShellView::BeginDrag() {
+void CShellViewCommands::BeginDrag() {
     // Only a station's file leaves by drag; stations themselves move by copy and paste.
-    if (folderKind_ != PT_STATION)
+    if (folder_.kind != PT_STATION)
         return;
-    const std::vector<SelectedItem> selection = Selection();
+    const std::vector<SelectedItem> selection = list_.Selection();
     if (selection.empty())
         return;
     auto dataObject = MakeComObject<CLVDataObject>();
@@ -238,4 +273,10 @@ void CLVShellView::BeginDrag() {
     DWORD effect = DROPEFFECT_NONE;
     // The target decides what happens; the source has nothing to do afterwards.
     (void)::DoDragDrop(dataObject.Get(), dataObject.Get(), DROPEFFECT_COPY, &effect);
+}
+
+LPITEMIDLIST CShellViewCommands::CreateFullItem(PCUITEMID_CHILD item) const {
+    return manager_.CreatePidlFromPath(
+        (folder_.path + L'\\' + manager_.GetItemName(reinterpret_cast<LPCITEMIDLIST>(item)))
+            .c_str());
 }

@@ -1,6 +1,8 @@
 // The view's list: its styles, columns and image lists for each view mode, its asynchronous fill,
 // the texts and images it asks for, and its sorting.
-#include "view/lv_shell_view.h"
+#include "view/shell_view_list.h"
+
+#include <shlwapi.h>
 
 #include <memory>
 
@@ -60,106 +62,8 @@ struct FillRequest {
     HWND window;
 };
 
-struct SortContext {
-    IShellFolder* folder;
-    LPARAM column;
-};
-
-int CALLBACK CompareItems(LPARAM first, LPARAM second, LPARAM context) {
-    // The entry has no identifier and stays on top in either direction.
-    if (!first || !second)
-        return first ? 1 : (second ? -1 : 0);
-    const auto& sort = *reinterpret_cast<const SortContext*>(context);
-    // The folder answers with the order itself in the status value.
-    return static_cast<int>(sort.folder->CompareIDs(sort.column,
-                                                    reinterpret_cast<PCUIDLIST_RELATIVE>(first),
-                                                    reinterpret_cast<PCUIDLIST_RELATIVE>(second)));
-}
-
-}  // namespace
-
-bool CLVShellView::CreateList() {
-    // Clipping its siblings keeps the animation visible over the list while a fill runs.
-    const DWORD style = WS_CHILD | WS_VISIBLE | WS_TABSTOP | WS_CLIPSIBLINGS | LVS_AUTOARRANGE |
-                        LVS_SHAREIMAGELISTS | LVS_SHOWSELALWAYS | ListViewType(settings_.ViewMode);
-    // No label editing: stations are renamed in their property sheet only.
-    if (!list_.Create(window_, style, WS_EX_CLIENTEDGE, IDC_VIEW_LIST))
-        return false;
-    RECT area{};
-    ::GetClientRect(window_, &area);
-    ::MoveWindow(list_.Window(), 0, 0, area.right, area.bottom, FALSE);
-    ApplyViewModeStyle();
-    ResetColumnsAndImages();
-    // Files dropped on a station row or into a station's folder. Without OLE (a host that did not
-    // initialise it) the view simply takes no drops.
-    auto dropTarget = MakeComObject<CLVDropTargetOnListView>();
-    UniquePidl folder(manager_.CreatePidlFromPath(folderPath_.c_str()));
-    if (folder && SUCCEEDED(dropTarget->SetUp(list_.Window(), this,
-                                              reinterpret_cast<PCUIDLIST_RELATIVE>(folder.get()))))
-        dropTargetRegistered_ = SUCCEEDED(::RegisterDragDrop(list_.Window(), dropTarget.Get()));
-    return true;
-}
-
-void CLVShellView::ApplyViewModeStyle() noexcept {
-    const HWND list = list_.Window();
-    if (!list)
-        return;
-    const LONG_PTR style = ::GetWindowLongPtrW(list, GWL_STYLE);
-    ::SetWindowLongPtrW(
-        list, GWL_STYLE,
-        (style & ~static_cast<LONG_PTR>(LVS_TYPEMASK)) | ListViewType(settings_.ViewMode));
-    constexpr DWORD kClickMask = LVS_EX_TRACKSELECT | LVS_EX_ONECLICKACTIVATE | LVS_EX_UNDERLINEHOT;
-    list_.Send(LVM_SETEXTENDEDLISTVIEWSTYLE, kClickMask, ClickStyles());
-}
-
-void CLVShellView::ResetColumnsAndImages() {
-    list_.Send(LVM_DELETEALLITEMS);
-    while (list_.Send(LVM_DELETECOLUMN, 0)) {
-    }
-    if (settings_.ViewMode == FVM_DETAILS) {
-        std::wstring name = LoadUiText(IDS_NAME_COLUMN);
-        LVCOLUMNW column{};
-        column.mask = LVCF_FMT | LVCF_TEXT | LVCF_WIDTH | LVCF_SUBITEM;
-        column.fmt = LVCFMT_LEFT;
-        column.cx = DisplayColumnWidth(0);
-        column.pszText = name.data();
-        list_.Send(LVM_INSERTCOLUMNW, 0, reinterpret_cast<LPARAM>(&column));
-    }
-    if (settings_.ViewMode == FVM_ICON)
-        list_.Send(LVM_SETIMAGELIST, LVSIL_NORMAL, reinterpret_cast<LPARAM>(LargeIconList()));
-    else
-        list_.Send(LVM_SETIMAGELIST, LVSIL_SMALL, reinterpret_cast<LPARAM>(SmallIconList()));
-}
-
-void CLVShellView::StartFill() {
-    // A newer fill takes the animation over; the older thread's result is still taken.
-    animation_.reset();
-    RECT area{};
-    ::GetClientRect(window_, &area);
-    animation_.reset(::CreateWindowExW(
-        0, ANIMATE_CLASSW, L"", WS_CHILD | WS_VISIBLE | ACS_CENTER | ACS_TRANSPARENT | ACS_AUTOPLAY,
-        0, 0, area.right, area.bottom, window_,
-        reinterpret_cast<HMENU>(static_cast<UINT_PTR>(IDC_VIEW_ANIMATION)), ThisModule(), nullptr));
-    if (animation_) {
-        ::SetWindowPos(animation_.get(), HWND_TOP, 0, 0, 0, 0, SWP_NOMOVE | SWP_NOSIZE);
-        // Without its video the fill still runs; there is just nothing to watch.
-        ::SendMessageW(animation_.get(), ACM_OPENW, reinterpret_cast<WPARAM>(ThisModule()),
-                       reinterpret_cast<LPARAM>(MAKEINTRESOURCEW(IDR_SEARCH_ANIMATION)));
-    }
-
-    auto request = std::make_unique<FillRequest>(FillRequest{folder_, window_});
-    UniqueHandle thread(::CreateThread(nullptr, kFillThreadStackSize, &FillThread, request.get(),
-                                       STACK_SIZE_PARAM_IS_A_RESERVATION, nullptr));
-    if (!thread) {
-        // The list stays empty until the next refresh, as it would after a failed enumeration.
-        animation_.reset();
-        return;
-    }
-    request.release();  // the thread's now
-    fillThreads_.push_back(std::move(thread));
-}
-
-DWORD WINAPI CLVShellView::FillThread(void* parameter) {
+// Runs on a thread of its own: enumerates the folder and posts the enumerator to the view window.
+DWORD WINAPI FillThread(void* parameter) {
     std::unique_ptr<FillRequest> request(static_cast<FillRequest*>(parameter));
     const HRESULT apartment = ::CoInitializeEx(nullptr, COINIT_MULTITHREADED);
     IEnumIDList* enumerator = nullptr;
@@ -178,24 +82,158 @@ DWORD WINAPI CLVShellView::FillThread(void* parameter) {
     return 0;
 }
 
-void CLVShellView::StopFillThreads() noexcept {
+struct SortContext {
+    IShellFolder* folder;
+    LPARAM column;
+};
+
+int CALLBACK CompareItems(LPARAM first, LPARAM second, LPARAM context) {
+    // The entry has no identifier and stays on top in either direction.
+    if (!first || !second)
+        return first ? 1 : (second ? -1 : 0);
+    const auto& sort = *reinterpret_cast<const SortContext*>(context);
+    // The folder answers with the order itself in the status value.
+    return static_cast<int>(sort.folder->CompareIDs(sort.column,
+                                                    reinterpret_cast<PCUIDLIST_RELATIVE>(first),
+                                                    reinterpret_cast<PCUIDLIST_RELATIVE>(second)));
+}
+
+}  // namespace
+
+bool CShellViewList::Create(HWND view, IShellView* dropView) {
+    view_ = view;
+    // Clipping its siblings keeps the animation visible over the list while a fill runs.
+    const DWORD style = WS_CHILD | WS_VISIBLE | WS_TABSTOP | WS_CLIPSIBLINGS | LVS_AUTOARRANGE |
+                        LVS_SHAREIMAGELISTS | LVS_SHOWSELALWAYS | ListViewType(viewMode_);
+    // No label editing: stations are renamed in their property sheet only.
+    if (!list_.Create(view_, style, WS_EX_CLIENTEDGE, IDC_VIEW_LIST))
+        return false;
+    RECT area{};
+    ::GetClientRect(view_, &area);
+    ::MoveWindow(list_.Window(), 0, 0, area.right, area.bottom, FALSE);
+    ApplyViewModeStyle();
+    ResetColumnsAndImages();
+    // Files dropped on a station row or into a station's folder. Without OLE (a host that did not
+    // initialise it) the view simply takes no drops.
+    auto dropTarget = MakeComObject<CLVDropTargetOnListView>();
+    UniquePidl folder(manager_.CreatePidlFromPath(folder_.path.c_str()));
+    if (folder && SUCCEEDED(dropTarget->SetUp(list_.Window(), dropView,
+                                              reinterpret_cast<PCUIDLIST_RELATIVE>(folder.get()))))
+        dropTargetRegistered_ = SUCCEEDED(::RegisterDragDrop(list_.Window(), dropTarget.Get()));
+    return true;
+}
+
+void CShellViewList::Destroy() noexcept {
+    StopFill();
+    // The drop target holds the view: revoking it ends that cycle.
+    if (dropTargetRegistered_)
+        (void)::RevokeDragDrop(list_.Window());
+    dropTargetRegistered_ = false;
+    list_.Destroy();
+    animation_.reset();
+    view_ = nullptr;
+}
+
+void CShellViewList::Resize(int width, int height) noexcept {
+    ::MoveWindow(list_.Window(), 0, 0, width, height, TRUE);
+}
+
+void CShellViewList::SetViewMode(UINT mode) {
+    viewMode_ = mode;
+    if (!list_.Window())
+        return;
+    ApplyViewModeStyle();
+    ResetColumnsAndImages();
+}
+
+void CShellViewList::ApplyViewModeStyle() noexcept {
+    const HWND list = list_.Window();
+    if (!list)
+        return;
+    const LONG_PTR style = ::GetWindowLongPtrW(list, GWL_STYLE);
+    ::SetWindowLongPtrW(
+        list, GWL_STYLE,
+        (style & ~static_cast<LONG_PTR>(LVS_TYPEMASK)) | ListViewType(viewMode_));
+    constexpr DWORD kClickMask = LVS_EX_TRACKSELECT | LVS_EX_ONECLICKACTIVATE | LVS_EX_UNDERLINEHOT;
+    list_.Send(LVM_SETEXTENDEDLISTVIEWSTYLE, kClickMask, ClickStyles());
+}
+
+void CShellViewList::ResetColumnsAndImages() {
+    list_.Send(LVM_DELETEALLITEMS);
+    while (list_.Send(LVM_DELETECOLUMN, 0)) {
+    }
+    if (viewMode_ == FVM_DETAILS) {
+        std::wstring name = LoadUiText(IDS_NAME_COLUMN);
+        LVCOLUMNW column{};
+        column.mask = LVCF_FMT | LVCF_TEXT | LVCF_WIDTH | LVCF_SUBITEM;
+        column.fmt = LVCFMT_LEFT;
+        column.cx = DisplayColumnWidth(0);
+        column.pszText = name.data();
+        list_.Send(LVM_INSERTCOLUMNW, 0, reinterpret_cast<LPARAM>(&column));
+    }
+    if (viewMode_ == FVM_ICON)
+        list_.Send(LVM_SETIMAGELIST, LVSIL_NORMAL, reinterpret_cast<LPARAM>(LargeIconList()));
+    else
+        list_.Send(LVM_SETIMAGELIST, LVSIL_SMALL, reinterpret_cast<LPARAM>(SmallIconList()));
+}
+
+HRESULT CShellViewList::Refresh() noexcept {
+    if (!list_.Window())
+        return E_FAIL;
+    try {
+        list_.Send(LVM_DELETEALLITEMS);
+        StartFill();
+        return S_OK;
+    }
+    CATCH_RETURN()
+}
+
+void CShellViewList::StartFill() {
+    // A newer fill takes the animation over; the older thread's result is still taken.
+    animation_.reset();
+    RECT area{};
+    ::GetClientRect(view_, &area);
+    animation_.reset(::CreateWindowExW(
+        0, ANIMATE_CLASSW, L"", WS_CHILD | WS_VISIBLE | ACS_CENTER | ACS_TRANSPARENT | ACS_AUTOPLAY,
+        0, 0, area.right, area.bottom, view_,
+        reinterpret_cast<HMENU>(static_cast<UINT_PTR>(IDC_VIEW_ANIMATION)), ThisModule(), nullptr));
+    if (animation_) {
+        ::SetWindowPos(animation_.get(), HWND_TOP, 0, 0, 0, 0, SWP_NOMOVE | SWP_NOSIZE);
+        // Without its video the fill still runs; there is just nothing to watch.
+        ::SendMessageW(animation_.get(), ACM_OPENW, reinterpret_cast<WPARAM>(ThisModule()),
+                       reinterpret_cast<LPARAM>(MAKEINTRESOURCEW(IDR_SEARCH_ANIMATION)));
+    }
+
+    auto request = std::make_unique<FillRequest>(FillRequest{folder_.folder, view_});
+    UniqueHandle thread(::CreateThread(nullptr, kFillThreadStackSize, &FillThread, request.get(),
+                                       STACK_SIZE_PARAM_IS_A_RESERVATION, nullptr));
+    if (!thread) {
+        // The list stays empty until the next refresh, as it would after a failed enumeration.
+        animation_.reset();
+        return;
+    }
+    request.release();  // the thread's now
+    fillThreads_.push_back(std::move(thread));
+}
+
+void CShellViewList::StopFill() noexcept {
     // Each thread ends after one enumeration of the registry and one post: waiting is short, and
     // it keeps the module's code in place until the last thread has left it.
     for (UniqueHandle& thread : fillThreads_)
         ::WaitForSingleObject(thread.get(), INFINITE);
     fillThreads_.clear();
-    if (!window_)
+    if (!view_)
         return;
     // Results posted to a window about to go would be lost with their enumerators.
     MSG message;
     const UINT ready = g_registeredMessages.getEnumIdList;
-    while (ready && ::PeekMessageW(&message, window_, ready, ready, PM_REMOVE)) {
+    while (ready && ::PeekMessageW(&message, view_, ready, ready, PM_REMOVE)) {
         if (auto* enumerator = reinterpret_cast<IEnumIDList*>(message.lParam))
             enumerator->Release();
     }
 }
 
-void CLVShellView::OnEnumeratorReady(IEnumIDList* enumerator) {
+void CShellViewList::OnEnumeratorReady(IEnumIDList* enumerator) {
     Microsoft::WRL::ComPtr<IEnumIDList> owned;
     *owned.GetAddressOf() = enumerator;  // the posted reference is ours now
     animation_.reset();
@@ -209,7 +247,7 @@ void CLVShellView::OnEnumeratorReady(IEnumIDList* enumerator) {
     // late replaces what is shown instead of adding to it.
     list_.Send(LVM_DELETEALLITEMS);
     int index = 0;
-    if (IsTopFolder()) {
+    if (folder_.IsTopFolder()) {
         std::wstring entry = LoadUiText(IDS_ADD_NEW_DIGITAL_LEVEL);
         LVITEMW item{};
         item.mask = LVIF_TEXT | LVIF_IMAGE | LVIF_PARAM;
@@ -241,20 +279,25 @@ void CLVShellView::OnEnumeratorReady(IEnumIDList* enumerator) {
     ::SetCursor(previousCursor);
 }
 
-void CLVShellView::Sort(int columnArgument) {
-    SortContext context{folder_.Get(), columnArgument};
+void CShellViewList::Sort(int columnArgument) {
+    SortContext context{folder_.folder.Get(), columnArgument};
     list_.Send(LVM_SORTITEMS, reinterpret_cast<WPARAM>(&context),
                reinterpret_cast<LPARAM>(&CompareItems));
 }
 
-void CLVShellView::OnColumnClick(int column) {
+void CShellViewList::OnColumnClick(int column) {
     if (column + 1 == g_sortColumn)
         g_sortDirection = -g_sortDirection;
     g_sortColumn = column + 1;
     Sort(g_sortDirection * g_sortColumn);
 }
 
-void CLVShellView::ReadColumnWidths() noexcept {
+void CShellViewList::OnHeaderEndTrack() noexcept {
+    // The header applies the new width after this notification: read it back afterwards.
+    ::PostMessageW(view_, kReadColumnWidthsMessage, 0, 0);
+}
+
+void CShellViewList::ReadColumnWidths() noexcept {
     // The list has one column; the second width is kept as the control reports it (0).
     int widths[kDisplayColumnCount] = {};
     for (size_t column = 0; column < kDisplayColumnCount; ++column)
@@ -265,14 +308,14 @@ void CLVShellView::ReadColumnWidths() noexcept {
     (void)StoreDisplayColumnWidths(widths);
 }
 
-void CLVShellView::OnGetDisplayInfo(NMLVDISPINFOW& info) {
+void CShellViewList::OnGetDisplayInfo(NMLVDISPINFOW& info) {
     const auto item = reinterpret_cast<PCUITEMID_CHILD>(info.item.lParam);
     if (!item)
         return;
     if (info.item.mask & LVIF_TEXT) {
         STRRET name{};
         if (info.item.pszText && info.item.cchTextMax > 0 &&
-            SUCCEEDED(folder_->GetDisplayNameOf(item, SHGDN_NORMAL, &name)))
+            SUCCEEDED(folder_.folder->GetDisplayNameOf(item, SHGDN_NORMAL, &name)))
             (void)::StrRetToBufW(&name, item, info.item.pszText, info.item.cchTextMax);
     }
     if (info.item.mask & LVIF_IMAGE) {
@@ -280,15 +323,20 @@ void CLVShellView::OnGetDisplayInfo(NMLVDISPINFOW& info) {
         wchar_t location[MAX_PATH] = {};
         int index = kRootIconIndex;
         UINT flags = 0;
-        if (SUCCEEDED(folder_->GetUIObjectOf(window_, 1, &item, IID_IExtractIconW, nullptr,
-                                             reinterpret_cast<void**>(icon.GetAddressOf()))) &&
+        if (SUCCEEDED(folder_.folder->GetUIObjectOf(view_, 1, &item, IID_IExtractIconW, nullptr,
+                                                    reinterpret_cast<void**>(icon.GetAddressOf()))) &&
             FAILED(icon->GetIconLocation(0, location, ARRAYSIZE(location), &index, &flags)))
             index = kRootIconIndex;
         info.item.iImage = index;
     }
 }
 
-std::vector<CLVShellView::SelectedItem> CLVShellView::Selection() const {
+void CShellViewList::OnDeleteItem(const NMLISTVIEW& item) noexcept {
+    // The item owned its identifier; the entry has none.
+    UniquePidl owned(reinterpret_cast<LPITEMIDLIST>(item.lParam));
+}
+
+std::vector<CShellViewList::SelectedItem> CShellViewList::Selection() const {
     std::vector<SelectedItem> selection;
     if (!list_.Window())
         return selection;
@@ -302,14 +350,4 @@ std::vector<CLVShellView::SelectedItem> CLVShellView::Selection() const {
             selection.push_back({index, reinterpret_cast<PCUITEMID_CHILD>(item.lParam)});
     }
     return selection;
-}
-
-LPITEMIDLIST CLVShellView::CreateFullItem(PCUITEMID_CHILD item) const {
-    return manager_.CreatePidlFromPath(
-        (folderPath_ + L'\\' + manager_.GetItemName(reinterpret_cast<LPCITEMIDLIST>(item)))
-            .c_str());
-}
-
-bool CLVShellView::IsTopFolder() const noexcept {
-    return folderKind_ == PT_ROOT;
 }

@@ -1,6 +1,8 @@
 // The view's activation: its items merged into the browser's File, Edit and View menus, the
 // list's pop-up menu, and the status text.
-#include "view/lv_shell_view.h"
+#include "view/shell_view_menus.h"
+
+#include <shlwapi.h>
 
 #include <algorithm>
 
@@ -28,7 +30,7 @@ void InsertGroup(HMENU menu, UINT position, bool byPosition,
                  const std::vector<MenuItem>& group) {
     for (const MenuItem& item : group) {
         MENUITEMINFOW info{};
-    info.cbSize = sizeof info;
+        info.cbSize = sizeof info;
         std::wstring text;
         if (item.command == 0) {
             info.fMask = MIIM_FTYPE;
@@ -51,12 +53,27 @@ void InsertGroup(HMENU menu, UINT position, bool byPosition,
 
 }  // namespace
 
-MenuContext CLVShellView::CurrentMenuContext() const {
+HRESULT CShellViewMenus::SetUp(const ShellViewFolder& folder, PCUIDLIST_RELATIVE own) noexcept {
+    try {
+        folder_ = folder;
+        ownIdentifier_.reset(manager_.CopyPidl(own));
+        RETURN_IF_NULL_ALLOC(ownIdentifier_.get());
+        return S_OK;
+    }
+    CATCH_RETURN()
+}
+
+void CShellViewMenus::SetBrowser(IShellBrowser* browser, bool inFileDialog) noexcept {
+    browser_ = browser;
+    inFileDialog_ = inFileDialog;
+}
+
+MenuContext CShellViewMenus::CurrentMenuContext() const {
     MenuContext context;
-    context.folderKind = folderKind_;
-    context.inFileDialog = dialogBrowser_ != nullptr;
-    context.viewMode = settings_.ViewMode;
-    for (const SelectedItem& selected : Selection()) {
+    context.folderKind = folder_.kind;
+    context.inFileDialog = inFileDialog_;
+    context.viewMode = list_.ViewMode();
+    for (const CShellViewList::SelectedItem& selected : list_.Selection()) {
         context.hasSelection = true;
         if (!selected.item)
             context.selectionHasEntry = true;
@@ -64,7 +81,7 @@ MenuContext CLVShellView::CurrentMenuContext() const {
     return context;
 }
 
-void CLVShellView::SetActivation(ViewActivation state) {
+void CShellViewMenus::SetActivation(ViewActivation state) {
     if (state == activation_)
         return;
     RemoveMenus();
@@ -75,7 +92,7 @@ void CLVShellView::SetActivation(ViewActivation state) {
     ShowStatusText();
 }
 
-void CLVShellView::RemoveMenus() noexcept {
+void CShellViewMenus::RemoveMenus() noexcept {
     if (!menu_ || !browser_)
         return;
     // Wine's browsers implement neither call; Explorer's do. Either way the menu goes.
@@ -84,7 +101,7 @@ void CLVShellView::RemoveMenus() noexcept {
     menu_.reset();
 }
 
-void CLVShellView::BuildMenus() {
+void CShellViewMenus::BuildMenus() {
     RemoveMenus();
     if (activation_ == ViewActivation::Deactivated || !browser_)
         return;
@@ -120,14 +137,14 @@ void CLVShellView::BuildMenus() {
         }
     }
     // The menu is the browser's to show from here; it stays ours to remove and destroy.
-    if (FAILED(browser_->SetMenuSB(menu.get(), nullptr, window_))) {
+    if (FAILED(browser_->SetMenuSB(menu.get(), nullptr, view_))) {
         (void)browser_->RemoveMenusSB(menu.get());
         return;
     }
     menu_ = std::move(menu);
 }
 
-void CLVShellView::UpdateMenuStates() noexcept {
+void CShellViewMenus::UpdateMenuStates() noexcept {
     if (!menu_)
         return;
     try {
@@ -140,13 +157,13 @@ void CLVShellView::UpdateMenuStates() noexcept {
                                      MF_BYCOMMAND | (item.enabled ? MF_ENABLED : MF_GRAYED));
             }
         }
-        const UINT checked = CommandOfViewMode(settings_.ViewMode);
+        const UINT checked = CommandOfViewMode(list_.ViewMode());
         ::CheckMenuRadioItem(menu_.get(), IDM_LARGE_ICONS, IDM_DETAILS, checked, MF_BYCOMMAND);
     }
     CATCH_LOG()
 }
 
-void CLVShellView::ShowStatusText() {
+void CShellViewMenus::ShowStatusText() {
     if (!browser_)
         return;
     // One part over the whole bar, "Quorvel Digital Levels: " and the folder's name, 260
@@ -155,7 +172,7 @@ void CLVShellView::ShowStatusText() {
     STRRET name{};
     PCUITEMID_CHILD own = reinterpret_cast<PCUITEMID_CHILD>(manager_.GetLastItem(ownIdentifier_.get()));
     wchar_t folderName[MAX_PATH] = {};
-    if (SUCCEEDED(folder_->GetDisplayNameOf(own, SHGDN_NORMAL, &name)))
+    if (SUCCEEDED(folder_.folder->GetDisplayNameOf(own, SHGDN_NORMAL, &name)))
         (void)::StrRetToBufW(&name, own, folderName, ARRAYSIZE(folderName));
     text += folderName;
     if (text.size() >= MAX_PATH)
@@ -169,7 +186,7 @@ void CLVShellView::ShowStatusText() {
                                    reinterpret_cast<LPARAM>(text.c_str()), &ignored);
 }
 
-void CLVShellView::ShowPopupMenu(POINT position) {
+void CShellViewMenus::ShowPopupMenu(POINT position) {
     UniqueMenu popup(::CreatePopupMenu());
     if (!popup)
         return;
@@ -191,5 +208,5 @@ void CLVShellView::ShowPopupMenu(POINT position) {
         ::ClientToScreen(list_.Window(), &position);
     }
     // The chosen item comes back as WM_COMMAND to the view window.
-    ::TrackPopupMenu(popup.get(), TPM_RIGHTBUTTON, position.x, position.y, 0, window_, nullptr);
+    ::TrackPopupMenu(popup.get(), TPM_RIGHTBUTTON, position.x, position.y, 0, view_, nullptr);
 }

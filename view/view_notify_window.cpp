@@ -23,18 +23,12 @@ bool CViewNotifyWindow::Create(HWND view) noexcept {
     if (!::RegisterClassExW(&windowClass) && ::GetLastError() != ERROR_CLASS_ALREADY_EXISTS)
         return false;
     // Not a message-only window: those do not hear broadcasts.
-    window_ = ::CreateWindowExW(WS_EX_TOOLWINDOW, kNotifyWindowClass, L"", WS_POPUP, 0, 0, 0, 0,
-                                nullptr, nullptr, instance, nullptr);
+    window_.reset(::CreateWindowExW(WS_EX_TOOLWINDOW, kNotifyWindowClass, L"", WS_POPUP, 0, 0, 0,
+                                    0, nullptr, nullptr, instance, nullptr));
     if (!window_)
         return false;
-    ::SetWindowLongPtrW(window_, GWLP_USERDATA, reinterpret_cast<LONG_PTR>(view));
+    ::SetWindowLongPtrW(window_.get(), GWLP_USERDATA, reinterpret_cast<LONG_PTR>(view));
     return true;
-}
-
-void CViewNotifyWindow::Destroy() noexcept {
-    if (window_)
-        ::DestroyWindow(window_);
-    window_ = nullptr;
 }
 
 LRESULT CALLBACK CViewNotifyWindow::WindowProcedure(HWND window, UINT message, WPARAM wParam,

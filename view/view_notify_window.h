@@ -4,25 +4,26 @@
 
 #include <windows.h>
 
+#include "support/unique_resource.h"
+
 class CViewNotifyWindow {
 public:
     CViewNotifyWindow() noexcept = default;
     CViewNotifyWindow(const CViewNotifyWindow&) = delete;
     CViewNotifyWindow& operator=(const CViewNotifyWindow&) = delete;
-    ~CViewNotifyWindow() { Destroy(); }
 
     // Creates the window of class "QRV Net Shell Extension - Notify"; every change broadcast it
     // hears is posted on to view with the same arguments.
     bool Create(HWND view) noexcept;
-    void Destroy() noexcept;
+    void Destroy() noexcept { window_.reset(); }
 
-    HWND Window() const noexcept { return window_; }
+    HWND Window() const noexcept { return window_.get(); }
 
 private:
     static LRESULT CALLBACK WindowProcedure(HWND window, UINT message, WPARAM wParam,
                                             LPARAM lParam);
 
-    HWND window_ = nullptr;
+    UniqueWindow window_;
 };
 
 // Tells every view of folders of that kind, in every process, that the station list changed.

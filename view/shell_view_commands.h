@@ -1,0 +1,78 @@
+// CShellViewCommands: what the user asks of the view: add, open, delete, edit, copy and paste
+// stations, the view modes, the drag of a station's file, and the keys that ask for them.
+#pragma once
+
+#include <windows.h>
+#include <shlobj.h>
+#include <wrl/client.h>
+
+#include <vector>
+
+#include "namespace/pidl_manager.h"
+#include "support/unique_resource.h"
+#include "view/shell_view_folder.h"
+#include "view/shell_view_list.h"
+#include "view/shell_view_menus.h"
+
+class CLVDataObject;
+
+class CShellViewCommands {
+public:
+    // The commands act on the list's selection; a new view mode is shown by the list and
+    // marked in the menus. view is the view itself, as the browser knows it: opening an item
+    // keeps it alive across the browse, and a file dialog is told of its default command.
+    CShellViewCommands(CShellViewList& list, CShellViewMenus& menus, IShellView& view) noexcept
+        : list_(list), menus_(menus), view_(view) {}
+    CShellViewCommands(const CShellViewCommands&) = delete;
+    CShellViewCommands& operator=(const CShellViewCommands&) = delete;
+
+    void SetUp(const ShellViewFolder& folder) { folder_ = folder; }
+    void SetBrowser(IShellBrowser* browser, ICommDlgBrowser* dialogBrowser) noexcept;
+    // The view window: it owns the sheets and receives the keys' commands; null once it is gone.
+    void SetViewWindow(HWND window) noexcept { window_ = window; }
+    void LoadAccelerators() noexcept;
+    void UnloadAccelerators() noexcept { accelerators_.reset(); }
+
+    // A key the browser hands the view before dispatching it.
+    void TranslateAccelerator(MSG& message) noexcept;
+    // A key pressed in the list that no browser translated (Wine's never call
+    // TranslateAccelerator).
+    void OnListKeyDown(WORD key);
+
+    // A menu item, accelerator or IOleCommandTarget::Exec command.
+    void OnCommand(UINT command);
+    void OpenSelection();
+    void BeginDrag();
+
+private:
+    using SelectedItem = CShellViewList::SelectedItem;
+
+    void AddStation();
+    void DeleteSelection();
+    void EditSelectedStations();
+    void CopySelection();
+    void PasteStations();
+    void SetViewMode(UINT mode);
+    // Shows the stored stations in this view and in every view of the same kind.
+    void ChangedStations();
+    // The selected items with an identifier, added to the data object by their full identifiers;
+    // S_FALSE when the selection held none.
+    HRESULT AddSelectedItems(CLVDataObject& dataObject,
+                             const std::vector<SelectedItem>& selection) const;
+    // Items' internal full identifiers: the folder's path, then the item.
+    LPITEMIDLIST CreateFullItem(PCUITEMID_CHILD item) const;
+
+    CShellViewList& list_;
+    CShellViewMenus& menus_;
+    IShellView& view_;
+    CPidlMgr manager_;
+    ShellViewFolder folder_;
+    Microsoft::WRL::ComPtr<IShellBrowser> browser_;
+    Microsoft::WRL::ComPtr<ICommDlgBrowser> dialogBrowser_;
+    HWND window_ = nullptr;
+    UniqueAccelerators accelerators_;
+    // The last key that TranslateAccelerator turned into a command: when the browser goes on to
+    // dispatch that same message, the list must not turn it into a command again.
+    WPARAM translatedKey_ = 0;
+    LONG translatedKeyTime_ = 0;
+};
