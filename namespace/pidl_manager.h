@@ -68,38 +68,6 @@ public:
     // back are checked with this before any name in them is read.
     bool IsWellFormedList(PCUIDLIST_RELATIVE list) const noexcept;
 
-#ifdef STRICT_TYPED_ITEMIDS
-    // The view still holds its lists untyped (UniquePidl, LPCITEMIDLIST): these take them as the
-    // relative lists that every kind is. They go with the view's last untyped list.
-    PCUIDLIST_RELATIVE GetNextItem(LPCITEMIDLIST list) const noexcept {
-        return GetNextItem(AsRelative(list));
-    }
-    PCUITEMID_CHILD GetLastItem(LPCITEMIDLIST list) const noexcept {
-        return GetLastItem(AsRelative(list));
-    }
-    UINT GetSize(LPCITEMIDLIST list) const noexcept {
-        return GetSize(AsRelative(list));
-    }
-    PIDLIST_RELATIVE CopyPidl(LPCITEMIDLIST list) const noexcept {
-        return CopyPidl(AsRelative(list));
-    }
-    PIDLIST_RELATIVE CopyParent(LPCITEMIDLIST list) const noexcept {
-        return CopyParent(AsRelative(list));
-    }
-    bool IsFile(LPCITEMIDLIST list) const {
-        return IsFile(AsRelative(list));
-    }
-    UINT GetPath(LPCITEMIDLIST list, wchar_t* buffer, UINT capacity) const {
-        return GetPath(AsRelative(list), buffer, capacity);
-    }
-    DWORD GetLastItemKind(LPCITEMIDLIST list) const noexcept {
-        return GetLastItemKind(AsRelative(list));
-    }
-    std::wstring GetItemName(LPCITEMIDLIST item) const {
-        return GetItemName(AsRelative(item));
-    }
-#endif
-
 private:
     PITEMID_CHILD CreateNamedItem(DWORD kind, const std::wstring& name) const noexcept;
     // The first size bytes of a list (whole items) as a new list with its terminator.
@@ -108,12 +76,6 @@ private:
     // A list the manager made or walked to, of exactly one item, as the child it is.
     static PITEMID_CHILD AsChild(PIDLIST_RELATIVE list) noexcept;
     static PCUITEMID_CHILD AsChild(PCUIDLIST_RELATIVE list) noexcept;
-#ifdef STRICT_TYPED_ITEMIDS
-    // A list of no stated kind: any list is at least a relative one.
-    static PCUIDLIST_RELATIVE AsRelative(LPCITEMIDLIST list) noexcept {
-        return static_cast<PCUIDLIST_RELATIVE>(list);
-    }
-#endif
 
     Microsoft::WRL::ComPtr<IMalloc> allocator_;
 };
@@ -128,5 +90,3 @@ struct PidlTraits {
 };
 using UniqueRelativePidl = UniqueResource<PidlTraits<PIDLIST_RELATIVE>>;
 using UniqueChildPidl = UniqueResource<PidlTraits<PITEMID_CHILD>>;
-// A list held without its kind, as the view still holds its lists.
-using UniquePidl = UniqueResource<PidlTraits<LPITEMIDLIST>>;

@@ -3,6 +3,7 @@
 
 #include <atomic>
 
+#include "download/dialog_station_downloader.h"
 #include "namespace/lv_enum_id_list.h"
 #include "namespace/lv_extract_icon.h"
 #include "namespace/lv_query_info.h"
@@ -32,7 +33,8 @@ constexpr CLSID kQueryInfoClassId = {
 
 constexpr ClassTableEntry kClassTable[] = {
     {&CLSID_LVShellFolder, IDR_LVSHELLFOLDER, &CreateComInstance<CLVShellFolder>},
-    {&kDataObjectClassId, IDR_LVDATAOBJECT, &CreateComInstance<CLVDataObject>},
+    {&kDataObjectClassId, IDR_LVDATAOBJECT,
+     &CreateComInstanceWith<CLVDataObject, &MakeDialogStationDownloader>},
     {&kEnumIdListClassId, IDR_LVENUMIDLIST, &CreateComInstance<CLVEnumIDList>},
     {&kExtractIconClassId, IDR_LVEXTRACTICON, &CreateComInstance<CLVExtractIcon>},
     {&kQueryInfoClassId, IDR_AZQUERYINFO, &CreateComInstance<CLVQueryInfo>},

@@ -9,17 +9,29 @@
 
 using CreateInstanceFunction = HRESULT (*)(REFIID iid, void** object);
 
-// Creates T with its default constructor and asks it for the interface; the object is released
-// again when that fails.
-template <typename T>
-HRESULT CreateComInstance(REFIID iid, void** object) noexcept {
+// Makes an object with make() and asks it for the interface; the object is released again when
+// that fails.
+template <typename Make>
+HRESULT CreateAndQuery(Make make, REFIID iid, void** object) noexcept {
     if (!object)
         return E_POINTER;
     *object = nullptr;
     try {
-        return MakeComObject<T>()->QueryInterface(iid, object);
+        return make()->QueryInterface(iid, object);
     }
     CATCH_RETURN()
+}
+
+// Creates T with its default constructor.
+template <typename T>
+HRESULT CreateComInstance(REFIID iid, void** object) noexcept {
+    return CreateAndQuery([] { return MakeComObject<T>(); }, iid, object);
+}
+
+// Creates T from the one argument that MakeArgument() gives: what the class must be handed.
+template <typename T, auto MakeArgument>
+HRESULT CreateComInstanceWith(REFIID iid, void** object) noexcept {
+    return CreateAndQuery([] { return MakeComObject<T>(MakeArgument()); }, iid, object);
 }
 
 // Factories are cached until the module's tear-down (when DllCanUnloadNow answers S_OK), with one

@@ -6,7 +6,6 @@
 #include <cstring>
 #include <cwchar>
 
-#include "download/dialog_station_downloader.h"
 #include "download/download_target.h"
 #include "stations/station_list_block.h"
 #include "stations/station_models.h"
@@ -39,10 +38,10 @@ HRESULT ReturnHGlobal(UniqueHGlobal block, STGMEDIUM* medium) noexcept {
 
 // The path of an item's identifier list as the data object names it: every name and a
 // backslash, until the characters taken reach the path limit; one trailing backslash dropped.
-std::wstring ItemPath(const CPidlMgr& manager, LPCITEMIDLIST list) {
+std::wstring ItemPath(const CPidlMgr& manager, PCUIDLIST_RELATIVE list) {
     std::wstring path;
     size_t taken = 0;
-    for (LPCITEMIDLIST item = list; item && item->mkid.cb != 0 && taken < kMaximumPath;
+    for (PCUIDLIST_RELATIVE item = list; item && item->mkid.cb != 0 && taken < kMaximumPath;
          item = manager.GetNextItem(item)) {
         const std::wstring name = manager.GetItemName(item);
         path += name;
@@ -58,8 +57,6 @@ std::wstring ItemPath(const CPidlMgr& manager, LPCITEMIDLIST list) {
 
 }  // namespace
 
-CLVDataObject::CLVDataObject() : CLVDataObject(MakeDialogStationDownloader()) {}
-
 CLVDataObject::CLVDataObject(std::shared_ptr<StationDownloader> downloader)
     : downloader_(std::move(downloader)) {}
 
@@ -70,7 +67,7 @@ CLVDataObject::~CLVDataObject() {
 HRESULT CLVDataObject::SetItem(PCUIDLIST_RELATIVE fullList) {
     RETURN_HR_IF(E_INVALIDARG, !fullList);
     try {
-        UniquePidl copy(manager_.CopyPidl(fullList));
+        UniqueRelativePidl copy(manager_.CopyPidl(fullList));
         RETURN_IF_NULL_ALLOC(copy.get());
         items_.push_back(std::move(copy));
         return S_OK;
@@ -82,7 +79,7 @@ HRESULT CLVDataObject::SetFolderLocation(PCIDLIST_ABSOLUTE folder) {
     folderLocation_.reset();
     if (!folder)
         return S_OK;
-    folderLocation_.reset(reinterpret_cast<LPITEMIDLIST>(::ILClone(folder)));
+    folderLocation_.reset(::ILCloneFull(folder));
     RETURN_IF_NULL_ALLOC(folderLocation_.get());
     return S_OK;
 }
@@ -101,7 +98,7 @@ IFACEMETHODIMP CLVDataObject::QueryInterface(REFIID iid, void** object) {
     return QISearch(this, table, iid, object);
 }
 
-HRESULT CLVDataObject::LoadItemStation(LPCITEMIDLIST item, Station& station) const {
+HRESULT CLVDataObject::LoadItemStation(PCUIDLIST_RELATIVE item, Station& station) const {
     station = DefaultStation();
     station.Name = StationNameFromPath(ItemPath(manager_, item));
     return FindStation(station);
@@ -168,7 +165,7 @@ HRESULT CLVDataObject::GetFileGroupDescriptor(STGMEDIUM* medium) {
 HRESULT CLVDataObject::GetFileContents(LONG index, STGMEDIUM* medium) {
     if (items_.empty() || index < 0 || static_cast<size_t>(index) >= items_.size())
         return S_FALSE;
-    LPCITEMIDLIST item = items_[index].get();
+    PCUIDLIST_RELATIVE item = items_[index].get();
     if (!manager_.IsFile(item))
         return S_FALSE;
 
@@ -216,22 +213,20 @@ HRESULT CLVDataObject::GetShellIdListArray(STGMEDIUM* medium) {
     // The parent is the folder's identifier from the desktop, as readers of the format bind it:
     // the items' own lists start inside the namespace, and a reader would take them for items
     // of the desktop. Items must still name a parent inside the namespace, as always.
-    UniquePidl internalParent(manager_.CopyParent(items_.front().get()));
+    UniqueRelativePidl internalParent(manager_.CopyParent(items_.front().get()));
     if (!internalParent || !folderLocation_)
         return S_FALSE;
-    UniquePidl parent(reinterpret_cast<LPITEMIDLIST>(
-        ::ILClone(reinterpret_cast<PCIDLIST_ABSOLUTE>(folderLocation_.get()))));
-    RETURN_IF_NULL_ALLOC(parent.get());
+    PCIDLIST_ABSOLUTE parent = folderLocation_.get();
 
     // The block: cidl, then one offset for the parent and one for each child (aoffset), then
     // the parent's list and each child's one-item list, each with its terminator. Every child
     // has its own offset, unlike the one shared slot that older versions wrote: an offset left 0
     // makes any reader walk the header as an item-ID list and run past the block.
-    const UINT parentSize = manager_.GetSize(parent.get());
-    std::vector<UniquePidl> children;
+    const UINT parentSize = manager_.GetSize(parent);
+    std::vector<UniqueChildPidl> children;
     const size_t headerSize = sizeof(UINT) * (items_.size() + 2);
     size_t size = headerSize + parentSize;
-    for (const UniquePidl& item : items_) {
+    for (const UniqueRelativePidl& item : items_) {
         children.emplace_back(manager_.CopyItem(manager_.GetLastItem(item.get())));
         RETURN_IF_NULL_ALLOC(children.back().get());
         size += manager_.GetSize(children.back().get());
@@ -251,7 +246,7 @@ HRESULT CLVDataObject::GetShellIdListArray(STGMEDIUM* medium) {
         writeHeaderValue(0, items_.size());
         size_t offset = headerSize;
         writeHeaderValue(1, offset);
-        memcpy(bytes + offset, parent.get(), parentSize);
+        memcpy(bytes + offset, parent, parentSize);
         offset += parentSize;
         for (size_t index = 0; index < children.size(); ++index) {
             const UINT childSize = manager_.GetSize(children[index].get());
@@ -265,7 +260,7 @@ HRESULT CLVDataObject::GetShellIdListArray(STGMEDIUM* medium) {
 
 HRESULT CLVDataObject::GetStationList(STGMEDIUM* medium) {
     std::vector<Station> stations;
-    for (const UniquePidl& item : items_) {
+    for (const UniqueRelativePidl& item : items_) {
         Station station;
         // Stations that no longer load are left out silently.
         if (LoadItemStation(item.get(), station) == S_OK)

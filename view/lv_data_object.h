@@ -19,9 +19,8 @@
 
 class CLVDataObject final : public ComObject<IDataObject, IDropSource> {
 public:
-    // Its file's download runs the progress dialogs (may throw bad_alloc).
-    CLVDataObject();
-    // Its file's download goes through the downloader given, which must not be null.
+    // Its file's download goes through the downloader given, which must not be null: the
+    // progress dialogs (MakeDialogStationDownloader) in the folder and its view.
     explicit CLVDataObject(std::shared_ptr<StationDownloader> downloader);
     ~CLVDataObject() override;
 
@@ -62,13 +61,13 @@ private:
     HRESULT GetStationList(STGMEDIUM* medium);
 
     // The station named by an item's path; the store's status when it cannot be loaded.
-    HRESULT LoadItemStation(LPCITEMIDLIST item, Station& station) const;
+    HRESULT LoadItemStation(PCUIDLIST_RELATIVE item, Station& station) const;
     void EndDragImage() noexcept;
 
     std::shared_ptr<StationDownloader> downloader_;
     CPidlMgr manager_;
-    std::vector<UniquePidl> items_;
-    UniquePidl folderLocation_;
+    std::vector<UniqueRelativePidl> items_;
+    UniqueAbsoluteIdList folderLocation_;
 
     UniqueHImageList dragImages_;
     HWND dragView_ = nullptr;

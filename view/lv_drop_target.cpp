@@ -17,7 +17,7 @@ HRESULT QueryFormat(IDataObject* dataObject, CLIPFORMAT wanted, DWORD tymed) {
 }
 
 // The station named by a full identifier (root item, then station), as its path's second part.
-std::wstring StationNameOf(const CPidlMgr& manager, LPCITEMIDLIST fullList) {
+std::wstring StationNameOf(const CPidlMgr& manager, PCUIDLIST_RELATIVE fullList) {
     wchar_t path[MAX_PATH] = {};
     manager.GetPath(fullList, path, ARRAYSIZE(path));
     return StationNameFromPath(path);
@@ -64,7 +64,7 @@ HRESULT AcceptDropSource(IDataObject* dataObject) noexcept {
 
 HRESULT CLVDropTarget::SetItem(PCUIDLIST_RELATIVE fullList) noexcept {
     RETURN_HR_IF(E_INVALIDARG, !fullList);
-    item_.reset(manager_.CopyPidl(reinterpret_cast<LPCITEMIDLIST>(fullList)));
+    item_.reset(manager_.CopyPidl(fullList));
     RETURN_IF_NULL_ALLOC(item_.get());
     return S_OK;
 }
@@ -104,7 +104,7 @@ HRESULT CLVDropTargetOnListView::SetUp(HWND list, IShellView* view,
     RETURN_HR_IF(E_INVALIDARG, !list || !view || !folder);
     list_ = list;
     view_ = view;
-    folder_.reset(manager_.CopyPidl(reinterpret_cast<LPCITEMIDLIST>(folder)));
+    folder_.reset(manager_.CopyPidl(folder));
     RETURN_IF_NULL_ALLOC(folder_.get());
     return S_OK;
 }

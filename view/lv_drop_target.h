@@ -56,7 +56,7 @@ public:
 
 private:
     CPidlMgr manager_;
-    UniquePidl item_;
+    UniqueRelativePidl item_;
     DroppedSourcesReceiver receiver_;
 };
 
@@ -86,6 +86,6 @@ private:
     CPidlMgr manager_;
     HWND list_ = nullptr;
     Microsoft::WRL::ComPtr<IShellView> view_;
-    UniquePidl folder_;
+    UniqueRelativePidl folder_;
     DroppedSourcesReceiver receiver_;
 };

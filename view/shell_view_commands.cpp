@@ -2,21 +2,21 @@
 // drag of a station's file, and the keys that ask for them.
 #include "view/shell_view_commands.h"
 
+#include "download/dialog_station_downloader.h"
 #include "res/ids_stations.h"
 #include "res/ids_view.h"
-#include "support/module_instance.h"
 #include "stations/portable/station_names.h"
 #include "stations/station_dialog.h"
 #include "stations/station_list_block.h"
 #include "stations/station_store.h"
+#include "support/clipboard_formats.h"
 #include "support/error_handling.h"
+#include "support/module_instance.h"
 #include "support/text_lookup.h"
 #include "view/lv_data_object.h"
 #include "view/view_notify_window.h"
 
 namespace {
-
-constexpr wchar_t kStationListFormat[] = L"Quorvel Total Stations";
 
 // The drag image moves with the cursor and keeps the distance from the cursor to the item where
 // the drag began. The data object moves it to the cursor's screen position plus this offset, and
@@ -129,10 +129,10 @@ void CShellViewCommands::OpenSelection() {
     // the view and the identifier alive across the call.
     Microsoft::WRL::ComPtr<IShellView> keepAlive(&view_);
     Microsoft::WRL::ComPtr<ICommDlgBrowser> dialogBrowser = dialogBrowser_;
-    UniquePidl item(manager_.CopyPidl(reinterpret_cast<LPCITEMIDLIST>(first.item)));
+    UniqueRelativePidl item(manager_.CopyPidl(first.item));
     if (!item)
         return;
-    if (FAILED(browser_->BrowseObject(reinterpret_cast<PCUIDLIST_RELATIVE>(item.get()), SBSP_DEFBROWSER | SBSP_RELATIVE)) &&
+    if (FAILED(browser_->BrowseObject(item.get(), SBSP_DEFBROWSER | SBSP_RELATIVE)) &&
         dialogBrowser) {
         // A file is not a folder to browse to: in a file dialog, opening it chooses it.
         (void)dialogBrowser->OnDefaultCommand(&view_);
@@ -149,7 +149,7 @@ void CShellViewCommands::DeleteSelection() {
         if (!selected.item)
             continue;  // the entry is not a station
         Station station;
-        station.Name = manager_.GetItemName(reinterpret_cast<LPCITEMIDLIST>(selected.item));
+        station.Name = manager_.GetItemName(selected.item);
         // A station deleted meanwhile (in another view) is simply gone; the refresh shows it.
         (void)::DeleteStation(station);
     }
@@ -161,7 +161,7 @@ void CShellViewCommands::EditSelectedStations() {
     std::vector<std::wstring> names;
     for (const SelectedItem& selected : list_.Selection()) {
         if (selected.item)
-            names.push_back(manager_.GetItemName(reinterpret_cast<LPCITEMIDLIST>(selected.item)));
+            names.push_back(manager_.GetItemName(selected.item));
     }
     if (names.empty())
         return;
@@ -184,7 +184,7 @@ void CShellViewCommands::CopySelection() {
     const std::vector<SelectedItem> selection = list_.Selection();
     if (selection.empty())
         return;
-    auto dataObject = MakeComObject<CLVDataObject>();
+    auto dataObject = MakeComObject<CLVDataObject>(MakeDialogStationDownloader());
     // The entry alone copies nothing, and leaves the clipboard as it was. The clipboard keeps the
     // object and renders from it on request.
     if (AddSelectedItems(*dataObject.Get(), selection) == S_OK)
@@ -197,10 +197,10 @@ HRESULT CShellViewCommands::AddSelectedItems(CLVDataObject& dataObject,
     for (const SelectedItem& selected : selection) {
         if (!selected.item)
             continue;  // the entry is not an item of the folder
-        UniquePidl full(CreateFullItem(selected.item));
+        UniqueRelativePidl full(CreateFullItem(selected.item));
         // Part of the selection on the clipboard or in a drag would be a lie.
         RETURN_IF_NULL_ALLOC(full.get());
-        RETURN_IF_FAILED(dataObject.AddItem(reinterpret_cast<PCUIDLIST_RELATIVE>(full.get())));
+        RETURN_IF_FAILED(dataObject.AddItem(full.get()));
         added = true;
     }
     if (!added)
@@ -208,12 +208,9 @@ HRESULT CShellViewCommands::AddSelectedItems(CLVDataObject& dataObject,
     // Where the shell has our folder, for the parent of "Shell IDList Array". A folder that was
     // never placed (S_FALSE) leaves that format out; the others still carry the selection.
     Microsoft::WRL::ComPtr<IPersistFolder2> persist;
-    UniqueCoTaskMem location;
-    if (SUCCEEDED(folder_.folder.As(&persist)) &&
-        persist->GetCurFolder(reinterpret_cast<PIDLIST_ABSOLUTE*>(location.put())) == S_OK) {
-        RETURN_IF_FAILED(
-            dataObject.SetFolderLocation(static_cast<PCIDLIST_ABSOLUTE>(location.get())));
-    }
+    UniqueAbsoluteIdList location;
+    if (SUCCEEDED(folder_.folder.As(&persist)) && persist->GetCurFolder(location.put()) == S_OK)
+        RETURN_IF_FAILED(dataObject.SetFolderLocation(location.get()));
     return S_OK;
 }
 
@@ -223,8 +220,7 @@ void CShellViewCommands::PasteStations() {
     Microsoft::WRL::ComPtr<IDataObject> clipboard;
     if (FAILED(::OleGetClipboard(&clipboard)) || !clipboard)
         return;
-    FORMATETC format{static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(kStationListFormat)),
-                     nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
+    FORMATETC format{StationListFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
     UniqueStgMedium medium;
     if (format.cfFormat == 0 || FAILED(clipboard->GetData(&format, medium.put())))
         return;
@@ -259,7 +255,7 @@ void CShellViewCommands::BeginDrag() {
     const std::vector<SelectedItem> selection = list_.Selection();
     if (selection.empty())
         return;
-    auto dataObject = MakeComObject<CLVDataObject>();
+    auto dataObject = MakeComObject<CLVDataObject>(MakeDialogStationDownloader());
     if (AddSelectedItems(*dataObject.Get(), selection) != S_OK)
         return;
     POINT origin{};
@@ -275,8 +271,6 @@ void CShellViewCommands::BeginDrag() {
     (void)::DoDragDrop(dataObject.Get(), dataObject.Get(), DROPEFFECT_COPY, &effect);
 }
 
-LPITEMIDLIST CShellViewCommands::CreateFullItem(PCUITEMID_CHILD item) const {
-    return manager_.CreatePidlFromPath(
-        (folder_.path + L'\\' + manager_.GetItemName(reinterpret_cast<LPCITEMIDLIST>(item)))
-            .c_str());
+PIDLIST_RELATIVE CShellViewCommands::CreateFullItem(PCUITEMID_CHILD item) const {
+    return manager_.CreatePidlFromPath((folder_.path + L'\\' + manager_.GetItemName(item)).c_str());
 }

@@ -60,7 +60,7 @@ private:
     HRESULT AddSelectedItems(CLVDataObject& dataObject,
                              const std::vector<SelectedItem>& selection) const;
     // Items' internal full identifiers: the folder's path, then the item.
-    LPITEMIDLIST CreateFullItem(PCUITEMID_CHILD item) const;
+    PIDLIST_RELATIVE CreateFullItem(PCUITEMID_CHILD item) const;
 
     CShellViewList& list_;
     CShellViewMenus& menus_;

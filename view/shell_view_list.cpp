@@ -93,9 +93,10 @@ int CALLBACK CompareItems(LPARAM first, LPARAM second, LPARAM context) {
         return first ? 1 : (second ? -1 : 0);
     const auto& sort = *reinterpret_cast<const SortContext*>(context);
     // The folder answers with the order itself in the status value.
+    // Each item's data is the child identifier that the fill gave it.
     return static_cast<int>(sort.folder->CompareIDs(sort.column,
-                                                    reinterpret_cast<PCUIDLIST_RELATIVE>(first),
-                                                    reinterpret_cast<PCUIDLIST_RELATIVE>(second)));
+                                                    reinterpret_cast<PCUITEMID_CHILD>(first),
+                                                    reinterpret_cast<PCUITEMID_CHILD>(second)));
 }
 
 }  // namespace
@@ -116,9 +117,8 @@ bool CShellViewList::Create(HWND view, IShellView* dropView) {
     // Files dropped on a station row or into a station's folder. Without OLE (a host that did not
     // initialise it) the view simply takes no drops.
     auto dropTarget = MakeComObject<CLVDropTargetOnListView>();
-    UniquePidl folder(manager_.CreatePidlFromPath(folder_.path.c_str()));
-    if (folder && SUCCEEDED(dropTarget->SetUp(list_.Window(), dropView,
-                                              reinterpret_cast<PCUIDLIST_RELATIVE>(folder.get()))))
+    UniqueRelativePidl folder(manager_.CreatePidlFromPath(folder_.path.c_str()));
+    if (folder && SUCCEEDED(dropTarget->SetUp(list_.Window(), dropView, folder.get())))
         dropTargetRegistered_ = SUCCEEDED(::RegisterDragDrop(list_.Window(), dropTarget.Get()));
     return true;
 }
@@ -260,7 +260,7 @@ void CShellViewList::OnEnumeratorReady(IEnumIDList* enumerator) {
     if (owned) {
         PITEMID_CHILD next = nullptr;
         while (owned->Next(1, &next, nullptr) == S_OK) {
-            UniquePidl identifier(reinterpret_cast<LPITEMIDLIST>(next));
+            UniqueChildPidl identifier(next);
             LVITEMW item{};
             item.mask = LVIF_TEXT | LVIF_IMAGE | LVIF_PARAM;
             item.iItem = index;
@@ -333,7 +333,7 @@ void CShellViewList::OnGetDisplayInfo(NMLVDISPINFOW& info) {
 
 void CShellViewList::OnDeleteItem(const NMLISTVIEW& item) noexcept {
     // The item owned its identifier; the entry has none.
-    UniquePidl owned(reinterpret_cast<LPITEMIDLIST>(item.lParam));
+    UniqueChildPidl owned(reinterpret_cast<PITEMID_CHILD>(item.lParam));
 }
 
 std::vector<CShellViewList::SelectedItem> CShellViewList::Selection() const {

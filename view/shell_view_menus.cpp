@@ -170,7 +170,7 @@ void CShellViewMenus::ShowStatusText() {
     // characters at most.
     std::wstring text = LoadUiText(IDS_DIGITAL_LEVELS) + L": ";
     STRRET name{};
-    PCUITEMID_CHILD own = reinterpret_cast<PCUITEMID_CHILD>(manager_.GetLastItem(ownIdentifier_.get()));
+    PCUITEMID_CHILD own = manager_.GetLastItem(ownIdentifier_.get());
     wchar_t folderName[MAX_PATH] = {};
     if (SUCCEEDED(folder_.folder->GetDisplayNameOf(own, SHGDN_NORMAL, &name)))
         (void)::StrRetToBufW(&name, own, folderName, ARRAYSIZE(folderName));

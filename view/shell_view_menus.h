@@ -47,7 +47,7 @@ private:
     const CShellViewList& list_;
     CPidlMgr manager_;
     ShellViewFolder folder_;
-    UniquePidl ownIdentifier_;
+    UniqueRelativePidl ownIdentifier_;
     Microsoft::WRL::ComPtr<IShellBrowser> browser_;
     bool inFileDialog_ = false;
     HWND view_ = nullptr;

@@ -98,7 +98,7 @@ bool AddStations(int count) {
 struct TopFolderView {
     ComPtr<IShellFolder> folder;
     ComPtr<IShellView> view;
-    UniquePidl absolute;
+    UniqueAbsoluteIdList absolute;
 };
 
 HRESULT MakeTopFolderView(TopFolderView& made) {
@@ -115,7 +115,7 @@ HRESULT MakeTopFolderView(TopFolderView& made) {
     if (FAILED(result = ::SHGetSpecialFolderLocation(nullptr, CSIDL_DRIVES, computer.put())))
         return result;
     UniqueChildPidl own(manager.CreateRootPidl());
-    made.absolute.reset(manager.ConcatPidls(computer.get(), own.get()));
+    made.absolute.reset(::ILCombine(computer.get(), own.get()));
     return made.absolute ? S_OK : E_OUTOFMEMORY;
 }
 
@@ -167,8 +167,7 @@ Run MeasureOnce(int stationCount, const Settings& settings, ComPtr<CExplorerWind
         return run;
 
     const LONGLONG start = Ticks();
-    const HRESULT browsed = browser->BrowseToView(
-        made.view.Get(), reinterpret_cast<PCIDLIST_ABSOLUTE>(made.absolute.get()));
+    const HRESULT browsed = browser->BrowseToView(made.view.Get(), made.absolute.get());
     run.createCall = MillisecondsSince(start);
     const HWND viewWindow = browser->ViewWindow();
     const HWND list = ListOf(*browser.Get());
@@ -277,7 +276,7 @@ double MeasureEnumeration(int stationCount) {
     int count = 0;
     PITEMID_CHILD item = nullptr;
     while (enumerator->Next(1, &item, nullptr) == S_OK) {
-        UniquePidl owned(reinterpret_cast<LPITEMIDLIST>(item));
+        UniqueChildPidl owned(item);
         ++count;
     }
     return count == stationCount ? milliseconds : -1;

@@ -12,6 +12,7 @@
 #include <string>
 #include <vector>
 
+#include "download/dialog_station_downloader.h"
 #include "download/station_downloader.h"
 #include "namespace/pidl_manager.h"
 #include "stations/station_list_block.h"
@@ -87,10 +88,10 @@ protected:
         std::initializer_list<const wchar_t*> paths,
         std::shared_ptr<StationDownloader> downloader = nullptr) {
         auto object = downloader ? MakeComObject<CLVDataObject>(std::move(downloader))
-                                 : MakeComObject<CLVDataObject>();
+                                 : MakeComObject<CLVDataObject>(MakeDialogStationDownloader());
         for (const wchar_t* path : paths) {
-            UniquePidl list(manager_.CreatePidlFromPath(path));
-            EXPECT_EQ(S_OK, object->SetItem(reinterpret_cast<PCUIDLIST_RELATIVE>(list.get())));
+            UniqueRelativePidl list(manager_.CreatePidlFromPath(path));
+            EXPECT_EQ(S_OK, object->SetItem(list.get()));
         }
         Microsoft::WRL::ComPtr<IDataObject> data;
         EXPECT_EQ(S_OK, object.As(&data));

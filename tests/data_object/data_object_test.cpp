@@ -142,17 +142,16 @@ TEST_F(DataObject, ShellIdListArrayGivesEveryChildItsOwnOffsetInsideTheBlock) {
     const wchar_t* const names[] = {L"North", L"South", L"East", L"West", L"Centre"};
     UniqueAbsoluteIdList folder;
     ASSERT_EQ(S_OK, ::SHGetSpecialFolderLocation(
-                        nullptr, CSIDL_DRIVES, reinterpret_cast<PIDLIST_ABSOLUTE*>(folder.put())));
+                        nullptr, CSIDL_DRIVES, folder.put()));
     const UINT folderSize = manager_.GetSize(folder.get());
     for (size_t count = 1; count <= 5; ++count) {
         SCOPED_TRACE(count);
-        auto object = MakeComObject<CLVDataObject>();
-        ASSERT_EQ(S_OK, object->SetFolderLocation(
-                            reinterpret_cast<PCIDLIST_ABSOLUTE>(folder.get())));
+        auto object = MakeComObject<CLVDataObject>(MakeDialogStationDownloader());
+        ASSERT_EQ(S_OK, object->SetFolderLocation(folder.get()));
         for (size_t index = 0; index < count; ++index) {
             const std::wstring path = std::wstring(L"Quorvel Digital Level\\") + names[index];
-            UniquePidl list(manager_.CreatePidlFromPath(path.c_str()));
-            ASSERT_EQ(S_OK, object->SetItem(reinterpret_cast<PCUIDLIST_RELATIVE>(list.get())));
+            UniqueRelativePidl list(manager_.CreatePidlFromPath(path.c_str()));
+            ASSERT_EQ(S_OK, object->SetItem(list.get()));
         }
         UniqueStgMedium medium;
         ASSERT_EQ(S_OK, Get(object.Get(), CFSTR_SHELLIDLIST, TYMED_HGLOBAL, medium));
@@ -197,10 +196,10 @@ TEST_F(DataObject, ShellIdListArrayGivesEveryChildItsOwnOffsetInsideTheBlock) {
     EXPECT_EQ(S_FALSE, Get(Over({L"Quorvel Digital Level\\North"}).Get(), CFSTR_SHELLIDLIST,
                            TYMED_HGLOBAL, none))
         << "no place";
-    auto rootOnly = MakeComObject<CLVDataObject>();
-    UniquePidl root(manager_.CreatePidlFromPath(L"Quorvel Digital Level"));
-    ASSERT_EQ(S_OK, rootOnly->SetItem(reinterpret_cast<PCUIDLIST_RELATIVE>(root.get())));
-    ASSERT_EQ(S_OK, rootOnly->SetFolderLocation(reinterpret_cast<PCIDLIST_ABSOLUTE>(folder.get())));
+    auto rootOnly = MakeComObject<CLVDataObject>(MakeDialogStationDownloader());
+    UniqueRelativePidl root(manager_.CreatePidlFromPath(L"Quorvel Digital Level"));
+    ASSERT_EQ(S_OK, rootOnly->SetItem(root.get()));
+    ASSERT_EQ(S_OK, rootOnly->SetFolderLocation(folder.get()));
     EXPECT_EQ(S_FALSE, Get(rootOnly.Get(), CFSTR_SHELLIDLIST, TYMED_HGLOBAL, none)) << "no parent";
 }
 
@@ -223,7 +222,7 @@ TEST_F(DataObject, StationListOnTheOleClipboardCarriesTheLoadableStations) {
 }
 
 TEST_F(DataObject, DropSourceEndsOnButtonRelease) {
-    auto object = MakeComObject<CLVDataObject>();
+    auto object = MakeComObject<CLVDataObject>(MakeDialogStationDownloader());
     EXPECT_EQ(S_OK, object->QueryContinueDrag(FALSE, MK_LBUTTON));
     EXPECT_EQ(DRAGDROP_S_DROP, object->QueryContinueDrag(FALSE, 0));
     EXPECT_EQ(DRAGDROP_S_CANCEL, object->QueryContinueDrag(TRUE, MK_LBUTTON));

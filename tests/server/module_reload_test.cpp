@@ -80,7 +80,7 @@ void ListAndExtractIcons(IShellFolder* folder, std::vector<int>& indexes) {
     EXPECT_EQ(S_OK, folder->EnumObjects(nullptr, SHCONTF_FOLDERS | SHCONTF_NONFOLDERS, &items));
     PITEMID_CHILD item = nullptr;
     while (items && items->Next(1, &item, nullptr) == S_OK) {
-        UniquePidl owned(reinterpret_cast<LPITEMIDLIST>(item));
+        UniqueChildPidl owned(item);
         ComPtr<IExtractIconW> extract;
         // MinGW declares no __uuidof for this interface: its IID is passed by name.
         EXPECT_EQ(S_OK, folder->GetUIObjectOf(nullptr, 1, const_cast<PCUITEMID_CHILD*>(&item),
@@ -286,10 +286,9 @@ public:
         UniqueChildPidl own(manager.CreateRootPidl());
         PIDLIST_ABSOLUTE computer = nullptr;
         EXPECT_EQ(S_OK, ::SHGetSpecialFolderLocation(nullptr, CSIDL_DRIVES, &computer));
-        UniquePidl absolute(manager.ConcatPidls(computer, own.get()));
+        UniqueAbsoluteIdList absolute(::ILCombine(computer, own.get()));
         ::CoTaskMemFree(computer);
-        EXPECT_EQ(S_OK, browser_->BrowseToView(
-                            view.Get(), reinterpret_cast<PCIDLIST_ABSOLUTE>(absolute.get())));
+        EXPECT_EQ(S_OK, browser_->BrowseToView(view.Get(), absolute.get()));
         // Until the fill's animation is gone.
         for (int tries = 0; tries < 100 && AnimationShown(); ++tries)
             browser_->PumpMessages(30);

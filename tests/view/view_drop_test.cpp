@@ -16,9 +16,8 @@ protected:
     ComPtr<CLVDropTargetOnListView> ListTarget(CExplorerWindow& browser,
                                                const std::wstring& folderPath) {
         auto target = MakeComObject<CLVDropTargetOnListView>();
-        UniquePidl folder(manager_.CreatePidlFromPath(folderPath.c_str()));
-        EXPECT_EQ(S_OK, target->SetUp(List(browser), browser.View(),
-                                      reinterpret_cast<PCUIDLIST_RELATIVE>(folder.get())));
+        UniqueRelativePidl folder(manager_.CreatePidlFromPath(folderPath.c_str()));
+        EXPECT_EQ(S_OK, target->SetUp(List(browser), browser.View(), folder.get()));
         EXPECT_EQ(S_OK, target->SetReceiver([this](const std::wstring& station,
                                                    const std::shared_ptr<TSourceList>& sources) {
             received_.push_back({station, *sources});
@@ -124,12 +123,12 @@ TEST_F(ViewDropTest, AStationsFileDraggedAsAShellItemIsParsedThroughItsOwnDataOb
     ASSERT_EQ(S_OK, desktop->BindToObject(station.get(), nullptr, IID_PPV_ARGS(&stationFolder)));
     ComPtr<IEnumIDList> items;
     ASSERT_EQ(S_OK, stationFolder->EnumObjects(nullptr, SHCONTF_NONFOLDERS, &items));
-    UniquePidl file;
-    ASSERT_EQ(S_OK, items->Next(1, reinterpret_cast<PITEMID_CHILD*>(file.put()), nullptr));
+    UniqueChildPidl file;
+    ASSERT_EQ(S_OK, items->Next(1, file.put(), nullptr));
 
     auto data = MakeComObject<BlockDataObject>();
     data->blocks[ShellIdListFormat()] =
-        IdListArrayBlock(station.get(), {reinterpret_cast<PCUITEMID_CHILD>(file.get())});
+        IdListArrayBlock(station.get(), {file.get()});
     TSourceParser parser(true);
     EXPECT_EQ(S_OK, parser.ParseDataObject(data.Get(), L"", true));
     // The root is the directory part of the file's parsing name: the station's own.

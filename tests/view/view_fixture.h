@@ -129,10 +129,9 @@ protected:
         // The browser's record of where it is: My Computer, then the folder's own items.
         PIDLIST_ABSOLUTE computer = nullptr;
         EXPECT_EQ(S_OK, ::SHGetSpecialFolderLocation(nullptr, CSIDL_DRIVES, &computer));
-        UniquePidl absolute(manager_.ConcatPidls(computer, own.get()));
+        UniqueAbsoluteIdList absolute(::ILCombine(computer, own.get()));
         ::CoTaskMemFree(computer);
-        EXPECT_EQ(S_OK, browser->BrowseToView(view.Get(),
-                                              reinterpret_cast<PCIDLIST_ABSOLUTE>(absolute.get())));
+        EXPECT_EQ(S_OK, browser->BrowseToView(view.Get(), absolute.get()));
         browsers_.push_back(browser);
         WaitForFill(*browser.Get());
         return *browser.Get();
