@@ -9,4 +9,4 @@
 // download writes the file itself. When the folder cannot take it, the user is told which folder
 // and why (owner, which may be null, owns the box) before anything else happens, and the failure
 // is returned.
-HRESULT PrepareDownloadTarget(HWND owner, std::wstring& target);
+[[nodiscard]] HRESULT PrepareDownloadTarget(HWND owner, std::wstring& target);

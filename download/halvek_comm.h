@@ -64,7 +64,7 @@ constexpr size_t kHalvekPointsBufferSize = kHalvekPointRecords * kHalvekPointRec
 
 // Loads the library from this module's directory (it stays loaded for the process) and creates
 // one object. On failure object stays null and errorText holds the system's text for the error.
-HRESULT CreateHalvekObject(UniqueHalvekObject& object, std::wstring& errorText);
+[[nodiscard]] HRESULT CreateHalvekObject(UniqueHalvekObject& object, std::wstring& errorText);
 
 // A new points buffer with every half's marker set to -1; null when memory is short.
 std::unique_ptr<uint8_t[]> MakeHalvekPointsBuffer();
@@ -82,7 +82,7 @@ std::string HalvekFilePath(const std::wstring& path);
 // one still writes it, it holds data and its drive did not run out of room (the library's own
 // success says nothing about a write that the disk cut short); otherwise the HRESULT of what is
 // wrong.
-HRESULT CheckReceivedFile(const std::wstring& path);
+[[nodiscard]] HRESULT CheckReceivedFile(const std::wstring& path);
 
 // The string-table text for a library result code.
 std::wstring HalvekResultText(int32_t code);

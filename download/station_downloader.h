@@ -21,6 +21,6 @@ public:
     // system's. A failure: the download could not run, or the system refused the file (a full
     // disk), with its reason. Anything but S_OK may leave part of a file, which is the caller's
     // to delete.
-    virtual HRESULT Download(HWND owner, const Station& station, const std::wstring& target,
-                             std::wstring& file) = 0;
+    [[nodiscard]] virtual HRESULT Download(HWND owner, const Station& station,
+                                           const std::wstring& target, std::wstring& file) = 0;
 };

@@ -8,7 +8,7 @@
 // 102 and 104, destroying older ones first. Called at module start-up; afterwards the lists are
 // only read. False, with no lists left, when a list or one of its icons cannot be made: a list
 // with an icon missing would shift every later index.
-bool BuildSharedIconLists(HMODULE module);
+[[nodiscard]] bool BuildSharedIconLists(HMODULE module);
 // Called at the module's tear-down, when nothing can be using the lists any more. Nothing else
 // destroys them, not even the library's unload: that runs under the loader lock.
 void DestroySharedIconLists();

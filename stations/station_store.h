@@ -21,7 +21,8 @@ Station DefaultStation();
 // the station's subkey name is copied out (at most *keyNameCapacity characters) and
 // *keyNameCapacity set to its length plus one. S_OK when found; E_FAIL when not found or the
 // store cannot be opened.
-[[nodiscard]] HRESULT FindStation(Station& station, wchar_t* keyName = nullptr, DWORD* keyNameCapacity = nullptr);
+[[nodiscard]] HRESULT FindStation(Station& station, wchar_t* keyName = nullptr,
+                                  DWORD* keyNameCapacity = nullptr);
 
 // Writes the station under the lowest free "Station %d". E_INVALIDARG when the name is taken;
 // E_FAIL when the store cannot be opened or a key cannot be created.

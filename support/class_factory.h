@@ -12,7 +12,7 @@ using CreateInstanceFunction = HRESULT (*)(REFIID iid, void** object);
 // Makes an object with make() and asks it for the interface; the object is released again when
 // that fails.
 template <typename Make>
-HRESULT CreateAndQuery(Make make, REFIID iid, void** object) noexcept {
+[[nodiscard]] HRESULT CreateAndQuery(Make make, REFIID iid, void** object) noexcept {
     if (!object)
         return E_POINTER;
     *object = nullptr;
@@ -24,13 +24,13 @@ HRESULT CreateAndQuery(Make make, REFIID iid, void** object) noexcept {
 
 // Creates T with its default constructor.
 template <typename T>
-HRESULT CreateComInstance(REFIID iid, void** object) noexcept {
+[[nodiscard]] HRESULT CreateComInstance(REFIID iid, void** object) noexcept {
     return CreateAndQuery([] { return MakeComObject<T>(); }, iid, object);
 }
 
 // Creates T from the one argument that MakeArgument() gives: what the class must be handed.
 template <typename T, auto MakeArgument>
-HRESULT CreateComInstanceWith(REFIID iid, void** object) noexcept {
+[[nodiscard]] HRESULT CreateComInstanceWith(REFIID iid, void** object) noexcept {
     return CreateAndQuery([] { return MakeComObject<T>(MakeArgument()); }, iid, object);
 }
 

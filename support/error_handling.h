@@ -13,10 +13,10 @@ void LogFailure(HRESULT result, const char* file, const char* function, int line
 
 // The thread's last error as an HRESULT; E_FAIL when a failed call left none, so that the
 // result can never read as success.
-HRESULT LastErrorResult() noexcept;
+[[nodiscard]] HRESULT LastErrorResult() noexcept;
 
 // The HRESULT for the exception being handled (bad_alloc → E_OUTOFMEMORY, anything else E_FAIL).
-HRESULT ResultFromCaughtException() noexcept;
+[[nodiscard]] HRESULT ResultFromCaughtException() noexcept;
 
 #define LV_LOG_AND_RETURN(result)                             \
     do {                                                      \

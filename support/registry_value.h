@@ -9,7 +9,8 @@
 // Reads a REG_SZ value of at most maxBytes bytes (terminator included). A value of another type
 // gives ERROR_UNSUPPORTED_TYPE, a longer one ERROR_MORE_DATA; a stored text that lacks its
 // terminator is cut at the value's end.
-[[nodiscard]] LONG ReadStringValue(HKEY key, const wchar_t* name, DWORD maxBytes, std::wstring& text);
+[[nodiscard]] LONG ReadStringValue(HKEY key, const wchar_t* name, DWORD maxBytes,
+                                   std::wstring& text);
 
 // Reads a REG_DWORD value; any other type or size gives ERROR_UNSUPPORTED_TYPE.
 [[nodiscard]] LONG ReadDwordValue(HKEY key, const wchar_t* name, DWORD& value);

@@ -25,12 +25,12 @@ public:
     ~CLVDataObject() override;
 
     // Appends a copy of one item's internal full identifier (root, station, and file if any).
-    HRESULT SetItem(PCUIDLIST_RELATIVE fullList);
-    HRESULT AddItem(PCUIDLIST_RELATIVE fullList) { return SetItem(fullList); }
+    [[nodiscard]] HRESULT SetItem(PCUIDLIST_RELATIVE fullList);
+    [[nodiscard]] HRESULT AddItem(PCUIDLIST_RELATIVE fullList) { return SetItem(fullList); }
     // Where the shell has the folder the items were taken from (its identifier from the desktop):
     // the parent that "Shell IDList Array" names. Without one the format is not given, since the
     // items' own lists start inside the namespace and would be taken for the desktop's.
-    HRESULT SetFolderLocation(PCIDLIST_ABSOLUTE folder);
+    [[nodiscard]] HRESULT SetFolderLocation(PCIDLIST_ABSOLUTE folder);
 
     // The drag image that the view's drag start prepared; the object destroys the list when the
     // drag ends.
@@ -54,14 +54,14 @@ public:
     IFACEMETHODIMP GiveFeedback(DWORD effect) override;
 
 private:
-    HRESULT GetPreferredDropEffect(STGMEDIUM* medium);
-    HRESULT GetFileGroupDescriptor(STGMEDIUM* medium);
-    HRESULT GetFileContents(LONG index, STGMEDIUM* medium);
-    HRESULT GetShellIdListArray(STGMEDIUM* medium);
-    HRESULT GetStationList(STGMEDIUM* medium);
+    [[nodiscard]] HRESULT GetPreferredDropEffect(STGMEDIUM* medium);
+    [[nodiscard]] HRESULT GetFileGroupDescriptor(STGMEDIUM* medium);
+    [[nodiscard]] HRESULT GetFileContents(LONG index, STGMEDIUM* medium);
+    [[nodiscard]] HRESULT GetShellIdListArray(STGMEDIUM* medium);
+    [[nodiscard]] HRESULT GetStationList(STGMEDIUM* medium);
 
     // The station named by an item's path; the store's status when it cannot be loaded.
-    HRESULT LoadItemStation(PCUIDLIST_RELATIVE item, Station& station) const;
+    [[nodiscard]] HRESULT LoadItemStation(PCUIDLIST_RELATIVE item, Station& station) const;
     void EndDragImage() noexcept;
 
     std::shared_ptr<StationDownloader> downloader_;

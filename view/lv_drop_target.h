@@ -35,14 +35,14 @@ __CRT_UUID_DECL(IDroppedSourcesTarget, 0xAEAD47F9, 0xB75A, 0x4FF9, 0xAC, 0xF4, 0
                 0xDC, 0x8A, 0xB6)
 
 // S_OK when the source offers files, shell items, or virtual files with their contents.
-HRESULT AcceptDropSource(IDataObject* dataObject) noexcept;
+[[nodiscard]] HRESULT AcceptDropSource(IDataObject* dataObject) noexcept;
 
 class CLVDropTarget final : public ComObject<IDropTarget, IDroppedSourcesTarget> {
 public:
     CLVDropTarget() noexcept = default;
 
     // The station's internal full identifier (the root item, then the station).
-    HRESULT SetItem(PCUIDLIST_RELATIVE fullList) noexcept;
+    [[nodiscard]] HRESULT SetItem(PCUIDLIST_RELATIVE fullList) noexcept;
 
     IFACEMETHODIMP QueryInterface(REFIID iid, void** object) override;
     IFACEMETHODIMP DragEnter(IDataObject* dataObject, DWORD keys, POINTL point,
@@ -66,7 +66,7 @@ public:
 
     // The view's list, the view (held until the target goes, which is when the list revokes it)
     // and the internal full identifier of the view's folder.
-    HRESULT SetUp(HWND list, IShellView* view, PCUIDLIST_RELATIVE folder) noexcept;
+    [[nodiscard]] HRESULT SetUp(HWND list, IShellView* view, PCUIDLIST_RELATIVE folder) noexcept;
 
     IFACEMETHODIMP QueryInterface(REFIID iid, void** object) override;
     IFACEMETHODIMP DragEnter(IDataObject* dataObject, DWORD keys, POINTL point,

@@ -57,8 +57,8 @@ private:
     void ChangedStations();
     // The selected items with an identifier, added to the data object by their full identifiers;
     // S_FALSE when the selection held none.
-    HRESULT AddSelectedItems(CLVDataObject& dataObject,
-                             const std::vector<SelectedItem>& selection) const;
+    [[nodiscard]] HRESULT AddSelectedItems(CLVDataObject& dataObject,
+                                           const std::vector<SelectedItem>& selection) const;
     // Items' internal full identifiers: the folder's path, then the item.
     PIDLIST_RELATIVE CreateFullItem(PCUITEMID_CHILD item) const;
 

@@ -82,6 +82,15 @@ DWORD WINAPI FillThread(void* parameter) {
     return 0;
 }
 
+// Each list item's data is the child identifier that the fill gave it and that the item owns;
+// the entry's is null. Only these two turn one into the other.
+LPARAM ItemData(PITEMID_CHILD item) noexcept {
+    return reinterpret_cast<LPARAM>(item);
+}
+PITEMID_CHILD ItemOfData(LPARAM data) noexcept {
+    return reinterpret_cast<PITEMID_CHILD>(data);
+}
+
 struct SortContext {
     IShellFolder* folder;
     LPARAM column;
@@ -93,10 +102,8 @@ int CALLBACK CompareItems(LPARAM first, LPARAM second, LPARAM context) {
         return first ? 1 : (second ? -1 : 0);
     const auto& sort = *reinterpret_cast<const SortContext*>(context);
     // The folder answers with the order itself in the status value.
-    // Each item's data is the child identifier that the fill gave it.
-    return static_cast<int>(sort.folder->CompareIDs(sort.column,
-                                                    reinterpret_cast<PCUITEMID_CHILD>(first),
-                                                    reinterpret_cast<PCUITEMID_CHILD>(second)));
+    return static_cast<int>(
+        sort.folder->CompareIDs(sort.column, ItemOfData(first), ItemOfData(second)));
 }
 
 }  // namespace
@@ -151,9 +158,8 @@ void CShellViewList::ApplyViewModeStyle() noexcept {
     if (!list)
         return;
     const LONG_PTR style = ::GetWindowLongPtrW(list, GWL_STYLE);
-    ::SetWindowLongPtrW(
-        list, GWL_STYLE,
-        (style & ~static_cast<LONG_PTR>(LVS_TYPEMASK)) | ListViewType(viewMode_));
+    ::SetWindowLongPtrW(list, GWL_STYLE,
+                        (style & ~static_cast<LONG_PTR>(LVS_TYPEMASK)) | ListViewType(viewMode_));
     constexpr DWORD kClickMask = LVS_EX_TRACKSELECT | LVS_EX_ONECLICKACTIVATE | LVS_EX_UNDERLINEHOT;
     list_.Send(LVM_SETEXTENDEDLISTVIEWSTYLE, kClickMask, ClickStyles());
 }
@@ -266,7 +272,7 @@ void CShellViewList::OnEnumeratorReady(IEnumIDList* enumerator) {
             item.iItem = index;
             item.pszText = LPSTR_TEXTCALLBACKW;
             item.iImage = I_IMAGECALLBACK;
-            item.lParam = reinterpret_cast<LPARAM>(identifier.get());
+            item.lParam = ItemData(identifier.get());
             if (list_.Send(LVM_INSERTITEMW, 0, reinterpret_cast<LPARAM>(&item)) >= 0) {
                 (void)identifier.release();  // the list's item owns it; deleting it frees it
                 ++index;
@@ -309,7 +315,7 @@ void CShellViewList::ReadColumnWidths() noexcept {
 }
 
 void CShellViewList::OnGetDisplayInfo(NMLVDISPINFOW& info) {
-    const auto item = reinterpret_cast<PCUITEMID_CHILD>(info.item.lParam);
+    const PCUITEMID_CHILD item = ItemOfData(info.item.lParam);
     if (!item)
         return;
     if (info.item.mask & LVIF_TEXT) {
@@ -323,8 +329,9 @@ void CShellViewList::OnGetDisplayInfo(NMLVDISPINFOW& info) {
         wchar_t location[MAX_PATH] = {};
         int index = kRootIconIndex;
         UINT flags = 0;
-        if (SUCCEEDED(folder_.folder->GetUIObjectOf(view_, 1, &item, IID_IExtractIconW, nullptr,
-                                                    reinterpret_cast<void**>(icon.GetAddressOf()))) &&
+        if (SUCCEEDED(
+                folder_.folder->GetUIObjectOf(view_, 1, &item, IID_IExtractIconW, nullptr,
+                                              reinterpret_cast<void**>(icon.GetAddressOf()))) &&
             FAILED(icon->GetIconLocation(0, location, ARRAYSIZE(location), &index, &flags)))
             index = kRootIconIndex;
         info.item.iImage = index;
@@ -333,7 +340,7 @@ void CShellViewList::OnGetDisplayInfo(NMLVDISPINFOW& info) {
 
 void CShellViewList::OnDeleteItem(const NMLISTVIEW& item) noexcept {
     // The item owned its identifier; the entry has none.
-    UniqueChildPidl owned(reinterpret_cast<PITEMID_CHILD>(item.lParam));
+    UniqueChildPidl owned(ItemOfData(item.lParam));
 }
 
 std::vector<CShellViewList::SelectedItem> CShellViewList::Selection() const {
@@ -347,7 +354,7 @@ std::vector<CShellViewList::SelectedItem> CShellViewList::Selection() const {
         item.mask = LVIF_PARAM;
         item.iItem = index;
         if (list_.Send(LVM_GETITEMW, 0, reinterpret_cast<LPARAM>(&item)))
-            selection.push_back({index, reinterpret_cast<PCUITEMID_CHILD>(item.lParam)});
+            selection.push_back({index, ItemOfData(item.lParam)});
     }
     return selection;
 }

@@ -35,7 +35,7 @@ public:
     // Creates the control in the view window (in the chosen view mode) and registers its drop
     // target, which holds dropView until the control is destroyed; false when the control could
     // not be made.
-    bool Create(HWND view, IShellView* dropView);
+    [[nodiscard]] bool Create(HWND view, IShellView* dropView);
     // Waits for the fills, revokes the drop target, destroys the control and the animation.
     void Destroy() noexcept;
 

@@ -12,7 +12,8 @@ public:
     ~CShellViewListWindow() { Destroy(); }
 
     // Creates the list as a child of parent with the given styles and control id.
-    bool Create(HWND parent, DWORD style, DWORD extendedStyle, UINT controlId) noexcept;
+    [[nodiscard]] bool Create(HWND parent, DWORD style, DWORD extendedStyle,
+                              UINT controlId) noexcept;
     void Destroy() noexcept;
 
     HWND Window() const noexcept { return window_; }

@@ -4,6 +4,7 @@
 
 #include <shlwapi.h>
 
+#include "namespace/pidl_manager.h"
 #include "support/clipboard_formats.h"
 #include "support/error_handling.h"
 #include "support/unique_resource.h"
@@ -63,6 +64,16 @@ std::wstring FileSystemPath(PCIDLIST_ABSOLUTE item) {
         return {};
     path.resize(wcsnlen(path.c_str(), kLongPathCapacity));
     return path;
+}
+
+// The lists of a "Shell IDList Array" as the shell's types. The reader copied each out whole,
+// terminator included, and only when it lay inside the block; these are the only places where
+// the block's bytes become item-ID lists.
+PCIDLIST_ABSOLUTE AbsoluteListOf(const std::vector<uint8_t>& bytes) noexcept {
+    return reinterpret_cast<PCIDLIST_ABSOLUTE>(bytes.data());
+}
+PCUITEMID_CHILD ChildListOf(const std::vector<uint8_t>& bytes) noexcept {
+    return reinterpret_cast<PCUITEMID_CHILD>(bytes.data());
 }
 
 }  // namespace
@@ -174,11 +185,10 @@ HRESULT TSourceParser::ParseItemArray(IDataObject* dataObject, const FORMATETC& 
     const IdListArray array =
         ReadIdListArray(static_cast<const uint8_t*>(lock.data()), lock.size());
     RETURN_HR_IF(E_INVALIDARG, array.parent.empty());
-    const auto parent = reinterpret_cast<PCIDLIST_ABSOLUTE>(array.parent.data());
+    const PCIDLIST_ABSOLUTE parent = AbsoluteListOf(array.parent);
     if (rootOnly) {
         RETURN_HR_IF(E_INVALIDARG, array.children.empty());
-        UniqueAbsoluteIdList first(::ILCombine(
-            parent, reinterpret_cast<PCUIDLIST_RELATIVE>(array.children.front().list.data())));
+        UniqueAbsoluteIdList first(::ILCombine(parent, ChildListOf(array.children.front().list)));
         RETURN_IF_NULL_ALLOC(first.get());
         rootPath = DirectoryPart(FileSystemPath(first.get()));
         return S_OK;
@@ -187,7 +197,7 @@ HRESULT TSourceParser::ParseItemArray(IDataObject* dataObject, const FORMATETC& 
     for (const IdListArrayChild& child : array.children) {
         if (cancelled_)
             break;
-        result.Add(ParsePIDL(parent, reinterpret_cast<PCUITEMID_CHILD>(child.list.data())));
+        result.Add(ParsePIDL(parent, ChildListOf(child.list)));
     }
     return result.Value();
 }
@@ -278,10 +288,10 @@ HRESULT TSourceParser::ParseShortcut(const std::wstring& path, bool& parsed) {
         PIDLIST_ABSOLUTE raw = nullptr;
         if (SUCCEEDED(link->GetIDList(&raw)) && raw) {
             UniqueAbsoluteIdList parent(raw);
-            UniqueAbsoluteIdList child(reinterpret_cast<PIDLIST_ABSOLUTE>(::ILClone(::ILFindLastID(parent.get()))));
+            UniqueChildPidl child(::ILCloneChild(::ILFindLastID(parent.get())));
             if (child && ::ILRemoveLastID(parent.get())) {
                 parsed = true;
-                result = ParsePIDL(parent.get(), reinterpret_cast<PCUITEMID_CHILD>(child.get()));
+                result = ParsePIDL(parent.get(), child.get());
             }
         }
     }

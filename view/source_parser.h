@@ -34,12 +34,13 @@ public:
 
     // Appends the data object's sources. rootPath empty: found from the object's item IDs when it
     // offers them; deep false stops at virtual items (their own data objects are not opened).
-    HRESULT ParseDataObject(IDataObject* dataObject, const std::wstring& rootPath, bool deep);
+    [[nodiscard]] HRESULT ParseDataObject(IDataObject* dataObject, const std::wstring& rootPath,
+                                          bool deep);
     // The first parsed data object, for use on another thread: once. S_FALSE before any parse.
-    HRESULT GetDataObject(IDataObject** dataObject);
-    HRESULT ParsePath(const std::wstring& path, const std::wstring& rootPath);
+    [[nodiscard]] HRESULT GetDataObject(IDataObject** dataObject);
+    [[nodiscard]] HRESULT ParsePath(const std::wstring& path, const std::wstring& rootPath);
     // A shell item given as its parent folder (absolute) and its own ID.
-    HRESULT ParsePIDL(PCIDLIST_ABSOLUTE parent, PCUITEMID_CHILD child);
+    [[nodiscard]] HRESULT ParsePIDL(PCIDLIST_ABSOLUTE parent, PCUITEMID_CHILD child);
 
     // Wildcard patterns (as in "*.tmp") of paths to leave out; none by default.
     void SetPathFilter(std::vector<std::wstring> patterns) { filter_ = std::move(patterns); }
@@ -52,13 +53,13 @@ public:
     bool Cancelled() const noexcept { return cancelled_; }
 
 private:
-    HRESULT ParseDropFiles(IDataObject* dataObject, const FORMATETC& format);
-    HRESULT ParseFileGroup(IDataObject* dataObject, const FORMATETC& format, bool wide,
-                           const std::wstring& rootPath);
-    HRESULT ParseItemArray(IDataObject* dataObject, const FORMATETC& format, bool rootOnly,
-                           std::wstring& rootPath);
-    HRESULT ParseShortcut(const std::wstring& path, bool& parsed);
-    HRESULT ParseFolder(const std::wstring& path, const std::wstring& rootPath);
+    [[nodiscard]] HRESULT ParseDropFiles(IDataObject* dataObject, const FORMATETC& format);
+    [[nodiscard]] HRESULT ParseFileGroup(IDataObject* dataObject, const FORMATETC& format,
+                                         bool wide, const std::wstring& rootPath);
+    [[nodiscard]] HRESULT ParseItemArray(IDataObject* dataObject, const FORMATETC& format,
+                                         bool rootOnly, std::wstring& rootPath);
+    [[nodiscard]] HRESULT ParseShortcut(const std::wstring& path, bool& parsed);
+    [[nodiscard]] HRESULT ParseFolder(const std::wstring& path, const std::wstring& rootPath);
     void Add(const std::wstring& rootPath, const std::wstring& path, uint32_t index);
 
     std::shared_ptr<TSourceList> sources_;

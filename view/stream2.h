@@ -51,7 +51,7 @@ public:
 private:
     enum State : DWORD { kNotOpened = 0, kReading = 2, kFinished = 3 };
 
-    HRESULT ReadLocked(void* buffer, ULONG wanted, ULONG* got);
+    [[nodiscard]] HRESULT ReadLocked(void* buffer, ULONG wanted, ULONG* got);
     // Closes the file and, when asked at binding, deletes it; the state ends finished.
     void Finish() noexcept;
 

@@ -23,8 +23,8 @@ bool CViewNotifyWindow::Create(HWND view) noexcept {
     if (!::RegisterClassExW(&windowClass) && ::GetLastError() != ERROR_CLASS_ALREADY_EXISTS)
         return false;
     // Not a message-only window: those do not hear broadcasts.
-    window_.reset(::CreateWindowExW(WS_EX_TOOLWINDOW, kNotifyWindowClass, L"", WS_POPUP, 0, 0, 0,
-                                    0, nullptr, nullptr, instance, nullptr));
+    window_.reset(::CreateWindowExW(WS_EX_TOOLWINDOW, kNotifyWindowClass, L"", WS_POPUP, 0, 0, 0, 0,
+                                    nullptr, nullptr, instance, nullptr));
     if (!window_)
         return false;
     ::SetWindowLongPtrW(window_.get(), GWLP_USERDATA, reinterpret_cast<LONG_PTR>(view));

@@ -14,7 +14,7 @@ public:
 
     // Creates the window of class "QRV Net Shell Extension - Notify"; every change broadcast it
     // hears is posted on to view with the same arguments.
-    bool Create(HWND view) noexcept;
+    [[nodiscard]] bool Create(HWND view) noexcept;
     void Destroy() noexcept { window_.reset(); }
 
     HWND Window() const noexcept { return window_.get(); }

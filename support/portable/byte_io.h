@@ -45,7 +45,8 @@ inline void AppendWideZ(std::vector<uint8_t>& out, WideStringView text) {
 
 // Reads a zero-terminated UTF-16LE text that must end within [bytes, bytes + size).
 // Returns false (and leaves consumed untouched) when no terminator lies inside the span.
-[[nodiscard]] inline bool ReadWideZ(const uint8_t* bytes, size_t size, WideString& text, size_t& consumed) {
+[[nodiscard]] inline bool ReadWideZ(const uint8_t* bytes, size_t size, WideString& text,
+                                    size_t& consumed) {
     for (size_t offset = 0; offset + 1 < size; offset += 2) {
         if (ReadU16(bytes + offset) == 0) {
             text.clear();

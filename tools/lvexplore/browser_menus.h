@@ -33,7 +33,7 @@ using BrowserPopups = std::array<UniqueMenu, 3>;
 // shell id (FCIDM_MENU_FILE, _EDIT, _VIEW) so that a view finds it by command, and fills the
 // browser's groups of the widths (File and Edit, then View). All or nothing.
 [[nodiscard]] HRESULT InsertBrowserPopups(HMENU shared, const BrowserPopups& popups,
-                            OLEMENUGROUPWIDTHS* widths) noexcept;
+                                          OLEMENUGROUPWIDTHS* widths) noexcept;
 
 // Takes the popups out of the shared menu without destroying them; true when any was there.
 bool RemoveBrowserPopups(HMENU shared, const BrowserPopups& popups) noexcept;

@@ -44,7 +44,7 @@ enum class BrowseStep {
 class CExplorerWindow final : public ComObject<IShellBrowser, ICommDlgBrowser> {
 public:
     [[nodiscard]] static HRESULT Create(const ExplorerOptions& options,
-                          Microsoft::WRL::ComPtr<CExplorerWindow>& window);
+                                        Microsoft::WRL::ComPtr<CExplorerWindow>& window);
 
     // Binds the folder from the desktop, asks it for its view and shows that view in place of the
     // current one; the current folder goes into the history for Back.
