@@ -7,6 +7,8 @@
 #include <windows.h>
 #include <shlobj.h>
 
+#include <iterator>
+
 // The stations copied between views (the flat records of stations/station_list_block.h).
 inline constexpr wchar_t kStationListFormatName[] = L"Quorvel Total Stations";
 
@@ -15,25 +17,21 @@ inline CLIPFORMAT RegisteredClipboardFormat(const wchar_t* name) noexcept {
     return static_cast<CLIPFORMAT>(::RegisterClipboardFormatW(name));
 }
 
-// A virtual file's bytes, asked for by the file's index in the group descriptor.
-inline CLIPFORMAT FileContentsFormat() noexcept {
-    return RegisteredClipboardFormat(CFSTR_FILECONTENTS);
-}
-// The names of the virtual files, in UTF-16 and in the ANSI code page.
-inline CLIPFORMAT FileGroupDescriptorFormat() noexcept {
-    return RegisteredClipboardFormat(CFSTR_FILEDESCRIPTORW);
-}
-inline CLIPFORMAT AnsiFileGroupDescriptorFormat() noexcept {
-    return RegisteredClipboardFormat(CFSTR_FILEDESCRIPTORA);
-}
-// Shell items: a parent's identifier list from the desktop and its children's.
-inline CLIPFORMAT ShellIdListFormat() noexcept {
-    return RegisteredClipboardFormat(CFSTR_SHELLIDLIST);
-}
-// What the source wants done with its items: always a copy for ours.
-inline CLIPFORMAT PreferredDropEffectFormat() noexcept {
-    return RegisteredClipboardFormat(CFSTR_PREFERREDDROPEFFECT);
-}
-inline CLIPFORMAT StationListFormat() noexcept {
-    return RegisteredClipboardFormat(kStationListFormatName);
+// The formats the folder itself names.
+enum class ClipboardFormat {
+    FileContents,             // a virtual file's bytes, by the file's index in the descriptor
+    FileGroupDescriptor,      // the names of the virtual files, in UTF-16
+    AnsiFileGroupDescriptor,  // the same in the ANSI code page
+    ShellIdList,              // shell items: a parent's list from the desktop and its children
+    PreferredDropEffect,      // what the source wants done with its items: always a copy for ours
+    StationList,              // the stations copied between views
+};
+
+inline CLIPFORMAT RegisteredFormat(ClipboardFormat format) noexcept {
+    // In the order of the enumeration.
+    static constexpr const wchar_t* kNames[] = {CFSTR_FILECONTENTS,        CFSTR_FILEDESCRIPTORW,
+                                                CFSTR_FILEDESCRIPTORA,     CFSTR_SHELLIDLIST,
+                                                CFSTR_PREFERREDDROPEFFECT, kStationListFormatName};
+    static_assert(std::size(kNames) == static_cast<size_t>(ClipboardFormat::StationList) + 1);
+    return RegisteredClipboardFormat(kNames[static_cast<size_t>(format)]);
 }

@@ -25,7 +25,8 @@ bool IsHGlobalRequest(const FORMATETC& format, CLIPFORMAT wanted) noexcept {
 }
 
 bool IsStreamRequest(const FORMATETC& format) noexcept {
-    return format.cfFormat == FileContentsFormat() && (format.tymed & TYMED_ISTREAM) != 0;
+    return format.cfFormat == RegisteredFormat(ClipboardFormat::FileContents) &&
+           (format.tymed & TYMED_ISTREAM) != 0;
 }
 
 // Hands a filled block to the caller as an HGLOBAL medium.
@@ -109,17 +110,17 @@ IFACEMETHODIMP CLVDataObject::GetData(FORMATETC* format, STGMEDIUM* medium) {
         return E_INVALIDARG;
     try {
         *medium = {};
-        if (IsHGlobalRequest(*format, PreferredDropEffectFormat())) {
+        if (IsHGlobalRequest(*format, RegisteredFormat(ClipboardFormat::PreferredDropEffect))) {
             return GetPreferredDropEffect(medium);
         }
-        if (IsHGlobalRequest(*format, FileGroupDescriptorFormat())) {
+        if (IsHGlobalRequest(*format, RegisteredFormat(ClipboardFormat::FileGroupDescriptor))) {
             return GetFileGroupDescriptor(medium);
         }
         if (IsStreamRequest(*format))
             return GetFileContents(format->lindex, medium);
-        if (IsHGlobalRequest(*format, ShellIdListFormat()))
+        if (IsHGlobalRequest(*format, RegisteredFormat(ClipboardFormat::ShellIdList)))
             return GetShellIdListArray(medium);
-        if (IsHGlobalRequest(*format, StationListFormat()))
+        if (IsHGlobalRequest(*format, RegisteredFormat(ClipboardFormat::StationList)))
             return GetStationList(medium);
         return E_INVALIDARG;
     }
@@ -274,10 +275,11 @@ HRESULT CLVDataObject::GetStationList(STGMEDIUM* medium) {
 IFACEMETHODIMP CLVDataObject::QueryGetData(FORMATETC* format) {
     if (!format)
         return E_INVALIDARG;
-    if (IsStreamRequest(*format) || IsHGlobalRequest(*format, FileGroupDescriptorFormat()) ||
-        IsHGlobalRequest(*format, ShellIdListFormat()) ||
-        IsHGlobalRequest(*format, PreferredDropEffectFormat()) ||
-        IsHGlobalRequest(*format, StationListFormat())) {
+    if (IsStreamRequest(*format) ||
+        IsHGlobalRequest(*format, RegisteredFormat(ClipboardFormat::FileGroupDescriptor)) ||
+        IsHGlobalRequest(*format, RegisteredFormat(ClipboardFormat::ShellIdList)) ||
+        IsHGlobalRequest(*format, RegisteredFormat(ClipboardFormat::PreferredDropEffect)) ||
+        IsHGlobalRequest(*format, RegisteredFormat(ClipboardFormat::StationList))) {
         return S_OK;
     }
     return S_FALSE;
@@ -303,10 +305,14 @@ IFACEMETHODIMP CLVDataObject::EnumFormatEtc(DWORD, IEnumFORMATETC** enumerator) 
     try {
         // "Preferred DropEffect" is answered but not listed.
         const FORMATETC formats[] = {
-            {FileContentsFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_ISTREAM},
-            {FileGroupDescriptorFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL},
-            {ShellIdListFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL},
-            {StationListFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL},
+            {RegisteredFormat(ClipboardFormat::FileContents), nullptr, DVASPECT_CONTENT, -1,
+             TYMED_ISTREAM},
+            {RegisteredFormat(ClipboardFormat::FileGroupDescriptor), nullptr, DVASPECT_CONTENT, -1,
+             TYMED_HGLOBAL},
+            {RegisteredFormat(ClipboardFormat::ShellIdList), nullptr, DVASPECT_CONTENT, -1,
+             TYMED_HGLOBAL},
+            {RegisteredFormat(ClipboardFormat::StationList), nullptr, DVASPECT_CONTENT, -1,
+             TYMED_HGLOBAL},
         };
         *enumerator = MakeComObject<CEnumFormatEtc>(formats, ARRAYSIZE(formats)).Detach();
         return S_OK;

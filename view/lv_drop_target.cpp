@@ -53,11 +53,14 @@ HRESULT AcceptDropSource(IDataObject* dataObject) noexcept {
         return E_INVALIDARG;
     if (QueryFormat(dataObject, CF_HDROP, TYMED_HGLOBAL) == S_OK)
         return S_OK;
-    if (QueryFormat(dataObject, ShellIdListFormat(), TYMED_HGLOBAL) == S_OK)
+    if (QueryFormat(dataObject, RegisteredFormat(ClipboardFormat::ShellIdList), TYMED_HGLOBAL) ==
+        S_OK)
         return S_OK;
     // Virtual files are only worth taking when their contents come with them.
-    if (QueryFormat(dataObject, FileGroupDescriptorFormat(), TYMED_HGLOBAL) == S_OK &&
-        QueryFormat(dataObject, FileContentsFormat(), TYMED_ISTREAM) == S_OK)
+    if (QueryFormat(dataObject, RegisteredFormat(ClipboardFormat::FileGroupDescriptor),
+                    TYMED_HGLOBAL) == S_OK &&
+        QueryFormat(dataObject, RegisteredFormat(ClipboardFormat::FileContents), TYMED_ISTREAM) ==
+            S_OK)
         return S_OK;
     return E_INVALIDARG;
 }

@@ -220,7 +220,8 @@ void CShellViewCommands::PasteStations() {
     Microsoft::WRL::ComPtr<IDataObject> clipboard;
     if (FAILED(::OleGetClipboard(&clipboard)) || !clipboard)
         return;
-    FORMATETC format{StationListFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
+    FORMATETC format{RegisteredFormat(ClipboardFormat::StationList), nullptr, DVASPECT_CONTENT, -1,
+                     TYMED_HGLOBAL};
     UniqueStgMedium medium;
     if (format.cfFormat == 0 || FAILED(clipboard->GetData(&format, medium.put())))
         return;

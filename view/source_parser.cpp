@@ -124,15 +124,15 @@ HRESULT TSourceParser::ParseDataObject(IDataObject* dataObject, const std::wstri
         return ParseDropFiles(dataObject, dropFiles);
 
     std::wstring root = rootPath;
-    FORMATETC items = HGlobalFormat(ShellIdListFormat());
+    FORMATETC items = HGlobalFormat(RegisteredFormat(ClipboardFormat::ShellIdList));
     const bool offersItems = dataObject->QueryGetData(&items) == S_OK;
     if (root.empty() && offersItems)
         (void)ParseItemArray(dataObject, items, true, root);  // a failure leaves the root empty
 
-    FORMATETC ansiGroup = HGlobalFormat(AnsiFileGroupDescriptorFormat());
+    FORMATETC ansiGroup = HGlobalFormat(RegisteredFormat(ClipboardFormat::AnsiFileGroupDescriptor));
     if (dataObject->QueryGetData(&ansiGroup) == S_OK)
         return ParseFileGroup(dataObject, ansiGroup, false, root);
-    FORMATETC wideGroup = HGlobalFormat(FileGroupDescriptorFormat());
+    FORMATETC wideGroup = HGlobalFormat(RegisteredFormat(ClipboardFormat::FileGroupDescriptor));
     const HRESULT offersWideGroup = dataObject->QueryGetData(&wideGroup);
     if (offersWideGroup == S_OK)
         return ParseFileGroup(dataObject, wideGroup, true, root);

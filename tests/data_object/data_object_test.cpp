@@ -58,9 +58,9 @@ TEST_F(DataObject, EnumerationListsFourFormatsButNotTheDropEffectWhichIsAlwaysCo
     ComPtr<IEnumFORMATETC> clone;
     ASSERT_EQ(S_OK, formats->Clone(&clone));
     ASSERT_EQ(S_OK, clone->Next(1, entries, nullptr));
-    EXPECT_EQ(ShellIdListFormat(), entries[0].cfFormat);
+    EXPECT_EQ(RegisteredFormat(ClipboardFormat::ShellIdList), entries[0].cfFormat);
     ASSERT_EQ(S_OK, formats->Next(1, entries, nullptr));
-    EXPECT_EQ(ShellIdListFormat(), entries[0].cfFormat);
+    EXPECT_EQ(RegisteredFormat(ClipboardFormat::ShellIdList), entries[0].cfFormat);
 
     UniqueStgMedium medium;
     ASSERT_EQ(S_OK, Get(data.Get(), CFSTR_PREFERREDDROPEFFECT, TYMED_HGLOBAL, medium));

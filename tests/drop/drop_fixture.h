@@ -64,7 +64,7 @@ public:
     }
     IFACEMETHODIMP GetDataHere(FORMATETC*, STGMEDIUM*) override { return E_NOTIMPL; }
     IFACEMETHODIMP QueryGetData(FORMATETC* format) override {
-        if (contents && format->cfFormat == FileContentsFormat())
+        if (contents && format->cfFormat == RegisteredFormat(ClipboardFormat::FileContents))
             return (format->tymed & TYMED_ISTREAM) ? S_OK : DV_E_TYMED;
         return blocks.count(format->cfFormat) && (format->tymed & TYMED_HGLOBAL) ? S_OK
                                                                                  : DV_E_FORMATETC;

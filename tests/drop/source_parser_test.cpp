@@ -107,7 +107,8 @@ TEST_F(SourceParserTest, AVeryDeepFolderIsWalkedDownToTheDepthLimitOnly) {
 TEST_F(SourceParserTest, FileGroupsSkipDirectoriesAndKeepTheIndexes) {
     for (bool wide : {true, false}) {
         auto data = MakeComObject<BlockDataObject>();
-        data->blocks[wide ? FileGroupDescriptorFormat() : AnsiFileGroupDescriptorFormat()] =
+        data->blocks[wide ? RegisteredFormat(ClipboardFormat::FileGroupDescriptor)
+                          : RegisteredFormat(ClipboardFormat::AnsiFileGroupDescriptor)] =
             FileGroupBlock({{L"one.lv", 0}, {L"folder", FILE_ATTRIBUTE_DIRECTORY}, {L"two.lv", 0}},
                            wide);
         EXPECT_EQ((std::vector<TSourceDescriptor>{{L"", L"one.lv", 0}, {L"", L"two.lv", 2}}),
@@ -124,9 +125,15 @@ TEST_F(SourceParserTest, DropSourcesAreAcceptedByTheirFormats) {
         HRESULT expected;
     } cases[] = {
         {"files", {CF_HDROP}, false, S_OK},
-        {"shell items", {ShellIdListFormat()}, false, S_OK},
-        {"virtual files with contents", {FileGroupDescriptorFormat()}, true, S_OK},
-        {"virtual files without contents", {FileGroupDescriptorFormat()}, false, E_INVALIDARG},
+        {"shell items", {RegisteredFormat(ClipboardFormat::ShellIdList)}, false, S_OK},
+        {"virtual files with contents",
+         {RegisteredFormat(ClipboardFormat::FileGroupDescriptor)},
+         true,
+         S_OK},
+        {"virtual files without contents",
+         {RegisteredFormat(ClipboardFormat::FileGroupDescriptor)},
+         false,
+         E_INVALIDARG},
         {"text", {CF_UNICODETEXT}, false, E_INVALIDARG},
     };
     for (const auto& c : cases) {
@@ -146,7 +153,7 @@ TEST_F(SourceParserTest, ShellItemsUnderARealFolderAreParsedAsTheirFiles) {
     ASSERT_EQ(S_OK, ::SHParseDisplayName(first.c_str(), nullptr, &one, 0, nullptr));
     ASSERT_EQ(S_OK, ::SHParseDisplayName(second.c_str(), nullptr, &two, 0, nullptr));
     auto data = MakeComObject<BlockDataObject>();
-    data->blocks[ShellIdListFormat()] =
+    data->blocks[RegisteredFormat(ClipboardFormat::ShellIdList)] =
         IdListArrayBlock(folder, {::ILFindLastID(one), ::ILFindLastID(two)});
     ::ILFree(folder);
     ::ILFree(one);
@@ -211,7 +218,8 @@ TEST_F(SourceParserTest, BlocksThatLieAreReadOnlyWithinThemselves) {
     } cases[] = {
         {"file list offset past the block", CF_HDROP, pastTheEnd, 0},
         {"file list without terminators", CF_HDROP, unterminated, 0},
-        {"file group announcing too many records", FileGroupDescriptorFormat(), group, 1},
+        {"file group announcing too many records",
+         RegisteredFormat(ClipboardFormat::FileGroupDescriptor), group, 1},
     };
     for (const auto& c : cases) {
         auto data = MakeComObject<BlockDataObject>();

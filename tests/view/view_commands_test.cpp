@@ -19,7 +19,7 @@ void PutBlockOnClipboard(const std::vector<uint8_t>& block) {
         GlobalLockGuard lock(memory.get());
         std::memcpy(lock.data(), block.data(), block.size());
     }
-    if (::SetClipboardData(StationListFormat(), memory.get()))
+    if (::SetClipboardData(RegisteredFormat(ClipboardFormat::StationList), memory.get()))
         (void)memory.release();  // the clipboard's now
     ::CloseClipboard();
 }

@@ -24,7 +24,8 @@ public:
     IFACEMETHODIMP DragLeave() override { return S_OK; }
     // Reads only the file's name: asking for its contents would start a download.
     IFACEMETHODIMP Drop(IDataObject* data, DWORD, POINTL, DWORD* effect) override {
-        FORMATETC format{FileGroupDescriptorFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
+        FORMATETC format{RegisteredFormat(ClipboardFormat::FileGroupDescriptor), nullptr,
+                         DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
         STGMEDIUM medium{};
         if (SUCCEEDED(data->GetData(&format, &medium))) {
             GlobalLockGuard lock(medium.hGlobal);

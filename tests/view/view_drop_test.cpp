@@ -127,7 +127,7 @@ TEST_F(ViewDropTest, AStationsFileDraggedAsAShellItemIsParsedThroughItsOwnDataOb
     ASSERT_EQ(S_OK, items->Next(1, file.put(), nullptr));
 
     auto data = MakeComObject<BlockDataObject>();
-    data->blocks[ShellIdListFormat()] =
+    data->blocks[RegisteredFormat(ClipboardFormat::ShellIdList)] =
         IdListArrayBlock(station.get(), {file.get()});
     TSourceParser parser(true);
     EXPECT_EQ(S_OK, parser.ParseDataObject(data.Get(), L"", true));

@@ -114,7 +114,8 @@ TEST_F(ShellViewTest, GetItemObjectAnswersForTheFirstSelectedItemOnly) {
     EXPECT_EQ(E_NOINTERFACE, browser.View()->GetItemObject(SVGIO_ALLVIEW, IID_PPV_ARGS(&object)));
     ASSERT_EQ(S_OK, browser.View()->GetItemObject(SVGIO_SELECTION, IID_PPV_ARGS(&object)));
     // The object carries the station of list index 1, the first selected from the top.
-    FORMATETC format{StationListFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
+    FORMATETC format{RegisteredFormat(ClipboardFormat::StationList), nullptr, DVASPECT_CONTENT, -1,
+                     TYMED_HGLOBAL};
     STGMEDIUM medium{};
     ASSERT_EQ(S_OK, object->GetData(&format, &medium));
     std::vector<Station> stations;
@@ -160,7 +161,7 @@ TEST_F(ShellViewTest, TranslateAcceleratorSaysNotHandledWhileCtrlCCopies) {
     keys[VK_CONTROL] = 0;
     ASSERT_TRUE(::SetKeyboardState(keys));
     browser.PumpMessages(50);
-    const UINT format = StationListFormat();
+    const UINT format = RegisteredFormat(ClipboardFormat::StationList);
     EXPECT_TRUE(::IsClipboardFormatAvailable(format));
 }
 

@@ -133,7 +133,7 @@ TEST_F(ShellViewTest, ABrowserWithoutMenusLeavesAWorkingView) {
     EXPECT_EQ((std::vector<std::wstring>{kEntry, L"North"}), Texts(browser));
     Select(browser, {1});
     EXPECT_EQ(S_OK, Command(browser, 1281));
-    EXPECT_TRUE(::IsClipboardFormatAvailable(StationListFormat()));
+    EXPECT_TRUE(::IsClipboardFormatAvailable(RegisteredFormat(ClipboardFormat::StationList)));
     EXPECT_EQ(S_OK, Command(browser, 1288));
     EXPECT_TRUE(ListStationNames().empty());
 }

@@ -128,8 +128,8 @@ StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring&
     const ComPtr<IDataObject> data = std::move(object.data);
     HRESULT result = S_OK;
 
-    FORMATETC descriptorFormat = {FileGroupDescriptorFormat(), nullptr, DVASPECT_CONTENT, -1,
-                                  TYMED_HGLOBAL};
+    FORMATETC descriptorFormat = {RegisteredFormat(ClipboardFormat::FileGroupDescriptor), nullptr,
+                                  DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
     UniqueStgMedium descriptor;
     result = data->GetData(&descriptorFormat, descriptor.put());
     if (result != S_OK)
@@ -158,7 +158,8 @@ StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring&
     }
 
     const auto start = std::chrono::steady_clock::now();
-    FORMATETC contentsFormat = {FileContentsFormat(), nullptr, DVASPECT_CONTENT, 0, TYMED_ISTREAM};
+    FORMATETC contentsFormat = {RegisteredFormat(ClipboardFormat::FileContents), nullptr,
+                                DVASPECT_CONTENT, 0, TYMED_ISTREAM};
     UniqueStgMedium contents;
     result = data->GetData(&contentsFormat, contents.put());
     if (result == S_FALSE) {

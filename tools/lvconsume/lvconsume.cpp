@@ -172,7 +172,8 @@ private:
 
     // Every offset and every item-ID list must lie inside the block that GlobalSize measures.
     bool ReadIdListArrayStrictlyStep() {
-        FORMATETC format = {ShellIdListFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
+        FORMATETC format = {RegisteredFormat(ClipboardFormat::ShellIdList), nullptr,
+                            DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
         UniqueStgMedium medium;
         const HRESULT result = data_->GetData(&format, medium.put());
         if (result != S_OK || !medium.global())
@@ -259,8 +260,8 @@ private:
     // The block must hold every record that cItems announces; the file is the first record with
     // a usable name, and its position is the lindex of its contents.
     bool ReadFileGroupDescriptor() {
-        FORMATETC format = {FileGroupDescriptorFormat(), nullptr, DVASPECT_CONTENT, -1,
-                            TYMED_HGLOBAL};
+        FORMATETC format = {RegisteredFormat(ClipboardFormat::FileGroupDescriptor), nullptr,
+                            DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
         UniqueStgMedium medium;
         const HRESULT result = data_->GetData(&format, medium.put());
         if (result != S_OK || !medium.global())
@@ -299,7 +300,8 @@ private:
 
     // Asks as Explorer does, for any of the three media; only a stream is taken.
     int GetFileContents() {
-        FORMATETC format = {FileContentsFormat(), nullptr, DVASPECT_CONTENT, fileIndex_,
+        FORMATETC format = {RegisteredFormat(ClipboardFormat::FileContents), nullptr,
+                            DVASPECT_CONTENT, fileIndex_,
                             TYMED_HGLOBAL | TYMED_ISTREAM | TYMED_ISTORAGE};
         const HRESULT result = data_->GetData(&format, contents_.put());
         if (result == S_FALSE) {
