@@ -17,8 +17,8 @@
 #include "namespace/icon_lists.h"
 #include "namespace/pidl_manager.h"
 #include "res/ids_view.h"
-#include "stations/station_store.h"
 #include "tests/server/extension_module.h"
+#include "tests/server/stored_display_settings.h"
 #include "tests/stations/station_builders.h"
 #include "tests/support/registry_override.h"
 #include "tools/lvexplore/explorer_window.h"
@@ -26,33 +26,6 @@
 using Microsoft::WRL::ComPtr;
 
 namespace {
-
-using Bytes = std::vector<BYTE>;
-
-// The "Display Settings" value as it is stored; empty when there is none.
-Bytes StoredDisplaySettings() {
-    UniqueRegKey root;
-    if (::RegOpenKeyExW(HKEY_CURRENT_USER, StationRootKeyPath().c_str(), 0, KEY_READ, root.put()) !=
-        ERROR_SUCCESS)
-        return {};
-    Bytes data(32);
-    DWORD size = static_cast<DWORD>(data.size()), type = 0;
-    if (::RegQueryValueExW(root.get(), L"Display Settings", nullptr, &type, data.data(), &size) !=
-            ERROR_SUCCESS ||
-        type != REG_BINARY)
-        return {};
-    data.resize(size);
-    return data;
-}
-
-void WriteDisplaySettings(const Bytes& data) {
-    UniqueRegKey root;
-    ASSERT_EQ(ERROR_SUCCESS,
-              ::RegCreateKeyExW(HKEY_CURRENT_USER, StationRootKeyPath().c_str(), 0, nullptr, 0,
-                                KEY_ALL_ACCESS, nullptr, root.put(), nullptr));
-    ASSERT_EQ(ERROR_SUCCESS, ::RegSetValueExW(root.get(), L"Display Settings", 0, REG_BINARY,
-                                              data.data(), static_cast<DWORD>(data.size())));
-}
 
 // The folder made through the module's exports, as the shell makes it.
 ComPtr<IShellFolder> CreateFolder(const ExtensionModule& module) {
