@@ -8,6 +8,8 @@
 
 namespace {
 
+using enum StationFileProblem;
+
 // A good station first, so that a refusal is seen to drop it too.
 const std::string kGood = "[Good]\nPort = COM1\n";  // lines 1 and 2
 
@@ -30,6 +32,16 @@ void ExpectRefused(const Refusal& test) {
     EXPECT_TRUE(contents.warnings.empty()) << test.rule;
 }
 
+// A refusal of line 3, the line after kGood: of the key it writes, or of the name of the
+// section it opens.
+Refusal OfKey(const char* rule, const std::string& line, StationFileProblem problem) {
+    const std::string key = line.substr(0, line.find(" ="));
+    return {rule, kGood + line + "\n", problem, 3, WideString(key.begin(), key.end())};
+}
+Refusal OfName(const char* rule, const std::string& line, StationFileProblem problem) {
+    return {rule, kGood + line + "\n", problem, 3, WIDE_TEXT("Name")};
+}
+
 std::string Sections(size_t count) {
     std::string file;
     for (size_t i = 0; i < count; ++i)
@@ -50,32 +62,24 @@ TEST(StationFileRefusals, WrongSizeOrEncoding) {
     EXPECT_FALSE(Read(largest).error) << "the limit itself is allowed";
 
     const Refusal cases[] = {
-        {"more than 1 MiB", tooLarge, StationFileProblem::kTooLarge, 0, kNone},
-        {"UTF-16 little-endian", std::string("\xFF\xFE[\0A\0]\0", 8), StationFileProblem::kUtf16, 0,
+        {"more than 1 MiB", tooLarge, kTooLarge, 0, kNone},
+        {"UTF-16 little-endian", std::string("\xFF\xFE[\0A\0]\0", 8), kUtf16, 0, kNone},
+        {"UTF-16 big-endian", std::string("\xFE\xFF\0[\0A\0]", 8), kUtf16, 0, kNone},
+        {"UTF-16 without a mark: NUL bytes", std::string("[\0A\0]\0", 6), kControlCharacter, 1,
          kNone},
-        {"UTF-16 big-endian", std::string("\xFE\xFF\0[\0A\0]", 8), StationFileProblem::kUtf16, 0,
+        {"a stray continuation byte", kGood + "Software = \x80\n", kInvalidUtf8, 3, kNone},
+        {"Latin-1 text", kGood + "Software = Gr\xFC\xDF!\n", kInvalidUtf8, 3, kNone},
+        {"an overlong slash", kGood + "[a\xC0\xAF]\n", kInvalidUtf8, 3, kNone},
+        {"an encoded surrogate", kGood + "Software = \xED\xA0\x80\n", kInvalidUtf8, 3, kNone},
+        {"beyond U+10FFFF", kGood + "Software = \xF4\x90\x80\x80\n", kInvalidUtf8, 3, kNone},
+        {"a sequence cut by the end of the file", kGood + "Software = \xE2\x82", kInvalidUtf8, 3,
          kNone},
-        {"UTF-16 without a mark: NUL bytes", std::string("[\0A\0]\0", 6),
-         StationFileProblem::kControlCharacter, 1, kNone},
-        {"a stray continuation byte", kGood + "Software = \x80\n", StationFileProblem::kInvalidUtf8,
-         3, kNone},
-        {"Latin-1 text", kGood + "Software = Gr\xFC\xDF!\n", StationFileProblem::kInvalidUtf8, 3,
-         kNone},
-        {"an overlong slash", kGood + "[a\xC0\xAF]\n", StationFileProblem::kInvalidUtf8, 3, kNone},
-        {"an encoded surrogate", kGood + "Software = \xED\xA0\x80\n",
-         StationFileProblem::kInvalidUtf8, 3, kNone},
-        {"beyond U+10FFFF", kGood + "Software = \xF4\x90\x80\x80\n",
-         StationFileProblem::kInvalidUtf8, 3, kNone},
-        {"a sequence cut by the end of the file", kGood + "Software = \xE2\x82",
-         StationFileProblem::kInvalidUtf8, 3, kNone},
         {"a sequence cut by the end of its line", kGood + "Software = \xE2\n\x82\xAC\n",
-         StationFileProblem::kInvalidUtf8, 3, kNone},
-        {"a lone CR inside a line", kGood + "Software = a\rb\n",
-         StationFileProblem::kControlCharacter, 3, kNone},
-        {"an escape character", kGood + "Software = \x1B[0m\n",
-         StationFileProblem::kControlCharacter, 3, kNone},
-        {"a UTF-8 mark not at the start", kGood + "\xEF\xBB\xBF[B]\nPort = COM1\n",
-         StationFileProblem::kBadLine, 3, kNone},
+         kInvalidUtf8, 3, kNone},
+        {"a lone CR inside a line", kGood + "Software = a\rb\n", kControlCharacter, 3, kNone},
+        {"an escape character", kGood + "Software = \x1B[0m\n", kControlCharacter, 3, kNone},
+        {"a UTF-8 mark not at the start", kGood + "\xEF\xBB\xBF[B]\nPort = COM1\n", kBadLine, 3,
+         kNone},
     };
     for (const Refusal& test : cases)
         ExpectRefused(test);
@@ -83,36 +87,28 @@ TEST(StationFileRefusals, WrongSizeOrEncoding) {
 
 TEST(StationFileRefusals, WrongStructure) {
     const Refusal cases[] = {
-        {"an empty file", "", StationFileProblem::kNoStations, 0, kNone},
-        {"only a UTF-8 mark", "\xEF\xBB\xBF", StationFileProblem::kNoStations, 0, kNone},
-        {"only comments and blanks", "; nothing\n\n  # here\n\t\n", StationFileProblem::kNoStations,
-         0, kNone},
-        {"a value before any section", "Port = COM1\n" + kGood,
-         StationFileProblem::kValueOutsideSection, 1, WIDE_TEXT("Port")},
-        {"a line that is nothing", kGood + "Port COM3\n", StationFileProblem::kBadLine, 3, kNone},
-        {"an unclosed section", kGood + "[North\nPort = COM1\n", StationFileProblem::kBadSection, 3,
-         kName},
-        {"text after a section's ]", kGood + "[North] ; note\n", StationFileProblem::kBadSection, 3,
-         kName},
-        {"an empty section in the middle", kGood + "[Empty]\n; nothing\n[Next]\nPort = COM1\n",
-         StationFileProblem::kEmptySection, 3, kName},
-        {"a half section at the end", kGood + "[Cut]\n", StationFileProblem::kEmptySection, 3,
-         kName},
-        {"a half section without a line end", kGood + "[Cut]", StationFileProblem::kEmptySection, 3,
-         kName},
-        {"the same section twice", kGood + "[North]\nPort = COM1\n[Good]\nPort = COM1\n",
-         StationFileProblem::kDuplicateSection, 5, kName},
-        {"an unknown key", kGood + "Speed = 9600\n", StationFileProblem::kUnknownKey, 3,
-         WIDE_TEXT("Speed")},
-        {"a key that is not written", kGood + " = 9600\n", StationFileProblem::kUnknownKey, 3,
-         kNone},
-        {"the name as a key", kGood + "Name = Other\n", StationFileProblem::kUnknownKey, 3, kName},
-        {"a key twice", kGood + "Port = COM3\n", StationFileProblem::kDuplicateKey, 3,
+        {"an empty file", "", kNoStations, 0, kNone},
+        {"only a UTF-8 mark", "\xEF\xBB\xBF", kNoStations, 0, kNone},
+        {"only comments and blanks", "; nothing\n\n  # here\n\t\n", kNoStations, 0, kNone},
+        {"a value before any section", "Port = COM1\n" + kGood, kValueOutsideSection, 1,
          WIDE_TEXT("Port")},
-        {"a key twice in other letter case", kGood + "PORT = COM3\n",
-         StationFileProblem::kDuplicateKey, 3, WIDE_TEXT("Port")},
-        {"more than 1000 stations", Sections(kMaximumStationsInFile + 1),
-         StationFileProblem::kTooManyStations, 2 * kMaximumStationsInFile + 1, kNone},
+        {"a line that is nothing", kGood + "Port COM3\n", kBadLine, 3, kNone},
+        OfName("an unclosed section", "[North\nPort = COM1", kBadSection),
+        OfName("text after a section's ]", "[North] ; note", kBadSection),
+        OfName("an empty section in the middle", "[Empty]\n; nothing\n[Next]\nPort = COM1",
+               kEmptySection),
+        OfName("a half section at the end", "[Cut]", kEmptySection),
+        {"a half section without a line end", kGood + "[Cut]", kEmptySection, 3, kName},
+        {"the same section twice", kGood + "[North]\nPort = COM1\n[Good]\nPort = COM1\n",
+         kDuplicateSection, 5, kName},
+        OfKey("an unknown key", "Speed = 9600", kUnknownKey),
+        {"a key that is not written", kGood + " = 9600\n", kUnknownKey, 3, kNone},
+        {"the name as a key", kGood + "Name = Other\n", kUnknownKey, 3, kName},
+        OfKey("a key twice", "Port = COM3", kDuplicateKey),
+        {"a key twice in other letter case", kGood + "PORT = COM3\n", kDuplicateKey, 3,
+         WIDE_TEXT("Port")},
+        {"more than 1000 stations", Sections(kMaximumStationsInFile + 1), kTooManyStations,
+         2 * kMaximumStationsInFile + 1, kNone},
     };
     for (const Refusal& test : cases)
         ExpectRefused(test);
@@ -120,40 +116,28 @@ TEST(StationFileRefusals, WrongStructure) {
 }
 
 TEST(StationFileRefusals, WrongNumbers) {
-    const WideString baud = WIDE_TEXT("BaudRate");
     const Refusal cases[] = {
-        {"empty", kGood + "BaudRate =\n", StationFileProblem::kNotANumber, 3, baud},
-        {"words", kGood + "BaudRate = fast\n", StationFileProblem::kNotANumber, 3, baud},
-        {"a unit", kGood + "BaudRate = 9600 baud\n", StationFileProblem::kNotANumber, 3, baud},
-        {"a blank inside", kGood + "BaudRate = 96 00\n", StationFileProblem::kNotANumber, 3, baud},
-        {"a sign", kGood + "BaudRate = +9600\n", StationFileProblem::kNotANumber, 3, baud},
-        {"negative", kGood + "Parity = -1\n", StationFileProblem::kNotANumber, 3,
-         WIDE_TEXT("Parity")},
-        {"hexadecimal", kGood + "BaudRate = 0x2580\n", StationFileProblem::kNotANumber, 3, baud},
-        {"quoted", kGood + "BaudRate = \"9600\"\n", StationFileProblem::kNotANumber, 3, baud},
-        {"full-width digits", kGood + "BaudRate = \xEF\xBC\x99\n", StationFileProblem::kNotANumber,
-         3, baud},
-        {"2^32", kGood + "BaudRate = 4294967296\n", StationFileProblem::kNumberTooLarge, 3, baud},
-        {"far beyond 64 bits", kGood + "Flow = 184467440737095516160\n",
-         StationFileProblem::kNumberTooLarge, 3, WIDE_TEXT("Flow")},
-        {"2^32 - 1", kGood + "CheckSum = 4294967295\n", StationFileProblem::kRefusedValue, 3,
-         WIDE_TEXT("CheckSum")},
-        {"a baud rate the sheet does not offer", kGood + "BaudRate = 19200\n",
-         StationFileProblem::kRefusedValue, 3, baud},
-        {"baud rate 0", kGood + "BaudRate = 0\n", StationFileProblem::kRefusedValue, 3, baud},
-        {"parity 3", kGood + "Parity = 3\n", StationFileProblem::kRefusedValue, 3,
-         WIDE_TEXT("Parity")},
-        {"stop bits 3", kGood + "StopBits = 3\n", StationFileProblem::kRefusedValue, 3,
-         WIDE_TEXT("StopBits")},
-        {"data bits 4", kGood + "DataBits = 4\n", StationFileProblem::kRefusedValue, 3,
-         WIDE_TEXT("DataBits")},
-        {"data bits 9", kGood + "DataBits = 9\n", StationFileProblem::kRefusedValue, 3,
-         WIDE_TEXT("DataBits")},
-        {"protocol 4", kGood + "Protocol = 4\n", StationFileProblem::kRefusedValue, 3,
-         WIDE_TEXT("Protocol")},
-        {"flow 3", kGood + "Flow = 3\n", StationFileProblem::kRefusedValue, 3, WIDE_TEXT("Flow")},
-        {"checksum 2", kGood + "CheckSum = 2\n", StationFileProblem::kRefusedValue, 3,
-         WIDE_TEXT("CheckSum")},
+        OfKey("empty", "BaudRate =", kNotANumber),
+        OfKey("words", "BaudRate = fast", kNotANumber),
+        OfKey("a unit", "BaudRate = 9600 baud", kNotANumber),
+        OfKey("a blank inside", "BaudRate = 96 00", kNotANumber),
+        OfKey("a sign", "BaudRate = +9600", kNotANumber),
+        OfKey("negative", "Parity = -1", kNotANumber),
+        OfKey("hexadecimal", "BaudRate = 0x2580", kNotANumber),
+        OfKey("quoted", "BaudRate = \"9600\"", kNotANumber),
+        OfKey("full-width digits", "BaudRate = \xEF\xBC\x99", kNotANumber),
+        OfKey("2^32", "BaudRate = 4294967296", kNumberTooLarge),
+        OfKey("far beyond 64 bits", "Flow = 184467440737095516160", kNumberTooLarge),
+        OfKey("2^32 - 1", "CheckSum = 4294967295", kRefusedValue),
+        OfKey("a baud rate the sheet does not offer", "BaudRate = 19200", kRefusedValue),
+        OfKey("baud rate 0", "BaudRate = 0", kRefusedValue),
+        OfKey("parity 3", "Parity = 3", kRefusedValue),
+        OfKey("stop bits 3", "StopBits = 3", kRefusedValue),
+        OfKey("data bits 4", "DataBits = 4", kRefusedValue),
+        OfKey("data bits 9", "DataBits = 9", kRefusedValue),
+        OfKey("protocol 4", "Protocol = 4", kRefusedValue),
+        OfKey("flow 3", "Flow = 3", kRefusedValue),
+        OfKey("checksum 2", "CheckSum = 2", kRefusedValue),
     };
     for (const Refusal& test : cases)
         ExpectRefused(test);
@@ -162,44 +146,28 @@ TEST(StationFileRefusals, WrongNumbers) {
 TEST(StationFileRefusals, WrongTexts) {
     const std::string tooLong(kMaximumStationTextLength + 1, 'x');
     const Refusal cases[] = {
-        {"a backslash in a name", kGood + "[North\\South]\n", StationFileProblem::kRefusedValue, 3,
+        OfName("a backslash in a name", "[North\\South]", kRefusedValue),
+        OfName("a slash in a name", "[North/South]", kRefusedValue),
+        OfName("a double quote in a name", "[North \"7\"]", kRefusedValue),
+        OfName("an escaped double quote in a name", "[\"a\\\"b\"]", kRefusedValue),
+        OfName("an asterisk in a name", "[North*]", kRefusedValue),
+        OfName("an empty name", "[]", kRefusedValue),
+        OfName("a name of blanks only, unquoted", "[   ]", kRefusedValue),
+        {"a name the store could not read back", kGood + "[" + tooLong + "]\n", kRefusedValue, 3,
          kName},
-        {"a slash in a name", kGood + "[North/South]\n", StationFileProblem::kRefusedValue, 3,
-         kName},
-        {"a double quote in a name", kGood + "[North \"7\"]\n", StationFileProblem::kRefusedValue,
-         3, kName},
-        {"an escaped double quote in a name", kGood + "[\"a\\\"b\"]\n",
-         StationFileProblem::kRefusedValue, 3, kName},
-        {"an asterisk in a name", kGood + "[North*]\n", StationFileProblem::kRefusedValue, 3,
-         kName},
-        {"an empty name", kGood + "[]\n", StationFileProblem::kRefusedValue, 3, kName},
-        {"a name of blanks only, unquoted", kGood + "[   ]\n", StationFileProblem::kRefusedValue, 3,
-         kName},
-        {"a name the store could not read back", kGood + "[" + tooLong + "]\n",
-         StationFileProblem::kRefusedValue, 3, kName},
         {"a text the store could not read back", kGood + "Software = " + tooLong + "\n",
-         StationFileProblem::kRefusedValue, 3, WIDE_TEXT("Software")},
-        {"a NUL in a text", kGood + "Manufacturer = \"a\\u0000b\"\n",
-         StationFileProblem::kRefusedValue, 3, WIDE_TEXT("Manufacturer")},
-        {"an unknown model", kGood + "Model = Quorvel LV-40\n", StationFileProblem::kRefusedValue,
-         3, WIDE_TEXT("Model")},
-        {"a model in other letter case", kGood + "Model = quorvel lv-10\n",
-         StationFileProblem::kRefusedValue, 3, WIDE_TEXT("Model")},
-        {"a model cut short", kGood + "Model = Quorvel LV-", StationFileProblem::kRefusedValue, 3,
-         WIDE_TEXT("Model")},
-        {"an unclosed quote", kGood + "Software = \"abc\n", StationFileProblem::kBadText, 3,
-         WIDE_TEXT("Software")},
-        {"a lone quote", kGood + "Software = \"\n", StationFileProblem::kBadText, 3,
-         WIDE_TEXT("Software")},
-        {"text after the closing quote", kGood + "Software = \"a\" b\n",
-         StationFileProblem::kBadText, 3, WIDE_TEXT("Software")},
-        {"an unknown escape", kGood + "Software = \"a\\nb\"\n", StationFileProblem::kBadText, 3,
-         WIDE_TEXT("Software")},
-        {"a short \\u escape", kGood + "Software = \"\\u12\"\n", StationFileProblem::kBadText, 3,
-         WIDE_TEXT("Software")},
-        {"a \\u escape that is not hexadecimal", kGood + "Software = \"\\u12G4\"\n",
-         StationFileProblem::kBadText, 3, WIDE_TEXT("Software")},
-        {"an unclosed quoted name", kGood + "[\"North]\n", StationFileProblem::kBadText, 3, kName},
+         kRefusedValue, 3, WIDE_TEXT("Software")},
+        OfKey("a NUL in a text", "Manufacturer = \"a\\u0000b\"", kRefusedValue),
+        OfKey("an unknown model", "Model = Quorvel LV-40", kRefusedValue),
+        OfKey("a model in other letter case", "Model = quorvel lv-10", kRefusedValue),
+        {"a model cut short", kGood + "Model = Quorvel LV-", kRefusedValue, 3, WIDE_TEXT("Model")},
+        OfKey("an unclosed quote", "Software = \"abc", kBadText),
+        OfKey("a lone quote", "Software = \"", kBadText),
+        OfKey("text after the closing quote", "Software = \"a\" b", kBadText),
+        OfKey("an unknown escape", "Software = \"a\\nb\"", kBadText),
+        OfKey("a short \\u escape", "Software = \"\\u12\"", kBadText),
+        OfKey("a \\u escape that is not hexadecimal", "Software = \"\\u12G4\"", kBadText),
+        OfName("an unclosed quoted name", "[\"North]", kBadText),
     };
     for (const Refusal& test : cases)
         ExpectRefused(test);

@@ -6,11 +6,8 @@
 #include <gtest/gtest.h>
 
 #include <utility>
-#include <vector>
 
-#include "stations/station_store.h"
 #include "tests/server/extension_module.h"
-#include "tests/support/registry_override.h"
 
 using Microsoft::WRL::ComPtr;
 
@@ -88,37 +85,4 @@ TEST(ComServer, StartUpBuildsTheIconListsThatItemIconsComeFrom) {
         UniqueHIcon largeIcon(large), smallIcon(small);
         EXPECT_TRUE(largeIcon && smallIcon) << index;
     }
-}
-
-TEST(ComServer, NeitherLoadingNorUnloadingTouchesTheStoredSettings) {
-    RegistryOverride registry;
-    UniqueRegKey root;
-    ASSERT_EQ(ERROR_SUCCESS,
-              ::RegCreateKeyExW(HKEY_CURRENT_USER, StationRootKeyPath().c_str(), 0, nullptr, 0,
-                                KEY_ALL_ACCESS, nullptr, root.put(), nullptr));
-    // The "Display Settings" value as it is stored.
-    auto stored = [&root] {
-        std::vector<BYTE> data(32);
-        DWORD size = static_cast<DWORD>(data.size()), type = 0;
-        EXPECT_EQ(ERROR_SUCCESS, ::RegQueryValueExW(root.get(), L"Display Settings", nullptr, &type,
-                                                    data.data(), &size));
-        EXPECT_EQ(static_cast<DWORD>(REG_BINARY), type);
-        data.resize(size);
-        return data;
-    };
-    const std::vector<BYTE> written = {44, 1, 0, 0, 150, 0, 0, 0};  // 300 and 150
-    ASSERT_EQ(ERROR_SUCCESS, ::RegSetValueExW(root.get(), L"Display Settings", 0, REG_BINARY,
-                                              written.data(), static_cast<DWORD>(written.size())));
-    // Loading alone does nothing under the loader lock, so unloading has nothing to save.
-    { ExtensionModule module; }
-    EXPECT_EQ(written, stored());
-
-    {
-        ExtensionModule module;
-        ComPtr<IClassFactory> factory;
-        ASSERT_EQ(S_OK, module.GetClassObject(kShellFolderClassId, IID_PPV_ARGS(&factory)));
-    }
-    // Started and freed without a view changing a width: nothing is written, at unload least of
-    // all (no registry work under the loader lock). The module writes only its 12-byte form.
-    EXPECT_EQ(written, stored());
 }

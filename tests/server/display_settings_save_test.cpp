@@ -4,31 +4,11 @@
 
 #include <gtest/gtest.h>
 
-#include <vector>
-
 #include "stations/display_settings.h"
-#include "stations/station_store.h"
-#include "support/unique_resource.h"
+#include "tests/server/stored_display_settings.h"
 #include "tests/support/registry_override.h"
 
 namespace {
-
-using Bytes = std::vector<BYTE>;
-
-// The "Display Settings" value as it is stored; empty when there is none.
-Bytes Stored() {
-    UniqueRegKey root;
-    if (::RegOpenKeyExW(HKEY_CURRENT_USER, StationRootKeyPath().c_str(), 0, KEY_READ, root.put()) !=
-        ERROR_SUCCESS)
-        return {};
-    Bytes data(32);
-    DWORD size = static_cast<DWORD>(data.size());
-    if (::RegQueryValueExW(root.get(), L"Display Settings", nullptr, nullptr, data.data(), &size) !=
-        ERROR_SUCCESS)
-        return {};
-    data.resize(size);
-    return data;
-}
 
 void DeleteStored() {
     UniqueRegKey root;
@@ -48,19 +28,19 @@ TEST(DisplaySettingsSave, WrittenWhenAWidthChangesAndOnlyThen) {
     StartFrom(100, 100);
     const int dragged[kDisplayColumnCount] = {180, 0};
     ASSERT_EQ(S_OK, StoreDisplayColumnWidths(dragged));
-    EXPECT_EQ((Bytes{180, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0}), Stored());
+    EXPECT_EQ((Bytes{180, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0}), StoredDisplaySettings());
     EXPECT_EQ(180, DisplayColumnWidth(0));
     EXPECT_EQ(0, DisplayColumnWidth(1));
 
     // The same widths again write nothing: the value removed behind the module's back stays away.
     DeleteStored();
     ASSERT_EQ(S_OK, StoreDisplayColumnWidths(dragged));
-    EXPECT_EQ(Bytes{}, Stored());
+    EXPECT_EQ(Bytes{}, StoredDisplaySettings());
 
     // A change in either column writes both.
     const int second[kDisplayColumnCount] = {180, 0x1234};
     ASSERT_EQ(S_OK, StoreDisplayColumnWidths(second));
-    EXPECT_EQ((Bytes{180, 0, 0, 0, 0x34, 0x12, 0, 0, 0, 0, 0, 0}), Stored());
+    EXPECT_EQ((Bytes{180, 0, 0, 0, 0x34, 0x12, 0, 0, 0, 0, 0, 0}), StoredDisplaySettings());
 }
 
 TEST(DisplaySettingsSave, AWriteTheRegistryRefusedIsMadeByTheNextCall) {
@@ -82,7 +62,7 @@ TEST(DisplaySettingsSave, AWriteTheRegistryRefusedIsMadeByTheNextCall) {
 
     ASSERT_EQ(ERROR_SUCCESS, ::RegOverridePredefKey(HKEY_CURRENT_USER, accepting.get()));
     ASSERT_EQ(S_OK, StoreDisplayColumnWidths(dragged)) << "unchanged, yet not stored yet";
-    EXPECT_EQ((Bytes{222, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0}), Stored());
+    EXPECT_EQ((Bytes{222, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0}), StoredDisplaySettings());
 }
 
 }  // namespace

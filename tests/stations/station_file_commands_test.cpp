@@ -35,8 +35,12 @@ std::vector<Station> VariedStations() {
 TEST_F(StationFileCommands, ExportThenImportGivesTheSameStoreByteForByte) {
     for (const Station& station : VariedStations())
         ASSERT_EQ(S_OK, AddStation(station));
+    // Twelve keys: the registry lists "Station 10" before "Station 2", the file follows the
+    // numbers, so that the key names come back.
+    for (int i = 4; i < 12; ++i)
+        AddStationOfModel(L"Level " + std::to_wstring(i));
     const StoreSnapshot before = SnapshotStore();
-    ASSERT_EQ(4u, before.size());
+    ASSERT_EQ(12u, before.size());
     ASSERT_EQ(12u, before.begin()->second.size());
 
     const std::wstring file = ScratchFile(L"round-trip.txt");
@@ -47,19 +51,7 @@ TEST_F(StationFileCommands, ExportThenImportGivesTheSameStoreByteForByte) {
     EXPECT_EQ(kExitDone, Import(file)) << AllLines();
     EXPECT_EQ(before, SnapshotStore()) << "key names, value names, types and bytes";
     EXPECT_EQ(1u, LinesWith({L"warning:", L"\"COM9\""}).size()) << AllLines();
-    EXPECT_EQ(1u, LinesWith({L"4 added, 0 replaced, 0 skipped."}).size()) << AllLines();
-}
-
-TEST_F(StationFileCommands, ExportOrdersStationsByKeyNumberSoThatKeyNamesComeBack) {
-    // The registry lists "Station 10" before "Station 2"; the file follows the numbers.
-    for (int i = 0; i < 12; ++i)
-        AddStationOfModel(L"Level " + std::to_wstring(i));
-    const StoreSnapshot before = SnapshotStore();
-    const std::wstring file = ScratchFile(L"ordered.txt");
-    ASSERT_EQ(kExitDone, Export(file)) << AllLines();
-    ASSERT_EQ(ERROR_SUCCESS, DeleteKeyRecursive(HKEY_CURRENT_USER, StationsKeyPath().c_str()));
-    ASSERT_EQ(kExitDone, Import(file)) << AllLines();
-    EXPECT_EQ(before, SnapshotStore());
+    EXPECT_EQ(1u, LinesWith({L"12 added, 0 replaced, 0 skipped."}).size()) << AllLines();
 }
 
 TEST_F(StationFileCommands, TakenNamesAreSkippedUnlessReplaceIsGiven) {

@@ -33,10 +33,8 @@ TEST_F(StationFileCommands, EveryBadFileWritesNothingAndNamesWhereItIsBad) {
         {"invalid UTF-8", kGood + "[Gr\xFC\xDF]\n", {L"line 5", L"not UTF-8"}},
         {"a half section at the end", kGood + "[Cut", {L"line 5, Name"}},
         {"a section cut after its name", kGood + "[Cut]\n", {L"line 5, Name", L"no values"}},
+        // Every refused name character is refused alike (the parser's own tests list them).
         {"a backslash in a name", kGood + "[A\\B]\nPort = COM1\n", {L"line 5, Name"}},
-        {"a slash in a name", kGood + "[A/B]\nPort = COM1\n", {L"line 5, Name"}},
-        {"a double quote in a name", kGood + "[A\"B]\nPort = COM1\n", {L"line 5, Name"}},
-        {"an asterisk in a name", kGood + "[A*]\nPort = COM1\n", {L"line 5, Name"}},
         {"the same section twice",
          kGood + "[Good one]\nPort = COM1\n",
          {L"line 5, Name", L"line 1"}},

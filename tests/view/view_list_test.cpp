@@ -79,6 +79,10 @@ TEST_F(ShellViewTest, ViewModesSetTheListStyleAndDetailsShowsOneNameColumnAtTheS
     browser.PumpMessages(50);
     EXPECT_EQ(180, DisplayColumnWidth(0));
     EXPECT_EQ(0, DisplayColumnWidth(1));
+    // Stored at once, with the view still open: the store reads the dragged width back.
+    SetDisplayColumnWidth(0, 0);
+    EXPECT_TRUE(LoadDisplaySettings());
+    EXPECT_EQ(180, DisplayColumnWidth(0));
     // A later details view starts at the stored width.
     EXPECT_EQ(180, ListView_GetColumnWidth(List(Open(L"", Details())), 0));
     SetDisplayColumnWidth(0, 100);
