@@ -27,6 +27,8 @@
 #include "view/lv_data_object.h"
 
 constexpr wchar_t kNorthFile[] = L"Quorvel Digital Level\\North\\file1.lv";
+// What a download writes in the tests that play one.
+constexpr char kContent[] = "A,01,Z\r\n1,0.000,12.5,!,\r\n";
 
 // Answers every modal dialog at once without showing it, and counts the runs; message boxes
 // are recorded and answered OK.
@@ -50,6 +52,18 @@ private:
 
 inline FORMATETC Request(const wchar_t* name, DWORD tymed, LONG index = -1) {
     return {RegisteredClipboardFormat(name), nullptr, DVASPECT_CONTENT, index, tymed};
+}
+
+// A stream read a few bytes at a time, up to the short read that ends it.
+inline std::string ReadToEnd(IStream* stream) {
+    std::string content;
+    char buffer[7];
+    ULONG got = 0;
+    do {
+        EXPECT_EQ(S_OK, stream->Read(buffer, sizeof buffer, &got));
+        content.append(buffer, got);
+    } while (got == sizeof buffer);
+    return content;
 }
 
 inline bool FileExists(const std::wstring& path) {

@@ -16,8 +16,6 @@ using Microsoft::WRL::ComPtr;
 
 namespace {
 
-constexpr char kContent[] = "A,01,Z\r\n1,0.000,12.5,!,\r\n";
-
 // Answers a download with a set result after writing the given bytes, if any, to the file it
 // names; records what it was asked.
 class ScriptedDownloader final : public StationDownloader {
@@ -49,17 +47,6 @@ private:
     const HRESULT result_;
     const std::optional<std::string> written_;
 };
-
-std::string ReadToEnd(IStream* stream) {
-    std::string content;
-    char buffer[7];
-    ULONG got = 0;
-    do {
-        EXPECT_EQ(S_OK, stream->Read(buffer, sizeof buffer, &got));
-        content.append(buffer, got);
-    } while (got == sizeof buffer);
-    return content;
-}
 
 class FileContentsDownloader : public DataObject {};
 

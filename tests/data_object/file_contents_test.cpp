@@ -15,8 +15,6 @@
 
 namespace {
 
-constexpr char kContent[] = "A,01,Z\r\n1,0.000,12.5,!,\r\n";
-
 // Runs each progress dialog for real and, once it is up, writes what a download would have
 // written to its output file; then reports the transfer's end, or sends a stray IDOK and Cancel.
 class PlayedDialogs : public ScriptedDialogs {
@@ -107,14 +105,7 @@ TEST_F(FileContents, OnlyACompletedTransferGivesAStreamAndNoOutcomeLeavesADownlo
         if (test.completes) {
             ASSERT_EQ(static_cast<DWORD>(TYMED_ISTREAM), medium.get().tymed);
             EXPECT_EQ(nullptr, medium.get().pUnkForRelease);
-            std::string content;
-            char buffer[7];  // a few bytes a read, up to the short read that ends the file
-            ULONG got = 0;
-            do {
-                EXPECT_EQ(S_OK, medium.get().pstm->Read(buffer, sizeof buffer, &got));
-                content.append(buffer, got);
-            } while (got == sizeof buffer);
-            EXPECT_EQ(kContent, content);
+            EXPECT_EQ(kContent, ReadToEnd(medium.get().pstm));
         } else {
             EXPECT_EQ(static_cast<DWORD>(TYMED_NULL), medium.get().tymed);
         }

@@ -116,8 +116,8 @@ protected:
             UniqueChildPidl item(
                 manager_.CreateItemPidl((L"Quorvel Digital Level\\" + station).c_str()));
             ComPtr<IShellFolder> stationFolder;
-            EXPECT_EQ(S_OK, folder->BindToObject(reinterpret_cast<PCUIDLIST_RELATIVE>(item.get()),
-                                                 nullptr, IID_PPV_ARGS(&stationFolder)));
+            EXPECT_EQ(S_OK,
+                      folder->BindToObject(item.get(), nullptr, IID_PPV_ARGS(&stationFolder)));
             folder = stationFolder;
             own.reset(manager_.ConcatPidls(own.get(), item.get()));
         }

@@ -1,0 +1,1 @@
+// Compiles the shared precompiled header (cmake/PrecompiledHeaders.cmake); no code of its own.
