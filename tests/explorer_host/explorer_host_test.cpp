@@ -110,17 +110,13 @@ TEST_F(ExplorerHost, RemoveMenusSB_TakesThePopupsOutAliveAndPutsTheBrowsersMenuB
     EXPECT_NE(nullptr, Popup(window_->MenuBar(), FCIDM_MENU_FILE));
 }
 
-TEST_F(ExplorerHost, MenuCommand_OfAMergedItemGoesToTheViewWindow) {
+TEST_F(ExplorerHost, MenuCommand_OfAMergedItemGoesToTheViewWindowAndTheBrowsersStaysWithIt) {
     OpenOnFakeView(L"C:\\");
     ASSERT_NE(-1, static_cast<int>(::GetMenuState(window_->MenuBar(), kViewCommand, MF_BYCOMMAND)));
-    ::SendMessageW(window_->Window(), WM_COMMAND, MAKEWPARAM(kViewCommand, 0), 0);  // as the menu
-    EXPECT_EQ(std::vector<UINT>{kViewCommand}, view_->commands);
-}
-
-TEST_F(ExplorerHost, MenuCommand_OfTheBrowserStaysWithTheBrowser) {
-    OpenOnFakeView(L"C:\\");
+    // As the menu sends them.
+    ::SendMessageW(window_->Window(), WM_COMMAND, MAKEWPARAM(kViewCommand, 0), 0);
     ::SendMessageW(window_->Window(), WM_COMMAND, MAKEWPARAM(kCommandRefresh, 0), 0);
-    EXPECT_TRUE(view_->commands.empty());
+    EXPECT_EQ(std::vector<UINT>{kViewCommand}, view_->commands);
     EXPECT_EQ(1, view_->refreshes);
 }
 
@@ -172,6 +168,8 @@ TEST_F(ExplorerHost, MenusNotImplemented_AnswersENotImplAsWinesBrowsersDo) {
 
 TEST_F(ExplorerHost, BrowseObject_FollowsRelativeParentAndBackRequests) {
     Open();
+    EXPECT_FALSE(window_->GoBack()) << "nowhere to go";
+    EXPECT_FALSE(window_->GoUp()) << "nowhere to go";
     ASSERT_EQ(S_OK, window_->BrowseToParsingName(L"C:\\windows"));
     const UniqueAbsoluteIdList system32 = Parse(L"C:\\windows\\system32");
     const struct {
@@ -193,12 +191,6 @@ TEST_F(ExplorerHost, BrowsingAway_DeactivatesAndDestroysTheOldView) {
     ASSERT_EQ(S_OK, window_->BrowseToParsingName(L"C:\\windows"));
     EXPECT_EQ(static_cast<UINT>(SVUIA_DEACTIVATE), view_->state);
     EXPECT_FALSE(::IsWindow(oldWindow));
-}
-
-TEST_F(ExplorerHost, GoBackAndGoUp_AreFalseWithNowhereToGo) {
-    Open();
-    EXPECT_FALSE(window_->GoBack());
-    EXPECT_FALSE(window_->GoUp());
 }
 
 TEST_F(ExplorerHost, FrameKeys_ActOnlyWhenTheViewLeavesThem) {

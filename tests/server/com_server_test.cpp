@@ -1,4 +1,5 @@
-// The DLL's class objects, its lock count and its start-up and unload, through its exports.
+// The DLL's class objects, its lock count and its start-up and unload, through its exports; and
+// what start-up reads, in this process.
 #include <windows.h>
 #include <shlobj.h>
 #include <wrl/client.h>
@@ -7,7 +8,12 @@
 
 #include <utility>
 
+#include "server/module_app.h"
+#include "stations/display_settings.h"
+#include "support/module_instance.h"
 #include "tests/server/extension_module.h"
+#include "tests/server/stored_display_settings.h"
+#include "tests/support/registry_override.h"
 
 using Microsoft::WRL::ComPtr;
 
@@ -84,5 +90,19 @@ TEST(ComServer, StartUpBuildsTheIconListsThatItemIconsComeFrom) {
         ASSERT_EQ(S_OK, extract->Extract(L"", index, &large, &small, MAKELONG(32, 16)));
         UniqueHIcon largeIcon(large), smallIcon(small);
         EXPECT_TRUE(largeIcon && smallIcon) << index;
+    }
+}
+
+// The width a details view starts from is what start-up read: each start, also one after a
+// tear-down in a library that was never freed, reads what was stored before it.
+TEST(ComServer, EachStartUpReadsTheStoredColumnWidths) {
+    const RegistryOverride registry;
+    for (const BYTE width : {BYTE{210}, BYTE{180}}) {
+        WriteDisplaySettings({width, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0});
+        {
+            const CModuleApp::StartedScope started = CModuleApp::EnsureStarted(ThisModule());
+            EXPECT_EQ(width, DisplayColumnWidth(0));
+        }
+        EXPECT_EQ(S_OK, CModuleApp::CanUnloadNow());
     }
 }

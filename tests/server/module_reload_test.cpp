@@ -1,27 +1,22 @@
-// The DLL loaded, used, let go and freed again and again: what it keeps, what it leaks, what
-// still works when it is let go but not freed, and the stored column width its views start from.
+// The DLL loaded, used, let go and freed again and again: what it keeps, what it leaks, and what
+// still works when it is let go but not freed.
 #include <windows.h>
-#include <commctrl.h>
 #include <shlobj.h>
 #include <wrl/client.h>
 
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <atomic>
 #include <cstdio>
-#include <functional>
 #include <thread>
 #include <vector>
 
 #include "namespace/icon_lists.h"
 #include "namespace/pidl_manager.h"
-#include "res/ids_view.h"
 #include "tests/server/extension_module.h"
 #include "tests/server/stored_display_settings.h"
 #include "tests/stations/station_builders.h"
 #include "tests/support/registry_override.h"
-#include "tools/lvexplore/explorer_window.h"
 
 using Microsoft::WRL::ComPtr;
 
@@ -198,29 +193,12 @@ TEST_F(ModuleReloadTest, TearDownNeverRacesAClassObjectOnAnotherThread) {
     ExtensionModule module;
     constexpr int kRounds = 300;
     int answeredUnused = 0;
-    // Asks until it goes out of scope, on every path out of the test.
-    class Asker {
-    public:
-        explicit Asker(std::function<void()> ask)
-            : thread_([this, ask] {
-                  while (!done_.load())
-                      ask();
-              }) {}
-        Asker(const Asker&) = delete;
-        Asker& operator=(const Asker&) = delete;
-        ~Asker() { Stop(); }
-        void Stop() {
-            done_ = true;
-            if (thread_.joinable())
-                thread_.join();
+    // Asks until it is stopped, or goes out of scope on any path out of the test.
+    std::jthread asker([&](std::stop_token stop) {
+        while (!stop.stop_requested()) {
+            if (module.CanUnloadNow() == S_OK)
+                ++answeredUnused;
         }
-
-    private:
-        std::atomic<bool> done_{false};
-        std::thread thread_;
-    } asker([&] {
-        if (module.CanUnloadNow() == S_OK)
-            ++answeredUnused;
     });
     int extracted = 0;
     for (int round = 0; round < kRounds; ++round) {
@@ -235,86 +213,11 @@ TEST_F(ModuleReloadTest, TearDownNeverRacesAClassObjectOnAnotherThread) {
             ++extracted;
         UniqueHIcon largeIcon(large), smallIcon(small);
     }
-    asker.Stop();
+    asker.request_stop();
+    asker.join();
     EXPECT_EQ(kRounds, extracted);
     EXPECT_EQ(S_OK, module.CanUnloadNow());
     std::printf("%d of the other thread's questions found the module unused\n", answeredUnused);
-}
-
-// A details view of the top folder, from the module, in a browser of our own.
-class DetailsView {
-public:
-    explicit DetailsView(const ExtensionModule& module) {
-        ComPtr<IShellFolder> folder = CreateFolder(module);
-        ComPtr<IShellView> view;
-        if (folder) {
-            EXPECT_EQ(S_OK, folder->CreateViewObject(nullptr, IID_PPV_ARGS(&view)));
-        }
-        ExplorerOptions options;
-        options.viewMode = FVM_DETAILS;
-        EXPECT_EQ(S_OK, CExplorerWindow::Create(options, browser_));
-        if (!view || !browser_)
-            return;
-        // The browser's record of where it is: My Computer, then the folder's own item.
-        CPidlMgr manager;
-        UniqueChildPidl own(manager.CreateRootPidl());
-        PIDLIST_ABSOLUTE computer = nullptr;
-        EXPECT_EQ(S_OK, ::SHGetSpecialFolderLocation(nullptr, CSIDL_DRIVES, &computer));
-        UniqueAbsoluteIdList absolute(::ILCombine(computer, own.get()));
-        ::CoTaskMemFree(computer);
-        EXPECT_EQ(S_OK, browser_->BrowseToView(view.Get(), absolute.get()));
-        // Until the fill's animation is gone.
-        for (int tries = 0; tries < 100 && AnimationShown(); ++tries)
-            browser_->PumpMessages(30);
-        EXPECT_FALSE(AnimationShown()) << "the fill did not end";
-    }
-    DetailsView(const DetailsView&) = delete;
-    DetailsView& operator=(const DetailsView&) = delete;
-    ~DetailsView() {
-        if (browser_)
-            browser_->Close();
-        // What was posted to the view's windows finds none now; let it go.
-        MSG message;
-        while (::PeekMessageW(&message, nullptr, 0, 0, PM_REMOVE))
-            ::DispatchMessageW(&message);
-    }
-
-    HWND List() const {
-        return browser_ ? ::GetDlgItem(browser_->ViewWindow(), IDC_VIEW_LIST) : nullptr;
-    }
-
-private:
-    bool AnimationShown() const {
-        return ::GetDlgItem(browser_->ViewWindow(), IDC_VIEW_ANIMATION) != nullptr;
-    }
-
-    ComPtr<CExplorerWindow> browser_;
-};
-
-// OLE for the browser and the view's drop target, until the end of the test on every path.
-class OleSession {
-public:
-    OleSession() { EXPECT_EQ(S_OK, ::OleInitialize(nullptr)); }
-    OleSession(const OleSession&) = delete;
-    OleSession& operator=(const OleSession&) = delete;
-    ~OleSession() { ::OleUninitialize(); }
-};
-
-TEST_F(ModuleReloadTest, TheWidthStoredBeforeALoadIsTheDetailsViewsWidth) {
-    // The view's drag stores the width at once (the view tests); the module reads it at start-up.
-    INITCOMMONCONTROLSEX controls{sizeof controls, ICC_WIN95_CLASSES | ICC_ANIMATE_CLASS};
-    ASSERT_TRUE(::InitCommonControlsEx(&controls));
-    const OleSession ole;
-    for (const BYTE width : {BYTE{210}, BYTE{180}}) {
-        WriteDisplaySettings({width, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0});
-        ExtensionModule module;
-        {
-            DetailsView view(module);
-            ASSERT_NE(nullptr, view.List());
-            EXPECT_EQ(width, ListView_GetColumnWidth(view.List(), 0)) << "the stored width";
-        }
-        EXPECT_EQ(S_OK, module.CanUnloadNow());
-    }
 }
 
 }  // namespace
