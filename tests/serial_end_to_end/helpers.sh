@@ -15,6 +15,18 @@ rm -rf "$work"
 mkdir -p "$work"
 passed=0
 failed=0
+# The procedure's own cables, so that the four procedures can run side by side: COM quick and
+# quick+1 for the quick cases, the next two pairs for the one-minute cases that run beside them.
+# The cables fixture lays out all four sets.
+case $procedure in
+line) quick=60 ;;
+raw) quick=66 ;;
+bcc) quick=72 ;;
+ymodem) quick=78 ;;
+*) echo "helpers.sh: unknown procedure $procedure" >&2; exit 2 ;;
+esac
+beside=$((quick + 2))
+beside2=$((quick + 4))
 
 # The driver's messages as lvrecv prints them: "[code N] text".
 wait_expired="[code 4] The waiting time of the data has expired."

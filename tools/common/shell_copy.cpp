@@ -41,19 +41,16 @@ StationFileObject GetStationFileDataObject(const std::wstring& station) {
     if (FAILED(result))
         return fail(L"the desktop folder is not available", result);
 
-    std::wstring path = std::wstring(kFolderPath) + L"\\" + station;
-    UniqueCoTaskMem stationList;
-    result =
-        desktop->ParseDisplayName(nullptr, nullptr, path.data(), nullptr,
-                                  reinterpret_cast<PIDLIST_RELATIVE*>(stationList.put()), nullptr);
+    const std::wstring path = std::wstring(kFolderPath) + L"\\" + station;
+    UniqueAbsoluteIdList stationList;
+    result = ::SHParseDisplayName(path.c_str(), nullptr, stationList.put(), 0, nullptr);
     if (FAILED(result)) {
         return fail(L"\"Quorvel Digital Levels\" has no station \"" + station +
                         L"\" (is the extension registered?)",
                     result);
     }
     ComPtr<IShellFolder> stationFolder;
-    result = desktop->BindToObject(static_cast<PCUIDLIST_RELATIVE>(stationList.get()), nullptr,
-                                   IID_PPV_ARGS(&stationFolder));
+    result = desktop->BindToObject(stationList.get(), nullptr, IID_PPV_ARGS(&stationFolder));
     if (FAILED(result))
         return fail(L"the station folder cannot be opened", result);
 
@@ -61,16 +58,16 @@ StationFileObject GetStationFileDataObject(const std::wstring& station) {
     result = stationFolder->EnumObjects(nullptr, SHCONTF_NONFOLDERS, &items);
     if (result != S_OK)
         return fail(L"the station folder cannot be listed", result);
-    UniqueCoTaskMem file;
+    PITEMID_CHILD child = nullptr;
     ULONG fetched = 0;
-    if (items->Next(1, reinterpret_cast<PITEMID_CHILD*>(file.put()), &fetched) != S_OK ||
-        fetched != 1) {
+    const HRESULT next = items->Next(1, &child, &fetched);
+    const UniqueCoTaskMem file(child);  // the enumerator's item is the caller's to free
+    if (next != S_OK || fetched != 1)
         return fail(L"the station folder shows no file", E_FAIL);
-    }
 
-    PCUITEMID_CHILD child = static_cast<PCUITEMID_CHILD>(file.get());
-    result = stationFolder->GetUIObjectOf(nullptr, 1, &child, IID_IDataObject, nullptr,
-                                          &object.data);
+    PCUITEMID_CHILD fileItem = child;
+    result =
+        stationFolder->GetUIObjectOf(nullptr, 1, &fileItem, IID_IDataObject, nullptr, &object.data);
     if (FAILED(result) || !object.data)
         return fail(L"the file cannot be copied", FAILED(result) ? result : E_POINTER);
     return object;

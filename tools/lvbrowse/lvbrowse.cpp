@@ -126,11 +126,8 @@ int Browse(const wchar_t* station) {
     ComPtr<IShellFolder> desktop;
     if (FAILED(::SHGetDesktopFolder(&desktop)))
         return 1;
-    std::wstring path = kFolderPath;
-    PIDLIST_RELATIVE raw = nullptr;
-    HRESULT result =
-        desktop->ParseDisplayName(nullptr, nullptr, path.data(), nullptr, &raw, nullptr);
-    UniqueCoTaskMem list(raw);
+    UniqueAbsoluteIdList list;
+    HRESULT result = ::SHParseDisplayName(kFolderPath, nullptr, list.put(), 0, nullptr);
     if (FAILED(result)) {
         PrintUtf8(L"The folder is not under My Computer (" + Hex(result) +
                   L"): register LVShellExt.dll with regsvr32 first.\n");
@@ -139,8 +136,7 @@ int Browse(const wchar_t* station) {
     // The folder's entry in My Computer: its name, and the attributes the registry gives it.
     ComPtr<IShellFolder> myComputer;
     PCUITEMID_CHILD entry = nullptr;
-    if (SUCCEEDED(::SHBindToParent(reinterpret_cast<PCIDLIST_ABSOLUTE>(raw),
-                                   IID_PPV_ARGS(&myComputer), &entry))) {
+    if (SUCCEEDED(::SHBindToParent(list.get(), IID_PPV_ARGS(&myComputer), &entry))) {
         SFGAOF attributes = SFGAO_FOLDER | SFGAO_HASSUBFOLDER;
         if (FAILED(myComputer->GetAttributesOf(1, &entry, &attributes)))
             attributes = 0;
@@ -151,7 +147,7 @@ int Browse(const wchar_t* station) {
     }
 
     ComPtr<IShellFolder> root;
-    result = desktop->BindToObject(raw, nullptr, IID_PPV_ARGS(&root));
+    result = desktop->BindToObject(list.get(), nullptr, IID_PPV_ARGS(&root));
     if (FAILED(result)) {
         PrintUtf8(L"Cannot open the folder (" + Hex(result) + L").\n");
         return 1;
