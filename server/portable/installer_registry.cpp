@@ -1,3 +1,5 @@
+// The module's registry keys flattened into the values an installer package writes, and their
+// WiX and formatted-string escaping.
 #include "server/portable/installer_registry.h"
 
 #include <cstdio>

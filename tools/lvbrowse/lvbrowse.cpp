@@ -161,6 +161,7 @@ int Browse(const wchar_t* station) {
     result = root->ParseDisplayName(nullptr, nullptr, name.data(), nullptr, &stationRaw, nullptr);
     UniqueCoTaskMem stationList(stationRaw);
     SFGAOF attributes = SFGAO_VALIDATE;
+    // A station's name parses to one item of the top folder: the list is that child.
     PCUITEMID_CHILD child = reinterpret_cast<PCUITEMID_CHILD>(stationRaw);
     if (FAILED(result) || FAILED(root->GetAttributesOf(1, &child, &attributes))) {
         PrintUtf8(L"No station named \"" + name + L"\".\n");

@@ -124,6 +124,8 @@ IFACEMETHODIMP CExplorerWindow::BrowseObject(PCUIDLIST_RELATIVE list, UINT flags
             RETURN_IF_NULL_ALLOC(combined.get());
             return Navigate(combined.get(), true);
         }
+        // Without SBSP_RELATIVE the list is absolute (SBSP_ABSOLUTE is 0); the interface types
+        // it as relative for both cases.
         return Navigate(reinterpret_cast<PCIDLIST_ABSOLUTE>(list), true);
     }
     CATCH_RETURN()
