@@ -28,8 +28,14 @@ function(lv_add_module_resources target)
     file(GLOB parts CONFIGURE_DEPENDS ${PROJECT_SOURCE_DIR}/res/*.rc ${PROJECT_SOURCE_DIR}/res/*.h
         ${PROJECT_SOURCE_DIR}/res/registry/* ${PROJECT_SOURCE_DIR}/res/icons/*
         ${PROJECT_SOURCE_DIR}/res/animation/*)
+    # The list of parts is a dependency too: a part renamed or removed leaves no remaining part
+    # newer than the script's object, but it changes this file, so the script is compiled again
+    # and fails if it still includes the old name. Written only when the list changes.
+    list(JOIN parts "\n" part_lines)
+    set(part_list ${CMAKE_BINARY_DIR}/res/module_resource_parts.txt)
+    file(CONFIGURE OUTPUT ${part_list} CONTENT "${part_lines}\n" @ONLY)
     set_source_files_properties(${PROJECT_SOURCE_DIR}/res/LVShellExt.rc PROPERTIES
-        OBJECT_DEPENDS "${parts}")
+        OBJECT_DEPENDS "${parts};${part_list}")
     target_sources(${target} PRIVATE ${PROJECT_SOURCE_DIR}/res/LVShellExt.rc)
 endfunction()
 
