@@ -53,6 +53,13 @@ function(lv_add_test name)
     endif()
 endfunction()
 
+# lv_shares_wine_desktop(tests...): tests that use what the prefix has only one of (its desktop,
+# clipboard and foreground window, the extension's registration, the user's stations, the
+# downloads in the temporary folder) hold one lock, so that only one of them runs at a time.
+function(lv_shares_wine_desktop)
+    set_property(TEST ${ARGN} APPEND PROPERTY RESOURCE_LOCK wine_desktop)
+endfunction()
+
 # lv_add_fuzzer(name sources... LIBS libs...): a libFuzzer target of the host build.
 function(lv_add_fuzzer name)
     cmake_parse_arguments(ARG "" "" "LIBS" ${ARGN})
