@@ -67,15 +67,15 @@ TEST_F(ShellFolderTest, AttributesByKindAndValidation) {
         SFGAOF attributes;  // when the call succeeds
     } cases[] = {
         {"no items", {}, 0, S_OK, 0xFFFFFFFF},
-        {"the request does not limit", {Child(station)}, SFGAO_CANCOPY, S_OK, stationBits},
-        {"a file", {Child(file)}, 0, S_OK, SFGAO_CANCOPY},
-        {"the root item", {Child(root)}, 0, S_OK, 0},
-        {"stations and files share none", {Child(station), Child(file)}, 0, S_OK, 0},
+        {"the request does not limit", {station.get()}, SFGAO_CANCOPY, S_OK, stationBits},
+        {"a file", {file.get()}, 0, S_OK, SFGAO_CANCOPY},
+        {"the root item", {root.get()}, 0, S_OK, 0},
+        {"stations and files share none", {station.get(), file.get()}, 0, S_OK, 0},
         // A deleted station fails only when asked to validate, and only as first item.
-        {"stored, validated", {Child(station)}, SFGAO_VALIDATE, S_OK, stationBits},
-        {"deleted, validated", {Child(deleted)}, SFGAO_VALIDATE | SFGAO_FOLDER, E_FAIL, 0},
-        {"deleted, not validated", {Child(deleted)}, SFGAO_FOLDER, S_OK, stationBits},
-        {"deleted second", {Child(station), Child(deleted)}, SFGAO_VALIDATE, S_OK, stationBits},
+        {"stored, validated", {station.get()}, SFGAO_VALIDATE, S_OK, stationBits},
+        {"deleted, validated", {deleted.get()}, SFGAO_VALIDATE | SFGAO_FOLDER, E_FAIL, 0},
+        {"deleted, not validated", {deleted.get()}, SFGAO_FOLDER, S_OK, stationBits},
+        {"deleted second", {station.get(), deleted.get()}, SFGAO_VALIDATE, S_OK, stationBits},
     };
     auto attributes = [&](std::vector<PCUITEMID_CHILD> items, SFGAOF& result) {
         return root_->GetAttributesOf(static_cast<UINT>(items.size()), items.data(), &result);
@@ -90,13 +90,13 @@ TEST_F(ShellFolderTest, AttributesByKindAndValidation) {
 
     ASSERT_EQ(S_OK, DeleteStation(Named(L"Station 1")));
     SFGAOF result = SFGAO_VALIDATE;
-    EXPECT_EQ(E_FAIL, attributes({Child(station)}, result));
+    EXPECT_EQ(E_FAIL, attributes({station.get()}, result));
 }
 
 TEST_F(ShellFolderTest, AllocationFailureWhileValidatingIsAResultNotAnException) {
     AddStationOfModel(L"Station 1");
     UniqueChildPidl station = StationItem(L"Station 1");
-    PCUITEMID_CHILD item = Child(station);
+    PCUITEMID_CHILD item = station.get();
     SFGAOF attributes = SFGAO_VALIDATE;
     HRESULT result = S_OK;
     {
@@ -125,7 +125,7 @@ TEST_F(ShellFolderTest, MalformedItemsAreRefusedBeforeTheirNamesAreRead) {
         EXPECT_EQ(E_INVALIDARG, root_->GetDisplayNameOf(item, SHGDN_NORMAL, &text));
         SFGAOF attributes = SFGAO_VALIDATE;
         EXPECT_EQ(E_INVALIDARG, root_->GetAttributesOf(1, &item, &attributes));
-        EXPECT_EQ(E_INVALIDARG, root_->CompareIDs(0, Child(good), item));
+        EXPECT_EQ(E_INVALIDARG, root_->CompareIDs(0, good.get(), item));
         void* object = reinterpret_cast<void*>(1);
         EXPECT_EQ(E_INVALIDARG,
                   root_->GetUIObjectOf(nullptr, 1, &item, IID_IQueryInfo, nullptr, &object));
@@ -142,7 +142,7 @@ TEST_F(ShellFolderTest, CompareIDsReturnsTheSignedOrderUnfolded) {
     UniqueChildPidl alphaUpper = StationItem(L"ALPHA");
     UniqueChildPidl file = FileItem(L"zzz");
     auto compare = [&](LPARAM column, const UniqueChildPidl& first, const UniqueChildPidl& second) {
-        return root_->CompareIDs(column, Child(first), Child(second));
+        return root_->CompareIDs(column, first.get(), second.get());
     };
     const HRESULT order = compare(0, alpha, beta);
     EXPECT_LT(order, 0) << "case is ignored: alpha before Beta";

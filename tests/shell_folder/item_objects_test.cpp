@@ -24,7 +24,7 @@ LONG IconWidth(HICON icon) {
 TEST_F(ShellFolderTest, UIObjectsNeedExactlyOneItem) {
     UniqueChildPidl first = StationItem(L"A");
     UniqueChildPidl second = StationItem(L"B");
-    PCUITEMID_CHILD items[] = {Child(first), Child(second)};
+    PCUITEMID_CHILD items[] = {first.get(), second.get()};
     for (REFIID iid :
          {IID_IExtractIconW, IID_IQueryInfo, IID_IDataObject, IID_IDropTarget, IID_IUnknown}) {
         void* object = reinterpret_cast<void*>(1);

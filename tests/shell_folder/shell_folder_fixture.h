@@ -57,7 +57,6 @@ protected:
             manager_.CreatePidlFromPath((L"Quorvel Digital Level\\S\\" + name).c_str()));
         return UniqueChildPidl(manager_.CopyItem(manager_.GetLastItem(full.get())));
     }
-    static PCUITEMID_CHILD Child(const UniqueChildPidl& item) { return item.get(); }
 
     // ParseDisplayName of a (writable copy of the) name; the list is null after a failure.
     static HRESULT Parse(IShellFolder* folder, std::wstring name, UniqueRelativePidl& list) {
@@ -71,7 +70,7 @@ protected:
     static HRESULT DisplayName(IShellFolder* folder, const UniqueChildPidl& item, SHGDNF flags,
                                std::wstring& name) {
         STRRET text{};
-        const HRESULT result = folder->GetDisplayNameOf(Child(item), flags, &text);
+        const HRESULT result = folder->GetDisplayNameOf(item.get(), flags, &text);
         if (SUCCEEDED(result)) {
             EXPECT_EQ(static_cast<UINT>(STRRET_WSTR), text.uType);
             name = text.pOleStr;
@@ -82,7 +81,7 @@ protected:
 
     static HRESULT UIObject(IShellFolder* folder, const UniqueChildPidl& item, REFIID iid,
                             void** object) {
-        PCUITEMID_CHILD child = Child(item);
+        PCUITEMID_CHILD child = item.get();
         return folder->GetUIObjectOf(nullptr, 1, &child, iid, nullptr, object);
     }
 

@@ -27,7 +27,7 @@ TEST_F(ShellFolderTest, RootAndStationFolderPathsWithAndWithoutPrefix) {
 
     auto station = MakeComObject<CLVShellFolder>();
     UniqueChildPidl item = StationItem(L"Station 1");
-    ASSERT_EQ(S_OK, station->SetUp(root.Get(), Child(item)));
+    ASSERT_EQ(S_OK, station->SetUp(root.Get(), item.get()));
     EXPECT_EQ(L"\\Quorvel Digital Level\\Station 1", FolderPath(*station.Get(), false));
     EXPECT_EQ(std::wstring(kPrefix) + L"\\Station 1", FolderPath(*station.Get(), true));
 
@@ -89,14 +89,14 @@ TEST_F(ShellFolderTest, RefusedObjectsComeBackNull) {
     UniqueChildPidl file = FileItem(L"file1.lv");
     UniqueChildPidl station = StationItem(L"S");
     void* object = reinterpret_cast<void*>(1);
-    EXPECT_EQ(E_INVALIDARG, root_->BindToObject(Child(file), nullptr, IID_IShellFolder, &object));
+    EXPECT_EQ(E_INVALIDARG, root_->BindToObject(file.get(), nullptr, IID_IShellFolder, &object));
     EXPECT_EQ(nullptr, object);
     // The new station folder is released again (the fixture counts the module's locks).
     object = reinterpret_cast<void*>(1);
-    EXPECT_EQ(E_NOINTERFACE, root_->BindToObject(Child(station), nullptr, IID_IStream, &object));
+    EXPECT_EQ(E_NOINTERFACE, root_->BindToObject(station.get(), nullptr, IID_IStream, &object));
     EXPECT_EQ(nullptr, object);
     object = reinterpret_cast<void*>(1);
-    EXPECT_EQ(E_NOTIMPL, root_->BindToStorage(Child(station), nullptr, IID_IStream, &object));
+    EXPECT_EQ(E_NOTIMPL, root_->BindToStorage(station.get(), nullptr, IID_IStream, &object));
     EXPECT_EQ(nullptr, object);
     // The folder makes views and background menus only.
     for (REFIID iid : {IID_IDropTarget, IID_IShellFolder}) {
@@ -105,6 +105,6 @@ TEST_F(ShellFolderTest, RefusedObjectsComeBackNull) {
         EXPECT_EQ(nullptr, object);
     }
     PITEMID_CHILD renamed = reinterpret_cast<PITEMID_CHILD>(1);
-    EXPECT_EQ(E_NOTIMPL, root_->SetNameOf(nullptr, Child(station), L"T", SHGDN_NORMAL, &renamed));
+    EXPECT_EQ(E_NOTIMPL, root_->SetNameOf(nullptr, station.get(), L"T", SHGDN_NORMAL, &renamed));
     EXPECT_EQ(nullptr, renamed);
 }
