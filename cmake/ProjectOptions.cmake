@@ -47,6 +47,9 @@ function(lv_add_test name)
         # Test executables carry the module's resources (string table) so that text lookups
         # made through the executable's own module find them.
         lv_add_module_resources(${name})
+        # Test programs point the error log at a scratch folder (LVSHELLEXT_LOG_DIR): they take
+        # the log's copy that reads the variable, which the shipped one never does.
+        target_link_libraries(${name} PRIVATE lv_error_log_test_folder)
         add_test(NAME ${name} COMMAND ${PROJECT_SOURCE_DIR}/scripts/wine-run $<TARGET_FILE:${name}>)
     else()
         add_test(NAME ${name} COMMAND ${name})

@@ -10,7 +10,10 @@ class DialogStationDownloader final : public StationDownloader {
 public:
     // The built-in serial driver's dialog, or the external library's for the models it reads;
     // the library's dialog checks the file the library reports before it ends with success.
-    [[nodiscard]] HRESULT Download(HWND owner, const Station& station, const std::wstring& target,
+    // While another download through the library runs in this process (or has not ended yet),
+    // the user is told so and ERROR_BUSY is returned, before any dialog opens.
+    [[nodiscard]] HRESULT Download(HWND owner, const Station& station,
+                                   const PrepareTargetFunction& prepareTarget,
                                    std::wstring& file) override;
 };
 

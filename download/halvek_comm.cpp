@@ -58,10 +58,19 @@ HRESULT CheckReceivedFile(const std::wstring& path) {
 }
 
 HRESULT CreateHalvekObject(UniqueHalvekObject& object, std::wstring& errorText) {
+    return CreateHalvekObjectFrom(ModuleDirectory() + L"HalvekComm.dll", object, errorText);
+}
+
+HRESULT CreateHalvekObjectFrom(const std::wstring& libraryPath, UniqueHalvekObject& object,
+                               std::wstring& errorText) {
     object.reset();
-    const std::wstring libraryPath = ModuleDirectory() + L"HalvekComm.dll";
+    // The library's own dependencies come from its folder and the system's, never from the
+    // host's current directory or PATH, where anyone may put a file of that name. (Windows 7
+    // needs its update KB2533623 for these flags; without it the load fails and says so.)
     // Deliberately never freed: the library keeps threads and state of its own.
-    const HMODULE library = ::LoadLibraryW(libraryPath.c_str());
+    const HMODULE library = ::LoadLibraryExW(
+        libraryPath.c_str(), nullptr,
+        LOAD_LIBRARY_SEARCH_DLL_LOAD_DIR | LOAD_LIBRARY_SEARCH_DEFAULT_DIRS);
     if (!library) {
         const HRESULT result = HRESULT_FROM_WIN32(::GetLastError());
         errorText = SystemResultText(result, libraryPath);

@@ -65,6 +65,10 @@ constexpr size_t kHalvekPointsBufferSize = kHalvekPointRecords * kHalvekPointRec
 // Loads the library from this module's directory (it stays loaded for the process) and creates
 // one object. On failure object stays null and errorText holds the system's text for the error.
 [[nodiscard]] HRESULT CreateHalvekObject(UniqueHalvekObject& object, std::wstring& errorText);
+// The same with the library at libraryPath (a full path); its dependencies are looked for in its
+// own folder and the system's, never in the current directory or PATH.
+[[nodiscard]] HRESULT CreateHalvekObjectFrom(const std::wstring& libraryPath,
+                                             UniqueHalvekObject& object, std::wstring& errorText);
 
 // A new points buffer with every half's marker set to -1; null when memory is short.
 std::unique_ptr<uint8_t[]> MakeHalvekPointsBuffer();

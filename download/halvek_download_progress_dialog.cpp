@@ -1,39 +1,40 @@
 // CHalvekDownloadProgressDialog: library set-up step by step, completion, cancel and errors.
 #include "download/halvek_download_progress_dialog.h"
 
+#include <atomic>
+#include <utility>
+
 #include "download/portable/driver_text.h"
 #include "res/resource.h"
 #include "support/registered_messages.h"
 #include "support/text_lookup.h"
 #include "support/user_interface.h"
 
-std::atomic<HWND> g_halvekDialogWindow{nullptr};
-
 namespace {
+
 constexpr int32_t kStartFirst = 20;
 constexpr int32_t kStartSecond = 1;
-constexpr int32_t kTimeout = 30;
+constexpr UINT_PTR kCancelWaitTimer = 1;
+
+std::atomic<DWORD> g_cancelWaitMilliseconds{kHalvekCancelWaitMilliseconds};
+
 }  // namespace
 
-CHalvekDownloadProgressDialog::CHalvekDownloadProgressDialog(HWND parent, const Station& station,
-                                                             const std::wstring& outputPath)
-    : CProgressDialogBase(parent, station, outputPath) {}
-
-CHalvekDownloadProgressDialog::~CHalvekDownloadProgressDialog() {
-    library_.reset();  // before the buffer the library may still point to
-    points_.reset();
+DWORD SetHalvekCancelWait(DWORD milliseconds) noexcept {
+    return g_cancelWaitMilliseconds.exchange(milliseconds);
 }
 
-void CHalvekDownloadProgressDialog::CompletionCallback(int32_t result) {
-    const HWND window = g_halvekDialogWindow.load();
-    if (window) {
-        (void)::PostMessageW(window, g_registeredMessages.halvekDownloadMessage, 0,
-                             static_cast<LPARAM>(result));  // a closed dialog waits for nothing
-    }
+CHalvekDownloadProgressDialog::CHalvekDownloadProgressDialog(HWND parent, const Station& station,
+                                                             const std::wstring& outputPath,
+                                                             HalvekLibraryClaim claim)
+    : CProgressDialogBase(parent, station, outputPath), claim_(std::move(claim)) {}
+
+CHalvekDownloadProgressDialog::~CHalvekDownloadProgressDialog() {
+    claim_.Finish(std::move(library_), std::move(points_), OutputPath());
 }
 
 BOOL CHalvekDownloadProgressDialog::OnInitDialog() {
-    g_halvekDialogWindow = Window();
+    claim_.RouteCompletionTo(Window());
     ShowInitialTexts(IDS_HALVEK_DOWNLOAD_TITLE);
     SetControlText(IDC_START, LoadUiText(IDS_START));
     return FALSE;  // the focus was set
@@ -47,6 +48,13 @@ void CHalvekDownloadProgressDialog::OnCancel() {
     // The library ends the transfer itself and reports it (normally -102) through the callback.
     SetStatus(IDS_TERMINATING_CONNECTION);
     (void)library_->Cancel();  // the answer comes through the callback
+    // A library that never answers must not keep the dialog, and the shell's window with it,
+    // open for good: after its own time-out the dialog ends without it.
+    if (!cancelling_) {
+        cancelling_ = true;
+        // Fails only without a window, and then there is no dialog to end.
+        (void)::SetTimer(Window(), kCancelWaitTimer, g_cancelWaitMilliseconds.load(), nullptr);
+    }
 }
 
 bool CHalvekDownloadProgressDialog::OnCommand(WORD controlId, WORD notification) {
@@ -57,20 +65,28 @@ bool CHalvekDownloadProgressDialog::OnCommand(WORD controlId, WORD notification)
     return false;
 }
 
-bool CHalvekDownloadProgressDialog::OnMessage(UINT message, WPARAM, LPARAM lParam,
+bool CHalvekDownloadProgressDialog::OnMessage(UINT message, WPARAM wParam, LPARAM lParam,
                                               INT_PTR& result) {
-    if (message != g_registeredMessages.halvekDownloadMessage)
+    if (message == WM_TIMER && wParam == kCancelWaitTimer) {
+        OnCancelWaitOver();
+    } else if (message == g_registeredMessages.halvekDownloadMessage) {
+        OnLibraryResult(static_cast<int32_t>(lParam));
+    } else {
         return false;
-    OnLibraryResult(static_cast<int32_t>(lParam));
+    }
     result = 0;
     return true;
 }
 
 void CHalvekDownloadProgressDialog::OnDestroy() {
-    g_halvekDialogWindow = nullptr;
+    claim_.RouteCompletionTo(nullptr);
 }
 
 void CHalvekDownloadProgressDialog::OnStart() {
+    if (!claim_) {
+        FailWith(LoadUiText(IDS_LIBRARY_DOWNLOAD_RUNNING));
+        return;
+    }
     std::wstring errorText;
     if (FAILED(CreateHalvekObject(library_, errorText))) {
         FailWith(errorText);
@@ -80,7 +96,7 @@ void CHalvekDownloadProgressDialog::OnStart() {
         FailWith(LoadUiText(IDS_UNABLE_TO_SET_FILE_PATH));
         return;
     }
-    if (library_->SetTimeout(kTimeout) != 0) {
+    if (library_->SetTimeout(kHalvekTimeoutSeconds) != 0) {
         FailWith(LoadUiText(IDS_UNABLE_TO_SET_TIMEOUT));
         return;
     }
@@ -101,9 +117,12 @@ void CHalvekDownloadProgressDialog::OnStart() {
         FailWith(LoadUiText(IDS_UNABLE_TO_SET_COMM_PARAMS));
         return;
     }
-    library_->SetCallback(&CHalvekDownloadProgressDialog::CompletionCallback);
+    library_->SetCallback(&HalvekLibraryClaim::CompletionCallback);
+    // Due before the start: the library may report its end before StartDownload returns.
+    claim_.ExpectCompletion(true);
     const int32_t code = library_->StartDownload(kStartFirst, kStartSecond);
     if (code != kHalvekNoError) {
+        claim_.ExpectCompletion(false);
         FailWith(HalvekResultText(code));
         return;
     }
@@ -126,7 +145,20 @@ void CHalvekDownloadProgressDialog::OnLibraryResult(int32_t code) {
     FinishTransfer();
 }
 
+void CHalvekDownloadProgressDialog::OnCancelWaitOver() {
+    (void)::KillTimer(Window(), kCancelWaitTimer);  // once is enough; it only fails without one
+    // A completion already on its way ends the dialog with its own result.
+    if (claim_.CompletionArrived())
+        return;
+    FailWith(HalvekResultText(kHalvekCancelled));
+}
+
 void CHalvekDownloadProgressDialog::FailWith(const std::wstring& text) {
+    // One box per dialog: a result that arrives while the box is up (a late completion after the
+    // cancel wait, say) finds the dialog already ending.
+    if (ending_)
+        return;
+    ending_ = true;
     ShowMessageBox(Window(), text, LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONEXCLAMATION);
     EndDialog(IDCANCEL);
 }

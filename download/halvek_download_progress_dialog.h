@@ -3,28 +3,35 @@
 
 #include <windows.h>
 
-#include <atomic>
 #include <cstdint>
 #include <memory>
 #include <string>
 
 #include "download/halvek_comm.h"
+#include "download/halvek_library_claim.h"
 #include "download/progress_dialog_base.h"
 
-// The open dialog's window, for the library's completion callback: one dialog at a time.
-extern std::atomic<HWND> g_halvekDialogWindow;
+// The library is given a time-out of this many seconds. A Cancel that the library has not
+// confirmed within it and a small margin more ends the dialog all the same.
+constexpr int32_t kHalvekTimeoutSeconds = 30;
+constexpr DWORD kHalvekCancelMarginMilliseconds = 5000;
+constexpr DWORD kHalvekCancelWaitMilliseconds =
+    kHalvekTimeoutSeconds * 1000 + kHalvekCancelMarginMilliseconds;
+
+// Sets how long a Cancel waits for the library in this process (tests shorten it); returns the
+// wait it replaces.
+DWORD SetHalvekCancelWait(DWORD milliseconds) noexcept;
 
 class CHalvekDownloadProgressDialog : public CProgressDialogBase {
 public:
-    // parent may be null. DoModal gives IDOK, with TransferCompleted, when the library has
+    // parent may be null. claim is the process's one library download (HalvekLibraryClaim);
+    // without it Start refuses. DoModal gives IDOK, with TransferCompleted, when the library has
     // written the file.
     CHalvekDownloadProgressDialog(HWND parent, const Station& station,
-                                  const std::wstring& outputPath);
-    // Deletes the library object and frees the points buffer; the library stays loaded.
+                                  const std::wstring& outputPath, HalvekLibraryClaim claim);
+    // Deletes the library object and frees the points buffer, or leaves both to the claim while
+    // the library may still use them; the library stays loaded.
     ~CHalvekDownloadProgressDialog() override;
-
-    // The completion function handed to the library.
-    static void CompletionCallback(int32_t result);
 
 protected:
     BOOL OnInitDialog() override;
@@ -36,9 +43,13 @@ protected:
 private:
     void OnStart();
     void OnLibraryResult(int32_t code);
+    void OnCancelWaitOver();
     // Shows the error box and ends the dialog with IDCANCEL.
     void FailWith(const std::wstring& text);
 
+    HalvekLibraryClaim claim_;
     UniqueHalvekObject library_;
     std::unique_ptr<uint8_t[]> points_;
+    bool cancelling_ = false;
+    bool ending_ = false;
 };

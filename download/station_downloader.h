@@ -4,23 +4,31 @@
 
 #include <windows.h>
 
+#include <functional>
 #include <string>
 
 #include "stations/portable/station.h"
+
+// Makes the download's target, a name without extension that no file has yet, and hands it out.
+// A failure has been shown to the user already.
+using PrepareTargetFunction = std::function<HRESULT(std::wstring& target)>;
 
 class StationDownloader {
 public:
     virtual ~StationDownloader() = default;
 
-    // Downloads the station's file to target, a name without extension that no file has yet;
-    // owner (may be null) owns whatever the download shows. file is set first, whatever the
-    // outcome, to where the download writes: target, or target with ".txt" added for a model
-    // read through the external library, which adds it.
+    // Downloads the station's file; owner (may be null) owns whatever the download shows. The
+    // target is asked for through prepareTarget only once the download can run, so that a
+    // download refused at once (another one holds what it needs) leaves no file behind; its
+    // failure ends the download with it. file is set, once the target exists, to where the
+    // download writes: the target, or the target with ".txt" added for a model read through the
+    // external library, which adds it.
     // S_OK: file is complete (for the external library, CheckReceivedFile passed it).
     // S_FALSE: the surveyor cancelled, or the download ended without a file for no reason of the
     // system's. A failure: the download could not run, or the system refused the file (a full
     // disk), with its reason. Anything but S_OK may leave part of a file, which is the caller's
     // to delete.
     [[nodiscard]] virtual HRESULT Download(HWND owner, const Station& station,
-                                           const std::wstring& target, std::wstring& file) = 0;
+                                           const PrepareTargetFunction& prepareTarget,
+                                           std::wstring& file) = 0;
 };

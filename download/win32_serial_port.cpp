@@ -156,8 +156,11 @@ uint32_t Win32ProtocolClock::TickMilliseconds() {
 }
 
 uint32_t Win32ReceiveFile::Create() {
-    handle_.reset(::CreateFileW(path_.c_str(), GENERIC_READ | GENERIC_WRITE, 0, nullptr,
-                                CREATE_ALWAYS, FILE_ATTRIBUTE_NORMAL, nullptr));
+    // The data object holds its download's file open for reading from its creation on, so that
+    // nobody can delete or swap it: the file is shared with readers, never with other writers,
+    // and an existing file (that one) is emptied rather than replaced.
+    handle_.reset(::CreateFileW(path_.c_str(), GENERIC_READ | GENERIC_WRITE, FILE_SHARE_READ,
+                                nullptr, CREATE_ALWAYS, FILE_ATTRIBUTE_NORMAL, nullptr));
     return handle_ ? ERROR_SUCCESS : ::GetLastError();
 }
 
@@ -206,6 +209,8 @@ WideString StringTableDriverTexts::Text(DriverText text) const {
             return LoadUiText(IDS_SERIAL_BLOCK_IMPORT_FAILED);
         case DriverText::InputFileBccMismatch:
             return LoadUiText(IDS_SERIAL_INPUT_FILE_BCC_MISMATCH);
+        case DriverText::SizeLimitReached:
+            return LoadUiText(IDS_SERIAL_SIZE_LIMIT_REACHED);
         case DriverText::YModemFileInfo:
             return LoadUiText(IDS_SERIAL_YMODEM_FILE_INFO);
     }

@@ -56,7 +56,9 @@ HRESULT CLVEnumIDList::Fill(const wchar_t* folderPath, SHCONTF flags) noexcept {
 
 HRESULT CLVEnumIDList::AddStations(const std::wstring& rootName) noexcept {
     try {
-        // A store that cannot be read lists no station, silently.
+        // A store that cannot be read lists no station, silently. The store leaves out names a path
+        // would not carry as themselves (empty, with a backslash): "Site\North" would be listed
+        // as "Site", and the folder would act on the real "Site". FindStation skips them alike.
         for (const std::wstring& name : ListStationNames()) {
             const std::wstring itemPath = rootName + L"\\" + name;
             PITEMID_CHILD item = manager_.CreateItemPidl(itemPath.c_str());

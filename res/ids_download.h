@@ -42,4 +42,6 @@
 // The external library reported success but its file cannot be trusted. Argument: the system's
 // text.
 #define IDS_DOWNLOAD_INCOMPLETE 1101
+// A second download through the external library while one runs (or has not ended yet).
+#define IDS_LIBRARY_DOWNLOAD_RUNNING 1102
 // The results -101 and -102 use the serial driver's texts 1070 and 1053 (res/ids_serial.h).

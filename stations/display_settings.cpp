@@ -3,8 +3,8 @@
 
 #include <windows.h>
 
+#include <algorithm>
 #include <atomic>
-#include <cstring>
 
 #include "stations/station_store.h"
 #include "support/error_handling.h"
@@ -12,7 +12,7 @@
 
 namespace {
 
-constexpr int kDefaultWidth = 100;
+constexpr int kDefaultWidth = kDefaultDisplayColumnWidth;
 std::atomic<int> g_widths[kDisplayColumnCount] = {kDefaultWidth, kDefaultWidth};
 
 // Held from comparing the widths to writing them, so that two views ending a column drag at
@@ -33,13 +33,12 @@ HRESULT WriteWidths() {
     RETURN_IF_WIN32_ERROR(::RegCreateKeyExW(HKEY_CURRENT_USER, StationRootKeyPath().c_str(), 0,
                                             nullptr, REG_OPTION_NON_VOLATILE, KEY_ALL_ACCESS,
                                             nullptr, root.put(), nullptr));
-    BYTE data[12] = {};  // the last four bytes carry nothing
-    for (size_t column = 0; column < kDisplayColumnCount; ++column) {
-        const int32_t width = g_widths[column];
-        memcpy(data + 4 * column, &width, sizeof width);
-    }
-    RETURN_IF_WIN32_ERROR(
-        ::RegSetValueExW(root.get(), L"Display Settings", 0, REG_BINARY, data, sizeof(data)));
+    DisplayColumnWidths widths{};
+    for (size_t column = 0; column < kDisplayColumnCount; ++column)
+        widths[column] = g_widths[column];
+    const auto data = DisplaySettingsBytes(widths);
+    RETURN_IF_WIN32_ERROR(::RegSetValueExW(root.get(), L"Display Settings", 0, REG_BINARY,
+                                           data.data(), static_cast<DWORD>(data.size())));
     return S_OK;
 }
 
@@ -62,21 +61,22 @@ bool LoadDisplaySettings() {
         ERROR_SUCCESS) {
         return false;
     }
-    BYTE data[16] = {};
+    BYTE data[kDisplaySettingsReadBytes] = {};
     DWORD size = sizeof(data);
     DWORD type = REG_NONE;
-    // A value too short, too long for the buffer, or not binary at all is not ours to read:
-    // text read as widths would give columns millions of pixels wide.
+    // A value longer than the buffer is refused by the registry; a short one, or one that is not
+    // binary at all, by the parse.
     if (::RegQueryValueExW(root.get(), L"Display Settings", nullptr, &type, data, &size) !=
-            ERROR_SUCCESS ||
-        type != REG_BINARY || size < 8) {
+        ERROR_SUCCESS) {
         return false;
     }
-    for (size_t column = 0; column < kDisplayColumnCount; ++column) {
-        int32_t width = 0;
-        memcpy(&width, data + 4 * column, sizeof width);
-        g_widths[column] = width;
-    }
+    const std::optional<DisplayColumnWidths> widths =
+        ParseDisplaySettings(static_cast<RegistryValueType>(type),
+                             std::span<const uint8_t>(data, std::min<size_t>(size, sizeof(data))));
+    if (!widths)
+        return false;
+    for (size_t column = 0; column < kDisplayColumnCount; ++column)
+        g_widths[column] = (*widths)[column];
     return true;
 }
 

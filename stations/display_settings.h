@@ -6,7 +6,9 @@
 
 #include <cstddef>
 
-inline constexpr size_t kDisplayColumnCount = 2;
+#include "stations/portable/display_settings_value.h"
+
+inline constexpr size_t kDisplayColumnCount = kDisplaySettingsColumnCount;
 
 // 100 for each column until settings are loaded or set; 0 for a column that is not kept.
 int DisplayColumnWidth(size_t column) noexcept;

@@ -1,9 +1,11 @@
-// The serial-port list of the local machine.
+// The serial-port list of the local machine, read through the portable list rules.
 #include "stations/serial_ports.h"
 
 #include <windows.h>
 
-#include "support/portable/wide_text.h"
+#include <algorithm>
+
+#include "stations/portable/serial_port_list.h"
 #include "support/unique_resource.h"
 
 std::vector<std::wstring> ListSerialPorts() {
@@ -14,18 +16,23 @@ std::vector<std::wstring> ListSerialPorts() {
         return ports;
     }
     for (DWORD index = 0;; ++index) {
-        wchar_t valueName[64] = {};
-        wchar_t data[64] = {};  // 128 bytes
+        // Both buffers are reset for each value. A name or data that does not fit is an
+        // enumeration error, which ends the list as the rules do.
+        wchar_t valueName[kSerialCommNameCapacity] = {};
+        BYTE data[kSerialCommDataCapacity] = {};
         DWORD nameLength = ARRAYSIZE(valueName);
         DWORD dataBytes = sizeof(data);
-        DWORD type = 0;
-        if (::RegEnumValueW(key.get(), index, valueName, &nameLength, nullptr, &type,
-                            reinterpret_cast<BYTE*>(data), &dataBytes) != ERROR_SUCCESS ||
-            type != REG_SZ) {
+        DWORD type = REG_NONE;
+        if (::RegEnumValueW(key.get(), index, valueName, &nameLength, nullptr, &type, data,
+                            &dataBytes) != ERROR_SUCCESS) {
             break;
         }
-        // The data need not end with its terminator: only what lies in the buffer is read.
-        ports.emplace_back(data, BoundedLength(data, dataBytes / sizeof(wchar_t)));
+        const SerialCommValue value{
+            WideStringView(valueName, std::min<size_t>(nameLength, ARRAYSIZE(valueName))),
+            static_cast<RegistryValueType>(type),
+            std::span<const uint8_t>(data, std::min<size_t>(dataBytes, sizeof(data)))};
+        if (!AppendSerialPort(value, ports))
+            break;
     }
     return ports;
 }

@@ -10,7 +10,9 @@
 
 #include "res/resource.h"
 #include "stations/portable/station_names.h"
+#include "stations/portable/station_values.h"
 #include "stations/serial_ports.h"
+#include "stations/station_keys.h"
 #include "stations/station_models.h"
 #include "support/registry_value.h"
 #include "support/text_lookup.h"
@@ -18,8 +20,7 @@
 
 namespace {
 
-constexpr DWORD kNameValueBytes = 520;  // names of up to 259 characters
-constexpr DWORD kKeyNameCapacity = 260;
+constexpr DWORD kKeyNameCapacity = kStationKeyNameCapacity;
 
 // Opens the "Stations" key for writing, creating it when missing; the registry's status.
 [[nodiscard]] LONG OpenStationsKey(UniqueRegKey& key) {
@@ -27,71 +28,64 @@ constexpr DWORD kKeyNameCapacity = 260;
                              REG_OPTION_NON_VOLATILE, KEY_ALL_ACCESS, nullptr, key.put(), nullptr);
 }
 
-LONG ReadText(HKEY key, const wchar_t* name, std::wstring& field) {
-    return ReadStringValue(key, name, kNameValueBytes, field);
-}
-
-LONG ReadNumber(HKEY key, const wchar_t* name, uint32_t& field) {
-    DWORD value = 0;
-    const LONG status = ReadDwordValue(key, name, value);
-    if (status == ERROR_SUCCESS)
-        field = value;
-    return status;
-}
-
-// Hands each subkey name, in the registry's order, to visit until it answers true; true when it
-// did. The end of the list and any enumeration failure end the walk.
-template <typename Visit>
-bool VisitSubkeyNames(HKEY key, Visit&& visit) {
-    for (DWORD index = 0;; ++index) {
-        wchar_t subkeyName[kKeyNameCapacity];
-        DWORD length = kKeyNameCapacity;
-        if (::RegEnumKeyExW(key, index, subkeyName, &length, nullptr, nullptr, nullptr,
-                            nullptr) != ERROR_SUCCESS) {
-            return false;
-        }
-        if (visit(std::wstring_view(subkeyName, length)))
-            return true;
-    }
-}
-
-// Hands each station key that has a readable "Name", in the registry's order, to visit until it
-// answers true; true when it did.
-template <typename Visit>
-bool VisitStationKeys(HKEY stations, REGSAM access, Visit&& visit) {
-    return VisitSubkeyNames(stations, [&](std::wstring_view subkeyName) {
-        UniqueRegKey subkey;
-        std::wstring name;
-        const std::wstring keyName(subkeyName);
-        if (::RegOpenKeyExW(stations, keyName.c_str(), 0, access, subkey.put()) != ERROR_SUCCESS ||
-            ReadText(subkey.get(), L"Name", name) != ERROR_SUCCESS) {
-            return false;
-        }
-        return visit(subkeyName, subkey.get(), name);
-    });
-}
-
-// Registry key names compare without regard to case.
-std::wstring KeyNameFolded(std::wstring name) {
-    if (!name.empty())
-        ::CharLowerBuffW(name.data(), static_cast<DWORD>(name.size()));
-    return name;
-}
-
-std::unordered_set<std::wstring> SubkeyNamesFolded(HKEY stations) {
-    std::unordered_set<std::wstring> names;
-    VisitSubkeyNames(stations, [&](std::wstring_view subkeyName) {
-        names.insert(KeyNameFolded(std::wstring(subkeyName)));
-        return false;
-    });
-    return names;
-}
-
 // Whether a name is taken, by one reading of the store made when the predicate is built.
 NameTakenPredicate TakenInStore() {
     const std::vector<std::wstring> stored = ListStationNames();
     return [taken = std::unordered_set<std::wstring>(stored.begin(), stored.end())](
                const WideString& name) { return taken.count(name) != 0; };
+}
+
+// The twelve values in SaveStationValues' order; the first failing write's status.
+[[nodiscard]] LONG WriteStationValues(const Station& station, HKEY stationKey) {
+    LONG status = ERROR_SUCCESS;
+    const auto text = [&](const wchar_t* name, const std::wstring& value) {
+        if (status == ERROR_SUCCESS)
+            status = WriteStringValue(stationKey, name, value);
+    };
+    const auto number = [&](const wchar_t* name, uint32_t value) {
+        if (status == ERROR_SUCCESS)
+            status = WriteDwordValue(stationKey, name, value);
+    };
+    text(L"Name", station.Name);
+    text(L"Port", station.Port);
+    number(L"BaudRate", station.BaudRate);
+    number(L"StopBits", station.StopBits);
+    number(L"Parity", station.Parity);
+    number(L"DataBits", station.DataBits);
+    text(L"Manufacturer", station.Manufacturer);
+    text(L"Model", station.Model);
+    text(L"Software", station.Software);
+    number(L"Protocol", station.Protocol);
+    number(L"Flow", station.Flow);
+    number(L"CheckSum", station.CheckSum);
+    return status;
+}
+
+// Creates the lowest "Station %d" from *next on that neither the reading of the key names nor
+// the registry itself has; *next moves past it. A key made by someone else since the reading is
+// never overwritten, as creation tells whether the key was new.
+[[nodiscard]] LONG CreateFreeStationKey(HKEY stations,
+                                        const std::unordered_set<std::wstring>& existingKeys,
+                                        unsigned& next, std::wstring& keyName,
+                                        UniqueRegKey& subkey) {
+    for (;; ++next) {
+        wchar_t candidate[32];
+        swprintf(candidate, ARRAYSIZE(candidate), L"Station %u", next);
+        if (existingKeys.count(KeyNameFolded(candidate)) != 0)
+            continue;
+        DWORD disposition = 0;
+        const LONG status =
+            ::RegCreateKeyExW(stations, candidate, 0, nullptr, REG_OPTION_NON_VOLATILE,
+                              KEY_ALL_ACCESS, nullptr, subkey.put(), &disposition);
+        // A key that cannot be created at all would make the probe run forever.
+        if (status != ERROR_SUCCESS)
+            return status;
+        if (disposition == REG_CREATED_NEW_KEY) {
+            keyName = candidate;
+            ++next;
+            return ERROR_SUCCESS;
+        }
+    }
 }
 
 }  // namespace
@@ -114,8 +108,10 @@ HRESULT FindStation(Station& station, wchar_t* keyName, DWORD* keyNameCapacity) 
     UniqueRegKey stations;
     if (OpenStationsKey(stations) != ERROR_SUCCESS)
         return E_FAIL;
-    const bool found = VisitStationKeys(
-        stations.get(), KEY_ALL_ACCESS,
+    // Only the listed stations are found: the folder acts on no other (its listing logs them).
+    LeftOutStations notListed;
+    const bool found = VisitListedStations(
+        stations.get(), KEY_ALL_ACCESS, notListed,
         [&](std::wstring_view subkeyName, HKEY subkey, const std::wstring& name) {
             if (name != station.Name)
                 return false;
@@ -133,37 +129,50 @@ HRESULT FindStation(Station& station, wchar_t* keyName, DWORD* keyNameCapacity) 
 }
 
 HRESULT AddStation(const Station& station) {
+    if (CheckStationName(station.Name) != StationNameProblem::kNone)
+        return E_INVALIDARG;
     Station existing;
     existing.Name = station.Name;
     if (FindStation(existing) == S_OK)
         return E_INVALIDARG;
+    return AddStations({&station, 1}) == S_OK ? S_OK : E_FAIL;
+}
 
-    UniqueRegKey stations;
-    if (OpenStationsKey(stations) != ERROR_SUCCESS)
+HRESULT AddStations(std::span<const Station> stations) {
+    for (const Station& station : stations) {
+        if (CheckStationName(station.Name) != StationNameProblem::kNone)
+            return E_INVALIDARG;
+    }
+    UniqueRegKey stationsKey;
+    if (OpenStationsKey(stationsKey) != ERROR_SUCCESS)
         return E_FAIL;
 
-    // The lowest free "Station %d" is taken, so a deleted station's number is reused. Numbers
-    // whose key exists are passed over on one reading of the key names; a key that appears in
-    // between is not overwritten, as creation tells whether it was new.
-    const std::unordered_set<std::wstring> existingKeys = SubkeyNamesFolded(stations.get());
-    for (unsigned index = 0;; ++index) {
-        wchar_t subkeyName[32];
-        swprintf(subkeyName, ARRAYSIZE(subkeyName), L"Station %u", index);
-        if (existingKeys.count(KeyNameFolded(subkeyName)) != 0)
-            continue;
+    // The lowest free numbers are taken, so deleted stations' numbers are reused. Numbers whose
+    // key exists are passed over on one reading of the key names, and the probe goes on from the
+    // last number taken: the batch costs the store's size plus its own, not their product.
+    const std::unordered_set<std::wstring> existingKeys = SubkeyNamesFolded(stationsKey.get());
+    std::vector<std::wstring> written;
+    written.reserve(stations.size());
+    unsigned next = 0;
+    LONG status = ERROR_SUCCESS;
+    for (const Station& station : stations) {
         UniqueRegKey subkey;
-        DWORD disposition = 0;
-        const LONG status =
-            ::RegCreateKeyExW(stations.get(), subkeyName, 0, nullptr, REG_OPTION_NON_VOLATILE,
-                              KEY_ALL_ACCESS, nullptr, subkey.put(), &disposition);
-        // A key that cannot be created at all would make the probe run forever.
+        std::wstring keyName;
+        status = CreateFreeStationKey(stationsKey.get(), existingKeys, next, keyName, subkey);
         if (status != ERROR_SUCCESS)
-            return E_FAIL;
-        if (disposition == REG_CREATED_NEW_KEY) {
-            SaveStationValues(station, subkey.get());
-            return S_OK;
-        }
+            break;
+        written.push_back(std::move(keyName));
+        status = WriteStationValues(station, subkey.get());
+        if (status != ERROR_SUCCESS)
+            break;
     }
+    if (status == ERROR_SUCCESS)
+        return S_OK;
+    // All or nothing: a store that refused the tenth station keeps none of the batch. A key that
+    // will not go either is left for the listing, which shows what is stored.
+    for (const std::wstring& keyName : written)
+        (void)DeleteKeyRecursive(stationsKey.get(), keyName.c_str());
+    return HRESULT_FROM_WIN32(status);
 }
 
 HRESULT UpdateStation(const std::wstring& oldName, const Station& station) {
@@ -211,62 +220,70 @@ HRESULT DeleteStation(const Station& station) {
     return DeleteKeyRecursive(stations.get(), subkeyName);  // the registry's own code (header)
 }
 
-LONG LoadStationValues(Station& station, HKEY stationKey) {
-    LONG status = ReadText(stationKey, L"Name", station.Name);
-    if (status != ERROR_SUCCESS)
-        return status;
+namespace {
 
-    status = ReadText(stationKey, L"Port", station.Port);
-    if (status != ERROR_SUCCESS)
-        return status;
-    // A port the computer no longer has becomes its first one; with no list, it stays.
-    const std::vector<std::wstring> ports = ListSerialPorts();
-    if (!ports.empty() && std::find(ports.begin(), ports.end(), station.Port) == ports.end())
-        station.Port = ports.front();
+// An open station key as the portable reader's source of values. It keeps the registry's own
+// code of its last read, the one LoadStationValues passes on when that read was refused.
+class RegistryStationValues final : public StationValueSource {
+public:
+    explicit RegistryStationValues(HKEY key) noexcept : key_(key) {}
 
-    for (auto [name, field] :
-         {std::pair{L"StopBits", &station.StopBits}, std::pair{L"BaudRate", &station.BaudRate},
-          std::pair{L"Parity", &station.Parity}, std::pair{L"Parity", &station.Parity},
-          std::pair{L"DataBits", &station.DataBits}}) {
-        status = ReadNumber(stationKey, name, *field);
-        if (status != ERROR_SUCCESS)
-            return status;
+    ValueReadStatus ReadValue(const wchar_t* name, size_t capacity, RegistryValueType& type,
+                              std::vector<uint8_t>& data) override {
+        // Never a null buffer: given none, the registry answers with the value's size instead.
+        data.assign(std::max<size_t>(capacity, 1), 0);
+        DWORD valueType = REG_NONE;
+        DWORD size = static_cast<DWORD>(capacity);  // the reader's own small constants
+        lastError_ = ::RegQueryValueExW(key_, name, nullptr, &valueType, data.data(), &size);
+        if (lastError_ != ERROR_SUCCESS) {
+            data.clear();
+            switch (lastError_) {
+                case ERROR_FILE_NOT_FOUND:
+                    return ValueReadStatus::kMissing;
+                case ERROR_MORE_DATA:
+                    return ValueReadStatus::kTooLong;
+                default:
+                    return ValueReadStatus::kFailed;
+            }
+        }
+        data.resize(std::min<size_t>(size, capacity));
+        type = static_cast<RegistryValueType>(valueType);
+        return ValueReadStatus::kRead;
     }
 
-    status = ReadText(stationKey, L"Manufacturer", station.Manufacturer);
-    if (status != ERROR_SUCCESS)
-        return status;
+    [[nodiscard]] LONG LastError() const noexcept { return lastError_; }
 
-    status = ReadText(stationKey, L"Model", station.Model);
-    if (status != ERROR_SUCCESS)
-        return status;
-    station.Model = KnownModelOrFirst(station.Model);
+private:
+    HKEY key_;
+    LONG lastError_ = ERROR_SUCCESS;
+};
 
-    status = ReadText(stationKey, L"Software", station.Software);
-    if (status != ERROR_SUCCESS)
-        return status;
+}  // namespace
 
-    // Protocol and Flow came later than the other values; keys written before them still load.
-    (void)ReadNumber(stationKey, L"Protocol", station.Protocol);
-    (void)ReadNumber(stationKey, L"Flow", station.Flow);
-    return ReadNumber(stationKey, L"CheckSum", station.CheckSum);
+LONG LoadStationValues(Station& station, HKEY stationKey) {
+    RegistryStationValues values(stationKey);
+    const StationReadRules rules{[] { return ListSerialPorts(); }, FirstModelText(),
+                                 LoadUiText(IDS_MODEL_LV20), LoadUiText(IDS_MODEL_LV30)};
+    // The read that failed is always the last one made, so a refusal is the registry's own code.
+    switch (ReadStationValues(station, values, rules)) {
+        case ValueReadStatus::kRead:
+            return ERROR_SUCCESS;
+        case ValueReadStatus::kMissing:
+            return ERROR_FILE_NOT_FOUND;
+        case ValueReadStatus::kTooLong:
+            return ERROR_MORE_DATA;
+        case ValueReadStatus::kWrongType:
+            return ERROR_UNSUPPORTED_TYPE;
+        case ValueReadStatus::kFailed:
+            break;
+    }
+    return values.LastError();
 }
 
 void SaveStationValues(const Station& station, HKEY stationKey) {
     // Stops at the first failed write; callers are not told, as a half-written station still
     // loads up to its first missing value.
-    (void)(WriteStringValue(stationKey, L"Name", station.Name) == ERROR_SUCCESS &&
-           WriteStringValue(stationKey, L"Port", station.Port) == ERROR_SUCCESS &&
-           WriteDwordValue(stationKey, L"BaudRate", station.BaudRate) == ERROR_SUCCESS &&
-           WriteDwordValue(stationKey, L"StopBits", station.StopBits) == ERROR_SUCCESS &&
-           WriteDwordValue(stationKey, L"Parity", station.Parity) == ERROR_SUCCESS &&
-           WriteDwordValue(stationKey, L"DataBits", station.DataBits) == ERROR_SUCCESS &&
-           WriteStringValue(stationKey, L"Manufacturer", station.Manufacturer) == ERROR_SUCCESS &&
-           WriteStringValue(stationKey, L"Model", station.Model) == ERROR_SUCCESS &&
-           WriteStringValue(stationKey, L"Software", station.Software) == ERROR_SUCCESS &&
-           WriteDwordValue(stationKey, L"Protocol", station.Protocol) == ERROR_SUCCESS &&
-           WriteDwordValue(stationKey, L"Flow", station.Flow) == ERROR_SUCCESS &&
-           WriteDwordValue(stationKey, L"CheckSum", station.CheckSum) == ERROR_SUCCESS);
+    (void)WriteStationValues(station, stationKey);
 }
 
 std::vector<std::wstring> ListStationNames() {
@@ -276,18 +293,56 @@ std::vector<std::wstring> ListStationNames() {
                         stations.put()) != ERROR_SUCCESS) {
         return names;
     }
-    VisitStationKeys(stations.get(), KEY_READ,
-                     [&](std::wstring_view, HKEY, const std::wstring& name) {
-                         names.push_back(name);
-                         return false;
-                     });
+    LeftOutStations leftOut;
+    VisitListedStations(stations.get(), KEY_READ, leftOut,
+                        [&](std::wstring_view, HKEY, const std::wstring& name) {
+                            names.push_back(name);
+                            return false;
+                        });
+    LogLeftOutStations(leftOut, L"ListStationNames");
     return names;
+}
+
+std::vector<Station> ListStations() {
+    std::vector<Station> listed;
+    UniqueRegKey stations;
+    if (::RegOpenKeyExW(HKEY_CURRENT_USER, StationsKeyPath().c_str(), 0, KEY_READ,
+                        stations.put()) != ERROR_SUCCESS) {
+        return listed;
+    }
+    // Each record starts as FindStation's callers' do: a value that cannot be read keeps its
+    // default.
+    const Station defaults = DefaultStation();
+    LeftOutStations leftOut;
+    VisitListedStations(stations.get(), KEY_READ, leftOut,
+                        [&](std::wstring_view, HKEY subkey, const std::wstring& name) {
+                            Station station = defaults;
+                            station.Name = name;
+                            // As in FindStation: a half-written station is still listed.
+                            (void)LoadStationValues(station, subkey);
+                            listed.push_back(std::move(station));
+                            return false;
+                        });
+    LogLeftOutStations(leftOut, L"ListStations");
+    return listed;
 }
 
 std::wstring MakeUniqueStationName(const std::wstring& base) {
     return MakeUniqueName(base, TakenInStore());
 }
 
-std::wstring MakePastedStationName(const std::wstring& name) {
-    return MakePastedName(name, LoadUiText(IDS_COPY_OF), TakenInStore());
+PasteOutcome AddPastedStations(std::vector<Station> stations, const std::wstring& copyPrefix) {
+    PasteOutcome outcome;
+    const std::vector<std::wstring> stored = ListStationNames();
+    PastedNames chosen = ChoosePastedNames(
+        stations, std::unordered_set<std::wstring>(stored.begin(), stored.end()), copyPrefix);
+    if (chosen.refused) {
+        outcome.result = S_FALSE;
+        outcome.refused = std::move(chosen.refused);
+        return outcome;
+    }
+    for (size_t index = 0; index < stations.size(); ++index)
+        stations[index].Name = std::move(chosen.names[index]);
+    outcome.result = AddStations(stations);
+    return outcome;
 }

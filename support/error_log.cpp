@@ -17,15 +17,31 @@ namespace {
 
 constexpr wchar_t kLogName[] = L"LVShellExt.log";
 constexpr wchar_t kOldLogName[] = L"LVShellExt.old.log";
+#ifdef LV_ERROR_LOG_FOLDER_OVERRIDE
+// Test programs only (support/CMakeLists.txt): a variable that any parent process can set must
+// not choose where the shipped module writes and renames files, least of all in an elevated
+// process of the same user. Under Wine every process is elevated, so the token cannot tell a
+// test from the shell, and the shipped build has no override at all.
 constexpr wchar_t kFolderOverride[] = L"LVSHELLEXT_LOG_DIR";
+#endif
 // Per logon session: the processes that share one user's log share this name.
 constexpr wchar_t kLogMutexName[] = L"Local\\LVShellExt.ErrorLog";
-// Whoever holds the log longer than this is stuck; the entry is then appended without it.
-constexpr DWORD kLogMutexWaitMilliseconds = 2000;
+// A writer holds the log for one open, append and close. Whoever holds it longer is stuck or
+// hostile: the entry is dropped rather than keep the calling window frozen.
+constexpr DWORD kLogMutexWaitMilliseconds = 50;
+// Once a wait ran out while no other thread of this process was logging, another process holds
+// the log: for this long, entries only take the log when it is free at once, so that a burst of
+// failures costs one wait, not one each.
+constexpr ULONGLONG kHeldElsewhereMilliseconds = 1000;
+// A file that cannot be moved aside (a reader holds it without delete sharing) grows up to this
+// many times the limit; entries past that are dropped.
+constexpr ULONGLONG kSizeCeilingFactor = 2;
 // A text longer than this is cut, so that one entry cannot fill the log on its own.
 constexpr size_t kFieldLengthLimit = 2048;
 
 std::atomic<DWORD> g_sizeLimit{kErrorLogDefaultSizeLimit};
+std::atomic<int> g_writersInProcess{0};
+std::atomic<ULONGLONG> g_heldElsewhereUntil{0};
 
 struct BstrTraits {
     using Type = BSTR;
@@ -34,21 +50,30 @@ struct BstrTraits {
 };
 
 // Holds the log's mutex for one entry, so that two processes never both move the full file
-// aside, nor both start the new one with a byte-order mark.
+// aside, nor both start the new one with a byte-order mark. Waits a moment at most: without the
+// mutex the entry is dropped.
 class LogLock {
 public:
     LogLock() noexcept : mutex_(::CreateMutexW(nullptr, FALSE, kLogMutexName)) {
+        const bool aloneHere = g_writersInProcess.fetch_add(1) == 0;
         if (!mutex_)
             return;
-        const DWORD wait = ::WaitForSingleObject(mutex_.get(), kLogMutexWaitMilliseconds);
+        const bool heldElsewhere = aloneHere && ::GetTickCount64() < g_heldElsewhereUntil.load();
+        const DWORD outcome =
+            ::WaitForSingleObject(mutex_.get(), heldElsewhere ? 0 : kLogMutexWaitMilliseconds);
         // An abandoned mutex is ours now: its holder died, the file is whole entries still.
-        held_ = wait == WAIT_OBJECT_0 || wait == WAIT_ABANDONED;
+        held_ = outcome == WAIT_OBJECT_0 || outcome == WAIT_ABANDONED;
+        if (outcome == WAIT_TIMEOUT && aloneHere)
+            g_heldElsewhereUntil = ::GetTickCount64() + kHeldElsewhereMilliseconds;
+        else if (held_)
+            g_heldElsewhereUntil = 0;
     }
     LogLock(const LogLock&) = delete;
     LogLock& operator=(const LogLock&) = delete;
     ~LogLock() {
         if (held_)
             ::ReleaseMutex(mutex_.get());
+        g_writersInProcess.fetch_sub(1);
     }
     bool held() const noexcept { return held_; }
 
@@ -142,7 +167,9 @@ KnownFolder LookUpLocalAppData() noexcept {
 
 std::wstring LogFolder() {
     wchar_t chosen[MAX_PATH];
-    DWORD length = ::GetEnvironmentVariableW(kFolderOverride, chosen, MAX_PATH);
+    DWORD length = 0;
+#ifdef LV_ERROR_LOG_FOLDER_OVERRIDE
+    length = ::GetEnvironmentVariableW(kFolderOverride, chosen, MAX_PATH);
     // A test's folder or none at all: a test must never write to the user's own log.
     if (length > 0) {
         if (length >= MAX_PATH)
@@ -150,6 +177,7 @@ std::wstring LogFolder() {
         ::CreateDirectoryW(chosen, nullptr);
         return IsFolder(chosen) ? std::wstring(chosen, length) : std::wstring();
     }
+#endif
     // Looked up once per process: the log may be written from DllMain at unload, where the
     // shell's folder lookup is no longer safe to call.
     static const KnownFolder localAppData = LookUpLocalAppData();
@@ -185,20 +213,24 @@ void WriteEntry(const std::wstring& entry) {
         return;
     const std::wstring path = folder + L'\\' + kLogName;
     const LogLock lock;
+    if (!lock.held())
+        return;  // a dropped entry rather than a caller kept waiting
     UniqueFileHandle file = OpenLog(path);
     LARGE_INTEGER size{};
     if (!file || !::GetFileSizeEx(file.get(), &size))
         return;
     const ULONGLONG entryBytes = entry.size() * sizeof(wchar_t);
-    if (lock.held() && size.QuadPart > 0 &&
-        static_cast<ULONGLONG>(size.QuadPart) + entryBytes > g_sizeLimit.load()) {
+    const ULONGLONG limit = g_sizeLimit.load();
+    if (size.QuadPart > 0 && static_cast<ULONGLONG>(size.QuadPart) + entryBytes > limit) {
         file.reset();
         // When a reader holds the file without delete sharing it stays: the entry then goes on
-        // its end, past the limit, and the next entry tries again.
+        // its end, up to the ceiling, and the next entry tries again.
         ::MoveFileExW(path.c_str(), (folder + L'\\' + kOldLogName).c_str(),
                       MOVEFILE_REPLACE_EXISTING);
         file = OpenLog(path);
         if (!file || !::GetFileSizeEx(file.get(), &size))
+            return;
+        if (static_cast<ULONGLONG>(size.QuadPart) + entryBytes > limit * kSizeCeilingFactor)
             return;
     }
     std::wstring text;

@@ -9,7 +9,9 @@
 // LVShellExt.old.log (replacing the one before) and starts a new file: at most 1 MiB each.
 constexpr DWORD kErrorLogDefaultSizeLimit = 1024 * 1024;
 
-// Appends one entry to the log, in one write (several threads and processes may log at once):
+// Appends one entry to the log, in one write (several threads and processes may log at once),
+// under a mutex taken with a short wait: while another process holds it, the entry is dropped.
+// Past twice the size limit (the full file could not be moved aside) entries are dropped too.
 //   2024-05-01 14:03:07.123, process 1234, thread 5678
 //   SourceParser - 0x80070005 (TSourceParser::ParseDataObject, 120)
 //   System description: Access is denied.
@@ -21,9 +23,10 @@ void ReportError(const wchar_t* source, HRESULT result, const wchar_t* function,
                  const wchar_t* internalDescription = nullptr) noexcept;
 
 // The file the next entry goes to: "%LOCALAPPDATA%\Quorvel\Digital Levels\LVShellExt.log", its
-// folders created as needed; in the temporary folder when those cannot be had; in the folder
-// that the environment variable LVSHELLEXT_LOG_DIR names, when set (tests). Empty when no
-// folder can be found.
+// folders created as needed; in the temporary folder when those cannot be had. Test programs
+// built with LV_ERROR_LOG_FOLDER_OVERRIDE take the folder that the environment variable
+// LVSHELLEXT_LOG_DIR names, when set; the shipped module never reads it. Empty when no folder
+// can be found.
 std::wstring ErrorLogPath() noexcept;
 
 // Sets the size limit for this process (tests set a small one); returns the one it replaces.

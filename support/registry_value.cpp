@@ -1,13 +1,16 @@
 // Bounded registry value access.
 #include "support/registry_value.h"
 
+#include <algorithm>
 #include <vector>
 
 #include "support/portable/wide_text.h"
 #include "support/unique_resource.h"
 
 LONG ReadStringValue(HKEY key, const wchar_t* name, DWORD maxBytes, std::wstring& text) {
-    std::vector<BYTE> buffer(maxBytes + sizeof(wchar_t));
+    // Exactly the bytes offered (a size with room added could wrap in a 32-bit build), and never
+    // none: given a null buffer the registry reports the value's whole size as if it had read it.
+    std::vector<BYTE> buffer(std::max<DWORD>(maxBytes, 1));
     DWORD type = 0;
     DWORD size = maxBytes;
     const LONG status = ::RegQueryValueExW(key, name, nullptr, &type, buffer.data(), &size);
@@ -15,8 +18,10 @@ LONG ReadStringValue(HKEY key, const wchar_t* name, DWORD maxBytes, std::wstring
         return status;
     if (type != REG_SZ && type != REG_EXPAND_SZ)
         return ERROR_UNSUPPORTED_TYPE;
+    // Only what lies in the buffer: the text ends at its first NUL or its last whole unit.
     const auto* characters = reinterpret_cast<const wchar_t*>(buffer.data());
-    text.assign(characters, BoundedLength(characters, size / sizeof(wchar_t)));
+    text.assign(characters,
+                BoundedLength(characters, std::min<DWORD>(size, maxBytes) / sizeof(wchar_t)));
     return ERROR_SUCCESS;
 }
 

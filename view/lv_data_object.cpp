@@ -177,17 +177,29 @@ HRESULT CLVDataObject::GetFileContents(LONG index, STGMEDIUM* medium) {
 
     // The caller's active window, if any, owns the dialog so that it stays in front of it.
     const HWND owner = ::GetActiveWindow();
-    // A fresh temporary name for every request: asking twice downloads twice.
-    std::wstring target;
-    RETURN_IF_FAILED(PrepareDownloadTarget(owner, target));
-
     RETURN_HR_IF(E_UNEXPECTED, !downloader_);
+    // A fresh temporary name for every request: asking twice downloads twice. The downloader
+    // asks for it once it can run, so that a download refused at once leaves no file.
+    DownloadTarget target;
+    const auto prepareTarget = [&](std::wstring& path) -> HRESULT {
+        const HRESULT prepared = PrepareDownloadTarget(owner, target);  // shows and logs
+        if (SUCCEEDED(prepared))
+            path = target.Path();
+        return prepared;
+    };
     std::wstring file;
-    const HRESULT downloaded = downloader_->Download(owner, station, target, file);
-    // Only a complete file is handed on: a cancel or a failure leaves at most a partial file,
-    // which goes.
+    const HRESULT downloaded = downloader_->Download(owner, station, prepareTarget, file);
+    // A download that ended before its target was made has nothing to clean up; its failure
+    // (shown where it happened) fails the copy.
+    if (!target) {
+        if (FAILED(downloaded))
+            LV_LOG_AND_RETURN(downloaded);
+        return S_FALSE;
+    }
+    // Whatever the download wrote goes with the target: a partial file when the download did not
+    // complete (the target's end deletes it), the file the stream reads when it did.
+    RETURN_IF_FAILED(target.AddWrittenFile(file));
     if (downloaded != S_OK) {
-        (void)::DeleteFileW(file.c_str());  // usually there is none: nothing to report
         // A failure fails the copy with its reason, so that the caller reports a failure rather
         // than a cancel.
         if (FAILED(downloaded))
@@ -195,13 +207,11 @@ HRESULT CLVDataObject::GetFileContents(LONG index, STGMEDIUM* medium) {
         return S_FALSE;
     }
 
+    // The stream takes the target over and reads the file from here on, so that nobody writes,
+    // renames or replaces it between the download and the last read. A file that cannot be
+    // opened now is no download: no stream over nothing (its release removes the target).
     auto stream = MakeComObject<CStream2>();
-    // A file that cannot be opened now is no download: no stream over nothing.
-    const HRESULT bound = stream->Bind(file, true);
-    if (FAILED(bound)) {
-        (void)::DeleteFileW(file.c_str());  // whatever is left of it is of no use
-        LV_LOG_AND_RETURN(bound);
-    }
+    RETURN_IF_FAILED(stream->Bind(std::move(target)));
     medium->tymed = TYMED_ISTREAM;
     medium->pstm = stream.Detach();
     medium->pUnkForRelease = nullptr;
@@ -283,6 +293,22 @@ IFACEMETHODIMP CLVDataObject::QueryGetData(FORMATETC* format) {
         return S_OK;
     }
     return S_FALSE;
+}
+
+IFACEMETHODIMP CLVDataObject::GetCanonicalFormatEtc(FORMATETC* format, FORMATETC* canonical) {
+    if (canonical) {
+        // The request itself is the most general form of every format offered (none depends on
+        // a device); its target device is never handed back, since the caller frees it.
+        *canonical = format ? *format : FORMATETC{};
+        canonical->ptd = nullptr;
+    }
+    return E_NOTIMPL;
+}
+
+IFACEMETHODIMP CLVDataObject::EnumDAdvise(IEnumSTATDATA** enumerator) {
+    if (enumerator)
+        *enumerator = nullptr;
+    return E_NOTIMPL;
 }
 
 IFACEMETHODIMP CLVDataObject::SetData(FORMATETC* format, STGMEDIUM* medium, BOOL release) {

@@ -42,12 +42,15 @@ public:
     IFACEMETHODIMP GetData(FORMATETC* format, STGMEDIUM* medium) override;
     IFACEMETHODIMP GetDataHere(FORMATETC*, STGMEDIUM*) override { return E_NOTIMPL; }
     IFACEMETHODIMP QueryGetData(FORMATETC* format) override;
-    IFACEMETHODIMP GetCanonicalFormatEtc(FORMATETC*, FORMATETC*) override { return E_NOTIMPL; }
+    // Not supported; the out structure still comes back with no target device, which a caller
+    // may free whatever the result.
+    IFACEMETHODIMP GetCanonicalFormatEtc(FORMATETC* format, FORMATETC* canonical) override;
     IFACEMETHODIMP SetData(FORMATETC* format, STGMEDIUM* medium, BOOL release) override;
     IFACEMETHODIMP EnumFormatEtc(DWORD direction, IEnumFORMATETC** enumerator) override;
     IFACEMETHODIMP DAdvise(FORMATETC*, DWORD, IAdviseSink*, DWORD*) override { return E_NOTIMPL; }
     IFACEMETHODIMP DUnadvise(DWORD) override { return E_NOTIMPL; }
-    IFACEMETHODIMP EnumDAdvise(IEnumSTATDATA**) override { return E_NOTIMPL; }
+    // Not supported; the out-pointer comes back null, as COM asks of every failure.
+    IFACEMETHODIMP EnumDAdvise(IEnumSTATDATA** enumerator) override;
 
     // IDropSource
     IFACEMETHODIMP QueryContinueDrag(BOOL escapePressed, DWORD keyState) override;

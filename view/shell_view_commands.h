@@ -6,9 +6,11 @@
 #include <shlobj.h>
 #include <wrl/client.h>
 
+#include <optional>
 #include <vector>
 
 #include "namespace/pidl_manager.h"
+#include "stations/portable/pasted_stations.h"
 #include "support/unique_resource.h"
 #include "view/shell_view_folder.h"
 #include "view/shell_view_list.h"
@@ -52,6 +54,9 @@ private:
     void EditSelectedStations();
     void CopySelection();
     void PasteStations();
+    // Stores the block's stations under their pasted names on a worker, answering messages
+    // meanwhile; a refusal (nothing stored) comes back for the caller to show.
+    [[nodiscard]] std::optional<PasteRefused> PasteParsedStations(std::vector<Station> stations);
     void SetViewMode(UINT mode);
     // Shows the stored stations in this view and in every view of the same kind.
     void ChangedStations();
@@ -75,4 +80,6 @@ private:
     // dispatch that same message, the list must not turn it into a command again.
     WPARAM translatedKey_ = 0;
     LONG translatedKeyTime_ = 0;
+    // A paste is storing its stations: commands sent meanwhile from elsewhere are not run.
+    bool pasting_ = false;
 };

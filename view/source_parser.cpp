@@ -76,6 +76,18 @@ PCUITEMID_CHILD ChildListOf(const std::vector<uint8_t>& bytes) noexcept {
     return reinterpret_cast<PCUITEMID_CHILD>(bytes.data());
 }
 
+// Counts the nested parses of one drop, also when one ends in an exception.
+class NestingGuard {
+public:
+    explicit NestingGuard(int& nesting) noexcept : nesting_(nesting) { ++nesting_; }
+    NestingGuard(const NestingGuard&) = delete;
+    NestingGuard& operator=(const NestingGuard&) = delete;
+    ~NestingGuard() { --nesting_; }
+
+private:
+    int& nesting_;
+};
+
 }  // namespace
 
 TSourceParser::TSourceParser(bool recurse) noexcept
@@ -92,8 +104,31 @@ void TSourceParser::Add(const std::wstring& rootPath, const std::wstring& path, 
     ++fileCount_;
 }
 
+bool TSourceParser::Filtered(const std::wstring& path) const noexcept {
+    for (const std::wstring& pattern : filter_) {
+        if (::PathMatchSpecW(path.c_str(), pattern.c_str()))
+            return true;
+    }
+    return false;
+}
+
 HRESULT TSourceParser::ParseDataObject(IDataObject* dataObject, const std::wstring& rootPath,
                                        bool deep) {
+    const bool outermost = parseNesting_ == 0;
+    if (outermost)
+        bounds_.BeginDrop();
+    HRESULT result = S_OK;
+    {
+        NestingGuard nesting(parseNesting_);
+        result = ParseSources(dataObject, rootPath, deep);
+    }
+    if (outermost)
+        bounds_.EndDrop();
+    return result;
+}
+
+HRESULT TSourceParser::ParseSources(IDataObject* dataObject, const std::wstring& rootPath,
+                                    bool deep) {
     cancelled_ = false;
     if (!dataObject) {
         ReportError(kSource, E_INVALIDARG, L"TSourceParser::ParseDataObject", kNullDataObjectLine);
@@ -151,7 +186,7 @@ HRESULT TSourceParser::ParseDropFiles(IDataObject* dataObject, const FORMATETC& 
         ReadDropFilePaths(static_cast<const uint8_t*>(lock.data()), lock.size(), WidenAnsi);
     CombinedResult result;
     for (const WideString& path : paths) {
-        if (cancelled_)
+        if (cancelled_ || bounds_.Stopped())
             break;
         result.Add(ParsePath(path, path));
     }
@@ -195,7 +230,7 @@ HRESULT TSourceParser::ParseItemArray(IDataObject* dataObject, const FORMATETC& 
     }
     CombinedResult result;
     for (const IdListArrayChild& child : array.children) {
-        if (cancelled_)
+        if (cancelled_ || bounds_.Stopped())
             break;
         result.Add(ParsePIDL(parent, ChildListOf(child.list)));
     }
@@ -213,7 +248,7 @@ HRESULT TSourceParser::ParsePIDL(PCIDLIST_ABSOLUTE parent, PCUITEMID_CHILD child
                      : desktop->BindToObject(parent, nullptr, IID_PPV_ARGS(&folder));
     }
     if (FAILED(result)) {
-        ReportError(kSource, result, L"TSourceParser::ParsePIDL", __LINE__);
+        bounds_.Report(result, L"TSourceParser::ParsePIDL", __LINE__);
         return result;
     }
     UniqueAbsoluteIdList item(::ILCombine(parent, child));
@@ -231,23 +266,28 @@ HRESULT TSourceParser::ParsePIDL(PCIDLIST_ABSOLUTE parent, PCUITEMID_CHILD child
     result = folder->GetUIObjectOf(nullptr, 1, &child, IID_IDataObject, nullptr,
                                    reinterpret_cast<void**>(itemData.GetAddressOf()));
     if (FAILED(result)) {
-        ReportError(kSource, result, L"TSourceParser::ParsePIDL", __LINE__);
+        bounds_.Report(result, L"TSourceParser::ParsePIDL", __LINE__);
         return result;
     }
     return ParseDataObject(itemData.Get(), DirectoryPart(itemName), false);
 }
 
 HRESULT TSourceParser::ParsePath(const std::wstring& path, const std::wstring& rootPath) {
-    for (const std::wstring& pattern : filter_) {
-        if (::PathMatchSpecW(path.c_str(), pattern.c_str()))
-            return S_OK;
-    }
+    if (Filtered(path))
+        return S_OK;
+    if (!bounds_.VisitEntry(path))
+        return S_FALSE;
     const DWORD attributes = ::GetFileAttributesW(path.c_str());
     if (attributes == INVALID_FILE_ATTRIBUTES) {
         const HRESULT result = LastErrorResult();
-        ReportError(kSource, result, L"TSourceParser::ParsePath", __LINE__, path.c_str());
+        bounds_.Report(result, L"TSourceParser::ParsePath", __LINE__, path.c_str());
         return result;
     }
+    return ParseEntry(path, rootPath, attributes);
+}
+
+HRESULT TSourceParser::ParseEntry(const std::wstring& path, const std::wstring& rootPath,
+                                  DWORD attributes) {
     if (attributes & FILE_ATTRIBUTE_DIRECTORY)
         return ParseFolder(path, rootPath);
     if (::CompareStringOrdinal(::PathFindExtensionW(path.c_str()), -1, L".LNK", -1, TRUE) ==
@@ -300,11 +340,11 @@ HRESULT TSourceParser::ParseShortcut(const std::wstring& path, bool& parsed) {
 }
 
 HRESULT TSourceParser::ParseFolder(const std::wstring& path, const std::wstring& rootPath) {
-    // A folder reached again (through a shortcut to itself or a parent) or too deep is not
-    // walked again: the walk must end.
-    std::wstring key(path);
-    ::CharUpperBuffW(key.data(), static_cast<DWORD>(key.size()));
-    if (depth_ >= kMaximumSourceDepth || !walkedFolders_.insert(key).second)
+    // A folder reached again (through a shortcut or a link to itself or a parent) or too deep is
+    // not walked again: the walk must end. Folders are told apart by their identity, not by the
+    // path that reached them: two links back to a folder give each nesting level new path texts,
+    // and a walk that compared texts grew exponentially until the depth limit (a frozen drop).
+    if (depth_ >= kMaximumSourceDepth || !bounds_.FirstVisitOfFolder(path))
         return S_OK;
     ++folderCount_;
     WIN32_FIND_DATAW found{};
@@ -318,10 +358,21 @@ HRESULT TSourceParser::ParseFolder(const std::wstring& path, const std::wstring&
         const std::wstring name = found.cFileName;
         if (name == L"." || name == L"..")
             continue;
+        const std::wstring entry = path + L"\\" + name;
+        if (!bounds_.VisitEntry(entry))
+            break;
         if ((found.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) && !recurse_)
             continue;
-        result.Add(ParsePath(path + L"\\" + name, rootPath));
-    } while (!cancelled_ && ::FindNextFileW(search.get(), &found));
+        // Links and junctions met inside a folder are not followed (a dropped one, or a
+        // shortcut's target, is): they lead anywhere, the folder itself included. Wine reports
+        // its links with the attribute but no reparse tag, so the attribute decides.
+        if ((found.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) &&
+            (found.dwFileAttributes & FILE_ATTRIBUTE_REPARSE_POINT))
+            continue;
+        if (Filtered(entry))
+            continue;
+        result.Add(ParseEntry(entry, rootPath, found.dwFileAttributes));
+    } while (!cancelled_ && !bounds_.Stopped() && ::FindNextFileW(search.get(), &found));
     --depth_;
     return result.Value();
 }

@@ -10,9 +10,10 @@
 
 #include <cstdint>
 #include <memory>
-#include <set>
 #include <string>
 #include <vector>
+
+#include "view/source_walk_bounds.h"
 
 struct TSourceDescriptor {
     std::wstring rootPath;  // where the source was found
@@ -34,6 +35,7 @@ public:
 
     // Appends the data object's sources. rootPath empty: found from the object's item IDs when it
     // offers them; deep false stops at virtual items (their own data objects are not opened).
+    // Each outermost call is one drop, with its own entry and time limits and log allowance.
     [[nodiscard]] HRESULT ParseDataObject(IDataObject* dataObject, const std::wstring& rootPath,
                                           bool deep);
     // The first parsed data object, for use on another thread: once. S_FALSE before any parse.
@@ -51,15 +53,24 @@ public:
     uint32_t FolderCount() const noexcept { return folderCount_; }
     void Cancel() noexcept { cancelled_ = true; }
     bool Cancelled() const noexcept { return cancelled_; }
+    // Entries visited in the current (or last) drop, and whether a limit stopped it.
+    uint32_t EntriesVisited() const noexcept { return bounds_.EntriesVisited(); }
+    bool WalkStopped() const noexcept { return bounds_.Stopped(); }
 
 private:
+    [[nodiscard]] HRESULT ParseSources(IDataObject* dataObject, const std::wstring& rootPath,
+                                       bool deep);
     [[nodiscard]] HRESULT ParseDropFiles(IDataObject* dataObject, const FORMATETC& format);
     [[nodiscard]] HRESULT ParseFileGroup(IDataObject* dataObject, const FORMATETC& format,
                                          bool wide, const std::wstring& rootPath);
     [[nodiscard]] HRESULT ParseItemArray(IDataObject* dataObject, const FORMATETC& format,
                                          bool rootOnly, std::wstring& rootPath);
+    // A path whose attributes are known (read, or found by the folder's enumeration).
+    [[nodiscard]] HRESULT ParseEntry(const std::wstring& path, const std::wstring& rootPath,
+                                     DWORD attributes);
     [[nodiscard]] HRESULT ParseShortcut(const std::wstring& path, bool& parsed);
     [[nodiscard]] HRESULT ParseFolder(const std::wstring& path, const std::wstring& rootPath);
+    [[nodiscard]] bool Filtered(const std::wstring& path) const noexcept;
     void Add(const std::wstring& rootPath, const std::wstring& path, uint32_t index);
 
     std::shared_ptr<TSourceList> sources_;
@@ -70,10 +81,13 @@ private:
     Microsoft::WRL::ComPtr<IStream> marshalled_;
     bool marshalledOnce_ = false;
     bool cancelled_ = false;
-    // Shortcuts can point back up the tree: each folder is walked once per parser, and nesting
-    // stops at a fixed depth.
-    std::set<std::wstring> walkedFolders_;
+    // Links and shortcuts can point back up the tree: each folder is walked once per parser,
+    // known by its identity, nesting stops at a fixed depth, and a drop visits a bounded number
+    // of entries in a bounded time.
+    SourceWalkBounds bounds_;
     int depth_ = 0;
+    // One drop: the outermost ParseDataObject and the parses nested in it.
+    int parseNesting_ = 0;
 };
 
 // Folders and shortcuts nest at most this deep below a dropped source.

@@ -19,11 +19,19 @@ constexpr ULONG kCopyPieceBytes = 64 * 1024;
 }  // namespace
 
 CStream2::~CStream2() {
-    file_.reset();
     // A reader that lets go before the end (a cancelled copy, a failed write) will never read
     // the rest: the temporary download goes now rather than stay in the user's temporary folder.
-    if (deleteWhenFinished_ && state_ != kFinished && !path_.empty())
-        (void)::DeleteFileW(path_.c_str());  // nothing to tell anyone from a destructor
+    if (state_ != kFinished)
+        Discard();
+}
+
+void CStream2::Discard() noexcept {
+    file_.reset();
+    if (download_)
+        download_.Remove();  // its files, then its reservation
+    else if (deleteWhenFinished_ && !path_.empty())
+        (void)::DeleteFileW(path_.c_str());  // nothing to tell anyone when it fails
+    deleteWhenFinished_ = false;
 }
 
 HRESULT CStream2::Bind(const std::wstring& path, bool deleteWhenFinished) {
@@ -39,6 +47,25 @@ HRESULT CStream2::Bind(const std::wstring& path, bool deleteWhenFinished) {
     return S_OK;
 }
 
+HRESULT CStream2::Bind(DownloadTarget target) {
+    std::lock_guard<std::mutex> guard(lock_);
+    RETURN_HR_IF(E_INVALIDARG, !target);
+    try {
+        path_ = target.WrittenFile();
+    }
+    CATCH_RETURN()
+    download_ = std::move(target);
+    deleteWhenFinished_ = true;
+    // Held from the download's end to the stream's: the size announced and the bytes read are
+    // those of the file the download wrote, which nobody can write, rename or delete meanwhile.
+    const HRESULT opened = download_.OpenForReading(file_, size_);
+    if (FAILED(opened))
+        return opened;
+    position_ = 0;
+    state_ = kReading;
+    return S_OK;
+}
+
 IFACEMETHODIMP CStream2::QueryInterface(REFIID iid, void** object) {
     static const QITAB table[] = {
         QITABENT(CStream2, IStream), QITABENT(CStream2, ISequentialStream), {}};
@@ -47,11 +74,9 @@ IFACEMETHODIMP CStream2::QueryInterface(REFIID iid, void** object) {
 
 void CStream2::Finish() noexcept {
     state_ = kFinished;
-    file_.reset();
     // The temporary download is gone once it has been read; a failed delete leaves it in the
     // user's temporary folder, which is not worth failing the copy for.
-    if (deleteWhenFinished_)
-        (void)::DeleteFileW(path_.c_str());
+    Discard();
 }
 
 HRESULT CStream2::ReadLocked(void* buffer, ULONG wanted, ULONG* got) {

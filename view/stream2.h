@@ -8,6 +8,7 @@
 #include <mutex>
 #include <string>
 
+#include "download/download_target.h"
 #include "support/com_object.h"
 #include "support/unique_resource.h"
 
@@ -23,6 +24,10 @@ public:
     // Opens the file and takes its size. Fails with the open's HRESULT when the file cannot be
     // read: a stream over a missing file would hand the caller an empty file as a good one.
     [[nodiscard]] HRESULT Bind(const std::wstring& path, bool deleteWhenFinished);
+    // Takes a download's target over: reads what the download wrote, and removes the target (its
+    // files and its reservation) once, when read to the end or when the stream goes. Fails with
+    // the open's HRESULT, the target then removed when the stream goes.
+    [[nodiscard]] HRESULT Bind(DownloadTarget target);
 
     IFACEMETHODIMP QueryInterface(REFIID iid, void** object) override;
 
@@ -54,6 +59,8 @@ private:
     [[nodiscard]] HRESULT ReadLocked(void* buffer, ULONG wanted, ULONG* got);
     // Closes the file and, when asked at binding, deletes it; the state ends finished.
     void Finish() noexcept;
+    // Closes the file and deletes what the stream was asked to delete, once.
+    void Discard() noexcept;
 
     std::mutex lock_;  // the caller may share the stream between threads
     std::wstring path_;
@@ -62,4 +69,5 @@ private:
     State state_ = kNotOpened;
     UniqueFileHandle file_;
     bool deleteWhenFinished_ = false;
+    DownloadTarget download_;  // when bound to a download: what goes at the end
 };

@@ -12,6 +12,7 @@ enum class DriverText {
     InterruptedByUser,     // "The communication's process is interrupted by the user"
     BlockImportFailed,     // "AZ doesn't respond or error in importing block"
     InputFileBccMismatch,  // format with three %d: block, value in the block, computed value
+    SizeLimitReached,      // format with one %d: the cap in MiB
     YModemFileInfo,        // format with two %s: file name, size text
 };
 

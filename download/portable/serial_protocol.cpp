@@ -136,6 +136,7 @@ uint32_t SerialProtocol::ReceiveLines() {
     bool finished = false;
     uint32_t acceptedLines = 0;
     uint32_t refusedHeaderLines = 0;
+    acceptedBytes_ = 0;
 
     for (;;) {
         // Whatever followed the last line's CR LF is stale: the instrument waits for our reply.
@@ -178,6 +179,11 @@ uint32_t SerialProtocol::ReceiveLines() {
         } else if (!PassesLineCheck(line.data(), line.size())) {
             SendBytes(kNakLine, sizeof kNakLine);  // the instrument sends the line again
             continue;
+        }
+        // Every accepted line counts towards the cap, a repeated one too.
+        if (!AcceptWithinCap(lineEnd)) {
+            (void)file_.Close();  // the cap's message is the one the user sees
+            return 1;
         }
         // A line repeated because our ACK was lost is acknowledged again but written once. The
         // line goes into the file before the instrument hears that it arrived: a line the disk

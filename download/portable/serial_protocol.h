@@ -11,6 +11,12 @@
 #include "download/portable/parser_callback.h"
 #include "download/portable/protocol_io.h"
 
+// The most data one receive takes before it ends with a failure. The largest memories of the
+// instruments hold a few MiB of records; 64 MiB is far above any of them and still a harmless
+// temporary file. Without a cap an instrument (or a loop in its firmware) that never sends the
+// end would fill the disk. Even at 115200 baud the cap is hours of blocks away.
+constexpr uint64_t kMaxReceiveBytes = uint64_t{64} << 20;
+
 // Runs on one thread; only RequestStop may be called from others. Results: 0 success, 1 failure.
 class SerialProtocol {
 public:
@@ -26,6 +32,8 @@ public:
     bool IsPortOpen() const noexcept { return portOpen_; }
     bool IsFileOpened() const noexcept { return fileOpened_; }
     void RequestStop() noexcept { stopRequest_ = true; }
+    // The most data one receive takes: kMaxReceiveBytes, unless a test needs a nearer cap.
+    void SetReceiveCap(uint64_t bytes) noexcept { receiveCap_ = bytes; }
     uint32_t FileSize() const noexcept { return fileSize_; }
     const std::string& YModemFileName() const noexcept { return yModemFileName_; }
     // The system's code of the write that ended the last receive; 0 when every write succeeded.
@@ -52,8 +60,13 @@ private:
     // The 60-second wait and the user's cancel (which closes the port); false ends the receive.
     bool CheckTimeoutAndCancel(int64_t lastProgress);
     // Reads one burst into the receive buffer (after firstByte when >= 0), validates and writes
-    // its data as the selector says; returns the validation result.
+    // its data as the selector says; returns the validation result. A cancel seen on the burst,
+    // the size cap or a refused write end the receive (ReceiveEnded) with nothing written.
     uint8_t ReceiveBlock(int firstByte);
+    [[nodiscard]] bool ReceiveEnded() const noexcept { return receiveEnded_ || fileError_ != 0; }
+    // Counts data accepted by this receive; false, with the message, once it would pass the cap.
+    [[nodiscard]] bool AcceptWithinCap(size_t count);
+    void EndAtSizeLimit();
     // Reads one burst without writing; returns the count.
     size_t ReadBurst(int firstByte);
     bool CancelSeen();
@@ -86,6 +99,9 @@ private:
     uint32_t bytesWritten_ = 0;
     bool fileOpened_ = false;
     uint32_t fileError_ = 0;
+    bool receiveEnded_ = false;
+    uint64_t acceptedBytes_ = 0;
+    uint64_t receiveCap_ = kMaxReceiveBytes;
     uint32_t lastBlockDigit_ = 9;
     std::array<uint8_t, kBlockCapacity + 1> receiveBuffer_{};
     CrcTable crcTable_{};

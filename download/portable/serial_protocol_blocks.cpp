@@ -29,10 +29,33 @@ size_t SerialProtocol::ReadBurst(int firstByte) {
     return receiveCount_;
 }
 
-// A refused write is seen by the procedures through fileError_ right after this returns, before
-// they answer the block.
+void SerialProtocol::EndAtSizeLimit() {
+    receiveEnded_ = true;
+    const WideString mebibytes = DecimalText(static_cast<long long>(receiveCap_ >> 20));
+    Report(kMessageError, FormatDriverText(texts_.Text(DriverText::SizeLimitReached), {mebibytes}));
+}
+
+bool SerialProtocol::AcceptWithinCap(size_t count) {
+    if (acceptedBytes_ + count > receiveCap_) {
+        EndAtSizeLimit();
+        return false;
+    }
+    acceptedBytes_ += count;
+    return true;
+}
+
+// The procedures see a cancel, the cap or a refused write through ReceiveEnded right after this
+// returns, before they answer the block: what ended the receive is neither written nor answered.
 uint8_t SerialProtocol::ReceiveBlock(int firstByte) {
     ReadBurst(firstByte);
+    // Looked at on every burst, good or bad: an instrument that never stops sending good blocks
+    // is still stopped by the user.
+    if (stopRequest_ || callback_.IsCancelled()) {
+        receiveEnded_ = true;
+        Report(kMessageError, texts_.Text(DriverText::InterruptedByUser));
+        ClosePort();
+        return kNak;
+    }
     const uint8_t* data = receiveBuffer_.data();
     size_t dataSize = receiveCount_;
     if (selector_ == 2) {
@@ -44,21 +67,23 @@ uint8_t SerialProtocol::ReceiveBlock(int firstByte) {
     }
     uint8_t result = ValidateBlock(receiveBuffer_.data(), receiveCount_, crcTable_, receivedCheck_);
 
+    // Every accepted block counts towards the cap, also one that writes nothing (a Y-Modem block
+    // past the announced size, a BCC block repeated): an instrument that repeats forever ends too.
     if (selector_ == 2) {
-        if (result == kAck) {
+        if (result == kAck && AcceptWithinCap(kBlockDataSize)) {
             const uint32_t left = fileSize_ > bytesWritten_ ? fileSize_ - bytesWritten_ : 0;
             (void)WriteOutput(data, std::min<uint32_t>(left, kBlockDataSize));
             bytesWritten_ += kBlockDataSize;
         }
     } else if (selector_ == 1) {
-        if (result != kNak && result != kEot) {
+        if (result != kNak && result != kEot && AcceptWithinCap(dataSize)) {
             // A block sent again because our reply was lost carries the same digit.
             const uint32_t digit = receiveBuffer_[129];
             if (digit != lastBlockDigit_)
                 (void)WriteOutput(data, dataSize);
             lastBlockDigit_ = digit;
         }
-    } else {
+    } else if (AcceptWithinCap(dataSize)) {
         (void)WriteOutput(data, dataSize);
         if (std::memchr(data, kEot, dataSize) != nullptr)
             result = kEot;
@@ -72,6 +97,8 @@ uint32_t SerialProtocol::Receive() {
     port_.Purge(true, true);
     if (!CreateOutputFile())
         return 1;
+    receiveEnded_ = false;
+    acceptedBytes_ = 0;
     uint32_t result = 1;
     switch (selector_) {
         case 1:
@@ -103,7 +130,7 @@ uint32_t SerialProtocol::ReceiveRawStream() {
         counter = std::min(counter + 1, 10u);
         callback_.SetProgress(100, counter * 10);
         const uint8_t result = ReceiveBlock(first);
-        if (fileError_ != 0)
+        if (ReceiveEnded())
             return 1;
         lastProgress = clock_.WallSeconds();
         if (result == kEot)
@@ -120,7 +147,7 @@ uint32_t SerialProtocol::ReceiveBccBlocks() {
     uint32_t enqSent = clock_.TickMilliseconds();
     uint8_t result = ReceiveBlock(-1);
     while (result == kNak) {
-        if (!CheckTimeoutAndCancel(start) || stopRequest_)
+        if (ReceiveEnded() || !CheckTimeoutAndCancel(start) || stopRequest_)
             return 1;
         if (clock_.TickMilliseconds() - enqSent > kEnqRepollMilliseconds) {
             port_.Purge(true, true);
@@ -129,7 +156,7 @@ uint32_t SerialProtocol::ReceiveBccBlocks() {
         }
         result = ReceiveBlock(-1);
     }
-    if (fileError_ != 0)
+    if (ReceiveEnded())
         return 1;
 
     uint8_t reply = kAck;
@@ -140,17 +167,12 @@ uint32_t SerialProtocol::ReceiveBccBlocks() {
         for (int tries = 1;; ++tries) {
             SendByteWithLineEnd(reply);
             reply = MapBccReply(ReceiveBlock(-1));
-            if (fileError_ != 0)
+            if (ReceiveEnded())
                 return 1;
             if (reply != kNak)
                 break;
             if (tries == kBccTries) {
                 Report(kMessageError, texts_.Text(DriverText::BlockImportFailed));
-                return 1;
-            }
-            if (stopRequest_ || callback_.IsCancelled()) {
-                Report(kMessageError, texts_.Text(DriverText::InterruptedByUser));
-                ClosePort();
                 return 1;
             }
         }
@@ -191,6 +213,11 @@ uint32_t SerialProtocol::ReceiveYModem() {
     Report(kMessageInformation,
            FormatDriverText(texts_.Text(DriverText::YModemFileInfo),
                             {WidenBytes(header.Name.data(), header.Name.size()), sizeText}));
+    // A file announced larger than the cap could never be received: its header is not accepted.
+    if (header.Size > receiveCap_) {
+        EndAtSizeLimit();
+        return 1;
+    }
 
     const uint8_t acceptHeader[] = {kAck, kCrcRequest};
     SendBytes(acceptHeader, sizeof acceptHeader);
@@ -198,7 +225,7 @@ uint32_t SerialProtocol::ReceiveYModem() {
     int naksInARow = 0;
     for (;;) {
         const uint8_t result = ReceiveBlock(-1);
-        if (fileError_ != 0)
+        if (ReceiveEnded())
             return 1;
         if (result == kNak) {
             SendBytes(&result, 1);
@@ -209,11 +236,6 @@ uint32_t SerialProtocol::ReceiveYModem() {
             continue;
         }
         naksInARow = 0;
-        if (stopRequest_ || callback_.IsCancelled()) {
-            Report(kMessageError, texts_.Text(DriverText::InterruptedByUser));
-            ClosePort();
-            return 1;
-        }
         const uint64_t written = file_.Position();
         const uint64_t lastByte = fileSize_ > 0 ? fileSize_ - 1 : 0;
         callback_.SetProgress(fileSize_, static_cast<uint32_t>(std::min(lastByte, written)));

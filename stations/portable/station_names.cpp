@@ -40,3 +40,18 @@ WideString MakePastedName(const WideString& name, const WideString& copyPrefix,
 bool IsValidStationName(WideStringView name) noexcept {
     return !name.empty() && name.find_first_of(WIDE_TEXT("\\/\"*")) == WideStringView::npos;
 }
+
+StationNameProblem CheckStationName(WideStringView name) noexcept {
+    if (name.empty())
+        return StationNameProblem::kEmpty;
+    if (name.size() > kMaximumStationNameLength)
+        return StationNameProblem::kTooLong;
+    if (!IsValidStationName(name))
+        return StationNameProblem::kForbiddenCharacter;
+    return StationNameProblem::kNone;
+}
+
+bool IsListableStationName(WideStringView name) noexcept {
+    return !name.empty() && name.size() <= kMaximumStationNameLength &&
+           name.find(WIDE_TEXT('\\')) == WideStringView::npos;
+}

@@ -227,3 +227,42 @@ TEST_F(DataObject, DropSourceEndsOnButtonRelease) {
     EXPECT_EQ(DRAGDROP_S_DROP, object->QueryContinueDrag(FALSE, 0));
     EXPECT_EQ(DRAGDROP_S_CANCEL, object->QueryContinueDrag(TRUE, MK_LBUTTON));
 }
+
+// What the object does not support still leaves its out-parameters as COM asks of a failure: a
+// caller that frees what it got back frees nothing of ours, and no garbage of its own.
+TEST_F(DataObject, UnsupportedOperationsHandBackNullOutParameters) {
+    ComPtr<IDataObject> data = Over({kNorthFile});
+    auto* const poison = reinterpret_cast<IEnumSTATDATA*>(static_cast<uintptr_t>(0xBAADF00D));
+    IEnumSTATDATA* advises = poison;
+    EXPECT_EQ(E_NOTIMPL, data->EnumDAdvise(&advises));
+    EXPECT_EQ(nullptr, advises);
+    EXPECT_EQ(E_NOTIMPL, data->EnumDAdvise(nullptr));
+
+    // A request for a device: its target device must not come back as the canonical one's, which
+    // the caller would free a second time.
+    auto* device = static_cast<DVTARGETDEVICE*>(::CoTaskMemAlloc(sizeof(DVTARGETDEVICE)));
+    ASSERT_NE(nullptr, device);
+    *device = {};
+    device->tdSize = sizeof(DVTARGETDEVICE);
+    FORMATETC requests[] = {
+        {RegisteredFormat(ClipboardFormat::FileContents), nullptr, DVASPECT_CONTENT, 0,
+         TYMED_ISTREAM},
+        {RegisteredFormat(ClipboardFormat::ShellIdList), device, DVASPECT_CONTENT, -1,
+         TYMED_HGLOBAL},
+    };
+    for (FORMATETC& request : requests) {
+        FORMATETC canonical;
+        memset(&canonical, 0xCD, sizeof canonical);
+        EXPECT_EQ(E_NOTIMPL, data->GetCanonicalFormatEtc(&request, &canonical));
+        EXPECT_EQ(nullptr, canonical.ptd);
+        EXPECT_EQ(request.cfFormat, canonical.cfFormat);
+        EXPECT_EQ(request.lindex, canonical.lindex);
+        EXPECT_EQ(request.tymed, canonical.tymed);
+    }
+    ::CoTaskMemFree(device);
+    FORMATETC canonical;
+    memset(&canonical, 0xCD, sizeof canonical);
+    EXPECT_EQ(E_NOTIMPL, data->GetCanonicalFormatEtc(nullptr, &canonical));
+    EXPECT_EQ(nullptr, canonical.ptd);
+    EXPECT_EQ(E_NOTIMPL, data->GetCanonicalFormatEtc(requests, nullptr));
+}

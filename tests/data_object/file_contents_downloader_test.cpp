@@ -20,13 +20,20 @@ namespace {
 // names; records what it was asked.
 class ScriptedDownloader final : public StationDownloader {
 public:
-    ScriptedDownloader(HRESULT result, std::optional<std::string> written)
-        : result_(result), written_(std::move(written)) {}
+    // refusesAtOnce: answers before it asks for its target, as a download that cannot run does.
+    ScriptedDownloader(HRESULT result, std::optional<std::string> written,
+                       bool refusesAtOnce = false)
+        : result_(result), written_(std::move(written)), refusesAtOnce_(refusesAtOnce) {}
 
-    HRESULT Download(HWND, const Station& station, const std::wstring& target,
+    HRESULT Download(HWND, const Station& station, const PrepareTargetFunction& prepareTarget,
                      std::wstring& file) override {
         ++runs;
         stationName = station.Name;
+        if (refusesAtOnce_)
+            return result_;
+        std::wstring target;
+        if (const HRESULT prepared = prepareTarget(target); FAILED(prepared))
+            return prepared;
         file = target + L".part";
         writtenPath = file;
         if (written_) {
@@ -46,6 +53,7 @@ public:
 private:
     const HRESULT result_;
     const std::optional<std::string> written_;
+    const bool refusesAtOnce_;
 };
 
 class FileContentsDownloader : public DataObject {};
@@ -57,6 +65,7 @@ TEST_F(FileContentsDownloader, OnlyAReportedCompleteFileBecomesAStreamAndNothing
         HRESULT download;                    // what the downloader answers
         std::optional<std::string> written;  // what it left in the file
         HRESULT expected;                    // what GetData answers
+        bool refusesAtOnce = false;          // it answers before it asks for its target
     } const cases[] = {
         {"complete", S_OK, kContent, S_OK},
         {"cancelled half way", S_FALSE, partial, S_FALSE},
@@ -66,6 +75,8 @@ TEST_F(FileContentsDownloader, OnlyAReportedCompleteFileBecomesAStreamAndNothing
         {"found incomplete after the transfer", HRESULT_FROM_WIN32(ERROR_INVALID_DATA),
          std::string(), HRESULT_FROM_WIN32(ERROR_INVALID_DATA)},
         {"unable to run", E_FAIL, std::nullopt, E_FAIL},
+        {"refused before its target", HRESULT_FROM_WIN32(ERROR_BUSY), std::nullopt,
+         HRESULT_FROM_WIN32(ERROR_BUSY), true},
         // A success with no file behind it is no download: nothing to open, no stream.
         {"complete without a file", S_OK, std::nullopt, HRESULT_FROM_WIN32(ERROR_FILE_NOT_FOUND)},
     };
@@ -74,7 +85,8 @@ TEST_F(FileContentsDownloader, OnlyAReportedCompleteFileBecomesAStreamAndNothing
         SCOPED_TRACE(test.what);
         ScriptedDialogs dialogs(IDOK);
         ScopedUserInterface scope(dialogs);
-        auto downloader = std::make_shared<ScriptedDownloader>(test.download, test.written);
+        auto downloader =
+            std::make_shared<ScriptedDownloader>(test.download, test.written, test.refusesAtOnce);
         UniqueStgMedium medium;
         EXPECT_EQ(test.expected, Get(Over({kNorthFile}, downloader).Get(), CFSTR_FILECONTENTS,
                                      TYMED_ISTREAM, medium, 0));

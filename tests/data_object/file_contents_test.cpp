@@ -10,6 +10,8 @@
 
 #include "download/halvek_download_progress_dialog.h"
 #include "download/progress_dialog_base.h"
+#include "download/win32_serial_port.h"
+#include "support/module_instance.h"
 #include "support/registered_messages.h"
 #include "tests/data_object/data_object_fixture.h"
 
@@ -48,12 +50,21 @@ private:
         // The external library writes under the given name with ".txt" added.
         const bool external = dynamic_cast<CHalvekDownloadProgressDialog*>(dialog_) != nullptr;
         writtenPath = dialog_->OutputPath() + (external ? L".txt" : L"");
-        UniqueFileHandle file(::CreateFileW(writtenPath.c_str(), GENERIC_WRITE, 0, nullptr,
-                                            CREATE_ALWAYS, 0, nullptr));
-        DWORD written = 0;
-        EXPECT_TRUE(::WriteFile(file.get(), content_.data(), static_cast<DWORD>(content_.size()),
-                                &written, nullptr));
-        file.reset();
+        if (external) {
+            UniqueFileHandle file(::CreateFileW(writtenPath.c_str(), GENERIC_WRITE, 0, nullptr,
+                                                CREATE_ALWAYS, 0, nullptr));
+            DWORD written = 0;
+            EXPECT_TRUE(::WriteFile(file.get(), content_.data(),
+                                    static_cast<DWORD>(content_.size()), &written, nullptr));
+        } else {
+            // The serial driver's own output file, into the target that the data object holds.
+            Win32ReceiveFile file(writtenPath);
+            EXPECT_EQ(static_cast<uint32_t>(ERROR_SUCCESS), file.Create());
+            EXPECT_EQ(
+                static_cast<uint32_t>(ERROR_SUCCESS),
+                file.Write(reinterpret_cast<const uint8_t*>(content_.data()), content_.size()));
+            EXPECT_EQ(static_cast<uint32_t>(ERROR_SUCCESS), file.Close());
+        }
         if (!completes_) {
             ::PostMessageW(window, WM_COMMAND, IDOK, 0);
             ::PostMessageW(window, WM_COMMAND, IDCANCEL, 0);
@@ -130,36 +141,92 @@ TEST_F(FileContents, ADialogThatCannotRunIsAFailureAndCancelIsNoFile) {
     EXPECT_EQ(before, TemporaryDownloads());
 }
 
-TEST_F(FileContents, TemporaryFolderFailuresAreFailureResultsAndRunNoDialog) {
-    wchar_t saved[MAX_PATH] = {};
-    ASSERT_NE(0u, ::GetEnvironmentVariableW(L"TMP", saved, MAX_PATH));
-    const std::pair<std::wstring, HRESULT> cases[] = {
-        // Longer than the 130 characters the temporary path may have.
-        {L"C:\\" + std::wstring(140, L'x'), HRESULT_FROM_WIN32(ERROR_BUFFER_OVERFLOW)},
-        {L"C:\\no such folder for downloads", 0},  // 0: any failure
+namespace {
+
+// Points the process's temporary folder (TMP, which GetTempPathW reads first) elsewhere for a
+// test, and back.
+class TemporaryFolderOverride {
+public:
+    explicit TemporaryFolderOverride(const std::wstring& folder) {
+        saved_.resize(MAX_PATH);
+        saved_.resize(::GetEnvironmentVariableW(L"TMP", saved_.data(), MAX_PATH));
+        EXPECT_TRUE(::SetEnvironmentVariableW(L"TMP", folder.c_str()));
+    }
+    ~TemporaryFolderOverride() { ::SetEnvironmentVariableW(L"TMP", saved_.c_str()); }
+
+private:
+    std::wstring saved_;
+};
+
+// A real folder whose path has exactly `length` characters, in the temporary folder.
+std::wstring MakeFolderOfLength(size_t length) {
+    const std::wstring base = std::filesystem::temp_directory_path().wstring();
+    std::wstring folder = base + (base.back() == L'\\' ? L"" : L"\\");
+    folder += std::wstring(length - folder.size(), L'T');
+    std::filesystem::create_directories(folder);
+    return folder;
+}
+
+}  // namespace
+
+// A temporary folder of any length Windows gives takes the download: the whole file arrives.
+TEST_F(FileContents, ALongTemporaryFolderTakesTheWholeDownload) {
+    const std::wstring folder = MakeFolderOfLength(140);
+    ASSERT_EQ(140u, folder.size());
+    {
+        TemporaryFolderOverride temporary(folder);
+        for (const wchar_t* item : {kNorthFile, L"Quorvel Digital Level\\South\\file1.hvr"}) {
+            SCOPED_TRACE(testing::Message() << item);
+            PlayedDialogs dialogs(true);
+            ScopedUserInterface scope(dialogs);
+            UniqueStgMedium medium;
+            ASSERT_EQ(S_OK, DownloadFile(item, medium));
+            EXPECT_TRUE(dialogs.messages.empty());
+            EXPECT_EQ(0u, dialogs.writtenPath.rfind(folder + L"\\QRV", 0)) << dialogs.writtenPath;
+            EXPECT_EQ(kContent, ReadToEnd(medium.get().pstm));
+            EXPECT_FALSE(FileExists(dialogs.writtenPath));
+        }
+    }
+    EXPECT_TRUE(std::filesystem::is_empty(folder)) << "no file or reservation is left";
+    std::filesystem::remove(folder);
+}
+
+TEST_F(FileContents, TemporaryFolderFailuresAreFailureResultsNamedWithTheirReasonAndRunNoDialog) {
+    // With its backslash one character longer than GetTempFileNameW takes, and real: only the
+    // length is wrong.
+    const std::wstring tooLong = MakeFolderOfLength(MAX_PATH - 14);
+    const struct {
+        std::wstring folder;
+        HRESULT expected;  // 0: any failure
+    } cases[] = {
+        {tooLong, HRESULT_FROM_WIN32(ERROR_BUFFER_OVERFLOW)},
+        {L"C:\\no such folder for downloads", 0},
     };
-    for (const auto& [folder, expected] : cases) {
-        ASSERT_TRUE(::SetEnvironmentVariableW(L"TMP", folder.c_str()));
+    for (const auto& test : cases) {
+        TemporaryFolderOverride temporary(test.folder);
         ScriptedDialogs dialogs(IDOK);
         ScopedUserInterface scope(dialogs);
         UniqueStgMedium medium;
         const HRESULT result = DownloadFile(kNorthFile, medium);
         EXPECT_TRUE(FAILED(result))
             << std::hex << result << ": a bare Win32 code passes for success";
-        if (expected != 0) {
-            EXPECT_EQ(expected, result);
+        if (test.expected != 0) {
+            EXPECT_EQ(test.expected, result);
         }
         EXPECT_EQ(0, dialogs.runs);
         // The surveyor is told which folder and why, before any dialog asks for the instrument.
         ASSERT_EQ(1u, dialogs.messages.size());
-        EXPECT_EQ(0u, dialogs.messages[0].find(L"The download cannot be saved in the temporary "
-                                               L"folder "))
-            << dialogs.messages[0];
-        if (expected == 0) {
-            EXPECT_NE(std::wstring::npos, dialogs.messages[0].find(folder)) << dialogs.messages[0];
+        const std::wstring& message = dialogs.messages[0];
+        EXPECT_EQ(0u, message.find(L"The download cannot be saved in the temporary folder "))
+            << message;
+        EXPECT_NE(std::wstring::npos, message.find(test.folder)) << message;
+        if (test.expected != 0) {
+            const std::wstring reason = SystemMessageText(HRESULT_CODE(test.expected));
+            ASSERT_FALSE(reason.empty());
+            EXPECT_NE(std::wstring::npos, message.find(reason)) << message;
         }
     }
-    ASSERT_TRUE(::SetEnvironmentVariableW(L"TMP", saved));
+    std::filesystem::remove(tooLong);
 }
 
 // The external library's word is not taken for a file: one that is empty when the library

@@ -276,3 +276,78 @@ TEST(Stream2, TheFileIsDeletedExactlyOnce) {
         ::DeleteFileW(path.c_str());
     }
 }
+
+// A stream over a download's target removes the target's files and its reservation once,
+// whether it was read to its end, copied out, let go half way or never bound to a file at all;
+// a file that comes under the name afterwards is not the stream's.
+TEST(Stream2, ABoundDownloadGoesWithItsReservationOnceHoweverTheStreamEnds) {
+    enum class Ending { kReadToEnd, kCopiedOut, kLetGoHalfWay, kLetGoUnread, kNothingWritten };
+    const struct {
+        const char* what;
+        Ending ending;
+        const wchar_t* writtenBeside;  // what the download added to the name, if it wrote there
+    } cases[] = {
+        {"read to its end", Ending::kReadToEnd, nullptr},
+        {"the library's file read to its end", Ending::kReadToEnd, L".txt"},
+        {"copied out", Ending::kCopiedOut, nullptr},
+        {"let go half way", Ending::kLetGoHalfWay, nullptr},
+        {"the library's file let go unread", Ending::kLetGoUnread, L".txt"},
+        {"bound to a file the download never wrote", Ending::kNothingWritten, L".txt"},
+    };
+    for (const auto& test : cases) {
+        SCOPED_TRACE(test.what);
+        DownloadTarget target;
+        ASSERT_EQ(S_OK,
+                  DownloadTarget::Create(std::filesystem::temp_directory_path().wstring(), target));
+        const std::wstring path = target.Path();
+        const std::wstring reservation = target.Reservation();
+        const std::wstring written = path + (test.writtenBeside ? test.writtenBeside : L"");
+        ASSERT_EQ(S_OK, target.AddWrittenFile(written));
+        if (test.ending != Ending::kNothingWritten) {
+            // Shared with readers, as the driver writes: the target holds its file for reading.
+            UniqueFileHandle file(::CreateFileW(written.c_str(), GENERIC_WRITE, FILE_SHARE_READ,
+                                                nullptr, OPEN_ALWAYS, 0, nullptr));
+            DWORD count = 0;
+            ASSERT_TRUE(::WriteFile(file.get(), kContent, sizeof kContent - 1, &count, nullptr));
+        }
+        const bool finished =
+            test.ending == Ending::kReadToEnd || test.ending == Ending::kCopiedOut;
+        {
+            auto stream = MakeComObject<CStream2>();
+            const HRESULT bound = stream->Bind(std::move(target));
+            if (test.ending == Ending::kNothingWritten) {
+                EXPECT_EQ(HRESULT_FROM_WIN32(ERROR_FILE_NOT_FOUND), bound);
+            } else {
+                ASSERT_EQ(S_OK, bound);
+                EXPECT_TRUE(FileExists(reservation)) << "the name stays reserved while it is read";
+            }
+            if (test.ending == Ending::kReadToEnd) {
+                EXPECT_EQ(kContent, ReadToEnd(stream.Get()));
+            } else if (test.ending == Ending::kCopiedOut) {
+                Microsoft::WRL::ComPtr<IStream> copy;
+                ASSERT_EQ(S_OK, ::CreateStreamOnHGlobal(nullptr, TRUE, &copy));
+                ULARGE_INTEGER all;
+                all.QuadPart = UINT64_MAX;
+                ASSERT_EQ(S_OK, stream->CopyTo(copy.Get(), all, nullptr, nullptr));
+            } else if (test.ending == Ending::kLetGoHalfWay) {
+                char buffer[5];
+                ULONG got = 0;
+                ASSERT_EQ(S_OK, stream->Read(buffer, sizeof buffer, &got));
+                EXPECT_TRUE(FileExists(written));
+            }
+            if (finished) {
+                EXPECT_FALSE(FileExists(written));
+                EXPECT_FALSE(FileExists(path));
+                EXPECT_FALSE(FileExists(reservation));
+                std::ofstream(std::filesystem::path(path)) << "the next download";
+            }
+        }
+        EXPECT_FALSE(FileExists(reservation));
+        if (written != path) {
+            EXPECT_FALSE(FileExists(written));
+        }
+        EXPECT_EQ(finished, FileExists(path))
+            << (finished ? "deleted a second time" : "left behind");
+        ::DeleteFileW(path.c_str());
+    }
+}

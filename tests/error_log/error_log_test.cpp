@@ -6,8 +6,11 @@
 #include <shlobj.h>
 #include <wrl/client.h>
 
+#include <chrono>
 #include <filesystem>
 #include <fstream>
+#include <future>
+#include <iostream>
 #include <iterator>
 #include <regex>
 #include <set>
@@ -15,6 +18,7 @@
 #include <vector>
 
 #include "support/error_handling.h"
+#include "support/error_log.h"
 #include "support/module_instance.h"
 #include "support/unique_resource.h"
 
@@ -172,6 +176,179 @@ TEST_F(ErrorLog, PathIsInTheLocalApplicationDataFolderUnlessOverridden) {
     const UniqueCoTaskMem owner(localAppData);
     EXPECT_EQ(std::wstring(localAppData) + L"\\Quorvel\\Digital Levels\\LVShellExt.log",
               ErrorLogPath());
+}
+
+// A program of its own beside this one (tests/error_log/error_log_helper.cpp), started with the
+// arguments given; ends it when the test ends.
+class Helper {
+public:
+    explicit Helper(const std::wstring& arguments) {
+        wchar_t self[MAX_PATH] = {};
+        ::GetModuleFileNameW(nullptr, self, MAX_PATH);
+        std::wstring command = L"\"" +
+                               (fs::path(self).parent_path() / L"error_log_helper.exe").wstring() +
+                               L"\" " + arguments;
+        STARTUPINFOW startup{};
+        startup.cb = sizeof startup;
+        PROCESS_INFORMATION started{};
+        EXPECT_TRUE(::CreateProcessW(nullptr, command.data(), nullptr, nullptr, FALSE, 0, nullptr,
+                                     nullptr, &startup, &started))
+            << ::GetLastError();
+        process_.reset(started.hProcess);
+        UniqueHandle thread(started.hThread);
+    }
+    ~Helper() {
+        if (process_ && ::WaitForSingleObject(process_.get(), 0) == WAIT_TIMEOUT)
+            ::TerminateProcess(process_.get(), 1);
+    }
+    HANDLE process() const { return process_.get(); }
+    // Its exit code once it has ended within the watchdog's time; -1 otherwise.
+    int ExitCode() const {
+        DWORD code = 0;
+        if (::WaitForSingleObject(process_.get(), 20000) != WAIT_OBJECT_0 ||
+            !::GetExitCodeProcess(process_.get(), &code))
+            return -1;
+        return static_cast<int>(code);
+    }
+
+private:
+    UniqueHandle process_;
+};
+
+// A second process that holds the log's mutex until released (or ended).
+class MutexHolder {
+public:
+    MutexHolder()
+        : ready_(::CreateEventW(nullptr, TRUE, FALSE, ReadyName().c_str())),
+          release_(::CreateEventW(nullptr, TRUE, FALSE, ReleaseName().c_str())),
+          helper_(L"hold " + ReadyName() + L" " + ReleaseName()) {
+        const HANDLE either[] = {ready_.get(), helper_.process()};
+        holding_ = ::WaitForMultipleObjects(2, either, FALSE, 20000) == WAIT_OBJECT_0;
+    }
+    ~MutexHolder() { Release(); }
+    bool holding() const { return holding_; }
+    // Lets it go and waits for its end; true when it ended on its own.
+    bool Release() {
+        ::SetEvent(release_.get());
+        return helper_.ExitCode() == 0;
+    }
+    // Ends it while it holds the mutex, which is then abandoned.
+    void Kill() {
+        ::TerminateProcess(helper_.process(), 9);
+        ::WaitForSingleObject(helper_.process(), 20000);
+    }
+
+private:
+    static std::wstring ReadyName() {
+        return L"Local\\lv-error-log-test-ready-" + std::to_wstring(::GetCurrentProcessId());
+    }
+    static std::wstring ReleaseName() {
+        return L"Local\\lv-error-log-test-release-" + std::to_wstring(::GetCurrentProcessId());
+    }
+
+    UniqueHandle ready_, release_;
+    Helper helper_;
+    bool holding_ = false;
+};
+
+TEST_F(ErrorLog, WhileAnotherProcessHoldsTheLogEntriesAreDroppedAndCallersGoOn) {
+    {
+        MutexHolder holder;
+        ASSERT_TRUE(holder.holding());
+        // A drop of ten missing paths, logged on the caller's thread; the watchdog turns a frozen
+        // caller into a failure (each of the ten would otherwise wait for the holder).
+        std::packaged_task<void()> failures([] {
+            for (int number = 0; number < 10; ++number)
+                ReportError(L"Held", kOwnResult, L"Drop", number);
+        });
+        std::future<void> done = failures.get_future();
+        const auto started = std::chrono::steady_clock::now();
+        std::thread caller(std::move(failures));
+        const bool returned = done.wait_for(std::chrono::seconds(10)) == std::future_status::ready;
+        const auto elapsed = std::chrono::duration_cast<std::chrono::milliseconds>(
+            std::chrono::steady_clock::now() - started);
+        EXPECT_TRUE(returned) << "ten entries kept the caller waiting";
+        EXPECT_TRUE(holder.Release());
+        caller.join();
+        std::cout << "[ figure ] ten entries while the log was held: " << elapsed.count()
+                  << " ms\n";
+        EXPECT_FALSE(fs::exists(log_)) << "the entries are dropped, not written past the lock";
+    }
+    // Released: the next entry is written at once, and it is the only one.
+    ReportError(L"Held", kOwnResult, L"Drop", 99);
+    EXPECT_EQ(std::vector<Lines>{{L"Held - 0xA0041234 (Drop, 99)"}}, ReadEntries(log_));
+}
+
+TEST_F(ErrorLog, AMutexAbandonedByADeadProcessIsTakenOver) {
+    MutexHolder holder;
+    ASSERT_TRUE(holder.holding());
+    holder.Kill();
+    ReportError(L"Abandoned", kOwnResult, L"Drop", 1);
+    EXPECT_EQ(std::vector<Lines>{{L"Abandoned - 0xA0041234 (Drop, 1)"}}, ReadEntries(log_));
+}
+
+TEST_F(ErrorLog, AFullLogThatCannotBeMovedStopsGrowingAtTwiceTheLimit) {
+    constexpr DWORD kLimit = 600;  // three entries of about 180 bytes
+    SetErrorLogSizeLimit(kLimit);
+    ReportError(L"Source", kOwnResult, L"Function", 0);
+    // A reader that does not share delete: the file cannot be moved aside while it is open.
+    UniqueFileHandle reader(::CreateFileW(log_.c_str(), GENERIC_READ,
+                                          FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr,
+                                          OPEN_EXISTING, 0, nullptr));
+    ASSERT_TRUE(reader);
+    for (int number = 1; number < 40; ++number)
+        ReportError(L"Source", kOwnResult, L"Function", number);
+    EXPECT_FALSE(fs::exists(folder_ / L"LVShellExt.old.log")) << "the reader kept the file";
+    EXPECT_GT(fs::file_size(log_), kLimit);
+    EXPECT_LE(fs::file_size(log_), 2 * kLimit);
+    const std::vector<Lines> kept = ReadEntries(log_);  // whole entries, the oldest ones
+    ASSERT_GE(kept.size(), 4u);
+    for (size_t i = 0; i < kept.size(); ++i)
+        EXPECT_EQ(Lines{L"Source - 0xA0041234 (Function, " + std::to_wstring(i) + L")"}, kept[i]);
+
+    // The reader is gone: the next entry moves the full file aside and starts a new one.
+    reader.reset();
+    ReportError(L"Source", kOwnResult, L"Function", 40);
+    EXPECT_EQ(kept, ReadEntries(folder_ / L"LVShellExt.old.log"));
+    EXPECT_EQ(std::vector<Lines>{{L"Source - 0xA0041234 (Function, 40)"}}, ReadEntries(log_));
+}
+
+// The UTF-16 text of the variable's name, as a module holds it when it reads the variable.
+bool HoldsTheOverrideName(const fs::path& module) {
+    std::ifstream file(module, std::ios::binary);
+    const std::string bytes{std::istreambuf_iterator<char>(file), {}};
+    std::string name;
+    for (char c : std::string("LVSHELLEXT_LOG_DIR"))
+        name += {c, '\0'};
+    EXPECT_GT(bytes.size(), 4096u) << module;
+    return bytes.find(name) != std::string::npos;
+}
+
+TEST_F(ErrorLog, OnlyTestProgramsReadTheFolderOverride) {
+    // A program built as the DLL is, with the variable set (and inherited), logs where the user's
+    // own log is.
+    fs::create_directories(folder_);
+    const fs::path answer = folder_ / L"path.txt";
+    Helper helper(L"path \"" + answer.wstring() + L"\"");
+    ASSERT_EQ(0, helper.ExitCode());
+    std::ifstream file(answer, std::ios::binary);
+    const std::string bytes{std::istreambuf_iterator<char>(file), {}};
+    std::wstring path(bytes.size() / 2, L'\0');
+    memcpy(path.data(), bytes.data(), path.size() * 2);
+    PWSTR localAppData = nullptr;
+    ASSERT_EQ(S_OK, ::SHGetKnownFolderPath(FOLDERID_LocalAppData, 0, nullptr, &localAppData));
+    const UniqueCoTaskMem owner(localAppData);
+    EXPECT_EQ(std::wstring(localAppData) + L"\\Quorvel\\Digital Levels\\LVShellExt.log", path);
+
+    // The shipped DLL has no trace of the variable; this test program, which reads it, has.
+    const std::string host = LV_EXTENSION_DLL_PATH;
+    std::wstring dll = host.front() == '/' ? L"Z:" : L"";
+    for (char c : host)
+        dll.push_back(c == '/' ? L'\\' : static_cast<wchar_t>(c));
+    EXPECT_FALSE(HoldsTheOverrideName(dll));
+    wchar_t self[MAX_PATH] = {};
+    ::GetModuleFileNameW(nullptr, self, MAX_PATH);
+    EXPECT_TRUE(HoldsTheOverrideName(self));
 }
 
 }  // namespace

@@ -3,7 +3,8 @@
 
 First the signatures: every DLL and EXE in both packages (taken out with msiextract) and the
 packages themselves carry a valid SHA-256 Authenticode signature by the test certificate, the
-signed binaries still match their symbol files, and a binary with one byte changed fails.
+signed binaries still match their symbol files, and a binary with one byte changed fails. Then
+the folder lock that both packages carry (their MsiLockPermissionsEx rows, read with msiinfo).
 
 Then installs the x64 package silently, compares the registry it wrote with what regsvr32 writes
 for the same DLL at the same path (the REG_BINARY ShellFolder value included), checks the files and
@@ -11,8 +12,9 @@ the Start-menu shortcuts, lists the user's stations through the shell from the i
 upgrades to a newer package, refuses the older one back, uninstalls, and checks that every file,
 shortcut and key the package wrote is gone while the user's stations stay. The x86 package refuses
 this 64-bit Windows and installs nothing; a copy without that refusal shows its registration in
-the 32-bit view. Then an install to another folder (INSTALLDIR) with a verbose log, and last the
-x86 package's refusal as a user sees it (with /qb, on the virtual display).
+the 32-bit view. Then an install to another folder (INSTALLDIR) with a verbose log and its ACL
+as icacls shows it (where Wine shows it), and last the x86 package's refusal as a user sees it
+(with /qb, on the virtual display).
 
 Usage: package_test.py --make-certificate DIR
            writes a throwaway code-signing certificate: DIR/signing.pem, DIR/signing.pfx and
@@ -29,6 +31,8 @@ import shutil
 import subprocess
 import sys
 import zlib
+
+import folder_lock
 
 
 def make_certificate(folder):
@@ -328,6 +332,28 @@ check(problems and "MISMATCH" in output,
       "a copy of the signed x64 LVShellExt.dll with one byte changed fails the check "
       "(its digest no longer matches)", output[-1500:])
 
+# The folder lock: each package protects every folder it installs into, INSTALLDIR above all,
+# wherever an administrator puts it (a folder under a drive root inherits the root's write rights).
+for arch, package, install_folders in (("x64", old_x64, ["INSTALLDIR", "INSTALLDIR32"]),
+                                       ("x86", x86, ["INSTALLDIR"])):
+    problems, locks = folder_lock.lock_problems(package, install_folders)
+    check(locks and not problems,
+          f"the {arch} package locks {' and '.join(install_folders)} and every folder it installs "
+          "files into (MsiLockPermissionsEx through CreateFolder): protected, administrators and "
+          "SYSTEM full control, users read and execute", "\n".join(problems))
+# The check sees what a weaker lock would leave: the parent's ACEs, users' write rights, another
+# account, a name instead of a SID.
+weaker = {
+    "not protected": "D:AI(A;OICI;FA;;;SY)(A;OICI;FA;;;BA)(A;OICI;0x1200a9;;;BU)",
+    "users may modify": "D:PAI(A;OICI;FA;;;SY)(A;OICI;FA;;;BA)(A;OICI;0x1301bf;;;BU)",
+    "authenticated users too": "D:PAI(A;OICI;FA;;;SY)(A;OICI;FA;;;BA)(A;OICI;0x1200a9;;;BU)"
+                               "(A;OICI;FA;;;AU)",
+    "files not covered": "D:PAI(A;CI;FA;;;SY)(A;CI;FA;;;BA)(A;CI;0x1200a9;;;BU)",
+}
+passed = [name for name, sddl in weaker.items() if not folder_lock.sddl_problems(sddl)]
+check(not passed, "the lock check refuses an ACL that is " + ", ".join(weaker),
+      f"passed: {passed}")
+
 
 TYPELIB = r"hkey_local_machine\software\classes\typelib\{b8d31c5f-2a67-4e9b-a4f1-5c09d7e82b36}\1.0"
 CLSID = r"hkey_local_machine\software\classes\clsid\{7d3f2a61-4b8e-4c19-9a27-5e0c81b6d4f3}"
@@ -548,6 +574,19 @@ check(listing.returncode == 0 and STATION in listing.stdout,
 check_shortcuts(prefix, OTHER_FOLDER)
 check(OTHER_FOLDER + r"\LVShellExt.dll" in text_file(prefix.unix(r"C:\lv-install.log")),
       "the verbose log (/l*v) records the install, the DLL's path included")
+# Windows applies the lock when it creates the folder; icacls shows it. Wine gap: Wine's installer
+# does not read MsiLockPermissionsEx and its icacls is a stub that lists nothing, so under Wine the
+# ACL can only be confirmed on Windows (README); should a listing appear, it must show the lock.
+listing = prefix.wine("icacls", OTHER_FOLDER).stdout
+if listing.strip():
+    wanted = [r"BUILTIN\Administrators:(OI)(CI)(F)", r"NT AUTHORITY\SYSTEM:(OI)(CI)(F)",
+              r"BUILTIN\Users:(OI)(CI)(RX)"]
+    check(all(entry in listing for entry in wanted) and "(I)" not in listing,
+          f"icacls shows the lock on {OTHER_FOLDER}: " + ", ".join(wanted) + ", nothing inherited",
+          listing)
+else:
+    print(f"-- Wine gap: icacls lists no ACL for {OTHER_FOLDER} and Wine's installer does not "
+          "apply MsiLockPermissionsEx; the lock on the folder is confirmed only on Windows")
 # Windows takes the folder of an installed product from its components; Wine's msiexec resolves
 # it from the command line again, so the uninstall is given the same folder.
 code = prefix.msiexec("/x", msi(old_x64), "/qn", "INSTALLDIR=" + OTHER_FOLDER + "\\")

@@ -11,42 +11,14 @@
 
 #include "res/resource.h"
 #include "support/text_lookup.h"
-#include "tests/progress_dialogs/dialog_driver.h"
-
-namespace {
+#include "tests/progress_dialogs/halvek_fixture.h"
 
 namespace fs = std::filesystem;
 
-class HalvekDialog : public DialogTest {
-protected:
-    void SetUp() override {
-        DialogTest::SetUp();
-        ::SetEnvironmentVariableW(L"HALVEKCOMM_LOG", log_.c_str());
-        station_.Name = L"North benchmark";
-        station_.Port = L"COM12";
-        station_.Model = LoadUiText(IDS_MODEL_LV20);
-    }
-    void TearDown() override {
-        for (const wchar_t* name :
-             {L"HALVEKCOMM_LOG", L"HALVEKCOMM_RESULT", L"HALVEKCOMM_START_RESULT",
-              L"HALVEKCOMM_FAIL", L"HALVEKCOMM_DELAY_MS", L"HALVEKCOMM_CANCEL_DELAY_MS"})
-            ::SetEnvironmentVariableW(name, nullptr);
-        std::error_code ignored;
-        fs::remove(written_, ignored);
-        fs::remove(log_, ignored);
-    }
-
-    Station station_;
-    const fs::path output_ = TemporaryFile(L"halvek.hvr");
-    const fs::path written_ = output_.wstring() + L".txt";  // the library adds ".txt"
-    const fs::path log_ = TemporaryFile(L"halvek.log");
-};
-
-}  // namespace
-
 TEST_F(HalvekDialog, StartEndsWithOkAndTheLibraryWroteTheFile) {
     auto dialog =
-        std::make_unique<CHalvekDownloadProgressDialog>(nullptr, station_, output_.wstring());
+        std::make_unique<CHalvekDownloadProgressDialog>(nullptr, station_, output_.wstring(),
+                                                        HalvekLibraryClaim::TryTake());
     const INT_PTR result = RunDialog(*dialog, [](HWND window) { Press(window, IDC_START); });
     dialog.reset();  // deletes the library object
     EXPECT_EQ(result, IDOK);
@@ -92,7 +64,8 @@ TEST_F(HalvekDialog, EachFailureShowsItsTextInOneBoxAndCancelsWithoutAFile) {
         ScopedUserInterface seam(user);
         fs::remove(log_);
         ::SetEnvironmentVariableW(test.setting, test.value);
-        CHalvekDownloadProgressDialog dialog(nullptr, station_, output_.wstring());
+        CHalvekDownloadProgressDialog dialog(nullptr, station_, output_.wstring(),
+                                         HalvekLibraryClaim::TryTake());
         EXPECT_EQ(RunDialog(dialog, [](HWND window) { Press(window, IDC_START); }), IDCANCEL);
         ::SetEnvironmentVariableW(test.setting, nullptr);
         ExpectOneBox(user, test.text, MB_ICONEXCLAMATION);
@@ -104,21 +77,25 @@ TEST_F(HalvekDialog, EachFailureShowsItsTextInOneBoxAndCancelsWithoutAFile) {
 }
 
 TEST_F(HalvekDialog, CancelBeforeStartEndsAtOnce) {
-    CHalvekDownloadProgressDialog dialog(nullptr, station_, output_.wstring());
-    const INT_PTR result = RunDialog(dialog, [](HWND window) {
+    auto dialog = std::make_unique<CHalvekDownloadProgressDialog>(
+        nullptr, station_, output_.wstring(), HalvekLibraryClaim::TryTake());
+    const INT_PTR result = RunDialog(*dialog, [](HWND window) {
         Press(window, IDCANCEL);
         EXPECT_TRUE(WaitFor([&] { return !::IsWindow(window); }, 5000));
     });
     EXPECT_EQ(result, IDCANCEL);
     EXPECT_TRUE(user_.MessageBoxes().empty());
     EXPECT_FALSE(fs::exists(log_));  // the library was never asked for anything
-    EXPECT_EQ(g_halvekDialogWindow.load(), nullptr);
+    EXPECT_FALSE(HalvekLibraryClaim::TryTake()) << "held until the dialog object goes";
+    dialog.reset();
+    EXPECT_TRUE(HalvekLibraryClaim::TryTake());
 }
 
 TEST_F(HalvekDialog, CancelAfterStartWaitsForTheLibrarysEnd) {
     ::SetEnvironmentVariableW(L"HALVEKCOMM_DELAY_MS", L"20000");
     ::SetEnvironmentVariableW(L"HALVEKCOMM_CANCEL_DELAY_MS", L"1500");
-    CHalvekDownloadProgressDialog dialog(nullptr, station_, output_.wstring());
+    CHalvekDownloadProgressDialog dialog(nullptr, station_, output_.wstring(),
+                                         HalvekLibraryClaim::TryTake());
     const ULONGLONG started = ::GetTickCount64();
     const INT_PTR result = RunDialog(dialog, [](HWND window) {
         Press(window, IDC_START);
@@ -141,7 +118,8 @@ TEST_F(HalvekDialog, ShowsGermanTextsInAGermanUi) {
     ASSERT_TRUE(SelectThreadUiLanguage(MAKELANGID(LANG_GERMAN, SUBLANG_GERMAN)));
     const std::wstring instructions = LoadUiText(IDS_INSTRUCTIONS_LV20);
     ::SetEnvironmentVariableW(L"HALVEKCOMM_RESULT", L"-204");
-    CHalvekDownloadProgressDialog dialog(nullptr, station_, output_.wstring());
+    CHalvekDownloadProgressDialog dialog(nullptr, station_, output_.wstring(),
+                                         HalvekLibraryClaim::TryTake());
     const INT_PTR result = RunDialog(dialog, [&](HWND window) {
         EXPECT_EQ(Text(window), L"Datei vom Digitalnivellier herunterladen");
         EXPECT_EQ(Text(window, IDCANCEL), L"Abbrechen");

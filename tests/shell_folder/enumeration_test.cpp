@@ -7,18 +7,16 @@
 TEST_F(ShellFolderTest, RootListsStationsOnlyForFolders) {
     AddStationOfModel(L"Station 1");
     AddStationOfModel(L"Station 2", IDS_MODEL_LV30);
-    // A subkey without a readable name is skipped silently.
+    // A subkey whose name is no text is left out (with a line in the error log).
     ASSERT_EQ(ERROR_SUCCESS, WriteDwordValue(StationKey(L"Stray").get(), L"Name", 7));
-    // Names written by other tools: an empty one makes the path of the root itself, a backslash
-    // ends the station's part of the path.
+    // Names written by other tools that a path would not carry as themselves are left out: an
+    // empty one would make the path of the root itself, and "North\South" would be listed as
+    // "North", another station's name.
     ASSERT_EQ(ERROR_SUCCESS, WriteStringValue(StationKey(L"Station 8").get(), L"Name", L""));
     ASSERT_EQ(ERROR_SUCCESS,
               WriteStringValue(StationKey(L"Station 9").get(), L"Name", L"North\\South"));
 
-    const Items expected = {{PT_STATION, L"Station 1"},
-                            {PT_STATION, L"Station 2"},
-                            {PT_ROOT, L"Quorvel Digital Level"},
-                            {PT_STATION, L"North"}};
+    const Items expected = {{PT_STATION, L"Station 1"}, {PT_STATION, L"Station 2"}};
     EXPECT_EQ(expected, Enumerate(root_.Get(), SHCONTF_FOLDERS));
     EXPECT_EQ(expected, Enumerate(root_.Get(), SHCONTF_FOLDERS | SHCONTF_NONFOLDERS));
     EXPECT_EQ(Items{}, Enumerate(root_.Get(), SHCONTF_NONFOLDERS));

@@ -8,6 +8,7 @@
 #include "stations/display_settings.h"
 #include "stations/serial_ports.h"
 #include "stations/station_list_block.h"
+#include "support/error_log.h"
 #include "support/registry_value.h"
 #include "tests/stations/station_builders.h"
 #include "tests/support/registry_override.h"
@@ -117,7 +118,120 @@ TEST_F(StationStore, UniqueAndPastedNamesLookAtTheStore) {
     AddStationOfModel(L"New digital level");
     AddStationOfModel(L"Copy of New digital level");
     EXPECT_EQ(L"New digital level (2)", MakeUniqueStationName(L"New digital level"));
-    EXPECT_EQ(L"Copy of Copy of New digital level", MakePastedStationName(L"New digital level"));
+    const PasteOutcome pasted =
+        AddPastedStations({Named(L"New digital level"), Named(L"B"), Named(L"B")}, L"Copy of ");
+    EXPECT_EQ(S_OK, pasted.result);
+    EXPECT_EQ((Names{L"New digital level", L"Copy of New digital level",
+                     L"Copy of Copy of New digital level", L"B", L"Copy of B"}),
+              ListStationNames());
+
+    // A refused block writes nothing, the good stations before the refused one included.
+    const PasteOutcome refused =
+        AddPastedStations({Named(L"C"), Named(L"D"), Named(L"E/F")}, L"Copy of ");
+    EXPECT_EQ(S_FALSE, refused.result);
+    ASSERT_TRUE(refused.refused);
+    EXPECT_EQ(2u, refused.refused->station);
+    EXPECT_EQ(5u, ListStationNames().size());
+}
+
+TEST_F(StationStore, AddStationsTakesTheLowestFreeKeysAndWritesAllOrNothing) {
+    // Keys of all sorts already there; key names compare without regard to case.
+    for (const wchar_t* key : {L"Station 0", L"Station 2", L"station 3", L"Other"})
+        (void)StationKey(key);
+    ASSERT_EQ(S_OK, AddStations(std::vector<Station>{Named(L"X"), Named(L"Y"), Named(L"Z")}));
+    EXPECT_EQ(L"Station 1", KeyOf(L"X"));
+    EXPECT_EQ(L"Station 4", KeyOf(L"Y"));
+    EXPECT_EQ(L"Station 5", KeyOf(L"Z"));
+    Station found = Named(L"Z");
+    ASSERT_EQ(S_OK, FindStation(found));
+    EXPECT_EQ(Named(L"Z"), found);
+
+    // A name the store could not keep refuses the batch before a key is made, alone or not.
+    for (const std::wstring& bad :
+         {std::wstring(), std::wstring(L"a\\b"), std::wstring(L"c/d"), std::wstring(260, L'L')}) {
+        EXPECT_EQ(E_INVALIDARG, AddStations(std::vector<Station>{Named(L"Good"), Named(bad)}));
+        EXPECT_EQ(E_INVALIDARG, AddStation(Named(bad)));
+    }
+    EXPECT_EQ((Names{L"X", L"Y", L"Z"}), ListStationNames());
+    AddStationOfModel(L"W");
+    EXPECT_EQ(L"Station 6", KeyOf(L"W"));
+}
+
+TEST_F(StationStore, ListStationsReadsEachListedStationWholeInTheListingsOrder) {
+    registry_.SetSerialPorts({L"COM3", L"COM4"});
+    // clang-format off
+    const std::vector<Station> stored = {
+        {L"North", L"COM4", L"Maker", L"Quorvel LV-30", L"2.1", 19200, 2, 0, 3, 8, 1, 0},
+        {L"South", L"COM3", L"", L"Quorvel LV-10", L"", 4800, 0, 1, 1, 7, 0, 1},
+        {L"East", L"COM4", L"", L"Quorvel LV-20", L"", 9600, 1, 2, 0, 5, 2, 1}};
+    // clang-format on
+    ASSERT_EQ(S_OK, AddStations(stored));
+    ASSERT_EQ(S_OK, DeleteStation(Named(L"South")));
+    ASSERT_EQ(S_OK, AddStation(stored[1]));  // back in its old key: the order stays
+    const std::vector<Station> listed = ListStations();
+    EXPECT_EQ(stored, listed);
+    std::vector<std::wstring> names;
+    for (const Station& station : listed)
+        names.push_back(station.Name);
+    EXPECT_EQ(ListStationNames(), names);
+}
+
+TEST_F(StationStore, ANameTheFolderCannotListAsItselfIsListedUnderNoOtherName) {
+    // Another program's keys around the real "Site": names that a path would cut to "Site", an
+    // empty one, and one with a NUL inside.
+    const wchar_t withNul[] = L"Site\0North";
+    ASSERT_EQ(ERROR_SUCCESS,
+              WriteStringValue(StationKey(L"Station 0").get(), L"Name", L"Site\\North"));
+    AddStationOfModel(L"Site");
+    ASSERT_EQ(ERROR_SUCCESS, WriteStringValue(StationKey(L"Station 2").get(), L"Name", L"\\Site"));
+    ASSERT_EQ(ERROR_SUCCESS, WriteStringValue(StationKey(L"Station 3").get(), L"Name", L""));
+    ASSERT_EQ(ERROR_SUCCESS,
+              ::RegSetValueExW(StationKey(L"Station 4").get(), L"Name", 0, REG_SZ,
+                               reinterpret_cast<const BYTE*>(withNul), sizeof withNul));
+    ASSERT_EQ(ERROR_SUCCESS,
+              WriteStringValue(StationKey(L"Station 5").get(), L"Name", L"a/b \"quoted\" *"));
+
+    wchar_t folder[MAX_PATH] = {};
+    ASSERT_NE(0u, ::GetTempPathW(MAX_PATH, folder));
+    const std::wstring logFolder =
+        std::wstring(folder) + L"lv-store-log-" + std::to_wstring(::GetCurrentProcessId());
+    ASSERT_TRUE(::CreateDirectoryW(logFolder.c_str(), nullptr));
+    ::SetEnvironmentVariableW(L"LVSHELLEXT_LOG_DIR", logFolder.c_str());
+    const std::wstring log = ErrorLogPath();
+    const Names names = ListStationNames();
+    const std::vector<Station> stations = ListStations();
+    ::SetEnvironmentVariableW(L"LVSHELLEXT_LOG_DIR", nullptr);
+
+    // Other characters that a name may not hold are no separators: listed under its own name.
+    EXPECT_EQ((Names{L"Site", L"a/b \"quoted\" *"}), names);
+    ASSERT_EQ(2u, stations.size());
+    EXPECT_EQ(L"Site", stations[0].Name);
+    EXPECT_EQ(L"Station 1", KeyOf(L"Site")) << "Site is found in its own key";
+    for (const std::wstring& unlisted : {std::wstring(L"Site\\North"), std::wstring(L"\\Site"),
+                                         std::wstring(), std::wstring(withNul, 10)}) {
+        EXPECT_EQ(L"", KeyOf(unlisted)) << "found: " << unlisted.size();
+    }
+
+    // One line in the log per listing, however many keys each left out.
+    std::wstring text;
+    {
+        UniqueFileHandle file(::CreateFileW(log.c_str(), GENERIC_READ, FILE_SHARE_READ, nullptr,
+                                            OPEN_EXISTING, 0, nullptr));
+        ASSERT_TRUE(file);
+        text.resize(::GetFileSize(file.get(), nullptr) / sizeof(wchar_t));
+        DWORD read = 0;
+        ::ReadFile(file.get(), text.data(), static_cast<DWORD>(text.size() * sizeof(wchar_t)),
+                   &read, nullptr);
+    }
+    (void)DeleteFileW(log.c_str());
+    (void)RemoveDirectoryW(logFolder.c_str());
+    size_t lines = 0;
+    for (size_t at = text.find(L"4 station key(s) left out"); at != std::wstring::npos;
+         at = text.find(L"4 station key(s) left out", at + 1)) {
+        ++lines;
+    }
+    EXPECT_EQ(2u, lines);
+    EXPECT_NE(std::wstring::npos, text.find(L"(first: \"Station 0\")"));
 }
 
 TEST_F(StationStore, PortFallsBackToTheFirstListedPort) {

@@ -1,28 +1,9 @@
 // The view's commands end to end, with the real property sheet on the virtual display: add, edit,
-// delete, copy and paste stations, open an item, and the broadcast that keeps two views in step.
+// delete, copy and paste stations, open an item, and the broadcast that keeps two views in step
+// (pasting other programs' blocks: view_paste_test.cpp).
 #include "tests/view/view_fixture.h"
 
-#include "stations/portable/station_list_format.h"
-#include "stations/station_list_block.h"
-#include "support/clipboard_formats.h"
-
-#include <cstring>
-
 namespace {
-
-// Puts a station-list block on the clipboard as another program would, without a data object.
-void PutBlockOnClipboard(const std::vector<uint8_t>& block) {
-    ASSERT_TRUE(::OpenClipboard(nullptr));
-    ::EmptyClipboard();
-    UniqueHGlobal memory(::GlobalAlloc(GMEM_MOVEABLE, block.size()));
-    {
-        GlobalLockGuard lock(memory.get());
-        std::memcpy(lock.data(), block.data(), block.size());
-    }
-    if (::SetClipboardData(RegisteredFormat(ClipboardFormat::StationList), memory.get()))
-        (void)memory.release();  // the clipboard's now
-    ::CloseClipboard();
-}
 
 TEST_F(ShellViewTest, AddRefusesBadNamesThenStoresAGoodOneWithTheDefaults) {
     AddStationOfModel(L"North");
@@ -142,22 +123,6 @@ TEST_F(ShellViewTest, PastingPutsCopyOfInFrontUntilTheNameIsFree) {
                                          L"Copy of Copy of A", L"Copy of Copy of B",
                                          L"Copy of Copy of Copy of B"}),
               Texts(browser));
-}
-
-TEST_F(ShellViewTest, PastingAnotherProgramsBlockStoresOnlyCompleteRecordsWithValidNames) {
-    std::vector<Station> stations;
-    for (const wchar_t* name : {L"Good", L"", L"a\\b", L"c/d", L"say \"x\"", L"st*r", L"Fine"})
-        stations.push_back(Named(name));
-    std::vector<uint8_t> block = SerializeStationRecords(stations);
-    // A last record that claims more bytes than the block holds.
-    std::vector<uint8_t> liar = SerializeStationRecords({Named(L"Liar")});
-    liar.resize(liar.size() / 2);
-    block.insert(block.end(), liar.begin(), liar.end());
-    PutBlockOnClipboard(block);
-    CExplorerWindow& browser = Open();
-    EXPECT_EQ(S_OK, Command(browser, 1282));
-    EXPECT_EQ((std::vector<std::wstring>{L"Good", L"Fine"}), ListStationNames());
-    EXPECT_EQ((std::vector<std::wstring>{kEntry, L"Fine", L"Good"}), Texts(browser));
 }
 
 TEST_F(ShellViewTest, AChangeInOneViewRefreshesAnotherOfTheSameKind) {

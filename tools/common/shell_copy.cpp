@@ -142,17 +142,31 @@ StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring&
     if (name.empty() || name.find_first_of(L"\\/:") != std::wstring::npos) {
         return Failed(L"bad file name", E_FAIL);
     }
-    std::wstring targetName, nameError;
-    if (!TargetName(station, name, options.namePattern, targetName, nameError))
-        return Failed(L"bad --name pattern: " + nameError, E_INVALIDARG);
-    const std::wstring target = folder + L"\\" + targetName;
     // Before the download: nobody should press keys on an instrument for a copy that cannot land.
+    std::wstring targetName, nameError;
+    if (!TargetName(station, name, options.namePattern, targetName, nameError) ||
+        !IsCreatableFileName(targetName, folder.size(), nameError)) {
+        StationFileCopy refused = Failed(nameError, HRESULT_FROM_WIN32(ERROR_INVALID_NAME));
+        refused.result = StationFileCopy::kBadName;
+        return refused;
+    }
+    const std::wstring target = folder + L"\\" + targetName;
     if (!options.overwrite && Exists(target)) {
         StationFileCopy exists;
         exists.result = StationFileCopy::kExists;
         exists.target = target;
         return exists;
     }
+    // The file under its temporary name is made before the download too: a folder that takes no
+    // files is found out now, not after the instrument has sent everything.
+    wchar_t partialPath[MAX_PATH];
+    if (::GetTempFileNameW(folder.c_str(), L"lvc", 0, partialPath) == 0)
+        return Failed(L"cannot write in " + folder, HRESULT_FROM_WIN32(::GetLastError()));
+    PartialFile partial(partialPath);
+    UniqueFileHandle out(::CreateFileW(partialPath, GENERIC_WRITE, 0, nullptr, OPEN_EXISTING,
+                                       FILE_ATTRIBUTE_NORMAL, nullptr));
+    if (!out)
+        return Failed(L"cannot write in " + folder, HRESULT_FROM_WIN32(::GetLastError()));
 
     const auto start = std::chrono::steady_clock::now();
     FORMATETC contentsFormat = {RegisteredFormat(ClipboardFormat::FileContents), nullptr,
@@ -168,14 +182,6 @@ StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring&
         return Failed(L"the download failed", result);
     }
 
-    wchar_t partialPath[MAX_PATH];
-    if (::GetTempFileNameW(folder.c_str(), L"lvc", 0, partialPath) == 0)
-        return Failed(L"cannot write in " + folder, HRESULT_FROM_WIN32(::GetLastError()));
-    PartialFile partial(partialPath);
-    UniqueFileHandle out(::CreateFileW(partialPath, GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS,
-                                       FILE_ATTRIBUTE_NORMAL, nullptr));
-    if (!out)
-        return Failed(L"cannot write " + target, HRESULT_FROM_WIN32(::GetLastError()));
     // Read to the end, as the shell does: the stream removes its temporary file at the end.
     std::vector<char> buffer(4096);
     ULONGLONG total = 0;
@@ -194,18 +200,22 @@ StationFileCopy CopyStationFile(const std::wstring& station, const std::wstring&
         if (got < buffer.size())
             break;
     }
+    if (!::FlushFileBuffers(out.get()))
+        return Failed(L"cannot write " + target, HRESULT_FROM_WIN32(::GetLastError()));
     out.reset();
-    // Only a whole file takes the name, and it replaces one only when asked to.
+    // Only a whole file takes the name, and it replaces one only when asked to. A download that
+    // cannot take it (a file or folder of that name came meanwhile, the folder turned read-only)
+    // is the surveyor's all the same: it stays under its temporary name.
     if (!::MoveFileExW(partialPath, target.c_str(),
                        options.overwrite ? MOVEFILE_REPLACE_EXISTING : 0)) {
-        const DWORD error = ::GetLastError();
-        if (error == ERROR_ALREADY_EXISTS || error == ERROR_FILE_EXISTS) {
-            StationFileCopy exists;
-            exists.result = StationFileCopy::kExists;
-            exists.target = target;
-            return exists;
-        }
-        return Failed(L"cannot write " + target, HRESULT_FROM_WIN32(error));
+        const HRESULT error = HRESULT_FROM_WIN32(::GetLastError());
+        partial.Keep();
+        StationFileCopy kept = Failed(L"the download could not be named " + target, error);
+        kept.result = StationFileCopy::kKept;
+        kept.target = target;
+        kept.kept = partialPath;
+        kept.bytes = total;
+        return kept;
     }
     partial.Keep();
     StationFileCopy copied;

@@ -8,6 +8,8 @@
 //   HALVEKCOMM_IGNORE_CANCEL=1      Cancel is not honoured (otherwise it ends with -102)
 //   HALVEKCOMM_CANCEL_DELAY_MS=<ms> time a honoured Cancel takes to wind down (default 0)
 //   HALVEKCOMM_LOG=<path>           every call is appended to this file, one line each
+// Built with HALVEKCOMM_WITH_DEPENDENCY it imports lv_halvek_dependency.dll and logs its answer
+// on CreateInstance, as a library that needs a library of its own beside it.
 #include <windows.h>
 
 #include <atomic>
@@ -184,7 +186,14 @@ private:
 
 }  // namespace
 
+#ifdef HALVEKCOMM_WITH_DEPENDENCY
+extern "C" __declspec(dllimport) int32_t HalvekDependencyAnswer();
+#endif
+
 extern "C" __declspec(dllexport) IHalvekCommObject* CreateInstance() {
     Log("CreateInstance");
+#ifdef HALVEKCOMM_WITH_DEPENDENCY
+    Log("Dependency answer=" + std::to_string(HalvekDependencyAnswer()));
+#endif
     return new (std::nothrow) SubstituteObject;
 }

@@ -7,6 +7,7 @@
 #include <string>
 
 #include "download/az_comm.h"
+#include "download/portable/serial_protocol.h"
 
 namespace {
 
@@ -23,9 +24,19 @@ const char kUsage[] =
     "  --quiet                        no progress lines\n"
     "  --cancel-after N               cancel as a user would, once N progress steps above\n"
     "                                 zero were reported (the driver sees it at its next check)\n"
-    "  --help                         this text\n"
+    "  --help                         this text\n";
+// After the options: the cap, named from the driver's own constant.
+const char kUsageEnd[] =
+    "A receive ends as failed once the instrument sent more than %s MiB (far more than any\n"
+    "instrument holds), so that one that never sends its end cannot fill the disk; a cancel is\n"
+    "seen at the next line or block.\n"
     "Exit code: 0 when the file is complete; 1 when the receive failed or was cancelled (Ctrl+C,\n"
-    "--cancel-after); 3 when the port cannot be opened; 2 on bad usage.\n";
+    "--cancel-after, the size cap); 3 when the port cannot be opened; 2 on bad usage.\n";
+
+void PrintUsage(FILE* stream) {
+    std::fputs(kUsage, stream);
+    std::fprintf(stream, kUsageEnd, std::to_string(kMaxReceiveBytes >> 20).c_str());
+}
 
 std::atomic<bool> g_cancelled{false};
 // Progress steps above zero after which the receive is cancelled; 0 = never.
@@ -86,7 +97,7 @@ int wmain(int argc, wchar_t** argv) {
         const std::wstring option = argv[i];
         const bool hasValue = i + 1 < argc;
         if (option == L"--help" || option == L"-h") {
-            std::fputs(kUsage, stdout);
+            PrintUsage(stdout);
             return 0;
         } else if (option == L"--quiet") {
             quiet = true;
@@ -104,7 +115,8 @@ int wmain(int argc, wchar_t** argv) {
         } else if (option == L"--cancel-after" && hasValue) {
             g_cancelAfterSteps = static_cast<uint32_t>(std::wcstoul(argv[++i], nullptr, 10));
         } else {
-            std::fprintf(stderr, "lvrecv: bad option %ls\n%s", option.c_str(), kUsage);
+            std::fprintf(stderr, "lvrecv: bad option %ls\n", option.c_str());
+            PrintUsage(stderr);
             return 2;
         }
     }
@@ -120,7 +132,7 @@ int wmain(int argc, wchar_t** argv) {
     else
         port.clear();
     if (port.empty() || out.empty() || baud == 0 || port.size() > 10) {
-        std::fputs(kUsage, stderr);
+        PrintUsage(stderr);
         return 2;
     }
 

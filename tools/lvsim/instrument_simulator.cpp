@@ -196,14 +196,16 @@ int InstrumentSimulator::SendBccBlocks(const std::vector<std::string>& dataLines
             return 1;
     }
     uint32_t resends = 0;
-    for (size_t i = 0; i <= dataLines.size();) {
+    // Endless: block i carries line i % count, numbered on; the EOT never comes.
+    const size_t last = options_.Endless && !dataLines.empty() ? SIZE_MAX : dataLines.size();
+    for (size_t i = 0; i <= last;) {
         std::string block;
-        if (i == dataLines.size()) {
+        if (i == last) {
             block = std::string(1, static_cast<char>(kEot));
         } else {
-            const BccBlock bcc =
-                BuildBccBlock(reinterpret_cast<const uint8_t*>(dataLines[i].data()),
-                              dataLines[i].size(), static_cast<uint32_t>(i));
+            const std::string& line = dataLines[i % dataLines.size()];
+            const BccBlock bcc = BuildBccBlock(reinterpret_cast<const uint8_t*>(line.data()),
+                                               line.size(), static_cast<uint32_t>(i));
             block.assign(bcc.begin(), bcc.end());
             if (i + 1 == options_.BadCheckLine)
                 block[5] ^= 0x01;
@@ -211,7 +213,7 @@ int InstrumentSimulator::SendBccBlocks(const std::vector<std::string>& dataLines
         if (!SendPaced(block))
             return 1;
         const std::string answer = ReadAnswer(options_.AnswerTimeoutMs);
-        if (i == dataLines.size())
+        if (i == last)
             return !answer.empty() && static_cast<uint8_t>(answer[0]) == kAck ? 0 : 1;
         if (options_.Verbose)
             std::fprintf(stderr, "lvsim: sent block %zu, answer %s\n", i + 1, AnswerName(answer));
@@ -252,10 +254,12 @@ int InstrumentSimulator::SendYModem(const std::string& name, const std::string& 
                                static_cast<uint32_t>(_time64(nullptr)), table);
     if (!SendPaced(std::string(header.begin(), header.end())) || !waitFor(kAck))
         return 1;
-    const size_t blocks = (content.size() + 127) / 128;
+    // Endless: past the announced size the file's blocks come again; the EOT never comes.
+    const size_t fileBlocks = (content.size() + 127) / 128;
+    const size_t blocks = options_.Endless && fileBlocks > 0 ? SIZE_MAX : fileBlocks;
     uint32_t resends = 0;
     for (size_t i = 0; i < blocks;) {
-        std::string data = content.substr(i * 128, 128);
+        std::string data = content.substr(i % fileBlocks * 128, 128);
         data.resize(128, 0x1A);
         std::string block = {static_cast<char>(kSoh), static_cast<char>(i + 1),
                              static_cast<char>(254 - i)};

@@ -26,6 +26,8 @@ struct SimulatorOptions {
                                        // line or block
     bool WholeWrites = false;          // hand each line to the port at once and then wait its
                                        // wire time, instead of byte by byte as a cable does
+    bool Endless = false;              // BCC blocks and Y-Modem: the data over and over, never
+                                       // the end, as long as the receiver acknowledges
     bool Verbose = false;
 };
 

@@ -47,6 +47,9 @@ const char kUsage[] =
     "  --long-line            after the header, a 128-byte line without CR LF, then nothing\n"
     "  --disconnect-after K   close the port after line or block K was acknowledged (raw\n"
     "                         stream: sent), before the end\n"
+    "  --repeat               BCC blocks and Y-Modem: send the data again and again and never\n"
+    "                         the end (Y-Modem: past the announced size), for as long as the\n"
+    "                         receiver acknowledges\n"
     "  --verbose              report the opened port, every line or block and its answer on\n"
     "                         stderr\n"
     "  --help                 this text\n"
@@ -142,6 +145,8 @@ int wmain(int argc, wchar_t** argv) {
             options.LongLineWithoutEnd = true;
         } else if (option == L"--disconnect-after") {
             options.DisconnectAfterLine = number();
+        } else if (option == L"--repeat") {
+            options.Endless = true;
         } else if (option == L"--verbose") {
             options.Verbose = true;
         } else {

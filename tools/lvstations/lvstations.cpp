@@ -8,19 +8,25 @@
 #include <vector>
 
 #include "res/resource.h"
+#include "stations/portable/station_names.h"
 #include "stations/serial_ports.h"
 #include "stations/station_dialog.h"
 #include "stations/station_store.h"
 #include "support/text_lookup.h"
 #include "support/unique_resource.h"
 #include "tools/common/console_output.h"
+#include "tools/lvstations/portable/printable_text.h"
 #include "tools/lvstations/station_file_commands.h"
+#include "tools/lvstations/station_list_command.h"
 
 namespace {
 
 const wchar_t kUsage[] =
     L"Usage:\n"
-    L"  lvstations list                 the stations of the current user, with their settings\n"
+    L"  lvstations list                 the stations of the current user, with their settings;\n"
+    L"                                  characters a terminal would act on are printed as\n"
+    L"                                  escapes: \\x0D, \\x1B (controls), \\u202E (line and\n"
+    L"                                  direction marks, lone surrogates), \\\\ (a backslash)\n"
     L"  lvstations ports                the serial ports of this computer\n"
     L"  lvstations add NAME [options]   adds a station (fails if the name is taken)\n"
     L"      --port COMn                 serial port (default: the first port of the computer)\n"
@@ -45,36 +51,12 @@ const wchar_t kUsage[] =
     L"      cannot come back as stored; 2 usage; 3 a bad file, nothing imported; 4 a file or\n"
     L"      the store could not be read or written\n";
 
-std::wstring ParityName(DWORD parity) {
-    return LoadUiText(parity == 0   ? IDS_PARITY_NONE
-                      : parity == 1 ? IDS_PARITY_ODD
-                                    : IDS_PARITY_EVEN);
-}
-
-int List() {
-    const std::vector<std::wstring> names = ListStationNames();
-    if (names.empty())
-        PrintUtf8(L"No stations.\n");
-    for (const std::wstring& name : names) {
-        Station station;
-        station.Name = name;
-        if (FindStation(station) != S_OK)
-            continue;
-        wchar_t line[512];
-        swprintf(line, ARRAYSIZE(line), L"%ls\n    %ls, %lu baud, %lu data bits, parity %ls, %ls\n",
-                 station.Name.c_str(), station.Port.c_str(), station.BaudRate, station.DataBits,
-                 ParityName(station.Parity).c_str(), station.Model.c_str());
-        PrintUtf8(line);
-    }
-    return 0;
-}
-
 int Ports() {
     const std::vector<std::wstring> ports = ListSerialPorts();
     if (ports.empty())
         PrintUtf8(L"No serial ports.\n");
     for (const std::wstring& port : ports)
-        PrintUtf8(port + L"\n");
+        PrintUtf8(PrintableText(port) + L"\n");
     return 0;
 }
 
@@ -99,6 +81,12 @@ int Add(int argc, wchar_t** argv) {
             PrintUtf8(L"Unknown option " + option + L"\n" + kUsage);
             return 2;
         }
+    }
+    if (CheckStationName(station.Name) != StationNameProblem::kNone) {
+        PrintUtf8(L"A station name must not be empty, be longer than " +
+                  std::to_wstring(kMaximumStationNameLength) +
+                  L" characters or contain \\ / \" or *.\n");
+        return 1;
     }
     const HRESULT result = AddStation(station);
     if (result == E_INVALIDARG) {
@@ -160,8 +148,9 @@ int Delete(const wchar_t* name) {
 
 int wmain(int argc, wchar_t** argv) {
     const std::wstring command = argc > 1 ? argv[1] : L"";
+    const auto printLine = [](const std::wstring& line) { PrintUtf8(line + L"\n"); };
     if (command == L"list" && argc == 2)
-        return List();
+        return ListStationsCommand(printLine);
     if (command == L"ports" && argc == 2)
         return Ports();
     if (command == L"add" && argc == 2)
@@ -172,7 +161,6 @@ int wmain(int argc, wchar_t** argv) {
         return Properties(argv[2]);
     if (command == L"delete" && argc == 3)
         return Delete(argv[2]);
-    const auto printLine = [](const std::wstring& line) { PrintUtf8(line + L"\n"); };
     if (command == L"export" && argc == 3)
         return ExportStations(argv[2], printLine);
     const bool replace = argc == 4 && std::wstring(argv[3]) == L"--replace";

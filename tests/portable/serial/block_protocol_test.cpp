@@ -3,13 +3,10 @@
 
 #include <utility>
 
-#include "tests/portable/serial/fake_serial.h"
+#include "tests/portable/serial/scripted_instruments.h"
 
 namespace {
 
-const Bytes kEnqLine = {0x05, 0x0D, 0x0A};
-const Bytes kAckLine = {0x06, 0x0D, 0x0A};
-const Bytes kNakLine = {0x15, 0x0D, 0x0A};
 const WideString kWaitExpired = WIDE_TEXT("The waiting time of the data has expired.");
 const WideString kImportFailed = WIDE_TEXT("AZ doesn't respond or error in importing block");
 const WideString kInterrupted = WIDE_TEXT("The communication's process is interrupted by the user");
@@ -36,58 +33,6 @@ TEST(RawStream, WithoutEotTimesOut) {
     EXPECT_EQ(run.file.Text(), "no end");
     EXPECT_EQ(run.callback.messages, OnlyMessage(4, kWaitExpired));
     EXPECT_FALSE(run.file.open);
-}
-
-std::string BlockText(int index) {
-    // XON and XOFF are data here: without flow control they pass through the blocks.
-    return "R," + std::to_string(index) + ",1.2345,\x11\x13,";
-}
-
-// A BCC-block receive against an instrument that sends block 0 on ENQ, the next on ACK, the same
-// again on NAK, and EOT after the last. damage(index, attempt) may spoil what goes out; the
-// instrument may miss our first ACK of block missedAck and send that block again.
-struct BccRun : ProtocolRun {
-    BccRun() : ProtocolRun(1) {}
-
-    int blocks = 3;
-    int next = 0;
-    int attempt = 0;
-    int missedAck = -1;
-    std::function<void(int index, int attempt, BccBlock& block)> damage;
-
-    void Send() {
-        if (next >= blocks)
-            return port.Deliver(Bytes{0x04});
-        const std::string text = BlockText(next);
-        BccBlock block = BuildBccBlock(BytesOf(text), text.size(), next);
-        if (damage)
-            damage(next, attempt, block);
-        ++attempt;
-        port.Deliver(Bytes(block.begin(), block.end()));
-    }
-    uint32_t Receive() {
-        port.onWrite = [this](const Bytes& written, FakePort&) {
-            if (written == kAckLine && next == missedAck) {
-                missedAck = -1;  // lost on the line: the instrument sends the block again
-                Send();
-            } else if (written == kAckLine && next < blocks) {
-                ++next;
-                attempt = 0;
-                Send();
-            } else if (written == kEnqLine || written == kNakLine) {
-                Send();
-            }
-        };
-        return protocol.Receive();
-    }
-};
-
-// What the first count blocks leave in the file: each block's text filled with spaces.
-std::string BlocksText(int count) {
-    std::string text;
-    for (int i = 0; i < count; ++i)
-        text += (BlockText(i) + std::string(128, ' ')).substr(0, 128);
-    return text;
 }
 
 TEST(BccBlocks, AreWrittenAfterTheEnqAndTheEndIsAcknowledgedTenTimes) {
@@ -142,7 +87,7 @@ TEST(BccBlocks, SilentInstrumentIsPolledAgainEveryFourSecondsUntilTheTimeOut) {
     EXPECT_EQ(run.callback.messages.back().text, kWaitExpired);
 }
 
-TEST(BccBlocks, CancelAfterANakClosesThePort) {
+TEST(BccBlocks, CancelSeenOnABadBlockClosesThePort) {
     BccRun run;
     run.damage = [](int index, int, BccBlock& block) {
         if (index == 1)
@@ -155,53 +100,6 @@ TEST(BccBlocks, CancelAfterANakClosesThePort) {
     EXPECT_EQ(run.port.closes, 1);
     EXPECT_FALSE(run.protocol.IsPortOpen());
 }
-
-// A Y-Modem receive against a sender that sends its header on the first 'C', a data block on
-// each ACK and EOT after the last. damage(block, bytes) may spoil what goes out (block 0 is the
-// header).
-struct YModemRun : ProtocolRun {
-    explicit YModemRun(Bytes bytes) : ProtocolRun(2), sent(std::move(bytes)) {}
-
-    Bytes sent;
-    size_t nextBlock = 0;
-    bool eotSent = false;
-    std::function<void(size_t block, Bytes& bytes)> damage;
-    const CrcTable table = MakeCrcTable();
-
-    void Send() {
-        if (nextBlock == 0) {
-            const YModemBlock header =
-                BuildYModemHeaderBlock("survey.lv", static_cast<uint32_t>(sent.size()), 0, table);
-            return port.Deliver(Bytes(header.begin(), header.end()));
-        }
-        if (nextBlock > (sent.size() + 127) / 128) {
-            eotSent = true;
-            return port.Deliver(Bytes{0x04});
-        }
-        const size_t offset = (nextBlock - 1) * 128;
-        Bytes data(sent.begin() + offset, sent.begin() + std::min(sent.size(), offset + 128));
-        data.resize(128, 0x1A);
-        const uint16_t crc = Crc16(table, data.data(), data.size());
-        Bytes block = {0x01, static_cast<uint8_t>(nextBlock),
-                       static_cast<uint8_t>(255 - nextBlock)};
-        block.insert(block.end(), data.begin(), data.end());
-        block.insert(block.end(), {static_cast<uint8_t>(crc >> 8), static_cast<uint8_t>(crc)});
-        if (damage)
-            damage(nextBlock, block);
-        port.Deliver(block);
-    }
-    uint32_t Receive() {
-        port.onWrite = [this](const Bytes& written, FakePort&) {
-            if ((written == Bytes{0x43} && nextBlock == 0) || written == Bytes{0x15}) {
-                Send();
-            } else if (written == Bytes{0x06, 0x43} || (written == Bytes{0x06} && !eotSent)) {
-                ++nextBlock;
-                Send();
-            }
-        };
-        return protocol.Receive();
-    }
-};
 
 TEST(YModem, ReceivesTheAnnouncedSizeAndReportsTheHeader) {
     Bytes sent;
@@ -253,7 +151,6 @@ TEST(YModem, SendingAHeaderWaitsForTheReceiverAndResendsUntilAck) {
     EXPECT_EQ(run.protocol.SendYModemHeader(header), 0u);
     EXPECT_EQ(sends, 3);
 }
-
 
 // Each block procedure on a disk that fills up part-way through the second block: the receive
 // fails at that write, with the system's text, and the block that did not fit is not answered

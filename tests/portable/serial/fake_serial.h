@@ -184,6 +184,8 @@ public:
             WIDE_TEXT("The communication's process is interrupted by the user"),
             WIDE_TEXT("AZ doesn't respond or error in importing block"),
             WIDE_TEXT("Incorrect input file: BCC in block %d mismatch with computed %d!=%d"),
+            WIDE_TEXT("The instrument sent more than %d MiB, more than any instrument holds. "
+                      "The transfer was stopped."),
             WIDE_TEXT("Y-Modem File Info: %s (size=%s)"),
         };
         return kTexts[static_cast<size_t>(text)];

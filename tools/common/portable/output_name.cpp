@@ -23,6 +23,26 @@ WideString Digits(int value, size_t width) {
     return text;
 }
 
+WideChar AsciiUpper(WideChar character) noexcept {
+    return character >= WIDE_TEXT('a') && character <= WIDE_TEXT('z')
+               ? static_cast<WideChar>(character - WIDE_TEXT('a') + WIDE_TEXT('A'))
+               : character;
+}
+
+// Devices whose names stand alone; COM and LPT take a digit.
+const WideChar* const kDevices[] = {WIDE_TEXT("CON"), WIDE_TEXT("PRN"),    WIDE_TEXT("AUX"),
+                                    WIDE_TEXT("NUL"), WIDE_TEXT("CONIN$"), WIDE_TEXT("CONOUT$")};
+
+// A digit that ends a COM or LPT device's name: 0-9 and the superscripts 1, 2, 3.
+bool IsDevicePortDigit(WideChar character) noexcept {
+    constexpr WideChar kSuperscriptOne = 0x00B9;
+    constexpr WideChar kSuperscriptTwo = 0x00B2;
+    constexpr WideChar kSuperscriptThree = 0x00B3;
+    return (character >= WIDE_TEXT('0') && character <= WIDE_TEXT('9')) ||
+           character == kSuperscriptOne || character == kSuperscriptTwo ||
+           character == kSuperscriptThree;
+}
+
 WideString WithoutForbidden(WideStringView text) {
     WideString cleaned(text);
     for (WideChar& character : cleaned)
@@ -31,10 +51,9 @@ WideString WithoutForbidden(WideStringView text) {
     return cleaned;
 }
 
-}  // namespace
-
-bool ExpandOutputName(WideStringView pattern, const OutputNameParts& parts, WideString& name,
-                      WideString& error) {
+// The pattern with its fields filled in; false with a reason for a pattern that cannot be read.
+bool ExpandFields(WideStringView pattern, const OutputNameParts& parts, WideString& name,
+                  WideString& error) {
     name.clear();
     error.clear();
     const size_t dot = parts.fileName.rfind(WIDE_TEXT('.'));
@@ -87,17 +106,106 @@ bool ExpandOutputName(WideStringView pattern, const OutputNameParts& parts, Wide
         }
         index = close;
     }
+    return true;
+}
+
+WideString Number(size_t value) {
+    return Digits(static_cast<int>(value), 1);
+}
+
+}  // namespace
+
+WideString DeviceInFileName(WideStringView name) {
+    WideStringView base = name.substr(0, name.find(WIDE_TEXT('.')));
+    while (!base.empty() && base.back() == WIDE_TEXT(' '))
+        base.remove_suffix(1);
+    WideString upper;
+    for (const WideChar character : base)
+        upper.push_back(AsciiUpper(character));
+    for (const WideChar* device : kDevices) {
+        if (upper == device)
+            return upper;
+    }
+    if (upper.size() == 4 &&
+        (upper.starts_with(WIDE_TEXT("COM")) || upper.starts_with(WIDE_TEXT("LPT"))) &&
+        IsDevicePortDigit(upper[3])) {
+        return upper;
+    }
+    return WideString();
+}
+
+namespace {
+
+// What keeps a name from being a file's, and the reason in words.
+enum class NameProblem { kNone, kNoName, kCharacter, kTrailingDotOrSpace, kDevice, kTooLong };
+
+NameProblem FindNameProblem(WideStringView name, size_t folderLength, WideString& error) {
+    error.clear();
     if (name.empty() || name == WIDE_TEXT(".") || name == WIDE_TEXT("..")) {
         error = WIDE_TEXT("the pattern names no file");
-        return false;
+        return NameProblem::kNoName;
     }
+    for (const WideChar character : name) {
+        if (IsForbiddenInFileName(character)) {
+            error = WIDE_TEXT("a file name cannot hold the character \"") +
+                    WideString(1, character) + WIDE_TEXT("\"");
+            return NameProblem::kCharacter;
+        }
+    }
+    // Windows drops them, so the file would not get the name asked for.
     if (name.back() == WIDE_TEXT('.') || name.back() == WIDE_TEXT(' ')) {
         error = WIDE_TEXT("a file name cannot end in a dot or a space");
-        return false;
+        return NameProblem::kTrailingDotOrSpace;
+    }
+    const WideString device = DeviceInFileName(name);
+    if (!device.empty()) {
+        error = WIDE_TEXT("\"") + WideString(name) + WIDE_TEXT("\" is the device ") + device +
+                WIDE_TEXT(" in Windows, not a file");
+        return NameProblem::kDevice;
     }
     if (name.size() > kMaximumName) {
         error = WIDE_TEXT("the name is longer than 255 characters");
-        return false;
+        return NameProblem::kTooLong;
     }
-    return true;
+    const size_t pathLength = folderLength + 1 + name.size();
+    if (pathLength > kMaximumOutputPath) {
+        error = WIDE_TEXT("the name is too long for the folder: the path would have ") +
+                Number(pathLength) + WIDE_TEXT(" characters, Windows takes ") +
+                Number(kMaximumOutputPath);
+        return NameProblem::kTooLong;
+    }
+    return NameProblem::kNone;
+}
+
+}  // namespace
+
+bool IsCreatableFileName(WideStringView name, size_t folderLength, WideString& error) {
+    return FindNameProblem(name, folderLength, error) == NameProblem::kNone;
+}
+
+bool ExpandOutputName(WideStringView pattern, const OutputNameParts& parts, WideString& name,
+                      WideString& error) {
+    if (!ExpandFields(pattern, parts, name, error))
+        return false;
+    // No folder yet: only the name itself is checked here.
+    const NameProblem problem = FindNameProblem(name, 0, error);
+    if (problem != NameProblem::kDevice)
+        return problem == NameProblem::kNone;
+    const WideString device = DeviceInFileName(name);
+    // A device that the pattern names whatever the station is the pattern's; one that only this
+    // station's name makes can be avoided by writing something beside {station}.
+    OutputNameParts neutral = parts;
+    neutral.station = WIDE_TEXT("x");
+    WideString neutralName, neutralError;
+    if (ExpandFields(pattern, neutral, neutralName, neutralError) &&
+        DeviceInFileName(neutralName).empty()) {
+        error = WIDE_TEXT("the station's name \"") + parts.station + WIDE_TEXT("\" makes \"") +
+                name + WIDE_TEXT("\", which Windows takes for the device ") + device +
+                WIDE_TEXT(", not a file; put something beside {station}, as in ") +
+                WIDE_TEXT("\"_{station}{ext}\" or \"{station} {date}{ext}\"");
+    } else {
+        error = WIDE_TEXT("the pattern names the device ") + device +
+                WIDE_TEXT(" in Windows, not a file");
+    }
+    return false;
 }

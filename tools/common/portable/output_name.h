@@ -15,11 +15,29 @@ struct OutputNameParts {
     int second = 0;
 };
 
+// The longest full path (folder, "\\" and name) that Windows opens without the long-path prefix:
+// MAX_PATH less its terminator.
+constexpr size_t kMaximumOutputPath = 259;
+
+// The device a file name stands for in Windows, or empty when it names a file. Windows takes the
+// part before the first dot, less trailing spaces, in any case, for a device when it is CON,
+// PRN, AUX, NUL, CONIN$, CONOUT$, COM0-COM9 or LPT0-LPT9 (also with a superscript 1, 2 or 3),
+// whatever extension follows: "aux.lv" and "Com1 .txt" open devices, not files. The names differ
+// between versions; this is the widest set.
+WideString DeviceInFileName(WideStringView name);
+
+// Whether Windows can create a file of this name in a folder whose full path has folderLength
+// characters (without its trailing backslash): no character a name cannot hold, no trailing dot
+// or space, no device, at most 255 characters, and at most kMaximumOutputPath with the folder.
+// False with a reason in error otherwise.
+bool IsCreatableFileName(WideStringView name, size_t folderLength, WideString& error);
+
 // Expands {station}, {date} (YYYY-MM-DD), {time} (HHMMSS), {name} (the file's own name without its
 // extension) and {ext} (its extension with the dot, ".lv" or ".hvr"); "{{" and "}}" stand for
 // braces. Characters that a file name cannot hold are replaced by "_" where they come from the
 // station's name, and refused where the pattern itself has them (a pattern names a file, not a
-// folder). Trailing dots and spaces, which Windows drops, are refused too. False with a reason in
-// error for a pattern that names no usable file.
+// folder). Trailing dots and spaces, which Windows drops, and device names are refused too; a
+// device that the station's name makes is refused with a way around it ("_{station}"). False with
+// a reason in error for a pattern that names no usable file.
 bool ExpandOutputName(WideStringView pattern, const OutputNameParts& parts, WideString& name,
                       WideString& error);

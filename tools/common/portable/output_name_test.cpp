@@ -76,3 +76,147 @@ TEST(OutputName, PatternsThatNameNoUsableFileAreRefusedWithAReason) {
 }
 
 }  // namespace
+
+namespace {
+
+std::string Narrow(const WideString& text) {
+    std::string narrow;
+    for (const WideChar character : text)
+        narrow.push_back(character < 0x80 ? static_cast<char>(character) : '?');
+    return narrow;
+}
+
+}  // namespace
+
+TEST(OutputName, DeviceNamesAreFoundWithAnyExtensionCaseOrTrailingSpace) {
+    const struct {
+        const WideChar* name;
+        const WideChar* device;  // empty: a file
+    } cases[] = {
+        {WIDE_TEXT("CON"), WIDE_TEXT("CON")},
+        {WIDE_TEXT("con.lv"), WIDE_TEXT("CON")},
+        {WIDE_TEXT("Aux.lv"), WIDE_TEXT("AUX")},
+        {WIDE_TEXT("nul.tar.gz"), WIDE_TEXT("NUL")},
+        {WIDE_TEXT("PrN.hvr"), WIDE_TEXT("PRN")},
+        {WIDE_TEXT("AUX .lv"), WIDE_TEXT("AUX")},
+        {WIDE_TEXT("NUL  "), WIDE_TEXT("NUL")},
+        {WIDE_TEXT("COM1.txt"), WIDE_TEXT("COM1")},
+        {WIDE_TEXT("com9"), WIDE_TEXT("COM9")},
+        {WIDE_TEXT("COM0.lv"), WIDE_TEXT("COM0")},
+        {WIDE_TEXT("lpt5.hvr"), WIDE_TEXT("LPT5")},
+        {WIDE_TEXT("COM\u00B9.lv"), WIDE_TEXT("COM\u00B9")},
+        {WIDE_TEXT("lpt\u00B2"), WIDE_TEXT("LPT\u00B2")},
+        {WIDE_TEXT("Lpt\u00B3.x"), WIDE_TEXT("LPT\u00B3")},
+        {WIDE_TEXT("CONIN$"), WIDE_TEXT("CONIN$")},
+        {WIDE_TEXT("conout$.txt"), WIDE_TEXT("CONOUT$")},
+        // Files whose names only come close.
+        {WIDE_TEXT("file1.lv"), WIDE_TEXT("")},
+        {WIDE_TEXT("_Aux.lv"), WIDE_TEXT("")},
+        {WIDE_TEXT(" AUX.lv"), WIDE_TEXT("")},
+        {WIDE_TEXT("Aux 2026-03-07.lv"), WIDE_TEXT("")},
+        {WIDE_TEXT("AUXILIARY.lv"), WIDE_TEXT("")},
+        {WIDE_TEXT("CONSOLE"), WIDE_TEXT("")},
+        {WIDE_TEXT("NULL.lv"), WIDE_TEXT("")},
+        {WIDE_TEXT("COM10.lv"), WIDE_TEXT("")},
+        {WIDE_TEXT("COM.lv"), WIDE_TEXT("")},
+        {WIDE_TEXT("LPTx.lv"), WIDE_TEXT("")},
+        {WIDE_TEXT("COM\u2074.lv"), WIDE_TEXT("")},  // superscript four: no port
+        {WIDE_TEXT(".lv"), WIDE_TEXT("")},
+        {WIDE_TEXT(""), WIDE_TEXT("")},
+    };
+    for (const auto& test : cases)
+        EXPECT_EQ(WideString(test.device), DeviceInFileName(test.name)) << Narrow(test.name);
+}
+
+TEST(OutputName, OnlyNamesWindowsCanCreateInTheFolderPass) {
+    const WideString longest(255, WIDE_TEXT('n'));
+    const struct {
+        WideString name;
+        size_t folderLength;
+        const WideChar* reasonStart;  // null: creatable
+    } cases[] = {
+        {WIDE_TEXT("file1.lv"), 3, nullptr},
+        {WIDE_TEXT("_Aux.lv"), 3, nullptr},
+        {longest, 3, nullptr},
+        {longest + WIDE_TEXT("n"), 3, WIDE_TEXT("the name is longer than 255")},
+        // With the folder and its backslash: 259 characters are the most a path has.
+        {WIDE_TEXT("file1.lv"), kMaximumOutputPath - 9, nullptr},
+        {WIDE_TEXT("file1.lv"), kMaximumOutputPath - 8, WIDE_TEXT("the name is too long for")},
+        {WIDE_TEXT("a<b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
+        {WIDE_TEXT("a>b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
+        {WIDE_TEXT("a:b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
+        {WIDE_TEXT("a\"b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
+        {WIDE_TEXT("a/b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
+        {WIDE_TEXT("a\\b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
+        {WIDE_TEXT("a|b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
+        {WIDE_TEXT("a?b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
+        {WIDE_TEXT("a*b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
+        {WIDE_TEXT("a\x01") WIDE_TEXT("b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
+        {WIDE_TEXT("a\x1f") WIDE_TEXT("b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
+        {WIDE_TEXT("file1."), 3, WIDE_TEXT("a file name cannot end")},
+        {WIDE_TEXT("file1 "), 3, WIDE_TEXT("a file name cannot end")},
+        {WIDE_TEXT("Aux.lv"), 3, WIDE_TEXT("\"Aux.lv\" is the device AUX")},
+        {WIDE_TEXT("com\u00B3.hvr"), 3, WIDE_TEXT("\"com\u00B3.hvr\" is the device COM\u00B3")},
+        {WIDE_TEXT(""), 3, WIDE_TEXT("the pattern names no file")},
+    };
+    for (const auto& test : cases) {
+        WideString error = WIDE_TEXT("left over");
+        const bool creatable = IsCreatableFileName(test.name, test.folderLength, error);
+        EXPECT_EQ(test.reasonStart == nullptr, creatable) << Narrow(test.name);
+        if (test.reasonStart) {
+            EXPECT_EQ(0u, error.find(test.reasonStart)) << Narrow(error);
+        } else {
+            EXPECT_TRUE(error.empty()) << Narrow(error);
+        }
+    }
+}
+
+// A device that the station's name makes is the station's, with a way around it that works; one
+// the pattern names whatever the station is the pattern's.
+TEST(OutputName, DevicesAreRefusedAndTheRefusalSaysWhetherStationOrPatternMadeThem) {
+    const struct {
+        const WideChar* pattern;
+        const WideChar* station;
+        const WideChar* reasonStart;  // null: accepted
+        const WideChar* expected;     // the name, when accepted
+    } cases[] = {
+        {WIDE_TEXT("{station}{ext}"), WIDE_TEXT("Aux"),
+         WIDE_TEXT("the station's name \"Aux\" makes \"Aux.lv\", which Windows takes for the "
+                   "device AUX"),
+         nullptr},
+        {WIDE_TEXT("{station}{ext}"), WIDE_TEXT("CON"), WIDE_TEXT("the station's name \"CON\""),
+         nullptr},
+        {WIDE_TEXT("{station}{ext}"), WIDE_TEXT("nul"), WIDE_TEXT("the station's name \"nul\""),
+         nullptr},
+        {WIDE_TEXT("{station}"), WIDE_TEXT("COM1"), WIDE_TEXT("the station's name \"COM1\""),
+         nullptr},
+        {WIDE_TEXT("{station}.{name}"), WIDE_TEXT("lpt\u00B9"),
+         WIDE_TEXT("the station's name \"lpt\u00B9\""), nullptr},
+        {WIDE_TEXT("_{station}{ext}"), WIDE_TEXT("Aux"), nullptr, WIDE_TEXT("_Aux.lv")},
+        {WIDE_TEXT("{station} {date}{ext}"), WIDE_TEXT("CON"), nullptr,
+         WIDE_TEXT("CON 2026-03-07.lv")},
+        {WIDE_TEXT("NUL{ext}"), WIDE_TEXT("North"), WIDE_TEXT("the pattern names the device NUL"),
+         nullptr},
+        {WIDE_TEXT("con.txt"), WIDE_TEXT("North"), WIDE_TEXT("the pattern names the device CON"),
+         nullptr},
+        {WIDE_TEXT("COM\u00B2{ext}"), WIDE_TEXT("North"),
+         WIDE_TEXT("the pattern names the device COM\u00B2"), nullptr},
+        {WIDE_TEXT("aux {station}"), WIDE_TEXT(""), WIDE_TEXT("a file name cannot end"), nullptr},
+    };
+    for (const auto& test : cases) {
+        WideString name, error;
+        const bool accepted =
+            ExpandOutputName(test.pattern, Parts(test.station, WIDE_TEXT("file1.lv")), name, error);
+        EXPECT_EQ(test.reasonStart == nullptr, accepted) << Narrow(test.pattern);
+        if (test.reasonStart) {
+            EXPECT_EQ(0u, error.find(test.reasonStart)) << Narrow(error);
+        } else {
+            EXPECT_EQ(WideString(test.expected), name);
+        }
+    }
+    // The way around that the refusal names is one the check accepts.
+    WideString name, error;
+    ASSERT_FALSE(ExpandOutputName(WIDE_TEXT("{station}{ext}"),
+                                  Parts(WIDE_TEXT("Aux"), WIDE_TEXT("file1.lv")), name, error));
+    EXPECT_NE(WideString::npos, error.find(WIDE_TEXT("\"_{station}{ext}\""))) << Narrow(error);
+}

@@ -1,0 +1,86 @@
+// "lvstations list" over an isolated store: thousands of stations in one walk, and names and
+// texts that another program wrote to forge lines or terminal sequences printed escaped.
+#include "tests/stations/station_file_fixture.h"
+
+#include "support/registry_value.h"
+#include "tests/stations/station_builders.h"
+#include "tools/lvstations/station_list_command.h"
+
+namespace {
+
+class StationListCommand : public StationFileCommands {
+protected:
+    std::vector<std::wstring> List() {
+        lines_.clear();
+        EXPECT_EQ(
+            0, ListStationsCommand([this](const std::wstring& line) { lines_.push_back(line); }));
+        return lines_;
+    }
+};
+
+TEST_F(StationListCommand, ThreeThousandStationsAreListedInTheStoresOrder) {
+    EXPECT_EQ(std::vector<std::wstring>{L"No stations."}, List());
+    std::vector<Station> stations;
+    for (int number = 0; number < 3000; ++number) {
+        Station station = Named(L"Level " + std::to_wstring(number));
+        station.Port = number % 2 ? L"COM3" : L"COM1";
+        station.Parity = number % 3;
+        stations.push_back(station);
+    }
+    ASSERT_EQ(S_OK, AddStations(stations));
+    const std::vector<std::wstring> lines = List();
+    ASSERT_EQ(6000u, lines.size());
+    const std::vector<std::wstring> names = ListStationNames();
+    ASSERT_EQ(3000u, names.size());
+    for (size_t index = 0; index < names.size(); ++index)
+        EXPECT_EQ(names[index], lines[2 * index]);
+    // "Level 1" is in key "Station 1", wherever the registry's order puts it.
+    const auto first = std::find(lines.begin(), lines.end(), L"Level 1");
+    ASSERT_NE(lines.end(), first);
+    EXPECT_EQ(L"    COM3, 9600 baud, 7 data bits, parity Odd, Quorvel LV-10", *(first + 1));
+}
+
+TEST_F(StationListCommand, TextsThatWouldForgeLinesOrTerminalSequencesArePrintedEscaped) {
+    const struct {
+        std::wstring name;
+        std::wstring printed;
+    } cases[] = {
+        {L"Forged\r\nFake station", L"Forged\\x0D\\x0AFake station"},
+        {L"\x1B[2J\x1B]0;title\a", L"\\x1B[2J\\x1B]0;title\\x07"},
+        {L"csi\x9B"
+         L"31m",
+         L"csi\\x9B31m"},
+        {L"right\x202E"
+         L"txt.exe",
+         L"right\\u202Etxt.exe"},
+        {L"Plain ÄÖÜ", L"Plain ÄÖÜ"},
+    };
+    int key = 0;
+    for (const auto& test : cases) {
+        UniqueRegKey station = StationKey(L"Station " + std::to_wstring(key++));
+        SaveStationValues(Named(test.name), station.get());
+    }
+    // The other texts are printed the same way; a port read back as the computer's first port
+    // would hide it, so this one is on a computer without a port list.
+    ASSERT_EQ(ERROR_SUCCESS,
+              DeleteKeyRecursive(HKEY_LOCAL_MACHINE, L"HARDWARE\\DEVICEMAP\\SERIALCOMM"));
+    UniqueRegKey last = StationKey(L"Station " + std::to_wstring(key));
+    Station port = Named(L"Port");
+    port.Port = L"COM1\r\nInjected\x1B[0m";
+    SaveStationValues(port, last.get());
+
+    const std::vector<std::wstring> lines = List();
+    ASSERT_EQ(2 * (std::size(cases) + 1), lines.size());
+    for (size_t index = 0; index < std::size(cases); ++index)
+        EXPECT_EQ(cases[index].printed, lines[2 * index]);
+    EXPECT_EQ(
+        L"    COM1\\x0D\\x0AInjected\\x1B[0m, 9600 baud, 7 data bits, parity Even, "
+        L"Quorvel LV-10",
+        lines.back());
+    for (const std::wstring& line : lines) {
+        for (wchar_t unit : line)
+            EXPECT_FALSE(unit < 0x20 || (unit >= 0x7F && unit <= 0x9F)) << line;
+    }
+}
+
+}  // namespace
