@@ -48,9 +48,12 @@ bool SerialProtocol::AcceptWithinCap(size_t count) {
 // returns, before they answer the block: what ended the receive is neither written nor answered.
 uint8_t SerialProtocol::ReceiveBlock(int firstByte) {
     ReadBurst(firstByte);
-    // Looked at on every burst, good or bad: an instrument that never stops sending good blocks
-    // is still stopped by the user.
-    if (stopRequest_ || callback_.IsCancelled()) {
+    // The block procedures look at a cancel on every block, good or bad, before the block is
+    // written or answered: an instrument that never stops sending good blocks is still stopped
+    // by the user. The raw stream answers nothing, so a burst it has read is kept, and its own
+    // loop sees the cancel before the next one.
+    const bool answered = selector_ == 1 || selector_ == 2;
+    if (answered && (stopRequest_ || callback_.IsCancelled())) {
         receiveEnded_ = true;
         Report(kMessageError, texts_.Text(DriverText::InterruptedByUser));
         ClosePort();
