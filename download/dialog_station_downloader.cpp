@@ -22,28 +22,26 @@ HRESULT DialogStationDownloader::Download(HWND owner, const Station& station,
         completed = dialog.TransferCompleted();
         downloadResult = dialog.DownloadResult();
     };
-    std::wstring target;
+    // One library download per process: the library's completion says nothing of which download
+    // it ends. A second one is refused before its target, its dialog or the library is touched.
+    HalvekLibraryClaim claim;
     if (external) {
-        // One library download per process: the library's completion says nothing of which
-        // download it ends. A second one is refused before its target, its dialog or the
-        // library is touched.
-        HalvekLibraryClaim claim = HalvekLibraryClaim::TryTake();
+        claim = HalvekLibraryClaim::TryTake();
         if (!claim) {
             ShowMessageBox(owner, LoadUiText(IDS_LIBRARY_DOWNLOAD_RUNNING),
                            LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONEXCLAMATION);
             return HRESULT_FROM_WIN32(ERROR_BUSY);
         }
-        if (const HRESULT prepared = prepareTarget(target); FAILED(prepared))
-            return prepared;  // shown and logged where it failed
-        // The library writes its file under the given name with ".txt" added.
-        file = target + L".txt";
-        run(CHalvekDownloadProgressDialog(owner, station, target, std::move(claim)));
-    } else {
-        if (const HRESULT prepared = prepareTarget(target); FAILED(prepared))
-            return prepared;  // shown and logged where it failed
-        file = target;
-        run(CDownloadProgressDialog(owner, station, target));
     }
+    std::wstring target;
+    if (const HRESULT prepared = prepareTarget(target); FAILED(prepared))
+        return prepared;  // shown and logged where it failed
+    // The library writes its file under the given name with ".txt" added.
+    file = external ? target + L".txt" : target;
+    if (external)
+        run(CHalvekDownloadProgressDialog(owner, station, target, std::move(claim)));
+    else
+        run(CDownloadProgressDialog(owner, station, target));
     // The dialogs are gone, and with them the download thread: nothing writes the file now.
     // Only a transfer that reported its end makes a file; an IDOK from anywhere else, a cancel
     // or a dialog that could not run leaves at most a partial file.
