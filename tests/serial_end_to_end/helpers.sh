@@ -7,7 +7,7 @@ build=$(cd "${1:?build directory}" && pwd)
 procedure=${2:?procedure}
 root=$(cd "$(dirname "${BASH_SOURCE[0]}")/../.." && pwd)
 . "$root/scripts/wine-env" "$build"
-lv_wine_prefix_ready
+lv_wine_prefix_ready || exit 1
 bin="$build/bin"
 sample="$root/tools/lvsim/samples/survey.lv"
 work="$build/serial_end_to_end/$procedure"
