@@ -25,7 +25,8 @@ TAZComm::TAZComm(TParserCallBack* callback, TAZCommParams* params)
         protocol_->SetPortOpen(true);
         return;
     }
-    callback_->ShowMessage(kMessagePortNotOpened, g_texts.Text(DriverText::PortNotOpened).c_str());
+    callback_->ShowMessage(MessageCode::PortNotOpened,
+                           g_texts.Text(DriverText::PortNotOpened).c_str());
 }
 
 TAZComm::~TAZComm() {
@@ -48,7 +49,7 @@ bool TAZComm::OpenPort() {
     // Only a configuration failure has a system text of its own; a port that did not open
     // gets the driver's message alone.
     if (port_->IsValid())
-        callback_->ShowMessage(kMessageError, SystemMessageText(error).c_str());
+        callback_->ShowMessage(MessageCode::Error, SystemMessageText(error).c_str());
     return false;
 }
 
@@ -56,17 +57,23 @@ bool TAZComm::IsPortOpen() const noexcept {
     return protocol_->IsPortOpen();
 }
 
-uint32_t TAZComm::ReceiveLines() {
+TransferResult TAZComm::ReceiveLines() {
     // The time-outs are set per procedure: lines are framed by CR LF, blocks by silence.
     const DCB& dcb = params_->DeviceControlBlock;
-    const uint32_t bitsPerCharacter =
-        1 + dcb.ByteSize + (dcb.Parity != NOPARITY ? 1 : 0) + (dcb.StopBits == ONESTOPBIT ? 1 : 2);
+    constexpr uint32_t kStartBits = 1;
+    constexpr uint32_t kParityBits = 1;
+    // ONE5STOPBITS is counted as two: the interval only needs to be long enough.
+    constexpr uint32_t kOneStopBit = 1;
+    constexpr uint32_t kTwoStopBits = 2;
+    const uint32_t bitsPerCharacter = kStartBits + dcb.ByteSize +
+                                      (dcb.Parity != NOPARITY ? kParityBits : 0) +
+                                      (dcb.StopBits == ONESTOPBIT ? kOneStopBit : kTwoStopBits);
     // A port that refuses them keeps the block time-outs: slower per line, still correct.
     (void)port_->SetTimeouts(ToCommTimeouts(MakeLineTimeouts(dcb.BaudRate, bitsPerCharacter)));
     return protocol_->ReceiveLines();
 }
 
-uint32_t TAZComm::Receive() {
+TransferResult TAZComm::Receive() {
     (void)port_->SetTimeouts(params_->Timeouts);  // as opened; refused only by a port gone bad
     return protocol_->Receive();
 }
@@ -87,11 +94,11 @@ bool TAZComm::IsFileOpened() const noexcept {
     return protocol_->IsFileOpened();
 }
 
-uint32_t TAZComm::SendYModemHeader(const std::wstring& path) {
+TransferResult TAZComm::SendYModemHeader(const std::wstring& path) {
     WIN32_FILE_ATTRIBUTE_DATA attributes{};
     if (!::GetFileAttributesExW(path.c_str(), GetFileExInfoStandard, &attributes)) {
-        callback_->ShowMessage(kMessageError, SystemMessageText(::GetLastError()).c_str());
-        return 1;
+        callback_->ShowMessage(MessageCode::Error, SystemMessageText(::GetLastError()).c_str());
+        return TransferResult::Failed;
     }
     // The name travels as multibyte text of the thread's code page.
     const wchar_t* name = path.c_str();
@@ -118,7 +125,7 @@ bool TAZComm::CheckInputFile() {
     UniqueFileHandle input(::CreateFileW(params_->OutputPath.c_str(), GENERIC_READ, FILE_SHARE_READ,
                                          nullptr, OPEN_EXISTING, FILE_ATTRIBUTE_NORMAL, nullptr));
     if (!input) {
-        callback_->ShowMessage(kMessageError, SystemMessageText(::GetLastError()).c_str());
+        callback_->ShowMessage(MessageCode::Error, SystemMessageText(::GetLastError()).c_str());
         return false;
     }
     std::vector<uint8_t> bytes;

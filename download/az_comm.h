@@ -8,63 +8,67 @@
 #include <string>
 
 #include "download/portable/parser_callback.h"
+#include "download/portable/protocol_io.h"
+#include "download/portable/protocol_vocabulary.h"
 
 class SerialProtocol;
 class Win32SerialPort;
 class Win32ReceiveFile;
 
-// Protocol selectors of the connection record.
-constexpr uint32_t kProtocolRawStream = 0;
-constexpr uint32_t kProtocolBccBlocks = 1;
-constexpr uint32_t kProtocolYModem = 2;
-constexpr uint32_t kProtocolRawStreamAlt = 3;
+// The longest port name the connection record holds, e.g. L"\\.\COM1234".
+constexpr size_t kPortNameCapacity = 14;
+// The framing of every receive: seven data bits (the caller sets the parity and one stop bit).
+constexpr BYTE kReceiveDataBits = 7;
 
 // The connection record, filled by the caller and read by the driver. The caller sets
-// DeviceControlBlock.BaudRate, ByteSize (7), Parity (0 none, 1 odd, 2 even) and StopBits (0);
-// the driver fills the rest of the block and the time-outs.
+// DeviceControlBlock.BaudRate, ByteSize (kReceiveDataBits), Parity (NOPARITY, ODDPARITY or
+// EVENPARITY) and StopBits (ONESTOPBIT); the driver fills the rest of the block and the time-outs.
 struct TAZCommParams {
     DCB DeviceControlBlock{};
     COMMTIMEOUTS Timeouts{};
-    wchar_t PortName[15]{};  // e.g. L"COM1", passed to CreateFileW as it stands
-    uint32_t Protocol = kProtocolBccBlocks;
+    wchar_t PortName[kPortNameCapacity + 1]{};  // passed to CreateFileW as it stands
+    // The protocol selector, 32 bits as in the record; StoredSelectorOf gives its number.
+    ReceiveProcedure Protocol = ReceiveProcedure::BccBlocks;
     std::wstring OutputPath;
 };
+static_assert(sizeof(ReceiveProcedure) == sizeof(uint32_t));
 
 // Owns the port from construction to destruction. Not copyable; all receives run on one thread,
 // only Stop() may be called from another.
 class TAZComm {
 public:
-    // Configures and opens the port. On failure reports code 50 (after the system text, code 4,
-    // where there is one) and leaves the object unusable: every receive then returns 1.
+    // Configures and opens the port. On failure reports MessageCode::PortNotOpened (after the
+    // system text, MessageCode::Error, where there is one) and leaves the object unusable: every
+    // receive then fails.
     // Neither pointer is owned; both must outlive the driver.
     TAZComm(TParserCallBack* callback, TAZCommParams* params);
     ~TAZComm();
     TAZComm(const TAZComm&) = delete;
     TAZComm& operator=(const TAZComm&) = delete;
 
-    bool IsPortOpen() const noexcept;
+    [[nodiscard]] bool IsPortOpen() const noexcept;
 
-    // The line protocol ("A,01,Z" … "Z,&,"): 0 when the file is complete, 1 otherwise.
-    [[nodiscard]] uint32_t ReceiveLines();
-    // The procedure chosen by the record's Protocol selector: 0 success, 1 failure or stop.
-    [[nodiscard]] uint32_t Receive();
+    // The line protocol ("A,01,Z" … "Z,&,"): Complete when the file is complete.
+    [[nodiscard]] TransferResult ReceiveLines();
+    // The procedure chosen by the record's Protocol: Complete, or Failed on a failure or stop.
+    [[nodiscard]] TransferResult Receive();
 
     // Outside stop switch, read by every receive loop at its next check. Safe from any thread.
     void Stop() noexcept;
     // The size announced by a Y-Modem header block; 0 otherwise.
-    uint32_t FileSize() const noexcept;
+    [[nodiscard]] uint32_t FileSize() const noexcept;
 
     // Sending side. Sends a Y-Modem header block for the file at path (name, size, creation
-    // time) once the receiver has sent anything, until it is acknowledged: 0 success, 1 failure.
-    [[nodiscard]] uint32_t SendYModemHeader(const std::wstring& path);
+    // time) once the receiver has sent anything, until it is acknowledged.
+    [[nodiscard]] TransferResult SendYModemHeader(const std::wstring& path);
     // Checks that the record's OutputPath holds BCC blocks numbered 0, 1, 2 … ended by EOT:
-    // false only on a BCC mismatch or an unreadable file (both reported, code 4).
+    // false only on a BCC mismatch or an unreadable file (both reported, MessageCode::Error).
     [[nodiscard]] bool CheckInputFile();
     // The system's code of the output-file write that failed the last receive (already reported,
-    // code 4); 0 when none did.
-    uint32_t FileError() const noexcept;
+    // MessageCode::Error); kFileWritten when none did.
+    [[nodiscard]] uint32_t FileError() const noexcept;
     // Set at opening; cleared by CheckInputFile on a wrong block kind or digit.
-    bool IsFileOpened() const noexcept;
+    [[nodiscard]] bool IsFileOpened() const noexcept;
 
 private:
     [[nodiscard]] bool OpenPort();

@@ -13,7 +13,7 @@ CDownloadProgressDialog::CDownloadProgressDialog(HWND parent, const Station& sta
 CDownloadProgressDialog::~CDownloadProgressDialog() {
     if (thread_) {
         // A cancel during a transfer waits here until the driver has seen the stop request.
-        thread_->StopAndWait(INFINITE);
+        (void)thread_->StopAndWait(INFINITE);  // an infinite wait ends only with the thread
         thread_.reset();
     }
 }
@@ -76,7 +76,9 @@ void CDownloadProgressDialog::OnThreadMessage(WPARAM code, LPARAM text) {
         CLVDownloadThread::FreeMessageText(text);
         return;
     }
-    if (code == kMessageError || code == kMessagePortNotOpened) {
+    // A number that names no code is taken as the progress text it most likely is.
+    const std::optional<MessageCode> kind = MessageCodeOfPosted(code);
+    if (kind == MessageCode::Error || kind == MessageCode::PortNotOpened) {
         // The dialog stays open: the thread ends and closes it. The text is freed once the box
         // is closed, which is what the thread waits for before it shows a box of its own.
         ShowMessageBox(Window(), message, LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONSTOP);

@@ -6,6 +6,7 @@
 #include <chrono>
 #include <condition_variable>
 #include <mutex>
+#include <optional>
 #include <string>
 #include <unordered_map>
 
@@ -17,9 +18,8 @@
 
 namespace {
 
-constexpr DWORD kGeneralFailure = 0x80004005;
-constexpr uint32_t kReceiveFailed = 1;
-constexpr size_t kPortNameLength = 14;
+// The arguments of "Download Thread Finished" and WM_CLOSE: both messages carry none.
+constexpr WPARAM kNoArgument = 0;
 
 // The texts handed over with "Download Thread Message" that nobody has freed yet, with the
 // thread that posted each. The receiver frees a text when it handles it, but a modal dialog's
@@ -44,7 +44,7 @@ LiveTexts& PostedTexts() {
 // The progress text: "%d" becomes the percent and "%%" a percent sign. A translation with any
 // other conversion would be unsafe to hand to a formatter, so it is built here and refused
 // (false) instead.
-bool FormatPercentText(const std::wstring& format, int percent, std::wstring& text) {
+[[nodiscard]] bool FormatPercentText(const std::wstring& format, int percent, std::wstring& text) {
     text.clear();
     for (size_t index = 0; index < format.size(); ++index) {
         if (format[index] != L'%') {
@@ -96,14 +96,15 @@ CLVDownloadThread::~CLVDownloadThread() {
 std::unique_ptr<TAZCommParams> CLVDownloadThread::MakeConnectionRecord(
     const Station& station, const std::wstring& outputPath) {
     auto params = std::make_unique<TAZCommParams>();
-    // The built-in download always runs at 7 data bits, one stop bit, selector 1 (no XON/XOFF),
-    // whatever the station says about data bits, stop bits, protocol, flow and check sum.
+    // The built-in download always runs at 7 data bits, one stop bit, with the BCC blocks'
+    // selector (no XON/XOFF), whatever the station says about data bits, stop bits, protocol, flow
+    // and check sum.
     params->DeviceControlBlock.BaudRate = station.BaudRate;
-    params->DeviceControlBlock.ByteSize = 7;
+    params->DeviceControlBlock.ByteSize = kReceiveDataBits;
     params->DeviceControlBlock.Parity = static_cast<BYTE>(station.Parity);
     params->DeviceControlBlock.StopBits = ONESTOPBIT;
-    params->Protocol = kProtocolBccBlocks;
-    const size_t length = std::min(station.Port.size(), kPortNameLength);
+    params->Protocol = ReceiveProcedure::BccBlocks;
+    const size_t length = std::min(station.Port.size(), kPortNameCapacity);
     std::copy_n(station.Port.data(), length, params->PortName);
     params->PortName[length] = L'\0';
     params->OutputPath = outputPath;
@@ -111,8 +112,10 @@ std::unique_ptr<TAZCommParams> CLVDownloadThread::MakeConnectionRecord(
 }
 
 DWORD CLVDownloadThread::Run() {
-    const DWORD result = driver_ ? driver_->ReceiveLines() : kGeneralFailure;
-    if (result == kReceiveFailed) {
+    // Without a driver the port's failure has been reported already: no box of our own.
+    const std::optional<TransferResult> result =
+        driver_ ? std::optional(driver_->ReceiveLines()) : std::nullopt;
+    if (result == TransferResult::Failed) {
         // The dialog shows the driver's own messages (a full disk, say) in boxes of its own: one
         // box after the other, the reason before the summary, not two at once from two threads.
         WaitForShownTexts();
@@ -120,13 +123,13 @@ DWORD CLVDownloadThread::Run() {
         ShowMessageBox(notifyWindow_, LoadUiText(IDS_SERIAL_WAIT_EXPIRED),
                        LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONEXCLAMATION);
     }
-    received_ = result == 0;
-    const uint32_t fileError = driver_ ? driver_->FileError() : 0;
-    if (fileError != 0)
+    received_ = result == TransferResult::Complete;
+    const uint32_t fileError = driver_ ? driver_->FileError() : kFileWritten;
+    if (fileError != kFileWritten)
         result_ = HRESULT_FROM_WIN32(fileError);
     else if (!received_)
         result_ = S_FALSE;
-    return 0;
+    return kRunExitCode;
 }
 
 void CLVDownloadThread::WaitForShownTexts() noexcept {
@@ -149,12 +152,12 @@ void CLVDownloadThread::WaitForShownTexts() noexcept {
 
 void CLVDownloadThread::OnEnd() {
     if (received_)
-        PostToWindow(g_registeredMessages.downloadThreadFinished, 0, 0);
+        PostToWindow(g_registeredMessages.downloadThreadFinished, kNoArgument, kNoArgument);
     else
-        PostToWindow(WM_CLOSE, 0, 0);
+        PostToWindow(WM_CLOSE, kNoArgument, kNoArgument);
 }
 
-void CLVDownloadThread::ShowMessage(uint32_t code, const WideChar* text) {
+void CLVDownloadThread::ShowMessage(MessageCode code, const WideChar* text) {
     if (!::IsWindow(notifyWindow_))
         return;  // the dialog is gone: no copy, nothing posted
     const size_t length = text ? std::wcslen(text) : 0;
@@ -170,8 +173,8 @@ void CLVDownloadThread::ShowMessage(uint32_t code, const WideChar* text) {
         delete[] copy;  // no room to keep track of it: the message is not sent
         return;
     }
-    if (!::PostMessageW(notifyWindow_, g_registeredMessages.downloadThreadMessage, code,
-                        reinterpret_cast<LPARAM>(copy))) {
+    if (!::PostMessageW(notifyWindow_, g_registeredMessages.downloadThreadMessage,
+                        PostedCodeOf(code), reinterpret_cast<LPARAM>(copy))) {
         FreeMessageText(reinterpret_cast<LPARAM>(copy));  // never delivered: still ours
     }
 }
@@ -187,7 +190,7 @@ void CLVDownloadThread::SetProgress(uint32_t total, uint32_t current) {
         (void)FormatPercentText(LoadText(ThisModule(), IDS_TRANSFER_PERCENT, kEnglishLanguage),
                                 percent, text);
     }
-    ShowMessage(kMessageInformation, text.c_str());
+    ShowMessage(MessageCode::Information, text.c_str());
 }
 
 bool CLVDownloadThread::IsCancelled() {

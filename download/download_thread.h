@@ -22,22 +22,26 @@ public:
     // the texts it posted that no receiver freed.
     ~CLVDownloadThread() override;
 
-    // Receives the file with the line protocol. Always 0.
+    // The thread's exit code, whatever the receive's end: the window learns that by message.
+    static constexpr DWORD kRunExitCode = 0;
+
+    // Receives the file with the line protocol. Always kRunExitCode.
     DWORD Run() override;
     // Tells the window how the receive ended: "Download Thread Finished" for a complete file,
     // WM_CLOSE for anything else (a Run that threw included).
     void OnEnd() override;
 
     // TParserCallBack, called on the worker.
-    void ShowMessage(uint32_t code, const WideChar* text) override;
+    // Posts "Download Thread Message" with PostedCodeOf(code) and a copy of text.
+    void ShowMessage(MessageCode code, const WideChar* text) override;
     void SetProgress(uint32_t total, uint32_t current) override;
     bool IsCancelled() override;
 
-    bool HasDriver() const noexcept { return driver_ != nullptr; }
+    [[nodiscard]] bool HasDriver() const noexcept { return driver_ != nullptr; }
     // Why the output file is not complete, once Run has ended: the HRESULT of the write the
     // system refused, S_FALSE for a receive that failed otherwise (time-out, cancel), S_OK when
     // the file is complete or no receive ended yet.
-    HRESULT DownloadResult() const noexcept { return result_.load(); }
+    [[nodiscard]] HRESULT DownloadResult() const noexcept { return result_.load(); }
     const TAZCommParams& ConnectionRecord() const noexcept { return *params_; }
 
     // The text copies handed over with "Download Thread Message": the receiver frees each one

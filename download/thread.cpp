@@ -23,7 +23,7 @@ HANDLE CThread::Start() {
     return thread_.get();
 }
 
-uint32_t CThread::GetStatus() {
+uint32_t CThread::GetStatus() noexcept {
     if (state_.load() == kRunning) {
         DWORD exitCode = STILL_ACTIVE;
         if (::GetExitCodeThread(thread_.get(), &exitCode) && exitCode != STILL_ACTIVE)
@@ -32,7 +32,7 @@ uint32_t CThread::GetStatus() {
     return state_.load();
 }
 
-DWORD CThread::Wait(DWORD milliseconds) {
+DWORD CThread::Wait(DWORD milliseconds) noexcept {
     if (state_.load() != kRunning)
         return kNotApplicable;
     return ::WaitForSingleObject(thread_.get(), milliseconds);
@@ -43,7 +43,7 @@ DWORD CThread::StopAndWait(DWORD milliseconds) {
     return Wait(milliseconds);
 }
 
-DWORD CThread::GetExitCode() const {
+DWORD CThread::GetExitCode() const noexcept {
     DWORD exitCode = 0;
     if (!::GetExitCodeThread(thread_.get(), &exitCode))
         return 0;

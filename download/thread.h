@@ -25,11 +25,12 @@ public:
     // be created.
     HANDLE Start();
     // The state; a running thread whose exit code is no longer STILL_ACTIVE becomes finished.
-    uint32_t GetStatus();
+    [[nodiscard]] uint32_t GetStatus() noexcept;
     // The wait result for the thread's handle, or 0xFFFFFFFF when not running.
-    DWORD Wait(DWORD milliseconds);
-    DWORD StopAndWait(DWORD milliseconds);
-    DWORD GetExitCode() const;
+    [[nodiscard]] DWORD Wait(DWORD milliseconds) noexcept;
+    // Stop (which a derived class may override), then Wait.
+    [[nodiscard]] DWORD StopAndWait(DWORD milliseconds);
+    [[nodiscard]] DWORD GetExitCode() const noexcept;
 
     // Runs first on the worker thread.
     virtual void OnStart();

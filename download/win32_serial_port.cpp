@@ -155,7 +155,10 @@ uint32_t Win32ProtocolClock::TickMilliseconds() {
     return ::GetTickCount();
 }
 
-uint32_t Win32ReceiveFile::Create() {
+// The protocol takes the system's success for a written file.
+static_assert(kFileWritten == ERROR_SUCCESS);
+
+uint32_t Win32ReceiveFile::Create() noexcept {
     // The data object holds its download's file open for reading from its creation on, so that
     // nobody can delete or swap it: the file is shared with readers, never with other writers,
     // and an existing file (that one) is emptied rather than replaced.
@@ -164,7 +167,7 @@ uint32_t Win32ReceiveFile::Create() {
     return handle_ ? ERROR_SUCCESS : ::GetLastError();
 }
 
-uint32_t Win32ReceiveFile::Write(const uint8_t* bytes, size_t count) {
+uint32_t Win32ReceiveFile::Write(const uint8_t* bytes, size_t count) noexcept {
     if (count == 0)
         return ERROR_SUCCESS;
     if (!handle_)
@@ -178,14 +181,14 @@ uint32_t Win32ReceiveFile::Write(const uint8_t* bytes, size_t count) {
     return written == count ? ERROR_SUCCESS : ERROR_DISK_FULL;
 }
 
-uint64_t Win32ReceiveFile::Position() {
+uint64_t Win32ReceiveFile::Position() noexcept {
     LARGE_INTEGER position{};
     if (!handle_ || !::SetFilePointerEx(handle_.get(), LARGE_INTEGER{}, &position, FILE_CURRENT))
         return 0;
     return static_cast<uint64_t>(position.QuadPart);
 }
 
-uint32_t Win32ReceiveFile::Close() {
+uint32_t Win32ReceiveFile::Close() noexcept {
     if (!handle_)
         return ERROR_SUCCESS;
     // Data the system still holds in its cache can fail to reach the disk (a network folder, a

@@ -58,10 +58,10 @@ public:
 class Win32ReceiveFile final : public ReceiveFile {
 public:
     explicit Win32ReceiveFile(std::wstring path) : path_(std::move(path)) {}
-    uint32_t Create() override;
-    uint32_t Write(const uint8_t* bytes, size_t count) override;
-    uint64_t Position() override;
-    uint32_t Close() override;
+    [[nodiscard]] uint32_t Create() noexcept override;
+    [[nodiscard]] uint32_t Write(const uint8_t* bytes, size_t count) noexcept override;
+    uint64_t Position() noexcept override;
+    [[nodiscard]] uint32_t Close() noexcept override;
 
 private:
     std::wstring path_;

@@ -15,8 +15,8 @@ namespace {
 // Notes when each line was answered: the driver reports progress right after each ACK.
 class TimingCallback final : public TParserCallBack {
 public:
-    void ShowMessage(uint32_t code, const wchar_t* text) override {
-        std::fprintf(stderr, "driver message %u: %ls\n", code, text);
+    void ShowMessage(MessageCode code, const wchar_t* text) override {
+        std::fprintf(stderr, "driver message %u: %ls\n", PostedCodeOf(code), text);
     }
     void SetProgress(uint32_t, uint32_t current) override {
         if (current == 0)
@@ -69,11 +69,11 @@ bool RunAt(const Options& options, unsigned baud) {
     const std::wstring output = ExecutableDirectory() + L"\\bench-received.lv";
     TAZCommParams params;
     params.DeviceControlBlock.BaudRate = baud;
-    params.DeviceControlBlock.ByteSize = 7;
-    params.DeviceControlBlock.Parity = 2;
-    params.DeviceControlBlock.StopBits = 0;
+    params.DeviceControlBlock.ByteSize = kReceiveDataBits;
+    params.DeviceControlBlock.Parity = EVENPARITY;
+    params.DeviceControlBlock.StopBits = ONESTOPBIT;
     const std::wstring device = L"\\\\.\\" + options.driverPort;
-    wcsncpy(params.PortName, device.c_str(), 14);
+    wcsncpy(params.PortName, device.c_str(), kPortNameCapacity);
     params.OutputPath = output;
     TimingCallback callback;
     TAZComm driver(&callback, &params);
@@ -97,7 +97,7 @@ bool RunAt(const Options& options, unsigned baud) {
     UniqueHandle simulator(process.hProcess);
     UniqueHandle thread(process.hThread);
     const double cpuBefore = ProcessCpuSeconds();
-    const uint32_t result = driver.ReceiveLines();
+    const TransferResult result = driver.ReceiveLines();
     const double cpu = ProcessCpuSeconds() - cpuBefore;
     ::WaitForSingleObject(simulator.get(), 30000);
 
@@ -114,10 +114,11 @@ bool RunAt(const Options& options, unsigned baud) {
         frequency.QuadPart;
     const double limit =
         (received + answered) * 10.0 / baud + timedLines * options.turnaroundMs / 1000.0;
+    const bool complete = result == TransferResult::Complete;
     std::printf("%6u  %-8s  %8.0f  %7.0f  %8.2f  %8.2f  %6.3f  %6.3f (%.2f%% of wall)\n", baud,
-                result == 0 ? "complete" : "FAILED", received, answered, wall, limit,
-                wall / limit, cpu, 100.0 * cpu / wall);
-    return result == 0;
+                complete ? "complete" : "FAILED", received, answered, wall, limit, wall / limit,
+                cpu, 100.0 * cpu / wall);
+    return complete;
 }
 
 }  // namespace

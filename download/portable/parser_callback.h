@@ -3,20 +3,19 @@
 
 #include <cstdint>
 
+#include "download/portable/protocol_vocabulary.h"
 #include "support/portable/wide_text.h"
 
-// Message codes passed with ShowMessage.
-constexpr uint32_t kMessageInformation = 1;  // information or progress text
-constexpr uint32_t kMessageError = 4;
-constexpr uint32_t kMessagePortNotOpened = 50;
+// The total the procedures pass with SetProgress, but Y-Modem, which passes the announced size.
+constexpr uint32_t kProgressScale = 100;
 
 // Implemented by whoever runs the driver (the download thread); called on the driver's thread.
 class TParserCallBack {
 public:
     virtual ~TParserCallBack() = default;
     // text is zero-terminated and lives only for the call.
-    virtual void ShowMessage(uint32_t code, const WideChar* text) = 0;
-    // The line protocol always passes total 100.
+    virtual void ShowMessage(MessageCode code, const WideChar* text) = 0;
+    // The line protocol always passes total kProgressScale.
     virtual void SetProgress(uint32_t total, uint32_t current) = 0;
     virtual bool IsCancelled() = 0;
 };

@@ -1,9 +1,9 @@
 // The port settings the driver applies.
 #include "download/portable/port_setup.h"
 
-DeviceControlFields MakeDeviceControlFields(uint32_t protocolSelector) noexcept {
+DeviceControlFields MakeDeviceControlFields(ReceiveProcedure procedure) noexcept {
     DeviceControlFields fields;
-    if (protocolSelector == 0)
+    if (procedure == ReceiveProcedure::RawStream)
         fields.Flags |= kDcbXonXoffOut | kDcbXonXoffIn;
     else
         fields.Flags &= ~(kDcbXonXoffOut | kDcbXonXoffIn);
@@ -15,15 +15,20 @@ PortTimeouts MakePortTimeouts() noexcept {
 }
 
 PortTimeouts MakeLineTimeouts(uint32_t baudRate, uint32_t bitsPerCharacter) noexcept {
+    constexpr uint64_t kIntervalCharacters = 2;
+    constexpr uint64_t kMillisecondsPerSecond = 1000;
+    constexpr uint32_t kShortestInterval = 1;  // a 0 interval would mean none at all
+    constexpr uint32_t kNoMultiplier = 0;
+    constexpr uint32_t kSilentReadMilliseconds = 100;
     PortTimeouts timeouts;
     if (baudRate == 0)
         return timeouts;  // no rate to pace by: the port refuses such a setting anyway
-    // Two character times, rounded up to whole milliseconds and never 0 (0 means no interval).
-    const uint64_t twoCharacters = 2ull * bitsPerCharacter * 1000;
-    timeouts.ReadInterval = static_cast<uint32_t>((twoCharacters + baudRate - 1) / baudRate);
-    if (timeouts.ReadInterval == 0)
-        timeouts.ReadInterval = 1;
-    timeouts.ReadTotalMultiplier = 0;
-    timeouts.ReadTotalConstant = 100;
+    // Two character times, rounded up to whole milliseconds and never 0.
+    const uint64_t intervalBits = kIntervalCharacters * bitsPerCharacter * kMillisecondsPerSecond;
+    timeouts.ReadInterval = static_cast<uint32_t>((intervalBits + baudRate - 1) / baudRate);
+    if (timeouts.ReadInterval < kShortestInterval)
+        timeouts.ReadInterval = kShortestInterval;
+    timeouts.ReadTotalMultiplier = kNoMultiplier;
+    timeouts.ReadTotalConstant = kSilentReadMilliseconds;
     return timeouts;
 }

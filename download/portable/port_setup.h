@@ -3,6 +3,8 @@
 
 #include <cstdint>
 
+#include "download/portable/protocol_vocabulary.h"
+
 // DCB flag bits as the driver sets them.
 constexpr uint32_t kDcbBinary = 0x0001;
 constexpr uint32_t kDcbParityCheck = 0x0002;
@@ -29,9 +31,9 @@ struct DeviceControlFields {
     uint16_t Reserved1 = 0;
 };
 
-// Software flow control only for the raw stream of selector 0: with every other selector XON
-// and XOFF are data bytes (they occur inside BCC and Y-Modem blocks).
-DeviceControlFields MakeDeviceControlFields(uint32_t protocolSelector) noexcept;
+// Software flow control only for ReceiveProcedure::RawStream: with every other procedure XON and
+// XOFF are data bytes (they occur inside BCC and Y-Modem blocks).
+[[nodiscard]] DeviceControlFields MakeDeviceControlFields(ReceiveProcedure procedure) noexcept;
 
 // Milliseconds. The block procedures' time-outs: a read returns after 50 ms of silence between
 // bytes or after 100 ms plus 1 ms per byte asked for. A burst (a block) is framed by that silence,
@@ -44,7 +46,7 @@ struct PortTimeouts {
     uint32_t WriteTotalConstant = 100;
 };
 
-PortTimeouts MakePortTimeouts() noexcept;
+[[nodiscard]] PortTimeouts MakePortTimeouts() noexcept;
 
 // The line protocol's time-outs at a baud rate and framing: a read returns once the bytes stop
 // for about two character times, or after 100 ms when nothing comes. A line is framed by its
@@ -53,4 +55,4 @@ PortTimeouts MakePortTimeouts() noexcept;
 // difference from those time-outs. The read time-outs' other documented mode for this
 // ("return as soon as any byte is there": interval and multiplier MAXDWORD) is not honoured by
 // Wine's serial layer, and a short interval does the same job on both.
-PortTimeouts MakeLineTimeouts(uint32_t baudRate, uint32_t bitsPerCharacter) noexcept;
+[[nodiscard]] PortTimeouts MakeLineTimeouts(uint32_t baudRate, uint32_t bitsPerCharacter) noexcept;

@@ -34,9 +34,12 @@ public:
     virtual uint32_t TickMilliseconds() = 0;
 };
 
+// What ReceiveFile answers when every byte is in the file (the system's code for success).
+constexpr uint32_t kFileWritten = 0;
+
 // The output file of one receive. Create empties an existing file. Write and Close answer the
-// system's error code, 0 when every byte is in the file: the driver must not acknowledge, nor
-// report as complete, what the disk refused.
+// system's error code, kFileWritten when every byte is in the file: the driver must not
+// acknowledge, nor report as complete, what the disk refused.
 class ReceiveFile {
 public:
     virtual ~ReceiveFile() = default;
@@ -45,6 +48,6 @@ public:
     [[nodiscard]] virtual uint32_t Write(const uint8_t* bytes, size_t count) = 0;
     // Bytes written so far.
     virtual uint64_t Position() = 0;
-    // Flushes and closes; later calls answer 0.
+    // Flushes and closes; later calls answer kFileWritten.
     [[nodiscard]] virtual uint32_t Close() = 0;
 };

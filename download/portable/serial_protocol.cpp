@@ -11,6 +11,7 @@ constexpr int64_t kWaitLimitSeconds = 60;
 constexpr uint32_t kSendGiveUpMilliseconds = 3000;
 constexpr uint32_t kMaxRefusedHeaderLines = 60;
 constexpr uint32_t kProgressLines = 30;
+constexpr uint32_t kNoProgress = 0;
 constexpr uint8_t kAckLine[] = {kAck, ',', 'R', ',', kCr, kLf};
 constexpr uint8_t kNakLine[] = {kNak, ',', '!', ',', kCr, kLf};
 constexpr char kHeaderLine[] = "A,01,Z";
@@ -26,7 +27,7 @@ bool SameText(const uint8_t* left, const uint8_t* right, size_t capacity) noexce
     for (size_t i = 0; i < capacity; ++i) {
         if (left[i] != right[i])
             return false;
-        if (left[i] == 0)
+        if (left[i] == kNul)
             return true;
     }
     return true;
@@ -35,13 +36,13 @@ bool SameText(const uint8_t* left, const uint8_t* right, size_t capacity) noexce
 
 SerialProtocol::SerialProtocol(SerialPort& port, ProtocolClock& clock, ReceiveFile& file,
                                TParserCallBack& callback, const DriverTextSource& texts,
-                               uint32_t protocolSelector) noexcept
+                               ReceiveProcedure procedure) noexcept
     : port_(port),
       clock_(clock),
       file_(file),
       callback_(callback),
       texts_(texts),
-      selector_(protocolSelector) {}
+      procedure_(procedure) {}
 
 void SerialProtocol::ClosePort() noexcept {
     if (!portOpen_)
@@ -51,55 +52,55 @@ void SerialProtocol::ClosePort() noexcept {
     portOpen_ = false;
 }
 
-void SerialProtocol::Report(uint32_t code, const WideString& text) {
+void SerialProtocol::Report(MessageCode code, const WideString& text) {
     callback_.ShowMessage(code, text.c_str());
 }
 
 bool SerialProtocol::CancelSeen() {
     if (!callback_.IsCancelled())
         return false;
-    Report(kMessageError, texts_.Text(DriverText::InterruptedByUser));
+    Report(MessageCode::Error, texts_.Text(DriverText::InterruptedByUser));
     ClosePort();
     return true;
 }
 
 bool SerialProtocol::CheckTimeoutAndCancel(int64_t lastProgress) {
     if (clock_.WallSeconds() - lastProgress > kWaitLimitSeconds) {
-        Report(kMessageError, texts_.Text(DriverText::WaitExpired));
+        Report(MessageCode::Error, texts_.Text(DriverText::WaitExpired));
         return false;
     }
     return !CancelSeen();
 }
 
 void SerialProtocol::FailOutput(uint32_t error) {
-    if (fileError_ != 0)
+    if (fileError_ != kFileWritten)
         return;  // the first failure is the one the user needs to see
     fileError_ = error;
-    Report(kMessageError, texts_.SystemErrorText(error));
+    Report(MessageCode::Error, texts_.SystemErrorText(error));
 }
 
 bool SerialProtocol::CreateOutputFile() {
-    fileError_ = 0;
+    fileError_ = kFileWritten;
     const uint32_t error = file_.Create();
-    if (error != 0)
+    if (error != kFileWritten)
         FailOutput(error);
-    return error == 0;
+    return error == kFileWritten;
 }
 
 bool SerialProtocol::WriteOutput(const uint8_t* bytes, size_t count) {
-    if (fileError_ != 0)
+    if (fileError_ != kFileWritten)
         return false;
     const uint32_t error = file_.Write(bytes, count);
-    if (error != 0)
+    if (error != kFileWritten)
         FailOutput(error);
-    return error == 0;
+    return error == kFileWritten;
 }
 
 bool SerialProtocol::CloseOutputFile() {
     const uint32_t error = file_.Close();
-    if (error != 0)
+    if (error != kFileWritten)
         FailOutput(error);
-    return fileError_ == 0;
+    return fileError_ == kFileWritten;
 }
 
 void SerialProtocol::SendBytes(const uint8_t* bytes, size_t count) {
@@ -120,17 +121,17 @@ void SerialProtocol::SendByteWithLineEnd(uint8_t value) {
     SendBytes(reply, sizeof reply);
 }
 
-uint32_t SerialProtocol::ReceiveLines() {
+TransferResult SerialProtocol::ReceiveLines() {
     if (!portOpen_)
-        return 1;
+        return TransferResult::Failed;
     if (!CreateOutputFile())
-        return 1;
+        return TransferResult::Failed;
     port_.Purge(true, true);
     int64_t lastProgress = clock_.WallSeconds();
-    callback_.SetProgress(100, 0);
+    callback_.SetProgress(kProgressScale, kNoProgress);
     // One more byte than a line holds, for the terminator after a full 128-byte line.
-    std::array<uint8_t, kLineCapacity + 1> previous{};
-    std::array<uint8_t, kLineCapacity + 1> line{};
+    std::array<uint8_t, kLineBufferSize> previous{};
+    std::array<uint8_t, kLineBufferSize> line{};
     std::array<uint8_t, kLineCapacity> overflow{};
     bool started = false;
     bool finished = false;
@@ -148,7 +149,7 @@ uint32_t SerialProtocol::ReceiveLines() {
             if (!CheckTimeoutAndCancel(lastProgress) || stopRequest_ ||
                 refusedHeaderLines > kMaxRefusedHeaderLines) {
                 (void)file_.Close();  // the receive has failed: a close error adds nothing
-                return 1;
+                return TransferResult::Failed;
             }
             if (length < kLineCapacity) {
                 length += port_.Read(line.data() + length, kLineCapacity - length);
@@ -164,7 +165,7 @@ uint32_t SerialProtocol::ReceiveLines() {
                 }
             }
         }
-        line[lineEnd] = 0;
+        line[lineEnd] = kNul;
 
         if (!started) {
             if (!StartsWith(line.data(), lineEnd, kHeaderLine)) {
@@ -183,7 +184,7 @@ uint32_t SerialProtocol::ReceiveLines() {
         // Every accepted line counts towards the cap, a repeated one too.
         if (!AcceptWithinCap(lineEnd)) {
             (void)file_.Close();  // the cap's message is the one the user sees
-            return 1;
+            return TransferResult::Failed;
         }
         // A line repeated because our ACK was lost is acknowledged again but written once. The
         // line goes into the file before the instrument hears that it arrived: a line the disk
@@ -193,37 +194,37 @@ uint32_t SerialProtocol::ReceiveLines() {
         if (!SameText(line.data(), previous.data(), line.size())) {
             if (!WriteOutput(line.data(), lineEnd)) {
                 (void)file_.Close();  // the write's error is the one the user sees
-                return 1;
+                return TransferResult::Failed;
             }
             std::memcpy(previous.data(), line.data(), lineEnd + 1);
         }
         // The end line is acknowledged only once the whole file is safely closed.
         if (finished && !CloseOutputFile())
-            return 1;
+            return TransferResult::Failed;
         SendBytes(kAckLine, sizeof kAckLine);
         lastProgress = clock_.WallSeconds();
         acceptedLines = std::min(acceptedLines + 1, kProgressLines);
-        callback_.SetProgress(100, acceptedLines * 100 / kProgressLines);
+        callback_.SetProgress(kProgressScale, acceptedLines * kProgressScale / kProgressLines);
         if (finished)
-            return 0;
+            return TransferResult::Complete;
     }
 }
 
-uint32_t SerialProtocol::SendYModemHeader(const YModemBlock& block) {
+TransferResult SerialProtocol::SendYModemHeader(const YModemBlock& block) {
     if (!portOpen_)
-        return 1;
+        return TransferResult::Failed;
     const int64_t start = clock_.WallSeconds();
     bool receiverSpoke = false;
     for (;;) {
         if (!CheckTimeoutAndCancel(start) || stopRequest_)
-            return 1;
+            return TransferResult::Failed;
         if (!receiverSpoke) {
-            receiverSpoke = ReadBurst(-1) > 0;
+            receiverSpoke = ReadBurst(std::nullopt) > 0;
             continue;
         }
         SendBytes(block.data(), block.size());
-        if (ReadBurst(-1) > 0 && MapBccReply(receiveBuffer_[0]) == kAck)
-            return 0;
+        if (ReadBurst(std::nullopt) > 0 && MapBccReply(receiveBuffer_[kBlockKindOffset]) == kAck)
+            return TransferResult::Complete;
     }
 }
 
@@ -236,7 +237,7 @@ bool SerialProtocol::CheckInputFile(const uint8_t* bytes, size_t size) {
             fileOpened_ = false;  // not a block file: noted, but not an error of the check
             return true;
         case BccFileCheck::Outcome::BccMismatch:
-            Report(kMessageError,
+            Report(MessageCode::Error,
                    FormatDriverText(texts_.Text(DriverText::InputFileBccMismatch),
                                     {DecimalText(check.Block), DecimalText(check.ValueInBlock),
                                      DecimalText(check.Computed)}));

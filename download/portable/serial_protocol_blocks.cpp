@@ -11,13 +11,17 @@ constexpr uint32_t kEnqRepollMilliseconds = 4000;
 constexpr int kBccTries = 5;
 constexpr int kYModemNakLimit = 10;
 constexpr int kFinalAcks = 10;
+constexpr uint32_t kNoProgress = 0;
+// The progress the raw stream and the BCC blocks show: steps of a tenth and of a twentieth.
+constexpr uint32_t kRawStreamSteps = 10;
+constexpr uint32_t kBccBlockSteps = 20;
 }  // namespace
 
-size_t SerialProtocol::ReadBurst(int firstByte) {
-    receiveBuffer_.fill(0);
+size_t SerialProtocol::ReadBurst(std::optional<uint8_t> firstByte) {
+    receiveBuffer_.fill(kNul);
     receiveCount_ = 0;
-    if (firstByte >= 0)
-        receiveBuffer_[receiveCount_++] = static_cast<uint8_t>(firstByte);
+    if (firstByte)
+        receiveBuffer_[receiveCount_++] = *firstByte;
     // A burst ends when a read brings nothing: the port's 50 ms interval time-out.
     while (receiveCount_ < kBlockCapacity) {
         const size_t got =
@@ -31,8 +35,9 @@ size_t SerialProtocol::ReadBurst(int firstByte) {
 
 void SerialProtocol::EndAtSizeLimit() {
     receiveEnded_ = true;
-    const WideString mebibytes = DecimalText(static_cast<long long>(receiveCap_ >> 20));
-    Report(kMessageError, FormatDriverText(texts_.Text(DriverText::SizeLimitReached), {mebibytes}));
+    const WideString mebibytes = DecimalText(static_cast<long long>(receiveCap_ >> kMebibyteShift));
+    Report(MessageCode::Error,
+           FormatDriverText(texts_.Text(DriverText::SizeLimitReached), {mebibytes}));
 }
 
 bool SerialProtocol::AcceptWithinCap(size_t count) {
@@ -46,42 +51,47 @@ bool SerialProtocol::AcceptWithinCap(size_t count) {
 
 // The procedures see a cancel, the cap or a refused write through ReceiveEnded right after this
 // returns, before they answer the block: what ended the receive is neither written nor answered.
-uint8_t SerialProtocol::ReceiveBlock(int firstByte) {
-    ReadBurst(firstByte);
+bool SerialProtocol::AnswersBlocks() const noexcept {
+    return procedure_ == ReceiveProcedure::BccBlocks || procedure_ == ReceiveProcedure::YModem;
+}
+
+uint8_t SerialProtocol::ReceiveBlock(std::optional<uint8_t> firstByte) {
+    (void)ReadBurst(firstByte);  // the count is kept in receiveCount_
     // The block procedures look at a cancel on every block, good or bad, before the block is
     // written or answered: an instrument that never stops sending good blocks is still stopped
     // by the user. The raw stream answers nothing, so a burst it has read is kept, and its own
     // loop sees the cancel before the next one.
-    const bool answered = selector_ == 1 || selector_ == 2;
-    if (answered && (stopRequest_ || callback_.IsCancelled())) {
+    if (AnswersBlocks() && (stopRequest_ || callback_.IsCancelled())) {
         receiveEnded_ = true;
-        Report(kMessageError, texts_.Text(DriverText::InterruptedByUser));
+        Report(MessageCode::Error, texts_.Text(DriverText::InterruptedByUser));
         ClosePort();
         return kNak;
     }
     const uint8_t* data = receiveBuffer_.data();
     size_t dataSize = receiveCount_;
-    if (selector_ == 2) {
-        data += 3;
+    if (procedure_ == ReceiveProcedure::YModem) {
+        data += kYModemDataOffset;
         dataSize = kBlockDataSize;
-    } else if ((selector_ == 1 || selector_ == 3) && receiveCount_ == kBlockCapacity) {
-        data += 1;
+    } else if ((procedure_ == ReceiveProcedure::BccBlocks ||
+                procedure_ == ReceiveProcedure::RawStreamWithoutFlowControl) &&
+               receiveCount_ == kBlockCapacity) {
+        data += kBccDataOffset;
         dataSize = kBlockDataSize;
     }
     uint8_t result = ValidateBlock(receiveBuffer_.data(), receiveCount_, crcTable_, receivedCheck_);
 
     // Every accepted block counts towards the cap, also one that writes nothing (a Y-Modem block
     // past the announced size, a BCC block repeated): an instrument that repeats forever ends too.
-    if (selector_ == 2) {
+    if (procedure_ == ReceiveProcedure::YModem) {
         if (result == kAck && AcceptWithinCap(kBlockDataSize)) {
             const uint32_t left = fileSize_ > bytesWritten_ ? fileSize_ - bytesWritten_ : 0;
             (void)WriteOutput(data, std::min<uint32_t>(left, kBlockDataSize));
             bytesWritten_ += kBlockDataSize;
         }
-    } else if (selector_ == 1) {
+    } else if (procedure_ == ReceiveProcedure::BccBlocks) {
         if (result != kNak && result != kEot && AcceptWithinCap(dataSize)) {
             // A block sent again because our reply was lost carries the same digit.
-            const uint32_t digit = receiveBuffer_[129];
+            const uint32_t digit = receiveBuffer_[kBccDigitOffset];
             if (digit != lastBlockDigit_)
                 (void)WriteOutput(data, dataSize);
             lastBlockDigit_ = digit;
@@ -94,118 +104,119 @@ uint8_t SerialProtocol::ReceiveBlock(int firstByte) {
     return result;
 }
 
-uint32_t SerialProtocol::Receive() {
+TransferResult SerialProtocol::Receive() {
     if (!portOpen_)
-        return 1;
+        return TransferResult::Failed;
     port_.Purge(true, true);
     if (!CreateOutputFile())
-        return 1;
+        return TransferResult::Failed;
     receiveEnded_ = false;
     acceptedBytes_ = 0;
-    uint32_t result = 1;
-    switch (selector_) {
-        case 1:
+    TransferResult result = TransferResult::Failed;
+    switch (procedure_) {
+        case ReceiveProcedure::BccBlocks:
             result = ReceiveBccBlocks();
             break;
-        case 2:
+        case ReceiveProcedure::YModem:
             result = ReceiveYModem();
             break;
-        default:
+        case ReceiveProcedure::RawStream:
+        case ReceiveProcedure::RawStreamWithoutFlowControl:
             result = ReceiveRawStream();
             break;
     }
     // A receive that ended well but left an incomplete file has failed.
     if (!CloseOutputFile())
-        result = 1;
+        result = TransferResult::Failed;
     return result;
 }
 
-uint32_t SerialProtocol::ReceiveRawStream() {
-    callback_.SetProgress(100, 0);
+TransferResult SerialProtocol::ReceiveRawStream() {
+    callback_.SetProgress(kProgressScale, kNoProgress);
     int64_t lastProgress = clock_.WallSeconds();
     uint32_t counter = 0;
     for (;;) {
         if (!CheckTimeoutAndCancel(lastProgress) || stopRequest_)
-            return 1;
-        uint8_t first = 0;
-        if (port_.Read(&first, 1) == 0)
+            return TransferResult::Failed;
+        uint8_t first = kNul;
+        if (port_.Read(&first, sizeof first) == 0)
             continue;
-        counter = std::min(counter + 1, 10u);
-        callback_.SetProgress(100, counter * 10);
+        counter = std::min(counter + 1, kRawStreamSteps);
+        callback_.SetProgress(kProgressScale, counter * kProgressScale / kRawStreamSteps);
         const uint8_t result = ReceiveBlock(first);
         if (ReceiveEnded())
-            return 1;
+            return TransferResult::Failed;
         lastProgress = clock_.WallSeconds();
         if (result == kEot)
-            return 0;
+            return TransferResult::Complete;
     }
 }
 
-uint32_t SerialProtocol::ReceiveBccBlocks() {
-    lastBlockDigit_ = 9;
-    callback_.SetProgress(100, 0);
+TransferResult SerialProtocol::ReceiveBccBlocks() {
+    lastBlockDigit_ = kNoBlockDigit;
+    callback_.SetProgress(kProgressScale, kNoProgress);
     const int64_t start = clock_.WallSeconds();
 
     SendByteWithLineEnd(kEnq);
     uint32_t enqSent = clock_.TickMilliseconds();
-    uint8_t result = ReceiveBlock(-1);
+    uint8_t result = ReceiveBlock(std::nullopt);
     while (result == kNak) {
         if (ReceiveEnded() || !CheckTimeoutAndCancel(start) || stopRequest_)
-            return 1;
+            return TransferResult::Failed;
         if (clock_.TickMilliseconds() - enqSent > kEnqRepollMilliseconds) {
             port_.Purge(true, true);
             SendByteWithLineEnd(kEnq);
             enqSent = clock_.TickMilliseconds();
         }
-        result = ReceiveBlock(-1);
+        result = ReceiveBlock(std::nullopt);
     }
     if (ReceiveEnded())
-        return 1;
+        return TransferResult::Failed;
 
     uint8_t reply = kAck;
-    uint32_t counter = 1;
+    uint32_t counter = 1;  // the first block shows as one step done
     while (reply != kEot) {
-        callback_.SetProgress(100, counter * 5);
-        counter = std::min(counter + 1, 20u);
+        callback_.SetProgress(kProgressScale, counter * kProgressScale / kBccBlockSteps);
+        counter = std::min(counter + 1, kBccBlockSteps);
         for (int tries = 1;; ++tries) {
             SendByteWithLineEnd(reply);
-            reply = MapBccReply(ReceiveBlock(-1));
+            reply = MapBccReply(ReceiveBlock(std::nullopt));
             if (ReceiveEnded())
-                return 1;
+                return TransferResult::Failed;
             if (reply != kNak)
                 break;
             if (tries == kBccTries) {
-                Report(kMessageError, texts_.Text(DriverText::BlockImportFailed));
-                return 1;
+                Report(MessageCode::Error, texts_.Text(DriverText::BlockImportFailed));
+                return TransferResult::Failed;
             }
         }
     }
     for (int i = 0; i < kFinalAcks; ++i)
         SendByteWithLineEnd(kAck);
-    return 0;
+    return TransferResult::Complete;
 }
 
-uint32_t SerialProtocol::ReceiveYModem() {
+TransferResult SerialProtocol::ReceiveYModem() {
     BuildCrcTable(crcTable_);
     const int64_t start = clock_.WallSeconds();
     bytesWritten_ = 0;
     if (!CheckTimeoutAndCancel(start))
-        return 1;
+        return TransferResult::Failed;
 
     // The header block is only read here, not written: the data blocks that follow are.
     for (;;) {
         const uint8_t request = kCrcRequest;
-        SendBytes(&request, 1);
-        const size_t count = ReadBurst(-1);
+        SendBytes(&request, sizeof request);
+        const size_t count = ReadBurst(std::nullopt);
         if (count > 0 &&
             ValidateBlock(receiveBuffer_.data(), count, crcTable_, receivedCheck_) != kNak)
             break;
         if (count > 0) {
             const uint8_t nak = kNak;
-            SendBytes(&nak, 1);
+            SendBytes(&nak, sizeof nak);
         }
         if (!CheckTimeoutAndCancel(start) || stopRequest_)
-            return 1;
+            return TransferResult::Failed;
     }
     const YModemHeaderInfo header = ParseYModemHeader(receiveBuffer_.data());
     fileSize_ = header.Size;
@@ -213,13 +224,13 @@ uint32_t SerialProtocol::ReceiveYModem() {
     expectedBlockCount_ = fileSize_ / kBlockCapacity + 1;
     WideString sizeText = WidenBytes(header.SizeText.data(), header.SizeText.size());
     sizeText += WIDE_TEXT(" byte");
-    Report(kMessageInformation,
+    Report(MessageCode::Information,
            FormatDriverText(texts_.Text(DriverText::YModemFileInfo),
                             {WidenBytes(header.Name.data(), header.Name.size()), sizeText}));
     // A file announced larger than the cap could never be received: its header is not accepted.
     if (header.Size > receiveCap_) {
         EndAtSizeLimit();
-        return 1;
+        return TransferResult::Failed;
     }
 
     const uint8_t acceptHeader[] = {kAck, kCrcRequest};
@@ -227,14 +238,14 @@ uint32_t SerialProtocol::ReceiveYModem() {
 
     int naksInARow = 0;
     for (;;) {
-        const uint8_t result = ReceiveBlock(-1);
+        const uint8_t result = ReceiveBlock(std::nullopt);
         if (ReceiveEnded())
-            return 1;
+            return TransferResult::Failed;
         if (result == kNak) {
-            SendBytes(&result, 1);
+            SendBytes(&result, sizeof result);
             if (++naksInARow >= kYModemNakLimit) {
-                Report(kMessageError, texts_.Text(DriverText::BlockImportFailed));
-                return 1;
+                Report(MessageCode::Error, texts_.Text(DriverText::BlockImportFailed));
+                return TransferResult::Failed;
             }
             continue;
         }
@@ -243,11 +254,11 @@ uint32_t SerialProtocol::ReceiveYModem() {
         const uint64_t lastByte = fileSize_ > 0 ? fileSize_ - 1 : 0;
         callback_.SetProgress(fileSize_, static_cast<uint32_t>(std::min(lastByte, written)));
         const uint8_t ack = kAck;
-        SendBytes(&ack, 1);
+        SendBytes(&ack, sizeof ack);
         if (result == kEot)
             break;
     }
     const uint8_t cancel[] = {kCan, kCan};
     SendBytes(cancel, sizeof cancel);
-    return 0;
+    return TransferResult::Complete;
 }

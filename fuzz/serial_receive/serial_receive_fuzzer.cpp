@@ -1,18 +1,37 @@
 // Arbitrary byte streams, in arbitrary bursts, fed to each receive procedure of the driver.
 #include <cstddef>
 #include <cstdint>
+#include <optional>
 
 #include "download/portable/serial_protocol.h"
 #include "tests/portable/serial/fake_serial.h"
 
-// Input: [procedure] [burst seed] stream... Procedure 0 is the line protocol, 1-4 the selectors
-// 0-3 of Receive. Each answer the driver writes, and each silence, lets the next burst arrive.
+namespace {
+// The first byte picks the procedure: the line protocol, or Receive with the stored selector
+// that is one less (so the seed corpus keeps its meaning).
+constexpr uint8_t kLineProtocol = 0;
+constexpr uint8_t kProcedureChoices = 5;
+constexpr size_t kProcedureByte = 0;
+constexpr size_t kSeedByte = 1;
+constexpr size_t kStreamStart = 2;
+constexpr int kKeepInput = 0;  // libFuzzer's answer for an input worth keeping
+}  // namespace
+
+// Input: [procedure] [burst seed] stream... Each answer the driver writes, and each silence,
+// lets the next burst arrive.
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
-    if (size < 2)
-        return 0;
-    const uint8_t procedure = data[0] % 5;
-    uint32_t seed = data[1] | 1u;
-    size_t offset = 2;
+    if (size < kStreamStart)
+        return kKeepInput;
+    const uint8_t choice = data[kProcedureByte] % kProcedureChoices;
+    // The line protocol runs with the download thread's procedure; every other choice is a
+    // stored selector, all of which name a procedure.
+    const std::optional<ReceiveProcedure> procedure =
+        choice == kLineProtocol ? ReceiveProcedure::BccBlocks
+                                : ProcedureOfStoredSelector(choice - uint32_t{1});
+    if (!procedure)
+        return kKeepInput;
+    uint32_t seed = data[kSeedByte] | 1u;
+    size_t offset = kStreamStart;
 
     ProtocolRig rig;
     auto feed = [&](FakePort& port) {
@@ -28,13 +47,13 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     rig.port.onSilence = feed;
     feed(rig.port);
 
-    SerialProtocol protocol(rig.port, rig.clock, rig.file, rig.callback, rig.texts,
-                            procedure == 0 ? 1 : procedure - 1);
+    SerialProtocol protocol(rig.port, rig.clock, rig.file, rig.callback, rig.texts, *procedure);
     protocol.SetPortOpen(true);
-    if (procedure == 0)
+    // Any result will do: the fuzzer looks for crashes, leaks and undefined behaviour.
+    if (choice == kLineProtocol)
         (void)protocol.ReceiveLines();
     else
         (void)protocol.Receive();
-    (void)protocol.CheckInputFile(data + 2, size - 2);
-    return 0;
+    (void)protocol.CheckInputFile(data + kStreamStart, size - kStreamStart);
+    return kKeepInput;
 }

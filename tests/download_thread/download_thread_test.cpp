@@ -31,7 +31,7 @@ protected:
         station_.Parity = 1;
         station_.DataBits = 8;
         station_.StopBits = 2;
-        station_.Protocol = 2;
+        station_.Protocol = StoredSelectorOf(ReceiveProcedure::YModem);  // not taken
     }
     void TearDown() override { ::DestroyWindow(window_); }
 
@@ -68,7 +68,7 @@ TEST_F(DownloadThread, ConnectionRecordAlwaysUsesSevenDataBitsOneStopBitSelector
     EXPECT_EQ(record.DeviceControlBlock.ByteSize, 7);
     EXPECT_EQ(record.DeviceControlBlock.Parity, 1);
     EXPECT_EQ(record.DeviceControlBlock.StopBits, ONESTOPBIT);
-    EXPECT_EQ(record.Protocol, 1u);
+    EXPECT_EQ(record.Protocol, ReceiveProcedure::BccBlocks);
     EXPECT_EQ(std::wstring(record.PortName), L"\\\\.\\COM1234567");  // 14 characters
     EXPECT_EQ(record.OutputPath, L"C:\\out.lv");
     EXPECT_FALSE(thread.IsCancelled());
@@ -87,7 +87,7 @@ TEST_F(DownloadThread, ProgressPostsPercentTextsAndNothingAtZero) {
     thread.SetProgress(100, 100);
     const std::vector<Received> received = Pump();
     ASSERT_EQ(received.size(), 2u);
-    EXPECT_EQ(received[0].code, 1u);
+    EXPECT_EQ(MessageCodeOfPosted(received[0].code), MessageCode::Information);
     EXPECT_EQ(received[0].text, L"Performing file transfer - 2% done");
     EXPECT_EQ(received[1].text, L"Performing file transfer - 99% done");
 }
@@ -110,7 +110,7 @@ TEST_F(DownloadThread, ClosedWindowGetsNothingAndNoCopyIsMade) {
     CLVDownloadThread thread(window_, station_, L"C:\\out.lv");
     Pump();
     ::DestroyWindow(window_);
-    thread.ShowMessage(4, L"lost");
+    thread.ShowMessage(MessageCode::Error, L"lost");
     thread.SetProgress(100, 50);
     EXPECT_EQ(CLVDownloadThread::LiveMessageTexts(), 0);
     const HANDLE worker = thread.Start();
@@ -124,7 +124,8 @@ TEST_F(DownloadThread, EveryPostedTextIsFreedOverTenThousandMessages) {
     Pump();
     size_t received = 0;
     for (int message = 0; message < 10000; ++message) {
-        thread.ShowMessage(message % 2 ? 1 : 4, message % 3 ? L"line accepted" : L"");
+        thread.ShowMessage(message % 2 ? MessageCode::Information : MessageCode::Error,
+                           message % 3 ? L"line accepted" : L"");
         if (message % 500 == 499)
             received += Pump().size();
     }

@@ -54,7 +54,7 @@ TEST_F(DownloadDialog, AStrayOkBeforeStartIsIgnoredAndTextsQueuedAtCloseAreFreed
         // window goes (and the one the dialog's loop takes right after EndDialog is dropped).
         talker.emplace(window, missing, output_.wstring());
         for (int text = 0; text < 10000; ++text)
-            talker->ShowMessage(1, L"line accepted");
+            talker->ShowMessage(MessageCode::Information, L"line accepted");
         ::SendMessageW(window, WM_COMMAND, IDCANCEL, 0);
     });
     EXPECT_EQ(result, IDCANCEL);
@@ -95,7 +95,7 @@ TEST_F(DownloadDialog, TransferFromTheInstrumentEndsWithOkAndTheExactFile) {
         EXPECT_TRUE(WaitForText(window, IDC_STATUS_TEXT, L"Downloading...", 10000));
     });
     EXPECT_EQ(result, IDOK);
-    EXPECT_EQ(instrument.Finish(), 0);
+    EXPECT_EQ(instrument.Finish(), TransferResult::Complete);
     EXPECT_TRUE(user_.MessageBoxes().empty());
     EXPECT_EQ(ReadAll(output_), instrument.ExpectedFile());
     EXPECT_EQ(CLVDownloadThread::LiveMessageTexts(), 0);
@@ -120,6 +120,7 @@ TEST_F(DownloadDialog, CancelDuringTransferWaitsForTheDriverToStop) {
     const std::string partial = ReadAll(output_);
     EXPECT_EQ(partial.rfind("A,01,Z\r\n", 0), 0u);
     EXPECT_LT(partial.size(), instrument.ExpectedFile().size());
-    EXPECT_NE(instrument.Finish(), 0);  // the instrument's lines were never all acknowledged
+    // The instrument's lines were never all acknowledged.
+    EXPECT_EQ(instrument.Finish(), TransferResult::Failed);
     EXPECT_EQ(CLVDownloadThread::LiveMessageTexts(), 0);
 }

@@ -8,6 +8,7 @@
 #include <thread>
 #include <vector>
 
+#include "download/az_comm.h"
 #include "tools/lvsim/instrument_simulator.h"
 
 class Instrument {
@@ -20,12 +21,12 @@ public:
         options_.AnswerTimeoutMs = 500;
         options_.MaxResends = maxResends;
     }
-    ~Instrument() { Finish(); }
+    ~Instrument() { (void)Finish(); }
     bool Open() {
         DCB dcb{};
         dcb.DCBlength = sizeof dcb;
         dcb.BaudRate = options_.BaudRate;
-        dcb.ByteSize = 7;
+        dcb.ByteSize = kReceiveDataBits;
         dcb.Parity = EVENPARITY;
         dcb.StopBits = ONESTOPBIT;
         dcb.fBinary = TRUE;
@@ -42,8 +43,8 @@ public:
             port_.Close();
         });
     }
-    // 0 when the receiver acknowledged every line.
-    int Finish() {
+    // Complete when the receiver acknowledged every line.
+    TransferResult Finish() {
         if (thread_.joinable())
             thread_.join();
         return result_;
@@ -62,5 +63,5 @@ private:
     SimulatorOptions options_;
     Win32SerialPort port_;
     std::thread thread_;
-    int result_ = -1;
+    TransferResult result_ = TransferResult::Failed;
 };

@@ -24,11 +24,11 @@ const wchar_t kDriverPort[] = L"\\\\.\\COM20";
 TAZCommParams LineParams(const wchar_t* port, const std::wstring& output) {
     TAZCommParams params;
     params.DeviceControlBlock.BaudRate = 9600;
-    params.DeviceControlBlock.ByteSize = 7;
-    params.DeviceControlBlock.Parity = 2;
-    params.DeviceControlBlock.StopBits = 0;
-    wcsncpy(params.PortName, port, 14);
-    params.Protocol = kProtocolBccBlocks;
+    params.DeviceControlBlock.ByteSize = kReceiveDataBits;
+    params.DeviceControlBlock.Parity = EVENPARITY;
+    params.DeviceControlBlock.StopBits = ONESTOPBIT;
+    wcsncpy(params.PortName, port, kPortNameCapacity);
+    params.Protocol = ReceiveProcedure::BccBlocks;
     params.OutputPath = output;
     return params;
 }
@@ -38,9 +38,10 @@ TEST(SerialDriver, FillsTheRecordsDeviceControlBlockAndTimeOutsEvenWhenThePortIs
     RecordingCallback callback;
     TAZComm driver(&callback, &params);
     EXPECT_FALSE(driver.IsPortOpen());
-    EXPECT_EQ(callback.messages, OnlyMessage(50, EnglishTexts().Text(DriverText::PortNotOpened)));
+    EXPECT_EQ(callback.messages, OnlyMessage(MessageCode::PortNotOpened,
+                                             EnglishTexts().Text(DriverText::PortNotOpened)));
     EXPECT_EQ(params.DeviceControlBlock.XonLim, 1024);
-    EXPECT_FALSE(params.DeviceControlBlock.fOutX);  // selector 1: no software flow control
+    EXPECT_FALSE(params.DeviceControlBlock.fOutX);  // BCC blocks: no software flow control
     EXPECT_EQ(params.Timeouts.ReadIntervalTimeout, 50u);
 }
 
@@ -59,16 +60,17 @@ TEST(SerialDriver, CancelMidTransferReportsAndFreesThePort) {
     Instrument instrument(L"\\\\.\\COM21", 9600, 200, 2);
     ASSERT_TRUE(instrument.Open());
     instrument.Play();
-    EXPECT_EQ(driver.ReceiveLines(), 1u);
+    EXPECT_EQ(driver.ReceiveLines(), TransferResult::Failed);
     EXPECT_FALSE(driver.IsPortOpen());
-    EXPECT_EQ(callback.messages,
-              OnlyMessage(4, L"The communication's process is interrupted by the user"));
+    EXPECT_EQ(
+        callback.messages,
+        OnlyMessage(MessageCode::Error, L"The communication's process is interrupted by the user"));
     // Closed means free: the port opens again at once.
     UniqueFileHandle reopened(::CreateFileW(kDriverPort, GENERIC_READ | GENERIC_WRITE, 0, nullptr,
                                             OPEN_EXISTING, 0, nullptr));
     EXPECT_TRUE(reopened) << ::GetLastError();
     reopened.reset();
-    EXPECT_NE(instrument.Finish(), 0);
+    EXPECT_EQ(instrument.Finish(), TransferResult::Failed);
     std::ifstream file(output.c_str(), std::ios::binary);
     const std::string received{std::istreambuf_iterator<char>(file), {}};
     EXPECT_EQ(std::count(received.begin(), received.end(), '\n'), 3) << "the header and two lines";
@@ -78,10 +80,11 @@ TEST(SerialDriverSetup, DeviceControlFlagsLandInTheirBits) {
     DCB dcb{};
     DWORD flags = 0;
     static_assert(offsetof(DCB, BaudRate) + sizeof(DWORD) == 8);
-    for (const auto& [selector, expected] : {std::pair{0u, 0x1393u}, std::pair{1u, 0x1093u}}) {
-        ApplyDeviceControlFields(MakeDeviceControlFields(selector), dcb);
+    for (const auto& [procedure, expected] : {std::pair{ReceiveProcedure::RawStream, 0x1393u},
+                                              std::pair{ReceiveProcedure::BccBlocks, 0x1093u}}) {
+        ApplyDeviceControlFields(MakeDeviceControlFields(procedure), dcb);
         std::memcpy(&flags, reinterpret_cast<const uint8_t*>(&dcb) + 8, sizeof flags);
-        EXPECT_EQ(flags, expected) << selector;
+        EXPECT_EQ(flags, expected) << StoredSelectorOf(procedure);
     }
     EXPECT_EQ(dcb.DCBlength, 28u);
     EXPECT_EQ(dcb.EvtChar, static_cast<char>(0xFE));

@@ -4,6 +4,7 @@
 #include <atomic>
 #include <cstdio>
 #include <cwchar>
+#include <optional>
 #include <string>
 
 #include "download/az_comm.h"
@@ -35,8 +36,17 @@ const char kUsageEnd[] =
 
 void PrintUsage(FILE* stream) {
     std::fputs(kUsage, stream);
-    std::fprintf(stream, kUsageEnd, std::to_string(kMaxReceiveBytes >> 20).c_str());
+    std::fprintf(stream, kUsageEnd, std::to_string(kMaxReceiveBytes >> kMebibyteShift).c_str());
 }
+
+// The exit codes the usage text names.
+constexpr int kExitSuccess = 0;
+constexpr int kExitFailed = 1;
+constexpr int kExitBadUsage = 2;
+constexpr int kExitPortNotOpened = 3;
+
+// The longest port name taken (the record's capacity less the device prefix).
+constexpr size_t kLongestPortName = 10;
 
 std::atomic<bool> g_cancelled{false};
 // Progress steps above zero after which the receive is cancelled; 0 = never.
@@ -65,9 +75,10 @@ void PrintLine(FILE* stream, const wchar_t* prefix, const wchar_t* text) {
 class ConsoleCallback final : public TParserCallBack {
 public:
     explicit ConsoleCallback(bool quiet) : quiet_(quiet) {}
-    void ShowMessage(uint32_t code, const wchar_t* text) override {
-        const std::wstring prefix = L"lvrecv: [code " + std::to_wstring(code) + L"] ";
-        PrintLine(code == kMessageInformation ? stdout : stderr, prefix.c_str(), text);
+    void ShowMessage(MessageCode code, const wchar_t* text) override {
+        // Scripts read the code as the dialog receives it.
+        const std::wstring prefix = L"lvrecv: [code " + std::to_wstring(PostedCodeOf(code)) + L"] ";
+        PrintLine(code == MessageCode::Information ? stdout : stderr, prefix.c_str(), text);
     }
     void SetProgress(uint32_t total, uint32_t current) override {
         if (current > 0 && g_cancelAfterSteps != 0 && ++steps_ >= g_cancelAfterSteps)
@@ -91,14 +102,14 @@ int wmain(int argc, wchar_t** argv) {
     std::wstring out;
     std::wstring protocol = L"line";
     uint32_t baud = 9600;
-    uint32_t parity = 2;
+    BYTE parity = EVENPARITY;
     bool quiet = false;
     for (int i = 1; i < argc; ++i) {
         const std::wstring option = argv[i];
         const bool hasValue = i + 1 < argc;
         if (option == L"--help" || option == L"-h") {
             PrintUsage(stdout);
-            return 0;
+            return kExitSuccess;
         } else if (option == L"--quiet") {
             quiet = true;
         } else if (option == L"--port" && hasValue) {
@@ -109,7 +120,7 @@ int wmain(int argc, wchar_t** argv) {
             baud = static_cast<uint32_t>(std::wcstoul(argv[++i], nullptr, 10));
         } else if (option == L"--parity" && hasValue) {
             const std::wstring name = argv[++i];
-            parity = name == L"none" ? 0 : name == L"odd" ? 1 : 2;
+            parity = name == L"none" ? NOPARITY : name == L"odd" ? ODDPARITY : EVENPARITY;
         } else if (option == L"--protocol" && hasValue) {
             protocol = argv[++i];
         } else if (option == L"--cancel-after" && hasValue) {
@@ -117,48 +128,46 @@ int wmain(int argc, wchar_t** argv) {
         } else {
             std::fprintf(stderr, "lvrecv: bad option %ls\n", option.c_str());
             PrintUsage(stderr);
-            return 2;
+            return kExitBadUsage;
         }
     }
-    uint32_t selector = 0;
+    std::optional<ReceiveProcedure> procedure;
     if (protocol == L"bcc")
-        selector = kProtocolBccBlocks;
+        procedure = ReceiveProcedure::BccBlocks;
     else if (protocol == L"ymodem")
-        selector = kProtocolYModem;
+        procedure = ReceiveProcedure::YModem;
     else if (protocol == L"raw")
-        selector = kProtocolRawStream;
+        procedure = ReceiveProcedure::RawStream;
     else if (protocol == L"line")
-        selector = kProtocolBccBlocks;  // the download thread's selector: no software flow control
-    else
-        port.clear();
-    if (port.empty() || out.empty() || baud == 0 || port.size() > 10) {
+        procedure = ReceiveProcedure::BccBlocks;  // the download thread's: no software flow control
+    if (!procedure || port.empty() || out.empty() || baud == 0 || port.size() > kLongestPortName) {
         PrintUsage(stderr);
-        return 2;
+        return kExitBadUsage;
     }
 
     TAZCommParams params;
     params.DeviceControlBlock.BaudRate = baud;
-    params.DeviceControlBlock.ByteSize = 7;
-    params.DeviceControlBlock.Parity = static_cast<BYTE>(parity);
-    params.DeviceControlBlock.StopBits = 0;
+    params.DeviceControlBlock.ByteSize = kReceiveDataBits;
+    params.DeviceControlBlock.Parity = parity;
+    params.DeviceControlBlock.StopBits = ONESTOPBIT;
     // The driver passes the name to CreateFileW as it stands; only the device path form reaches
     // ports above COM9, and it works for every port.
     const std::wstring device = port.rfind(L"\\\\.\\", 0) == 0 ? port : L"\\\\.\\" + port;
-    wcsncpy(params.PortName, device.c_str(), 14);
-    params.Protocol = selector;
+    wcsncpy(params.PortName, device.c_str(), kPortNameCapacity);
+    params.Protocol = *procedure;
     params.OutputPath = out;
 
     ::SetConsoleCtrlHandler(OnConsoleControl, TRUE);
     ConsoleCallback callback(quiet);
     TAZComm driver(&callback, &params);
     if (!driver.IsPortOpen())
-        return 3;
-    const uint32_t result = protocol == L"line" ? driver.ReceiveLines() : driver.Receive();
-    if (result == 0) {
+        return kExitPortNotOpened;
+    const TransferResult result = protocol == L"line" ? driver.ReceiveLines() : driver.Receive();
+    if (result == TransferResult::Complete) {
         PrintLine(stdout, L"lvrecv: file complete: ", out.c_str());
-        return 0;
+        return kExitSuccess;
     }
     if (g_cancelled)
         PrintLine(stderr, L"lvrecv: ", L"stopped");
-    return 1;
+    return kExitFailed;
 }

@@ -10,11 +10,15 @@
 using namespace serial_bytes;
 
 namespace {
+bool IsAck(const std::string& answer) {
+    return !answer.empty() && static_cast<uint8_t>(answer.front()) == kAck;
+}
+
 // How a verbose log names the receiver's answer.
 const char* AnswerName(const std::string& answer) {
     if (answer.empty())
         return "none";
-    return static_cast<uint8_t>(answer[0]) == kAck ? "ACK" : "NAK";
+    return IsAck(answer) ? "ACK" : "NAK";
 }
 }  // namespace
 
@@ -127,7 +131,7 @@ bool InstrumentSimulator::SendLineUntilAcknowledged(const std::string& line, boo
             std::fprintf(stderr, "lvsim: sent %zu bytes, answer %s\n", sent.size(),
                          AnswerName(answer));
         Turnaround();
-        if (!answer.empty() && static_cast<uint8_t>(answer[0]) == kAck) {
+        if (IsAck(answer)) {
             if (loseFirstAck && attempt == 0)
                 continue;  // as if the ACK was lost on the line: the same line goes again
             return true;
@@ -136,12 +140,12 @@ bool InstrumentSimulator::SendLineUntilAcknowledged(const std::string& line, boo
     return false;
 }
 
-int InstrumentSimulator::SendLines(const std::vector<std::string>& dataLines) {
+TransferResult InstrumentSimulator::SendLines(const std::vector<std::string>& dataLines) {
     if (options_.SilenceSeconds > 0)
         ::Sleep(options_.SilenceSeconds * 1000);
     for (uint32_t i = 0; i < options_.NoiseLines; ++i) {
         if (!SendPaced("?? noise " + std::to_string(i) + "\r\n"))
-            return 1;
+            return TransferResult::Failed;
         // Each is refused with a NAK line; nothing depends on it here.
         const std::string answer = ReadAnswer(options_.AnswerTimeoutMs);
         if (options_.Verbose)
@@ -149,51 +153,53 @@ int InstrumentSimulator::SendLines(const std::vector<std::string>& dataLines) {
                          AnswerName(answer));
     }
     if (!SendLineUntilAcknowledged("A,01,Z\r\n", false, false))
-        return 1;
+        return TransferResult::Failed;
     if (options_.LongLineWithoutEnd) {
         // Never acknowledged: the receiver waits for CR LF until its time-out.
-        (void)SendPaced(std::string(128, 'L'));
+        (void)SendPaced(std::string(kLineCapacity, 'L'));
         (void)ReadAnswer(options_.AnswerTimeoutMs);
-        return 1;
+        return TransferResult::Failed;
     }
     for (uint32_t i = 1; i <= dataLines.size(); ++i) {
         if (!SendLineUntilAcknowledged(WithCheckCharacter(dataLines[i - 1]),
                                        i == options_.BadCheckLine, i == options_.LostAckLine))
-            return 1;
+            return TransferResult::Failed;
         if (i == options_.DisconnectAfterLine) {
             port_.Close();
-            return 1;
+            return TransferResult::Failed;
         }
     }
-    return SendLineUntilAcknowledged("Z,&,\r\n", false, false) ? 0 : 1;
+    return SendLineUntilAcknowledged("Z,&,\r\n", false, false) ? TransferResult::Complete
+                                                               : TransferResult::Failed;
 }
 
-int InstrumentSimulator::SendRawStream(const std::vector<std::string>& printedLines) {
+TransferResult InstrumentSimulator::SendRawStream(const std::vector<std::string>& printedLines) {
     for (uint32_t i = 1; i <= printedLines.size(); ++i) {
         if (!SendPaced(printedLines[i - 1]))
-            return 1;
+            return TransferResult::Failed;
         if (options_.Verbose)
             std::fprintf(stderr, "lvsim: sent line %u (%zu bytes)\n", i,
                          printedLines[i - 1].size());
         if (i == options_.DisconnectAfterLine) {
             port_.Close();
-            return 1;
+            return TransferResult::Failed;
         }
         if (options_.LineGapMs)
             ::Sleep(options_.LineGapMs);
     }
-    return SendPaced(std::string(1, static_cast<char>(kEot))) ? 0 : 1;
+    return SendPaced(std::string(1, static_cast<char>(kEot))) ? TransferResult::Complete
+                                                              : TransferResult::Failed;
 }
 
-int InstrumentSimulator::SendBccBlocks(const std::vector<std::string>& dataLines) {
+TransferResult InstrumentSimulator::SendBccBlocks(const std::vector<std::string>& dataLines) {
     // Wait for the receiver's ENQ.
     const ULONGLONG start = ::GetTickCount64();
     for (;;) {
         const std::string poll = ReadAnswer(1000);
-        if (!poll.empty() && static_cast<uint8_t>(poll[0]) == kEnq)
+        if (!poll.empty() && static_cast<uint8_t>(poll.front()) == kEnq)
             break;
         if (::GetTickCount64() - start > 60000)
-            return 1;
+            return TransferResult::Failed;
     }
     uint32_t resends = 0;
     // Endless: block i carries line i % count, numbered on; the EOT never comes.
@@ -211,31 +217,32 @@ int InstrumentSimulator::SendBccBlocks(const std::vector<std::string>& dataLines
                 block[5] ^= 0x01;
         }
         if (!SendPaced(block))
-            return 1;
+            return TransferResult::Failed;
         const std::string answer = ReadAnswer(options_.AnswerTimeoutMs);
         if (i == last)
-            return !answer.empty() && static_cast<uint8_t>(answer[0]) == kAck ? 0 : 1;
+            return IsAck(answer) ? TransferResult::Complete : TransferResult::Failed;
         if (options_.Verbose)
             std::fprintf(stderr, "lvsim: sent block %zu, answer %s\n", i + 1, AnswerName(answer));
         Turnaround();
-        if (!answer.empty() && static_cast<uint8_t>(answer[0]) == kAck) {
+        if (IsAck(answer)) {
             ++i;
             resends = 0;
             if (i == options_.DisconnectAfterLine) {
                 port_.Close();
-                return 1;
+                return TransferResult::Failed;
             }
             continue;
         }
         if (++resends > options_.MaxResends)
-            return 1;
+            return TransferResult::Failed;
         if (i + 1 == options_.BadCheckLine)
             options_.BadCheckLine = 0;  // the resend is clean
     }
-    return 0;
+    return TransferResult::Complete;
 }
 
-int InstrumentSimulator::SendYModem(const std::string& name, const std::string& content) {
+TransferResult InstrumentSimulator::SendYModem(const std::string& name,
+                                               const std::string& content) {
     CrcTable table;
     BuildCrcTable(table);
     auto waitFor = [&](uint8_t wanted) {
@@ -248,23 +255,26 @@ int InstrumentSimulator::SendYModem(const std::string& name, const std::string& 
         return false;
     };
     if (!waitFor(kCrcRequest))
-        return 1;
+        return TransferResult::Failed;
     const YModemBlock header =
         BuildYModemHeaderBlock(name, static_cast<uint32_t>(content.size()),
                                static_cast<uint32_t>(_time64(nullptr)), table);
     if (!SendPaced(std::string(header.begin(), header.end())) || !waitFor(kAck))
-        return 1;
+        return TransferResult::Failed;
     // Endless: past the announced size the file's blocks come again; the EOT never comes.
-    const size_t fileBlocks = (content.size() + 127) / 128;
+    constexpr char kFiller = 0x1A;  // the last block's unused bytes, as Y-Modem senders fill them
+    const size_t fileBlocks = (content.size() + kBlockDataSize - 1) / kBlockDataSize;
     const size_t blocks = options_.Endless && fileBlocks > 0 ? SIZE_MAX : fileBlocks;
     uint32_t resends = 0;
     for (size_t i = 0; i < blocks;) {
-        std::string data = content.substr(i % fileBlocks * 128, 128);
-        data.resize(128, 0x1A);
-        std::string block = {static_cast<char>(kSoh), static_cast<char>(i + 1),
-                             static_cast<char>(254 - i)};
+        std::string data = content.substr(i % fileBlocks * kBlockDataSize, kBlockDataSize);
+        data.resize(kBlockDataSize, kFiller);
+        const uint8_t number = static_cast<uint8_t>(i + 1);  // the header was block 0
+        std::string block = {static_cast<char>(kSoh), static_cast<char>(number),
+                             static_cast<char>(0xFF - number)};
         block += data;
-        const uint16_t crc = Crc16(table, reinterpret_cast<const uint8_t*>(data.data()), 128);
+        const uint16_t crc =
+            Crc16(table, reinterpret_cast<const uint8_t*>(data.data()), kBlockDataSize);
         block += static_cast<char>(crc >> 8);
         block += static_cast<char>(crc);
         if (i + 1 == options_.BadCheckLine) {
@@ -272,23 +282,23 @@ int InstrumentSimulator::SendYModem(const std::string& name, const std::string& 
             options_.BadCheckLine = 0;
         }
         if (!SendPaced(block))
-            return 1;
+            return TransferResult::Failed;
         const std::string answer = ReadAnswer(options_.AnswerTimeoutMs);
         if (options_.Verbose)
             std::fprintf(stderr, "lvsim: sent block %zu, answer %s\n", i + 1, AnswerName(answer));
         Turnaround();
-        if (!answer.empty() && static_cast<uint8_t>(answer[0]) == kAck) {
+        if (IsAck(answer)) {
             ++i;
             resends = 0;
             if (i == options_.DisconnectAfterLine) {
                 port_.Close();
-                return 1;
+                return TransferResult::Failed;
             }
         } else if (++resends > options_.MaxResends) {
-            return 1;
+            return TransferResult::Failed;
         }
     }
     if (!SendPaced(std::string(1, static_cast<char>(kEot))))
-        return 1;
-    return waitFor(kAck) ? 0 : 1;
+        return TransferResult::Failed;
+    return waitFor(kAck) ? TransferResult::Complete : TransferResult::Failed;
 }

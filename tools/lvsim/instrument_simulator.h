@@ -5,6 +5,7 @@
 #include <string>
 #include <vector>
 
+#include "download/portable/protocol_vocabulary.h"
 #include "download/win32_serial_port.h"
 
 struct SimulatorOptions {
@@ -37,15 +38,15 @@ public:
         : port_(port), options_(options) {}
 
     // Header "A,01,Z", the data lines (without CR LF; check characters are computed), "Z,&,".
-    // 0 when the receiver acknowledged everything.
-    int SendLines(const std::vector<std::string>& dataLines);
+    // Complete when the receiver acknowledged everything.
+    [[nodiscard]] TransferResult SendLines(const std::vector<std::string>& dataLines);
     // The lines as an instrument prints them (each with its CR LF), then EOT; no answer is
-    // awaited. 0 when everything was sent.
-    int SendRawStream(const std::vector<std::string>& printedLines);
+    // awaited. Complete when everything was sent.
+    [[nodiscard]] TransferResult SendRawStream(const std::vector<std::string>& printedLines);
     // One BCC block per line, started by the receiver's ENQ, ended by EOT.
-    int SendBccBlocks(const std::vector<std::string>& dataLines);
+    [[nodiscard]] TransferResult SendBccBlocks(const std::vector<std::string>& dataLines);
     // Y-Modem: header block with name and size, 128-byte CRC blocks, EOT.
-    int SendYModem(const std::string& name, const std::string& content);
+    [[nodiscard]] TransferResult SendYModem(const std::string& name, const std::string& content);
 
     uint64_t BytesSent() const { return bytesSent_; }
     uint64_t BytesReceived() const { return bytesReceived_; }

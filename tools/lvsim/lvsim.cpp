@@ -79,11 +79,16 @@ std::vector<std::string> ReadSurveyFile(const std::wstring& path, bool& ok) {
 
 }  // namespace
 
+// The exit codes the usage text names.
+constexpr int kExitAcknowledged = 0;
+constexpr int kExitNotCompleted = 1;
+constexpr int kExitBadUsage = 2;
+
 int wmain(int argc, wchar_t** argv) {
     std::wstring port;
     std::wstring file;
     std::wstring protocol = L"line";
-    uint32_t parity = 2;
+    BYTE parity = EVENPARITY;
     uint32_t dataBits = 7;
     uint32_t lineCount = 20;
     uint32_t lineLength = 60;
@@ -94,7 +99,7 @@ int wmain(int argc, wchar_t** argv) {
         auto value = [&]() -> std::wstring {
             if (i + 1 >= argc) {
                 std::fprintf(stderr, "lvsim: %ls needs a value\n", option.c_str());
-                std::exit(2);
+                std::exit(kExitBadUsage);
             }
             return argv[++i];
         };
@@ -103,14 +108,14 @@ int wmain(int argc, wchar_t** argv) {
         };
         if (option == L"--help" || option == L"-h") {
             std::fputs(kUsage, stdout);
-            return 0;
+            return kExitAcknowledged;
         } else if (option == L"--port") {
             port = value();
         } else if (option == L"--baud") {
             options.BaudRate = number();
         } else if (option == L"--parity") {
             const std::wstring name = value();
-            parity = name == L"none" ? 0 : name == L"odd" ? 1 : 2;
+            parity = name == L"none" ? NOPARITY : name == L"odd" ? ODDPARITY : EVENPARITY;
         } else if (option == L"--data-bits") {
             dataBits = number();
         } else if (option == L"--protocol") {
@@ -151,16 +156,20 @@ int wmain(int argc, wchar_t** argv) {
             options.Verbose = true;
         } else {
             std::fprintf(stderr, "lvsim: unknown option %ls\n%s", option.c_str(), kUsage);
-            return 2;
+            return kExitBadUsage;
         }
     }
     if (port.empty() || options.BaudRate == 0 ||
         (protocol != L"line" && protocol != L"raw" && protocol != L"bcc" &&
          protocol != L"ymodem")) {
         std::fputs(kUsage, stderr);
-        return 2;
+        return kExitBadUsage;
     }
-    options.BitsPerCharacter = 1 + dataBits + (parity ? 1 : 0) + 1;
+    constexpr uint32_t kStartBits = 1;
+    constexpr uint32_t kParityBits = 1;
+    constexpr uint32_t kStopBits = 1;
+    options.BitsPerCharacter =
+        kStartBits + dataBits + (parity != NOPARITY ? kParityBits : 0) + kStopBits;
 
     std::vector<std::string> lines;
     if (!file.empty()) {
@@ -168,7 +177,7 @@ int wmain(int argc, wchar_t** argv) {
         lines = ReadSurveyFile(file, ok);
         if (!ok) {
             std::fprintf(stderr, "lvsim: cannot read %ls\n", file.c_str());
-            return 2;
+            return kExitBadUsage;
         }
     } else {
         lines = GenerateSurveyLines(lineCount, lineLength);
@@ -178,7 +187,7 @@ int wmain(int argc, wchar_t** argv) {
     dcb.DCBlength = sizeof dcb;
     dcb.BaudRate = options.BaudRate;
     dcb.ByteSize = static_cast<BYTE>(dataBits);
-    dcb.Parity = static_cast<BYTE>(parity);
+    dcb.Parity = parity;
     dcb.StopBits = ONESTOPBIT;
     dcb.fBinary = TRUE;
     dcb.fDtrControl = DTR_CONTROL_ENABLE;
@@ -195,7 +204,7 @@ int wmain(int argc, wchar_t** argv) {
     if (error != ERROR_SUCCESS) {
         std::fprintf(stderr, "lvsim: cannot open %ls: %ls\n", port.c_str(),
                      SystemMessageText(error).c_str());
-        return 1;
+        return kExitNotCompleted;
     }
     // Answers left on the line by an earlier receiver are not meant for this transfer.
     serial.Purge(true, true);
@@ -205,7 +214,7 @@ int wmain(int argc, wchar_t** argv) {
         ::Sleep(startDelay);
 
     InstrumentSimulator simulator(serial, options);
-    int result = 1;
+    TransferResult result = TransferResult::Failed;
     if (protocol == L"line") {
         result = simulator.SendLines(lines);
     } else if (protocol == L"raw") {
@@ -223,9 +232,10 @@ int wmain(int argc, wchar_t** argv) {
             content += WithCheckCharacter(line);
         result = simulator.SendYModem("survey.lv", content);
     }
-    std::fprintf(stderr, "lvsim: %s (%llu bytes sent, %llu received)\n",
-                 result == 0 ? "transfer acknowledged" : "transfer not completed",
-                 static_cast<unsigned long long>(simulator.BytesSent()),
-                 static_cast<unsigned long long>(simulator.BytesReceived()));
-    return result;
+    std::fprintf(
+        stderr, "lvsim: %s (%llu bytes sent, %llu received)\n",
+        result == TransferResult::Complete ? "transfer acknowledged" : "transfer not completed",
+        static_cast<unsigned long long>(simulator.BytesSent()),
+        static_cast<unsigned long long>(simulator.BytesReceived()));
+    return result == TransferResult::Complete ? kExitAcknowledged : kExitNotCompleted;
 }

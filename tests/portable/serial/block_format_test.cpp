@@ -75,7 +75,7 @@ std::vector<uint8_t> BlockFile(int blocks, bool endWithEot) {
 }
 
 TEST(InputFileCheck, NumberedBlocksPassAndABccMismatchIsReportedWithItsNumbers) {
-    ProtocolRun run(1);
+    ProtocolRun run(ReceiveProcedure::BccBlocks);
     std::vector<uint8_t> file = BlockFile(12, true);  // digits wrap from 9 to 0
     EXPECT_TRUE(run.protocol.CheckInputFile(file.data(), file.size()));
     const uint8_t stored = ComputeBcc(file.data() + 136);
@@ -83,7 +83,8 @@ TEST(InputFileCheck, NumberedBlocksPassAndABccMismatchIsReportedWithItsNumbers) 
     EXPECT_FALSE(run.protocol.CheckInputFile(file.data(), file.size()));
     const std::string expected = "Incorrect input file: BCC in block 1 mismatch with computed " +
                                  std::to_string(stored) + "!=" + std::to_string(stored ^ 1);
-    EXPECT_EQ(run.callback.messages, OnlyMessage(4, WidenBytes(expected.data(), expected.size())));
+    EXPECT_EQ(run.callback.messages,
+              OnlyMessage(MessageCode::Error, WidenBytes(expected.data(), expected.size())));
     EXPECT_TRUE(run.protocol.IsFileOpened());
 }
 
@@ -92,17 +93,21 @@ TEST(InputFileCheck, WhatIsNotABlockFilePassesButIsNotedAsNotOpened) {
     wrongDigit[136 * 2 + 129] = '7';
     const std::vector<uint8_t> files[] = {wrongDigit, ToBytes("plain text"), {}};
     for (const auto& file : files) {
-        ProtocolRun run(1);
+        ProtocolRun run(ReceiveProcedure::BccBlocks);
         EXPECT_TRUE(run.protocol.CheckInputFile(file.data(), file.size())) << file.size();
         EXPECT_FALSE(run.protocol.IsFileOpened()) << file.size();
         EXPECT_TRUE(run.callback.messages.empty());
     }
 }
 
-TEST(PortSetup, FlowControlOnlyForSelectorZero) {
-    EXPECT_EQ(MakeDeviceControlFields(0).Flags, 0x1393u);  // XON/XOFF in and out
-    for (uint32_t selector : {1u, 2u, 3u})
-        EXPECT_EQ(MakeDeviceControlFields(selector).Flags, 0x1093u) << selector;
+TEST(PortSetup, FlowControlOnlyForTheRawStream) {
+    // XON/XOFF in and out.
+    EXPECT_EQ(MakeDeviceControlFields(ReceiveProcedure::RawStream).Flags, 0x1393u);
+    for (const ReceiveProcedure procedure :
+         {ReceiveProcedure::BccBlocks, ReceiveProcedure::YModem,
+          ReceiveProcedure::RawStreamWithoutFlowControl})
+        EXPECT_EQ(MakeDeviceControlFields(procedure).Flags, 0x1093u)
+            << StoredSelectorOf(procedure);
 }
 
 // Lines are framed by CR LF: a read ends once the bytes stop for about two character times.

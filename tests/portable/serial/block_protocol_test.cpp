@@ -12,14 +12,14 @@ const WideString kImportFailed = WIDE_TEXT("AZ doesn't respond or error in impor
 const WideString kInterrupted = WIDE_TEXT("The communication's process is interrupted by the user");
 
 TEST(RawStream, WritesEveryBurstUntilEot) {
-    ProtocolRun run(3);
+    ProtocolRun run(ReceiveProcedure::RawStreamWithoutFlowControl);
     run.port.Deliver("first burst ");
     run.port.Deliver("second");
     run.port.onSilence = [sent = false](FakePort& port) mutable {
         if (!std::exchange(sent, true))
             port.Queue(ToBytes("end\x04x"));
     };
-    EXPECT_EQ(run.protocol.Receive(), 0u);
+    EXPECT_EQ(run.protocol.Receive(), TransferResult::Complete);
     EXPECT_EQ(run.file.Text(), "first burst secondend\x04x");
     EXPECT_TRUE(run.port.writes.empty());
     EXPECT_EQ(run.callback.progress.front(), std::make_pair(100u, 0u));
@@ -27,17 +27,17 @@ TEST(RawStream, WritesEveryBurstUntilEot) {
 }
 
 TEST(RawStream, WithoutEotTimesOut) {
-    ProtocolRun run(0);
+    ProtocolRun run(ReceiveProcedure::RawStream);
     run.port.Deliver("no end");
-    EXPECT_EQ(run.protocol.Receive(), 1u);
+    EXPECT_EQ(run.protocol.Receive(), TransferResult::Failed);
     EXPECT_EQ(run.file.Text(), "no end");
-    EXPECT_EQ(run.callback.messages, OnlyMessage(4, kWaitExpired));
+    EXPECT_EQ(run.callback.messages, OnlyMessage(MessageCode::Error, kWaitExpired));
     EXPECT_FALSE(run.file.open);
 }
 
 TEST(BccBlocks, AreWrittenAfterTheEnqAndTheEndIsAcknowledgedTenTimes) {
     BccRun run;
-    EXPECT_EQ(run.Receive(), 0u);
+    EXPECT_EQ(run.Receive(), TransferResult::Complete);
     EXPECT_EQ(run.file.Text(), BlocksText(3));
     EXPECT_EQ(run.port.writes.front(), kEnqLine);
     ASSERT_GE(run.port.writes.size(), 10u);
@@ -48,13 +48,13 @@ TEST(BccBlocks, AreWrittenAfterTheEnqAndTheEndIsAcknowledgedTenTimes) {
 TEST(BccBlocks, BadBccIsAnsweredWithNakUntilTheFifthBadBlockInARowEndsTheReceive) {
     const struct {
         int badAttempts;  // of block 1
-        uint32_t result;
+        TransferResult result;
         long naks;
         int blocksWritten;
         std::vector<RecordedMessage> messages;
     } cases[] = {
-        {2, 0, 2, 3, {}},
-        {5, 1, 4, 1, OnlyMessage(4, kImportFailed)},
+        {2, TransferResult::Complete, 2, 3, {}},
+        {5, TransferResult::Failed, 4, 1, OnlyMessage(MessageCode::Error, kImportFailed)},
     };
     for (const auto& test : cases) {
         BccRun run;
@@ -72,15 +72,15 @@ TEST(BccBlocks, BadBccIsAnsweredWithNakUntilTheFifthBadBlockInARowEndsTheReceive
 TEST(BccBlocks, BlockSentAgainWithTheSameDigitIsWrittenOnce) {
     BccRun run;
     run.missedAck = 1;
-    EXPECT_EQ(run.Receive(), 0u);
+    EXPECT_EQ(run.Receive(), TransferResult::Complete);
     EXPECT_EQ(run.port.WritesOf(kAckLine), 3 + 1 + 10) << "block 1 is acknowledged twice";
     EXPECT_EQ(run.file.Text(), BlocksText(3));
 }
 
 TEST(BccBlocks, SilentInstrumentIsPolledAgainEveryFourSecondsUntilTheTimeOut) {
-    ProtocolRun run(1);
+    ProtocolRun run(ReceiveProcedure::BccBlocks);
     const int64_t start = run.clock.WallSeconds();
-    EXPECT_EQ(run.protocol.Receive(), 1u);
+    EXPECT_EQ(run.protocol.Receive(), TransferResult::Failed);
     EXPECT_GT(run.clock.WallSeconds() - start, 60);
     EXPECT_GE(run.port.WritesOf(kEnqLine), 14);
     EXPECT_LE(run.port.WritesOf(kEnqLine), 16);
@@ -95,8 +95,8 @@ TEST(BccBlocks, CancelSeenOnABadBlockClosesThePort) {
     };
     int asked = 0;
     run.callback.cancelWhen = [&] { return ++asked > 1; };
-    EXPECT_EQ(run.Receive(), 1u);
-    EXPECT_EQ(run.callback.messages, OnlyMessage(4, kInterrupted));
+    EXPECT_EQ(run.Receive(), TransferResult::Failed);
+    EXPECT_EQ(run.callback.messages, OnlyMessage(MessageCode::Error, kInterrupted));
     EXPECT_EQ(run.port.closes, 1);
     EXPECT_FALSE(run.protocol.IsPortOpen());
 }
@@ -106,13 +106,14 @@ TEST(YModem, ReceivesTheAnnouncedSizeAndReportsTheHeader) {
     for (int i = 0; i < 300; ++i)
         sent.push_back(static_cast<uint8_t>(i * 7));
     YModemRun run(sent);
-    EXPECT_EQ(run.Receive(), 0u);
+    EXPECT_EQ(run.Receive(), TransferResult::Complete);
     EXPECT_EQ(run.file.content, sent);
     EXPECT_EQ(run.protocol.FileSize(), 300u);
     EXPECT_EQ(run.protocol.YModemFileName(), "survey.lv");
     EXPECT_EQ(run.protocol.ExpectedBlockCount(), 3u);
     EXPECT_EQ(run.callback.messages,
-              OnlyMessage(1, WIDE_TEXT("Y-Modem File Info: survey.lv (size=300 byte)")));
+              OnlyMessage(MessageCode::Information,
+                          WIDE_TEXT("Y-Modem File Info: survey.lv (size=300 byte)")));
     EXPECT_EQ(run.port.writes.back(), (Bytes{0x18, 0x18}));
     EXPECT_EQ(run.callback.progress.back(), std::make_pair(300u, 299u));
 }
@@ -123,7 +124,7 @@ TEST(YModem, BlockOfHundredThirtyOneBytesPassesWithoutCrc) {
         if (block == 2)
             bytes.resize(131);
     };
-    EXPECT_EQ(run.Receive(), 0u);
+    EXPECT_EQ(run.Receive(), TransferResult::Complete);
     EXPECT_EQ(run.file.content, run.sent);
 }
 
@@ -133,14 +134,14 @@ TEST(YModem, TenNaksInARowFail) {
         if (block == 2)
             bytes[60] ^= 1;
     };
-    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_EQ(run.Receive(), TransferResult::Failed);
     EXPECT_EQ(run.port.WritesOf(Bytes{0x15}), 10);
     EXPECT_EQ(run.callback.messages.back().text, kImportFailed);
     EXPECT_EQ(run.file.content.size(), 128u);
 }
 
 TEST(YModem, SendingAHeaderWaitsForTheReceiverAndResendsUntilAck) {
-    ProtocolRun run(2);
+    ProtocolRun run(ReceiveProcedure::YModem);
     const YModemBlock header = BuildYModemHeaderBlock("a.lv", 10, 5, MakeCrcTable());
     int sends = 0;
     run.port.Queue(Bytes{0x43});
@@ -148,7 +149,7 @@ TEST(YModem, SendingAHeaderWaitsForTheReceiverAndResendsUntilAck) {
         EXPECT_EQ(written, Bytes(header.begin(), header.end()));
         port.Deliver(Bytes{++sends < 3 ? uint8_t{0x15} : uint8_t{0x06}});
     };
-    EXPECT_EQ(run.protocol.SendYModemHeader(header), 0u);
+    EXPECT_EQ(run.protocol.SendYModemHeader(header), TransferResult::Complete);
     EXPECT_EQ(sends, 3);
 }
 
@@ -159,15 +160,15 @@ TEST(BlockProcedures, ARefusedWriteFailsTheReceiveAtThatBlock) {
     const WideString diskFull = WIDE_TEXT("System error 112");
     {
         SCOPED_TRACE("raw stream");
-        ProtocolRun run(0);
+        ProtocolRun run(ReceiveProcedure::RawStream);
         run.file.capacity = 20;
         run.port.Deliver("first burst ");
         run.port.onSilence = [sent = false](FakePort& port) mutable {
             if (!std::exchange(sent, true))
                 port.Queue(ToBytes("second burst\x04"));
         };
-        EXPECT_EQ(run.protocol.Receive(), 1u);
-        EXPECT_EQ(run.callback.messages, OnlyMessage(4, diskFull));
+        EXPECT_EQ(run.protocol.Receive(), TransferResult::Failed);
+        EXPECT_EQ(run.callback.messages, OnlyMessage(MessageCode::Error, diskFull));
         EXPECT_EQ(run.protocol.FileError(), MemoryFile::kDiskFull);
         EXPECT_FALSE(run.file.open);
     }
@@ -175,8 +176,8 @@ TEST(BlockProcedures, ARefusedWriteFailsTheReceiveAtThatBlock) {
         SCOPED_TRACE("BCC blocks");
         BccRun run;
         run.file.capacity = 128 + 10;
-        EXPECT_EQ(run.Receive(), 1u);
-        EXPECT_EQ(run.callback.messages, OnlyMessage(4, diskFull));
+        EXPECT_EQ(run.Receive(), TransferResult::Failed);
+        EXPECT_EQ(run.callback.messages, OnlyMessage(MessageCode::Error, diskFull));
         // ENQ, then the ACK of block 0; block 1 is left unanswered.
         EXPECT_EQ(run.port.writes, (std::vector<Bytes>{kEnqLine, kAckLine}));
         EXPECT_FALSE(run.file.open);
@@ -185,8 +186,8 @@ TEST(BlockProcedures, ARefusedWriteFailsTheReceiveAtThatBlock) {
         SCOPED_TRACE("Y-Modem");
         YModemRun run(Bytes(400, 'L'));
         run.file.capacity = 128 + 10;
-        EXPECT_EQ(run.Receive(), 1u);
-        EXPECT_EQ(run.callback.messages.back(), (RecordedMessage{4, diskFull}));
+        EXPECT_EQ(run.Receive(), TransferResult::Failed);
+        EXPECT_EQ(run.callback.messages.back(), (RecordedMessage{MessageCode::Error, diskFull}));
         // 'C', the header's ACK 'C', the first block's ACK: nothing after the second block.
         EXPECT_EQ(run.port.writes,
                   (std::vector<Bytes>{Bytes{0x43}, Bytes{0x06, 0x43}, Bytes{0x06}}));
@@ -197,9 +198,10 @@ TEST(BlockProcedures, ARefusedWriteFailsTheReceiveAtThatBlock) {
 TEST(BlockProcedures, AFileThatFailsToCloseFailsAnOtherwiseGoodReceive) {
     BccRun run;
     run.file.closeError = 1784;
-    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_EQ(run.Receive(), TransferResult::Failed);
     EXPECT_EQ(run.file.Text(), BlocksText(3));
-    EXPECT_EQ(run.callback.messages, OnlyMessage(4, WIDE_TEXT("System error 1784")));
+    EXPECT_EQ(run.callback.messages,
+              OnlyMessage(MessageCode::Error, WIDE_TEXT("System error 1784")));
 }
 
 }  // namespace

@@ -6,12 +6,21 @@
 #include <cstdint>
 #include <deque>
 #include <functional>
+#include <ostream>
 #include <string>
 #include <vector>
 
 #include "download/portable/serial_protocol.h"  // with the port, file, callback and text types
 
 using Bytes = std::vector<uint8_t>;
+
+// Failure messages name the values as the driver's callers see them.
+inline void PrintTo(TransferResult result, std::ostream* stream) {
+    *stream << (result == TransferResult::Complete ? "Complete" : "Failed");
+}
+inline void PrintTo(MessageCode code, std::ostream* stream) {
+    *stream << "message code " << PostedCodeOf(code);
+}
 
 inline Bytes ToBytes(const std::string& text) {
     return Bytes(text.begin(), text.end());
@@ -122,14 +131,14 @@ public:
     uint32_t Create() override {
         ++creates;
         content.clear();
-        open = createError == 0;
+        open = createError == kFileWritten;
         return createError;
     }
     uint32_t Write(const uint8_t* bytes, size_t count) override {
         ++writeCalls;
         const size_t room = capacity > content.size() ? capacity - content.size() : 0;
         content.insert(content.end(), bytes, bytes + std::min(room, count));
-        return count <= room ? 0 : kDiskFull;
+        return count <= room ? kFileWritten : kDiskFull;
     }
     uint64_t Position() override { return content.size(); }
     uint32_t Close() override {
@@ -144,24 +153,24 @@ public:
     int creates = 0;
     int writeCalls = 0;
     size_t capacity = SIZE_MAX;
-    uint32_t closeError = 0;
-    uint32_t createError = 0;
+    uint32_t closeError = kFileWritten;
+    uint32_t createError = kFileWritten;
 };
 
 struct RecordedMessage {
-    uint32_t code;
+    MessageCode code;
     WideString text;
     bool operator==(const RecordedMessage&) const = default;
 };
 
 // What a run that shows exactly one message must have recorded.
-inline std::vector<RecordedMessage> OnlyMessage(uint32_t code, const WideString& text) {
+inline std::vector<RecordedMessage> OnlyMessage(MessageCode code, const WideString& text) {
     return {{code, text}};
 }
 
 class RecordingCallback final : public TParserCallBack {
 public:
-    void ShowMessage(uint32_t code, const WideChar* text) override {
+    void ShowMessage(MessageCode code, const WideChar* text) override {
         messages.push_back({code, text});
     }
     void SetProgress(uint32_t total, uint32_t current) override {
@@ -204,10 +213,10 @@ struct ProtocolRig {
     EnglishTexts texts;
 };
 
-// A driver of the given protocol selector over its own rig, its port open as its owner leaves it.
+// A driver of the given procedure over its own rig, its port open as its owner leaves it.
 struct ProtocolRun : ProtocolRig {
-    explicit ProtocolRun(uint32_t selector)
-        : protocol(port, clock, file, callback, texts, selector) {
+    explicit ProtocolRun(ReceiveProcedure procedure)
+        : protocol(port, clock, file, callback, texts, procedure) {
         protocol.SetPortOpen(true);
     }
     SerialProtocol protocol;

@@ -40,7 +40,8 @@ std::string Joined(const std::vector<std::string>& lines, size_t count = SIZE_MA
 // (or on NAK too, when nakMovesOn), the same one again on NAK. sendAs may change what goes on the
 // wire for (line index, attempt) and split it into chunks.
 struct LineRun : ProtocolRun {
-    explicit LineRun(std::vector<std::string> sent = {}) : ProtocolRun(1), lines(std::move(sent)) {}
+    explicit LineRun(std::vector<std::string> sent = {})
+        : ProtocolRun(ReceiveProcedure::BccBlocks), lines(std::move(sent)) {}
 
     std::vector<std::string> lines;
     std::function<std::vector<std::string>(size_t index, int attempt, const std::string& line)>
@@ -57,7 +58,7 @@ struct LineRun : ProtocolRun {
             port.Deliver(chunk);
         ++attempt;
     }
-    uint32_t Receive() {
+    TransferResult Receive() {
         port.onWrite = [this](const Bytes& written, FakePort&) {
             if (written == kAckLine || (nakMovesOn && written == kNakLine)) {
                 ++next;
@@ -72,7 +73,7 @@ struct LineRun : ProtocolRun {
 
 TEST(LineProtocol, ReceivesTheWholeTransferAcknowledgingEachLineWithProgressUpToHundred) {
     LineRun run(Transfer(40));
-    EXPECT_EQ(run.Receive(), 0u);
+    EXPECT_EQ(run.Receive(), TransferResult::Complete);
     EXPECT_EQ(run.file.Text(), Joined(run.lines));
     EXPECT_EQ(run.port.writes, std::vector<Bytes>(42, kAckLine));
     EXPECT_FALSE(run.file.open);
@@ -96,7 +97,7 @@ TEST(LineProtocol, LinesSplitAtEveryBoundaryAreJoined) {
                 return std::vector<std::string>{line};
             return std::vector<std::string>{line.substr(0, split), line.substr(split)};
         };
-        ASSERT_EQ(run.Receive(), 0u) << "split at " << split;
+        ASSERT_EQ(run.Receive(), TransferResult::Complete) << "split at " << split;
         EXPECT_EQ(run.file.Text(), Joined(lines)) << "split at " << split;
     }
 }
@@ -104,7 +105,8 @@ TEST(LineProtocol, LinesSplitAtEveryBoundaryAreJoined) {
 TEST(LineProtocol, AReplyThatMovesNoByteIsGivenUpAfterThreeSeconds) {
     LineRun run({Transfer(1).front()});  // the header, then nothing more
     run.port.refuseWrites = true;
-    EXPECT_EQ(run.Receive(), 1u) << "the instrument never hears the ACK and goes silent";
+    EXPECT_EQ(run.Receive(), TransferResult::Failed)
+        << "the instrument never hears the ACK and goes silent";
     // Each refused write costs 100 ms: the reply stops at the first attempt past 3000 ms, and
     // the receive goes on to its own time-out instead of spinning on the dead line.
     EXPECT_EQ(31, run.port.refusedWrites);
@@ -116,7 +118,7 @@ TEST(LineProtocol, WrongCheckCharacterIsRefusedNotWrittenAndTheResendAccepted) {
     run.sendAs = [](size_t index, int attempt, const std::string& line) {
         return std::vector<std::string>{index == 2 && attempt == 0 ? WithWrongCheck(line) : line};
     };
-    EXPECT_EQ(run.Receive(), 0u);
+    EXPECT_EQ(run.Receive(), TransferResult::Complete);
     EXPECT_EQ(run.file.Text(), Joined(run.lines));
     EXPECT_EQ(run.port.WritesOf(kNakLine), 1);
     EXPECT_EQ(run.port.WritesOf(kAckLine), 5);
@@ -129,10 +131,10 @@ TEST(LineProtocol, RefusedLinesDoNotPostponeTheTimeOut) {
     };
     run.port.millisecondsPerWrite = 1000;  // the instrument thinks a second before each answer
     const int64_t start = run.clock.WallSeconds();
-    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_EQ(run.Receive(), TransferResult::Failed);
     EXPECT_GT(run.clock.WallSeconds() - start, 60);
     EXPECT_LT(run.clock.WallSeconds() - start, 70);
-    EXPECT_EQ(run.callback.messages, OnlyMessage(4, kWaitExpired));
+    EXPECT_EQ(run.callback.messages, OnlyMessage(MessageCode::Error, kWaitExpired));
     EXPECT_EQ(run.file.Text(), Joined(run.lines, 2));
 }
 
@@ -140,7 +142,7 @@ TEST(LineProtocol, RepeatedLineIsAcknowledgedTwiceButWrittenOnceUnlessNotAdjacen
     const std::string repeated = DataLine("B,7,1.11111,2.000,");
     const std::string other = DataLine("B,8,1.2,3.0,");
     LineRun run({"A,01,Z\r\n", repeated, repeated, other, repeated, "Z,&,\r\n"});
-    EXPECT_EQ(run.Receive(), 0u);
+    EXPECT_EQ(run.Receive(), TransferResult::Complete);
     EXPECT_EQ(run.port.WritesOf(kAckLine), 6);
     EXPECT_EQ(run.file.Text(), "A,01,Z\r\n" + repeated + other + repeated + "Z,&,\r\n");
 }
@@ -148,7 +150,7 @@ TEST(LineProtocol, RepeatedLineIsAcknowledgedTwiceButWrittenOnceUnlessNotAdjacen
 TEST(LineProtocol, EndLineIsWrittenWithoutTheLineCheck) {
     // The end line, with anything after "Z,&,", would fail the check.
     LineRun run({"A,01,Z\r\n", DataLine("B,1,0.5,"), "Z,&,~~garbage\r\n"});
-    EXPECT_EQ(run.Receive(), 0u);
+    EXPECT_EQ(run.Receive(), TransferResult::Complete);
     EXPECT_EQ(run.file.Text(), Joined(run.lines));
 }
 
@@ -158,7 +160,8 @@ TEST(LineProtocol, SixtyRefusalsBeforeTheHeaderAreToleratedAndTheSixtyFirstEndsS
         LineRun run(std::vector<std::string>(noise, "noise before the header\r\n"));
         run.lines.insert(run.lines.end(), transfer.begin(), transfer.end());
         run.nakMovesOn = true;  // each refused noise line is followed by the next line
-        EXPECT_EQ(run.Receive(), noise == 60 ? 0u : 1u) << noise;
+        EXPECT_EQ(run.Receive(), noise == 60 ? TransferResult::Complete : TransferResult::Failed)
+            << noise;
         EXPECT_EQ(run.port.WritesOf(kNakLine), noise);
         EXPECT_EQ(run.file.Text(), noise == 60 ? Joined(transfer) : "") << noise;
         EXPECT_TRUE(run.callback.messages.empty()) << noise;
@@ -170,38 +173,39 @@ TEST(LineProtocol, FullLineWithoutLineEndIsNeverAcceptedAndTimesOut) {
     LineRun run({"A,01,Z\r\n", std::string(128, 'X'), DataLine("B,1,2,")});
     // Keep streaming after the 128 bytes: the surplus must not overrun the line.
     run.port.onSilence = [](FakePort& port) { port.Queue(Bytes(200, 'Y')); };
-    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_EQ(run.Receive(), TransferResult::Failed);
     EXPECT_EQ(run.file.Text(), "A,01,Z\r\n");
-    EXPECT_EQ(run.callback.messages, OnlyMessage(4, kWaitExpired));
+    EXPECT_EQ(run.callback.messages, OnlyMessage(MessageCode::Error, kWaitExpired));
 }
 
 TEST(LineProtocol, ClosedPortFailsAtOnceAndSilenceEndsAfterMoreThanSixtySeconds) {
     LineRun run;
     const int64_t start = run.clock.milliseconds;
     run.protocol.SetPortOpen(false);
-    EXPECT_EQ(run.Receive(), 1u);
-    EXPECT_EQ(run.protocol.Receive(), 1u) << "the block procedures too";
+    EXPECT_EQ(run.Receive(), TransferResult::Failed);
+    EXPECT_EQ(run.protocol.Receive(), TransferResult::Failed) << "the block procedures too";
     EXPECT_EQ(run.file.creates, 0);
     EXPECT_EQ(run.clock.milliseconds, start) << "no read was tried";
 
     run.protocol.SetPortOpen(true);
-    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_EQ(run.Receive(), TransferResult::Failed);
     EXPECT_EQ(run.clock.milliseconds / 1000 - start / 1000, 61);
-    EXPECT_EQ(run.callback.messages, OnlyMessage(4, kWaitExpired));
+    EXPECT_EQ(run.callback.messages, OnlyMessage(MessageCode::Error, kWaitExpired));
     EXPECT_EQ(run.port.closes, 0);
 }
 
 TEST(LineProtocol, CancelReportsClosesThePortAndLeavesTheDriverUnusable) {
     LineRun run(Transfer(10));
     run.callback.cancelWhen = [&] { return run.file.content.size() > 20; };
-    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_EQ(run.Receive(), TransferResult::Failed);
     EXPECT_EQ(run.callback.messages,
-              OnlyMessage(4, WIDE_TEXT("The communication's process is interrupted by the user")));
+              OnlyMessage(MessageCode::Error,
+                          WIDE_TEXT("The communication's process is interrupted by the user")));
     EXPECT_EQ(run.port.breaks, 1);
     EXPECT_EQ(run.port.closes, 1);
     EXPECT_FALSE(run.protocol.IsPortOpen());
     EXPECT_EQ(run.file.Text(), Joined(run.lines, 2));
-    EXPECT_EQ(run.protocol.ReceiveLines(), 1u);
+    EXPECT_EQ(run.protocol.ReceiveLines(), TransferResult::Failed);
     EXPECT_EQ(run.file.creates, 1);
 }
 
@@ -212,7 +216,7 @@ TEST(LineProtocol, StopRequestEndsWithoutAMessage) {
             run.protocol.RequestStop();
         return false;
     };
-    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_EQ(run.Receive(), TransferResult::Failed);
     EXPECT_TRUE(run.callback.messages.empty());
     EXPECT_EQ(run.port.closes, 0);
 }
@@ -246,7 +250,7 @@ TEST(LineProtocol, LinesAreFramedByCrLfWhateverTheReadsCarry) {
         run.sendAs = [&](size_t index, int, const std::string& line) {
             return index == 2 ? test.cut(line) : std::vector<std::string>{line};
         };
-        EXPECT_EQ(run.Receive(), 0u);
+        EXPECT_EQ(run.Receive(), TransferResult::Complete);
         EXPECT_EQ(run.file.Text(), Joined(lines));
         EXPECT_EQ(run.port.writes, std::vector<Bytes>(lines.size(), kAckLine));
     }
@@ -259,7 +263,7 @@ TEST(LineProtocol, BytesAfterALineAreDroppedByThePurge) {
         return index == 1 ? std::vector<std::string>{line, "stale"}
                           : std::vector<std::string>{line};
     };
-    EXPECT_EQ(run.Receive(), 0u);
+    EXPECT_EQ(run.Receive(), TransferResult::Complete);
     EXPECT_EQ(run.file.Text().find("stale"), std::string::npos);
 }
 
@@ -275,11 +279,11 @@ TEST(LineProtocol, ARefusedWriteFailsTheReceiveBeforeTheLineIsAcknowledged) {
         LineRun run(lines);
         // Room for the lines before `full` and part of that one.
         run.file.capacity = Joined(lines, full).size() + 3;
-        EXPECT_EQ(run.Receive(), 1u);
+        EXPECT_EQ(run.Receive(), TransferResult::Failed);
         EXPECT_EQ(run.port.writes, std::vector<Bytes>(full, kAckLine))
             << "the refused line must not be acknowledged";
         EXPECT_EQ(run.callback.messages,
-                  OnlyMessage(kMessageError, WIDE_TEXT("System error 112")));
+                  OnlyMessage(MessageCode::Error, WIDE_TEXT("System error 112")));
         EXPECT_EQ(run.protocol.FileError(), MemoryFile::kDiskFull);
         EXPECT_EQ(run.file.writeCalls, static_cast<int>(full) + 1) << "no write after the first";
         EXPECT_FALSE(run.file.open);
@@ -289,33 +293,34 @@ TEST(LineProtocol, ARefusedWriteFailsTheReceiveBeforeTheLineIsAcknowledged) {
 TEST(LineProtocol, AFileThatFailsToCloseFailsTheReceiveBeforeTheEndLineIsAcknowledged) {
     LineRun run(Transfer(2));
     run.file.closeError = 1784;  // a delayed write that the disk refused at the flush
-    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_EQ(run.Receive(), TransferResult::Failed);
     EXPECT_EQ(run.port.writes, std::vector<Bytes>(3, kAckLine)) << "the end line stays unanswered";
-    EXPECT_EQ(run.callback.messages, OnlyMessage(kMessageError, WIDE_TEXT("System error 1784")));
+    EXPECT_EQ(run.callback.messages,
+              OnlyMessage(MessageCode::Error, WIDE_TEXT("System error 1784")));
 }
 
 TEST(LineProtocol, AWriteFailureOfOneReceiveIsForgottenByTheNext) {
     LineRun run(Transfer(1));
     run.file.capacity = 4;
-    ASSERT_EQ(run.Receive(), 1u);
+    ASSERT_EQ(run.Receive(), TransferResult::Failed);
     LineRun again(Transfer(1));
     again.file.capacity = 4;
-    ASSERT_EQ(again.Receive(), 1u);
+    ASSERT_EQ(again.Receive(), TransferResult::Failed);
     // The same driver receives again on a disk with room.
     run.file.capacity = SIZE_MAX;
     run.next = 0;
     run.attempt = 0;
     run.callback.messages.clear();
-    EXPECT_EQ(run.Receive(), 0u);
-    EXPECT_EQ(run.protocol.FileError(), 0u);
+    EXPECT_EQ(run.Receive(), TransferResult::Complete);
+    EXPECT_EQ(run.protocol.FileError(), kFileWritten);
     EXPECT_EQ(run.file.Text(), Joined(run.lines));
 }
 
 TEST(LineProtocol, AnOutputFileThatCannotBeCreatedIsReportedAndNothingIsAcknowledged) {
     LineRun run(Transfer(1));
     run.file.createError = 3;  // the temporary folder vanished
-    EXPECT_EQ(run.Receive(), 1u);
+    EXPECT_EQ(run.Receive(), TransferResult::Failed);
     EXPECT_TRUE(run.port.writes.empty());
-    EXPECT_EQ(run.callback.messages, OnlyMessage(kMessageError, WIDE_TEXT("System error 3")));
+    EXPECT_EQ(run.callback.messages, OnlyMessage(MessageCode::Error, WIDE_TEXT("System error 3")));
     EXPECT_EQ(run.protocol.FileError(), 3u);
 }

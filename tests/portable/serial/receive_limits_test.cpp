@@ -34,7 +34,7 @@ Bytes YModemFile() {
 
 // What one receive against an endless instrument left.
 struct Outcome {
-    uint32_t result = 0;
+    TransferResult result = TransferResult::Complete;
     int acknowledged = 0;
     std::vector<RecordedMessage> messages;
     Bytes file;
@@ -88,14 +88,14 @@ TEST(EndlessInstrument, ACancelAfterBlockKEndsTheReceiveAtBlockKPlusOne) {
             SCOPED_TRACE(std::string(NameOf(procedure)) + ", cancel after block " +
                          std::to_string(k));
             const Outcome outcome = RunEndless(procedure, k);
-            EXPECT_EQ(outcome.result, 1u);
+            EXPECT_EQ(outcome.result, TransferResult::Failed);
             // Block k + 1 arrived and was neither acknowledged nor written.
             EXPECT_EQ(outcome.acknowledged, k);
             EXPECT_EQ(outcome.file, FileAfter(procedure, k));
             ASSERT_FALSE(outcome.messages.empty());
-            EXPECT_EQ(outcome.messages.back(), (RecordedMessage{4, kInterrupted}));
+            EXPECT_EQ(outcome.messages.back(), (RecordedMessage{MessageCode::Error, kInterrupted}));
             EXPECT_EQ(std::count(outcome.messages.begin(), outcome.messages.end(),
-                                 RecordedMessage{4, kInterrupted}),
+                                 RecordedMessage{MessageCode::Error, kInterrupted}),
                       1);
             EXPECT_FALSE(outcome.portOpen);
             EXPECT_EQ(outcome.closes, 1);
@@ -107,11 +107,11 @@ TEST(EndlessInstrument, TheSizeCapEndsTheReceiveWithItsMessage) {
     for (const Procedure procedure : {Procedure::BccBlocks, Procedure::YModem}) {
         SCOPED_TRACE(NameOf(procedure));
         const Outcome outcome = RunEndless(procedure, -1);
-        EXPECT_EQ(outcome.result, 1u);
+        EXPECT_EQ(outcome.result, TransferResult::Failed);
         // Every block up to the cap is taken; the one that would pass it is not acknowledged.
         EXPECT_EQ(outcome.acknowledged, kBlocksToCap);
         ASSERT_FALSE(outcome.messages.empty());
-        EXPECT_EQ(outcome.messages.back(), (RecordedMessage{4, SizeLimitText(1)}));
+        EXPECT_EQ(outcome.messages.back(), (RecordedMessage{MessageCode::Error, SizeLimitText(1)}));
         EXPECT_EQ(outcome.file, FileAfter(procedure, kBlocksToCap));
     }
 }
@@ -119,17 +119,18 @@ TEST(EndlessInstrument, TheSizeCapEndsTheReceiveWithItsMessage) {
 TEST(EndlessInstrument, TheRawStreamAndTheLineProtocolEndAtTheCapToo) {
     {
         SCOPED_TRACE("raw stream: bursts without EOT");
-        ProtocolRun run(0);  // all of each burst is data (selector 3 takes 128 of 136)
+        // All of each burst is data (without flow control a 136-byte burst would give 128).
+        ProtocolRun run(ReceiveProcedure::RawStream);
         run.protocol.SetReceiveCap(kTestCap);
         run.port.onSilence = [](FakePort& port) { port.Queue(Bytes(136, 'R')); };
-        EXPECT_EQ(run.protocol.Receive(), 1u);
-        EXPECT_EQ(run.callback.messages, OnlyMessage(4, SizeLimitText(1)));
+        EXPECT_EQ(run.protocol.Receive(), TransferResult::Failed);
+        EXPECT_EQ(run.callback.messages, OnlyMessage(MessageCode::Error, SizeLimitText(1)));
         // Every burst up to the cap, none past it.
         EXPECT_EQ(run.file.content.size(), kTestCap / 136 * 136);
     }
     {
         SCOPED_TRACE("line protocol: checked lines without the end line");
-        ProtocolRun run(1);
+        ProtocolRun run(ReceiveProcedure::BccBlocks);
         run.protocol.SetReceiveCap(kTestCap);
         const Bytes ack = {0x06, ',', 'R', ',', 0x0D, 0x0A};
         int sent = 0;
@@ -145,8 +146,8 @@ TEST(EndlessInstrument, TheRawStreamAndTheLineProtocolEndAtTheCapToo) {
                 port.Deliver(next());
         };
         run.port.Deliver("A,01,Z\r\n");
-        EXPECT_EQ(run.protocol.ReceiveLines(), 1u);
-        EXPECT_EQ(run.callback.messages, OnlyMessage(4, SizeLimitText(1)));
+        EXPECT_EQ(run.protocol.ReceiveLines(), TransferResult::Failed);
+        EXPECT_EQ(run.callback.messages, OnlyMessage(MessageCode::Error, SizeLimitText(1)));
         // The header and 100-byte lines up to the cap, each acknowledged; the next one not.
         const size_t lines = (kTestCap - 8) / 100;
         EXPECT_EQ(run.file.content.size(), 8 + lines * 100);
@@ -158,11 +159,12 @@ TEST(EndlessInstrument, TheRawStreamAndTheLineProtocolEndAtTheCapToo) {
 TEST(YModem, AHeaderAnnouncingMoreThanTheCapIsRefusedAtOnce) {
     const struct {
         uint64_t announced;
-        uint32_t result;
+        TransferResult result;
         bool headerAcknowledged;
     } cases[] = {
-        {kMaxReceiveBytes + 1, 1, false},
-        {kMaxReceiveBytes, 0, true},  // at the cap: taken (the sender here then sends its EOT)
+        {kMaxReceiveBytes + 1, TransferResult::Failed, false},
+        {kMaxReceiveBytes, TransferResult::Complete,
+         true},  // at the cap: taken (the sender here then sends its EOT)
     };
     for (const auto& test : cases) {
         SCOPED_TRACE(test.announced);
@@ -172,7 +174,7 @@ TEST(YModem, AHeaderAnnouncingMoreThanTheCapIsRefusedAtOnce) {
         EXPECT_EQ(run.port.WritesOf(Bytes{0x06, 0x43}), test.headerAcknowledged ? 1 : 0);
         const bool capMessage =
             !run.callback.messages.empty() &&
-            run.callback.messages.back() == RecordedMessage{4, SizeLimitText(64)};
+            run.callback.messages.back() == RecordedMessage{MessageCode::Error, SizeLimitText(64)};
         EXPECT_EQ(capMessage, !test.headerAcknowledged);
     }
 }

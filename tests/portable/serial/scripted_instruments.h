@@ -26,7 +26,7 @@ inline std::string BlockText(int index) {
 // again on NAK, and EOT after the last. damage(index, attempt) may spoil what goes out; the
 // instrument may miss our first ACK of block missedAck and send that block again.
 struct BccRun : ProtocolRun {
-    BccRun() : ProtocolRun(1) {}
+    BccRun() : ProtocolRun(ReceiveProcedure::BccBlocks) {}
 
     int blocks = 3;  // kEndless: never the EOT
     int next = 0;
@@ -44,7 +44,7 @@ struct BccRun : ProtocolRun {
         ++attempt;
         port.Deliver(Bytes(block.begin(), block.end()));
     }
-    uint32_t Receive() {
+    TransferResult Receive() {
         port.onWrite = [this](const Bytes& written, FakePort&) {
             if (written == kAckLine && next == missedAck) {
                 missedAck = -1;  // lost on the line: the instrument sends the block again
@@ -75,7 +75,8 @@ inline std::string BlocksText(int count) {
 // each ACK and EOT after the last. damage(block, bytes) may spoil what goes out (block 0 is the
 // header).
 struct YModemRun : ProtocolRun {
-    explicit YModemRun(Bytes bytes) : ProtocolRun(2), sent(std::move(bytes)) {}
+    explicit YModemRun(Bytes bytes)
+        : ProtocolRun(ReceiveProcedure::YModem), sent(std::move(bytes)) {}
 
     Bytes sent;
     int64_t announcedSize = -1;  // what the header says; -1: the size of sent
@@ -113,7 +114,7 @@ struct YModemRun : ProtocolRun {
             damage(nextBlock, block);
         port.Deliver(block);
     }
-    uint32_t Receive() {
+    TransferResult Receive() {
         port.onWrite = [this](const Bytes& written, FakePort&) {
             if ((written == Bytes{0x43} && nextBlock == 0) || written == Bytes{0x15}) {
                 Send();

@@ -1,0 +1,65 @@
+// The conversions between the protocol's names and the numbers stored and posted for them.
+#include "download/portable/protocol_vocabulary.h"
+
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <iterator>
+#include <set>
+
+namespace {
+
+constexpr ReceiveProcedure kProcedures[] = {
+    ReceiveProcedure::RawStream,
+    ReceiveProcedure::BccBlocks,
+    ReceiveProcedure::YModem,
+    ReceiveProcedure::RawStreamWithoutFlowControl,
+};
+constexpr MessageCode kCodes[] = {
+    MessageCode::Information,
+    MessageCode::Error,
+    MessageCode::PortNotOpened,
+};
+
+TEST(ProtocolVocabulary, EveryProcedureHasItsOwnStoredSelectorAndComesBackFromIt) {
+    std::set<uint32_t> stored;
+    for (const ReceiveProcedure procedure : kProcedures) {
+        const uint32_t selector = StoredSelectorOf(procedure);
+        EXPECT_TRUE(stored.insert(selector).second) << selector << " names two procedures";
+        EXPECT_EQ(ProcedureOfStoredSelector(selector), procedure) << selector;
+    }
+}
+
+TEST(ProtocolVocabulary, AStoredSelectorThatNamesNoProcedureIsRefused) {
+    // A station's Protocol value is whatever the registry or a pasted block holds.
+    int named = 0;
+    for (uint32_t selector = 0; selector < 256; ++selector) {
+        const auto procedure = ProcedureOfStoredSelector(selector);
+        if (procedure) {
+            ++named;
+            EXPECT_EQ(StoredSelectorOf(*procedure), selector);
+        }
+    }
+    EXPECT_EQ(named, static_cast<int>(std::size(kProcedures)));
+    for (const uint32_t selector : {0x80000001u, 0xFFFFFFFFu})
+        EXPECT_FALSE(ProcedureOfStoredSelector(selector)) << selector;
+}
+
+TEST(ProtocolVocabulary, PostedCodesComeBackAndOtherNumbersNameNoCode) {
+    std::set<uint32_t> posted;
+    for (const MessageCode code : kCodes) {
+        const uint32_t number = PostedCodeOf(code);
+        EXPECT_TRUE(posted.insert(number).second) << number << " names two codes";
+        EXPECT_EQ(MessageCodeOfPosted(number), code) << number;
+    }
+    int named = 0;
+    for (uint64_t number = 0; number < 256; ++number)
+        named += MessageCodeOfPosted(number).has_value();
+    EXPECT_EQ(named, static_cast<int>(std::size(kCodes)));
+    // A window message's whole argument counts: a number above 32 bits is no code, whatever its
+    // low bits say.
+    for (const MessageCode code : kCodes)
+        EXPECT_FALSE(MessageCodeOfPosted((uint64_t{1} << 32) | PostedCodeOf(code)));
+}
+
+}  // namespace
