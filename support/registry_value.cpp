@@ -7,7 +7,8 @@
 #include "support/portable/wide_text.h"
 #include "support/unique_resource.h"
 
-LONG ReadStringValue(HKEY key, const wchar_t* name, DWORD maxBytes, std::wstring& text) {
+LONG ReadStringValue(HKEY key, const wchar_t* name, DWORD maxBytes,
+                     std::wstring& text) noexcept try {
     // Exactly the bytes offered (a size with room added could wrap in a 32-bit build), and never
     // none: given a null buffer the registry reports the value's whole size as if it had read it.
     std::vector<BYTE> buffer(std::max<DWORD>(maxBytes, 1));
@@ -23,9 +24,11 @@ LONG ReadStringValue(HKEY key, const wchar_t* name, DWORD maxBytes, std::wstring
     text.assign(characters,
                 BoundedLength(characters, std::min<DWORD>(size, maxBytes) / sizeof(wchar_t)));
     return ERROR_SUCCESS;
+} catch (...) {
+    return ERROR_NOT_ENOUGH_MEMORY;  // the buffer or the text: allocation is all that can throw
 }
 
-LONG ReadDwordValue(HKEY key, const wchar_t* name, DWORD& value) {
+LONG ReadDwordValue(HKEY key, const wchar_t* name, DWORD& value) noexcept {
     DWORD type = 0;
     DWORD data = 0;
     DWORD size = sizeof(data);
@@ -39,17 +42,17 @@ LONG ReadDwordValue(HKEY key, const wchar_t* name, DWORD& value) {
     return ERROR_SUCCESS;
 }
 
-LONG WriteStringValue(HKEY key, const wchar_t* name, const std::wstring& text) {
+LONG WriteStringValue(HKEY key, const wchar_t* name, const std::wstring& text) noexcept {
     return ::RegSetValueExW(key, name, 0, REG_SZ, reinterpret_cast<const BYTE*>(text.c_str()),
                             static_cast<DWORD>((text.size() + 1) * sizeof(wchar_t)));
 }
 
-LONG WriteDwordValue(HKEY key, const wchar_t* name, DWORD value) {
+LONG WriteDwordValue(HKEY key, const wchar_t* name, DWORD value) noexcept {
     return ::RegSetValueExW(key, name, 0, REG_DWORD, reinterpret_cast<const BYTE*>(&value),
                             sizeof(value));
 }
 
-LONG DeleteKeyRecursive(HKEY parent, const wchar_t* subkey) {
+LONG DeleteKeyRecursive(HKEY parent, const wchar_t* subkey) noexcept {
     UniqueRegKey key;
     LONG status = ::RegOpenKeyExW(parent, subkey, 0, KEY_READ | KEY_WRITE, key.put());
     if (status != ERROR_SUCCESS)

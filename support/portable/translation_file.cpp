@@ -85,7 +85,7 @@ WideString DecodeTranslationEscapes(WideStringView text) {
     return decoded;
 }
 
-bool DecodeTranslationFileText(const uint8_t* bytes, size_t size, WideString& text) {
+bool DecodeTranslationFileText(const uint8_t* bytes, size_t size, WideString& text) noexcept try {
     text.clear();
     if (bytes == nullptr || size < 2)
         return false;
@@ -105,13 +105,17 @@ bool DecodeTranslationFileText(const uint8_t* bytes, size_t size, WideString& te
     else
         DecodeUtf8(bytes, size, text);
     return true;
+} catch (...) {
+    text.clear();  // out of memory: no text rather than part of one
+    return false;
 }
 
-bool ParseTranslationFile(const uint8_t* bytes, size_t size, TranslationMap& map) {
+bool ParseTranslationFile(const uint8_t* bytes, size_t size, TranslationMap& map) noexcept try {
     WideString text;
     if (!DecodeTranslationFileText(bytes, size, text))
         return false;
 
+    TranslationMap parsed;
     WideString pendingEnglish;
     bool englishPending = false;
     size_t start = 0;
@@ -146,8 +150,12 @@ bool ParseTranslationFile(const uint8_t* bytes, size_t size, TranslationMap& map
         }
         englishPending = false;
         if (!pendingEnglish.empty())
-            map.emplace(std::move(pendingEnglish), std::move(entry));
+            parsed.emplace(std::move(pendingEnglish), std::move(entry));
         pendingEnglish.clear();
     }
+    // The caller's map changes only when the whole file was read.
+    map.merge(parsed);
     return true;
+} catch (...) {
+    return false;  // out of memory
 }

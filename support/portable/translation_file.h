@@ -21,8 +21,11 @@ WideString DecodeTranslationEscapes(WideStringView text);
 // next one its translation. A blank line, or a "[" line without "]", drops an English line that
 // is still waiting for its translation; every other line is a comment. The first pair of an
 // English text wins. False, with map unchanged, when the bytes cannot be a translation file
-// (fewer than 2 bytes, or UTF-16 big-endian).
-[[nodiscard]] bool ParseTranslationFile(const uint8_t* bytes, size_t size, TranslationMap& map);
+// (fewer than 2 bytes, or UTF-16 big-endian) or memory runs out.
+[[nodiscard]] bool ParseTranslationFile(const uint8_t* bytes, size_t size,
+                                        TranslationMap& map) noexcept;
 
-// The file's bytes as UTF-16 text by the rules above; false for the rejected forms.
-[[nodiscard]] bool DecodeTranslationFileText(const uint8_t* bytes, size_t size, WideString& text);
+// The file's bytes as UTF-16 text by the rules above; false, and no text, for the rejected forms
+// and when memory runs out.
+[[nodiscard]] bool DecodeTranslationFileText(const uint8_t* bytes, size_t size,
+                                             WideString& text) noexcept;

@@ -3,11 +3,16 @@
 
 #include <shlwapi.h>
 
-HRESULT PartialFile::Create(const std::wstring& folder) {
+HRESULT PartialFile::Create(const std::wstring& folder) noexcept {
     wchar_t name[MAX_PATH];
     if (::GetTempFileNameW(folder.c_str(), L"lvc", 0, name) == 0)
         return HRESULT_FROM_WIN32(::GetLastError());
-    path_ = name;  // the placeholder exists from here on: Discard removes it
+    try {
+        path_ = name;  // the placeholder exists from here on: Discard removes it
+    } catch (...) {
+        (void)::DeleteFileW(name);  // no path kept to remove it by later
+        return E_OUTOFMEMORY;
+    }
     return ::SHCreateStreamOnFileEx(path_.c_str(), STGM_CREATE | STGM_WRITE, FILE_ATTRIBUTE_NORMAL,
                                     TRUE, nullptr, &stream_);
 }

@@ -16,7 +16,7 @@ public:
     ~PartialFile() { Discard(); }
 
     // A new, empty file of a temporary name in folder.
-    [[nodiscard]] HRESULT Create(const std::wstring& folder);
+    [[nodiscard]] HRESULT Create(const std::wstring& folder) noexcept;
     const std::wstring& path() const noexcept { return path_; }
     IStream* stream() const noexcept { return stream_.Get(); }
 

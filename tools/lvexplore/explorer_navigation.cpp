@@ -20,7 +20,7 @@ HRESULT BindToFolder(PCIDLIST_ABSOLUTE folder, ComPtr<IShellFolder>& bound) {
 
 }  // namespace
 
-HRESULT CExplorerWindow::BrowseTo(PCIDLIST_ABSOLUTE folder) {
+HRESULT CExplorerWindow::BrowseTo(PCIDLIST_ABSOLUTE folder) noexcept {
     try {
         failedStep_ = BrowseStep::None;
         return Navigate(folder, true);
@@ -28,7 +28,7 @@ HRESULT CExplorerWindow::BrowseTo(PCIDLIST_ABSOLUTE folder) {
     CATCH_RETURN()
 }
 
-HRESULT CExplorerWindow::BrowseToParsingName(const wchar_t* parsingName) {
+HRESULT CExplorerWindow::BrowseToParsingName(const wchar_t* parsingName) noexcept {
     failedStep_ = BrowseStep::None;
     RETURN_HR_IF(E_POINTER, !parsingName);
     PIDLIST_ABSOLUTE parsed = nullptr;
@@ -41,7 +41,7 @@ HRESULT CExplorerWindow::BrowseToParsingName(const wchar_t* parsingName) {
     return BrowseTo(list.get());
 }
 
-HRESULT CExplorerWindow::BrowseToView(IShellView* view, PCIDLIST_ABSOLUTE folder) {
+HRESULT CExplorerWindow::BrowseToView(IShellView* view, PCIDLIST_ABSOLUTE folder) noexcept {
     try {
         failedStep_ = BrowseStep::None;
         return ShowView(view, folder, true);
@@ -49,23 +49,15 @@ HRESULT CExplorerWindow::BrowseToView(IShellView* view, PCIDLIST_ABSOLUTE folder
     CATCH_RETURN()
 }
 
-bool CExplorerWindow::GoBack() {
-    try {
-        return SUCCEEDED(NavigateBack());
-    } catch (...) {
-        return false;
-    }
+bool CExplorerWindow::GoBack() noexcept {
+    return SUCCEEDED(NavigateBack());
 }
 
-bool CExplorerWindow::GoUp() {
-    try {
-        return SUCCEEDED(NavigateUp());
-    } catch (...) {
-        return false;
-    }
+bool CExplorerWindow::GoUp() noexcept {
+    return SUCCEEDED(NavigateUp());
 }
 
-HRESULT CExplorerWindow::Navigate(PCIDLIST_ABSOLUTE folder, bool remember) {
+HRESULT CExplorerWindow::Navigate(PCIDLIST_ABSOLUTE folder, bool remember) noexcept {
     RETURN_HR_IF(E_POINTER, !folder);
     ComPtr<IShellFolder> shellFolder;
     HRESULT result = BindToFolder(folder, shellFolder);
@@ -82,13 +74,17 @@ HRESULT CExplorerWindow::Navigate(PCIDLIST_ABSOLUTE folder, bool remember) {
     return ShowView(view.Get(), folder, remember);
 }
 
-HRESULT CExplorerWindow::ShowView(IShellView* view, PCIDLIST_ABSOLUTE folder, bool remember) {
+HRESULT CExplorerWindow::ShowView(IShellView* view, PCIDLIST_ABSOLUTE folder,
+                                  bool remember) noexcept {
     RETURN_HR_IF(E_UNEXPECTED, !frame_);
     RETURN_HR_IF(E_POINTER, !view || !folder);
     UniqueAbsoluteIdList place(::ILCloneFull(folder));
     RETURN_IF_NULL_ALLOC(place.get());
     // The one allocation that could fail after the old view is gone is made now.
-    history_.reserve(history_.size() + 1);
+    try {
+        history_.reserve(history_.size() + 1);
+    }
+    CATCH_RETURN()
 
     FOLDERSETTINGS settings = NextFolderSettings();
     RECT area = ViewArea();
@@ -118,7 +114,7 @@ HRESULT CExplorerWindow::ShowView(IShellView* view, PCIDLIST_ABSOLUTE folder, bo
     return S_OK;
 }
 
-HRESULT CExplorerWindow::NavigateBack() {
+HRESULT CExplorerWindow::NavigateBack() noexcept {
     if (history_.empty())
         return E_FAIL;
     UniqueAbsoluteIdList previous = std::move(history_.back());
@@ -129,7 +125,7 @@ HRESULT CExplorerWindow::NavigateBack() {
     return result;
 }
 
-HRESULT CExplorerWindow::NavigateUp() {
+HRESULT CExplorerWindow::NavigateUp() noexcept {
     if (!current_ || ILIsEmpty(current_.get()))
         return E_FAIL;
     UniqueAbsoluteIdList parent(::ILCloneFull(current_.get()));

@@ -69,7 +69,8 @@ CExplorerWindow::~CExplorerWindow() {
     Close();
 }
 
-HRESULT CExplorerWindow::Create(const ExplorerOptions& options, ComPtr<CExplorerWindow>& window) {
+HRESULT CExplorerWindow::Create(const ExplorerOptions& options,
+                                 ComPtr<CExplorerWindow>& window) noexcept {
     try {
         window.Reset();
         ComPtr<CExplorerWindow> made = MakeComObject<CExplorerWindow>(options);
@@ -192,10 +193,10 @@ void CExplorerWindow::OnCommand(WPARAM wParam, LPARAM lParam) {
             Close();
             return;
         case kCommandBack:
-            GoBack();
+            (void)GoBack();  // nothing to go back to: the command does nothing, as a browser's
             return;
         case kCommandUp:
-            GoUp();
+            (void)GoUp();  // at the desktop already
             return;
         case kCommandRefresh:
             if (const ComPtr<IShellView> view = view_)

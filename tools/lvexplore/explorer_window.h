@@ -44,20 +44,20 @@ enum class BrowseStep {
 class CExplorerWindow final : public ComObject<IShellBrowser, ICommDlgBrowser> {
 public:
     [[nodiscard]] static HRESULT Create(const ExplorerOptions& options,
-                                        Microsoft::WRL::ComPtr<CExplorerWindow>& window);
+                                        Microsoft::WRL::ComPtr<CExplorerWindow>& window) noexcept;
 
     // Binds the folder from the desktop, asks it for its view and shows that view in place of the
     // current one; the current folder goes into the history for Back.
-    [[nodiscard]] HRESULT BrowseTo(PCIDLIST_ABSOLUTE folder);
+    [[nodiscard]] HRESULT BrowseTo(PCIDLIST_ABSOLUTE folder) noexcept;
     // SHParseDisplayName, then BrowseTo.
-    [[nodiscard]] HRESULT BrowseToParsingName(const wchar_t* parsingName);
+    [[nodiscard]] HRESULT BrowseToParsingName(const wchar_t* parsingName) noexcept;
     // Shows a view the caller made (from a folder of its own) as the view of that folder.
-    [[nodiscard]] HRESULT BrowseToView(IShellView* view, PCIDLIST_ABSOLUTE folder);
+    [[nodiscard]] HRESULT BrowseToView(IShellView* view, PCIDLIST_ABSOLUTE folder) noexcept;
     BrowseStep FailedStep() const noexcept { return failedStep_; }
 
     // False when there is nothing to go back or up to, or the browse failed.
-    bool GoBack();
-    bool GoUp();
+    [[nodiscard]] bool GoBack() noexcept;
+    [[nodiscard]] bool GoUp() noexcept;
 
     IShellView* View() const noexcept { return view_.Get(); }
     PCIDLIST_ABSOLUTE CurrentFolder() const noexcept { return current_.get(); }
@@ -123,10 +123,11 @@ private:
 
     [[nodiscard]] HRESULT CreateFrame() noexcept;
     [[nodiscard]] HRESULT CreateControls(HWND frame) noexcept;
-    [[nodiscard]] HRESULT Navigate(PCIDLIST_ABSOLUTE folder, bool remember);
-    [[nodiscard]] HRESULT ShowView(IShellView* view, PCIDLIST_ABSOLUTE folder, bool remember);
-    [[nodiscard]] HRESULT NavigateBack();
-    [[nodiscard]] HRESULT NavigateUp();
+    [[nodiscard]] HRESULT Navigate(PCIDLIST_ABSOLUTE folder, bool remember) noexcept;
+    [[nodiscard]] HRESULT ShowView(IShellView* view, PCIDLIST_ABSOLUTE folder,
+                                   bool remember) noexcept;
+    [[nodiscard]] HRESULT NavigateBack() noexcept;
+    [[nodiscard]] HRESULT NavigateUp() noexcept;
     FOLDERSETTINGS NextFolderSettings() const noexcept;
     void ReleaseView() noexcept;
     void ForgetLentPopups(bool all) noexcept;
