@@ -8,16 +8,13 @@
 
 CEnumIDListImpl::~CEnumIDListImpl() = default;
 
-bool CEnumIDListImpl::AddToEnumList(PITEMID_CHILD item) noexcept {
-    UniqueChildPidl owned(item);
-    if (!owned)
-        return false;
+HRESULT CEnumIDListImpl::AddToEnumList(UniqueChildPidl item) noexcept {
+    RETURN_HR_IF(E_POINTER, !item);
     try {
-        items_.push_back(std::move(owned));
-        return true;
-    } catch (...) {
-        return false;
+        items_.push_back(std::move(item));
+        return S_OK;
     }
+    CATCH_RETURN()
 }
 
 void CEnumIDListImpl::DeleteList() noexcept {
@@ -37,7 +34,8 @@ HRESULT CEnumIDListImpl::Next(ULONG count, PITEMID_CHILD* items, ULONG* fetched)
     std::vector<UniqueChildPidl> copies;
     try {
         for (size_t next = position_; copies.size() < count && next < items_.size(); ++next) {
-            copies.emplace_back(manager_.CopyItem(items_[next].get()));
+            copies.push_back(manager_.CopyItem(items_[next].get()));
+            // The list holds only well-formed items of its own: a copy fails for want of memory.
             if (!copies.back())
                 return E_OUTOFMEMORY;
         }

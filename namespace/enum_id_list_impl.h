@@ -23,8 +23,9 @@ public:
 protected:
     virtual ~CEnumIDListImpl();
 
-    // Takes the item over. False (the item freed) when there is no memory for it.
-    [[nodiscard]] bool AddToEnumList(PITEMID_CHILD item) noexcept;
+    // Takes the item over: S_OK; E_POINTER when there is none; E_OUTOFMEMORY (the item freed)
+    // when there is no memory for it.
+    [[nodiscard]] HRESULT AddToEnumList(UniqueChildPidl item) noexcept;
     void DeleteList() noexcept;
 
     CPidlMgr manager_;  // the enumerator's own, gone with it

@@ -43,11 +43,11 @@ HRESULT CLVEnumIDList::Fill(const wchar_t* folderPath, SHCONTF flags) noexcept {
                                               ? StationFileName(station.Model)
                                               : StationFileName(std::wstring());
             const std::vector<uint8_t> name = ItemNameBytes(fileName);
-            PITEMID_CHILD item =
+            UniqueChildPidl item =
                 manager_.CreateItem(PT_FILE, name.data(), static_cast<UINT>(name.size()));
             // An item that cannot be made is left out; only a node that cannot be added fails.
-            if (item && !AddToEnumList(item))
-                return E_OUTOFMEMORY;
+            if (item)
+                RETURN_IF_FAILED(AddToEnumList(std::move(item)));
         }
         return S_OK;
     }
@@ -61,9 +61,9 @@ HRESULT CLVEnumIDList::AddStations(const std::wstring& rootName) noexcept {
         // as "Site", and the folder would act on the real "Site". FindStation skips them alike.
         for (const std::wstring& name : ListStationNames()) {
             const std::wstring itemPath = rootName + L"\\" + name;
-            PITEMID_CHILD item = manager_.CreateItemPidl(itemPath.c_str());
-            if (item && !AddToEnumList(item))
-                return E_OUTOFMEMORY;
+            UniqueChildPidl item = manager_.CreateItemPidl(itemPath.c_str());
+            if (item)
+                RETURN_IF_FAILED(AddToEnumList(std::move(item)));
         }
         return S_OK;
     }

@@ -7,7 +7,7 @@
 #include "support/error_handling.h"
 
 HRESULT CLVExtractIcon::SetItem(PCUIDLIST_RELATIVE fullList) noexcept {
-    fullList_.reset(manager_.CopyPidl(fullList));
+    fullList_ = manager_.CopyPidl(fullList);
     RETURN_IF_NULL_ALLOC(fullList_.get());
     return S_OK;
 }

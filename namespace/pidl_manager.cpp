@@ -26,8 +26,8 @@ CPidlMgr::CPidlMgr() noexcept {
 
 CPidlMgr::~CPidlMgr() = default;
 
-PITEMID_CHILD CPidlMgr::AsChild(PIDLIST_RELATIVE list) noexcept {
-    return reinterpret_cast<PITEMID_CHILD>(list);
+UniqueChildPidl CPidlMgr::AsChild(UniqueRelativePidl list) noexcept {
+    return UniqueChildPidl(reinterpret_cast<PITEMID_CHILD>(list.release()));
 }
 
 PCUITEMID_CHILD CPidlMgr::AsChild(PCUIDLIST_RELATIVE list) noexcept {
@@ -67,127 +67,134 @@ UINT CPidlMgr::GetSize(PCUIDLIST_RELATIVE list) const noexcept {
     return size;
 }
 
-PIDLIST_RELATIVE CPidlMgr::CopyPidl(PCUIDLIST_RELATIVE list) const noexcept {
+UniqueRelativePidl CPidlMgr::AsList(UniqueChildPidl item) noexcept {
+    return UniqueRelativePidl(item.release());
+}
+
+UniqueRelativePidl CPidlMgr::CopyPidl(PCUIDLIST_RELATIVE list) const noexcept {
     if (!list || !allocator_)
-        return nullptr;
+        return {};
     const UINT size = GetSize(list);
     auto* copy = static_cast<uint8_t*>(allocator_->Alloc(size));
     if (!copy)
-        return nullptr;
+        return {};
     memcpy(copy, list, size);
-    return ListAt(copy);
+    return UniqueRelativePidl(ListAt(copy));
 }
 
-PITEMID_CHILD CPidlMgr::CopyItem(PCUIDLIST_RELATIVE list) const noexcept {
+UniqueChildPidl CPidlMgr::CopyItem(PCUIDLIST_RELATIVE list) const noexcept {
     if (!list)
-        return nullptr;
+        return {};
     return AsChild(CopyLeadingBytes(list, list->mkid.cb));
 }
 
-PIDLIST_RELATIVE CPidlMgr::CopyParent(PCUIDLIST_RELATIVE list) const noexcept {
+UniqueRelativePidl CPidlMgr::CopyParent(PCUIDLIST_RELATIVE list) const noexcept {
     if (GetItemCount(list) < 2)
-        return nullptr;
+        return {};
     return CopyLeadingBytes(list, static_cast<UINT>(Bytes(GetLastItem(list)) - Bytes(list)));
 }
 
-PIDLIST_RELATIVE CPidlMgr::CopyLeadingBytes(PCUIDLIST_RELATIVE list, UINT size) const noexcept {
+UniqueRelativePidl CPidlMgr::CopyLeadingBytes(PCUIDLIST_RELATIVE list, UINT size) const noexcept {
     if (!allocator_)
-        return nullptr;
+        return {};
     auto* copy = static_cast<uint8_t*>(allocator_->Alloc(size + kListTerminatorSize));
     if (!copy)
-        return nullptr;
+        return {};
     memcpy(copy, list, size);
     memset(copy + size, 0, kListTerminatorSize);
-    return ListAt(copy);
+    return UniqueRelativePidl(ListAt(copy));
 }
 
-PIDLIST_RELATIVE CPidlMgr::CopyFromIndex(PCUIDLIST_RELATIVE list, UINT index) const noexcept {
+UniqueRelativePidl CPidlMgr::CopyFromIndex(PCUIDLIST_RELATIVE list, UINT index) const noexcept {
     if (!list || index >= GetItemCount(list))
-        return nullptr;
+        return {};
     PCUIDLIST_RELATIVE item = list;
     for (UINT skipped = 0; skipped < index; ++skipped) {
         if (item->mkid.cb == 0)
-            return nullptr;
+            return {};
         item = GetNextItem(item);
     }
     return CopyPidl(item);
 }
 
-PIDLIST_RELATIVE CPidlMgr::ConcatPidls(PCUIDLIST_RELATIVE first,
-                                       PCUIDLIST_RELATIVE second) const noexcept {
+UniqueRelativePidl CPidlMgr::ConcatPidls(PCUIDLIST_RELATIVE first,
+                                         PCUIDLIST_RELATIVE second) const noexcept {
     if (!first && !second)
-        return nullptr;
+        return {};
     if (!first)
         return CopyPidl(second);
     if (!second)
         return CopyPidl(first);
     if (!allocator_)
-        return nullptr;
+        return {};
     const UINT firstSize = GetSize(first) - kListTerminatorSize;
     const UINT secondSize = GetSize(second);
     auto* joined = static_cast<uint8_t*>(allocator_->Alloc(firstSize + secondSize));
     if (!joined)
-        return nullptr;
+        return {};
     memcpy(joined, first, firstSize);
     memcpy(joined + firstSize, second, secondSize);
-    return ListAt(joined);
+    return UniqueRelativePidl(ListAt(joined));
 }
 
-PITEMID_CHILD CPidlMgr::CreateItem(DWORD kind, const void* data, UINT byteCount) const noexcept {
+UniqueChildPidl CPidlMgr::CreateItem(DWORD kind, const void* data, UINT byteCount) const noexcept {
     // cb is 16 bits wide: larger names cannot be carried.
     if (!allocator_ || byteCount + kItemSizeOverhead > 0xFFFF)
-        return nullptr;
+        return {};
     auto* item = static_cast<uint8_t*>(allocator_->Alloc(ItemAllocationSize(byteCount)));
     if (!item)
-        return nullptr;
+        return {};
     WriteItem(item, kind, data, byteCount);
-    return AsChild(ListAt(item));
+    return AsChild(UniqueRelativePidl(ListAt(item)));
 }
 
-void CPidlMgr::FreePidl(PIDLIST_RELATIVE list) const noexcept {
-    if (list && allocator_)
-        allocator_->Free(list);
-}
-
-PITEMID_CHILD CPidlMgr::CreateNamedItem(DWORD kind, const std::wstring& name) const noexcept {
+UniqueChildPidl CPidlMgr::CreateNamedItem(DWORD kind, WideStringView name) const noexcept {
     try {
         const std::vector<uint8_t> bytes = ItemNameBytes(name);
         return CreateItem(kind, bytes.data(), static_cast<UINT>(bytes.size()));
     } catch (...) {
-        return nullptr;
+        return {};
     }
 }
 
-PITEMID_CHILD CPidlMgr::CreateRootPidl() const {
+UniqueChildPidl CPidlMgr::CreateRootPidl() const noexcept {
     return CreateNamedItem(PT_ROOT, kRootItemName);
 }
 
-PITEMID_CHILD CPidlMgr::CreateItemPidl(const wchar_t* path) const {
+UniqueChildPidl CPidlMgr::CreateItemPidl(const wchar_t* path) const noexcept {
     if (!path)
-        return nullptr;
-    const std::vector<std::wstring> components = SplitPathComponents(path);
-    if (components.empty())
-        return nullptr;
-    if (components.size() > 1)
-        return CreateNamedItem(PT_STATION, components[1]);
-    return CreateNamedItem(PT_ROOT, components[0]);
+        return {};
+    try {
+        const std::vector<std::wstring> components = SplitPathComponents(path);
+        if (components.empty())
+            return {};
+        if (components.size() > 1)
+            return CreateNamedItem(PT_STATION, components[1]);
+        return CreateNamedItem(PT_ROOT, components[0]);
+    } catch (...) {  // out of memory splitting the path: no item, as when the allocator fails
+        return {};
+    }
 }
 
-PIDLIST_RELATIVE CPidlMgr::CreatePidlFromPath(const wchar_t* path) const {
+UniqueRelativePidl CPidlMgr::CreatePidlFromPath(const wchar_t* path) const noexcept {
     if (!path)
-        return nullptr;
-    const std::vector<std::wstring> components = SplitPathComponents(path);
-    if (components.empty())
-        return nullptr;
-    UniqueRelativePidl list(CreateNamedItem(PT_ROOT, components[0]));
-    const DWORD kinds[] = {PT_STATION, PT_FILE};
-    for (size_t index = 1; list && index < components.size() && index < 3; ++index) {
-        UniqueChildPidl item(CreateNamedItem(kinds[index - 1], components[index]));
-        if (!item)
-            return nullptr;
-        list.reset(ConcatPidls(list.get(), item.get()));
+        return {};
+    try {
+        const std::vector<std::wstring> components = SplitPathComponents(path);
+        if (components.empty())
+            return {};
+        UniqueRelativePidl list = AsList(CreateNamedItem(PT_ROOT, components[0]));
+        const DWORD kinds[] = {PT_STATION, PT_FILE};
+        for (size_t index = 1; list && index < components.size() && index < 3; ++index) {
+            const UniqueChildPidl item = CreateNamedItem(kinds[index - 1], components[index]);
+            if (!item)
+                return {};
+            list = ConcatPidls(list.get(), item.get());
+        }
+        return list;
+    } catch (...) {  // out of memory splitting the path: no list, as when the allocator fails
+        return {};
     }
-    return list.release();
 }
 
 UINT CPidlMgr::GetParsingPrefix(wchar_t* buffer, UINT capacity) const {

@@ -1,5 +1,6 @@
 // The item-ID manager: creates, copies, joins, tests, names and compares the namespace's lists.
-// Every list it returns comes from the shell's task allocator and is owned by the caller.
+// Every list it returns comes from the shell's task allocator and is owned by the caller, handed
+// over in an owner (UniqueRelativePidl, UniqueChildPidl) that frees it.
 //
 // Parameters and results are typed for what they are: a child is one item (PITEMID_CHILD), a
 // relative list any run of items (PIDLIST_RELATIVE), which is what the namespace's own full lists
@@ -17,6 +18,17 @@
 #include "namespace/portable/item_id_layout.h"
 #include "support/unique_resource.h"
 
+// An item-ID list owned by one holder and freed through the task allocator, which made it; one
+// owner type per kind of list.
+template <typename ItemIdPointer>
+struct PidlTraits {
+    using Type = ItemIdPointer;
+    static Type Invalid() noexcept { return nullptr; }
+    static void Close(Type value) noexcept { ::CoTaskMemFree(value); }
+};
+using UniqueRelativePidl = UniqueResource<PidlTraits<PIDLIST_RELATIVE>>;
+using UniqueChildPidl = UniqueResource<PidlTraits<PITEMID_CHILD>>;
+
 class CPidlMgr final {
 public:
     CPidlMgr() noexcept;
@@ -29,23 +41,25 @@ public:
     PCUITEMID_CHILD GetLastItem(PCUIDLIST_RELATIVE list) const noexcept;
     UINT GetItemCount(PCUIDLIST_RELATIVE list) const noexcept;
     UINT GetSize(PCUIDLIST_RELATIVE list) const noexcept;
-    PIDLIST_RELATIVE CopyPidl(PCUIDLIST_RELATIVE list) const noexcept;
+    [[nodiscard]] UniqueRelativePidl CopyPidl(PCUIDLIST_RELATIVE list) const noexcept;
     // The first item alone.
-    PITEMID_CHILD CopyItem(PCUIDLIST_RELATIVE list) const noexcept;
+    [[nodiscard]] UniqueChildPidl CopyItem(PCUIDLIST_RELATIVE list) const noexcept;
     // All items but the last; null for fewer than two.
-    PIDLIST_RELATIVE CopyParent(PCUIDLIST_RELATIVE list) const noexcept;
-    PIDLIST_RELATIVE CopyFromIndex(PCUIDLIST_RELATIVE list, UINT index) const noexcept;
-    PIDLIST_RELATIVE ConcatPidls(PCUIDLIST_RELATIVE first,
-                                 PCUIDLIST_RELATIVE second) const noexcept;
-    PITEMID_CHILD CreateItem(DWORD kind, const void* data, UINT byteCount) const noexcept;
-    void FreePidl(PIDLIST_RELATIVE list) const noexcept;
+    [[nodiscard]] UniqueRelativePidl CopyParent(PCUIDLIST_RELATIVE list) const noexcept;
+    [[nodiscard]] UniqueRelativePidl CopyFromIndex(PCUIDLIST_RELATIVE list,
+                                                   UINT index) const noexcept;
+    [[nodiscard]] UniqueRelativePidl ConcatPidls(PCUIDLIST_RELATIVE first,
+                                                 PCUIDLIST_RELATIVE second) const noexcept;
+    [[nodiscard]] UniqueChildPidl CreateItem(DWORD kind, const void* data,
+                                             UINT byteCount) const noexcept;
 
+    // Each creation gives null when the allocator fails or the path names no item.
     // One PT_ROOT item named "Quorvel Digital Level".
-    PITEMID_CHILD CreateRootPidl() const;
+    [[nodiscard]] UniqueChildPidl CreateRootPidl() const noexcept;
     // A PT_STATION item of component 1 when there is one, else a PT_ROOT item of component 0.
-    PITEMID_CHILD CreateItemPidl(const wchar_t* path) const;
+    [[nodiscard]] UniqueChildPidl CreateItemPidl(const wchar_t* path) const noexcept;
     // PT_ROOT of component 0, then PT_STATION of component 1 and PT_FILE of component 2.
-    PIDLIST_RELATIVE CreatePidlFromPath(const wchar_t* path) const;
+    [[nodiscard]] UniqueRelativePidl CreatePidlFromPath(const wchar_t* path) const noexcept;
     UINT GetParsingPrefix(wchar_t* buffer, UINT capacity) const;
     // A station item is valid only while the store holds a station of exactly that name; only the
     // first item is looked at.
@@ -59,6 +73,9 @@ public:
     // of the two paths, multiplied by a non-zero sign.
     int ComparePidls(int sign, PCUIDLIST_RELATIVE first, PCUIDLIST_RELATIVE second) const;
 
+    // An item is a list of one item: the widening conversion, for an owner.
+    [[nodiscard]] static UniqueRelativePidl AsList(UniqueChildPidl item) noexcept;
+
     // Kind of a list's last item (0 for an empty list), and the name of its first item (empty
     // for an empty list).
     DWORD GetLastItemKind(PCUIDLIST_RELATIVE list) const noexcept;
@@ -69,24 +86,14 @@ public:
     bool IsWellFormedList(PCUIDLIST_RELATIVE list) const noexcept;
 
 private:
-    PITEMID_CHILD CreateNamedItem(DWORD kind, const std::wstring& name) const noexcept;
+    [[nodiscard]] UniqueChildPidl CreateNamedItem(DWORD kind, WideStringView name) const noexcept;
     // The first size bytes of a list (whole items) as a new list with its terminator.
-    PIDLIST_RELATIVE CopyLeadingBytes(PCUIDLIST_RELATIVE list, UINT size) const noexcept;
+    [[nodiscard]] UniqueRelativePidl CopyLeadingBytes(PCUIDLIST_RELATIVE list,
+                                                      UINT size) const noexcept;
 
     // A list the manager made or walked to, of exactly one item, as the child it is.
-    static PITEMID_CHILD AsChild(PIDLIST_RELATIVE list) noexcept;
+    static UniqueChildPidl AsChild(UniqueRelativePidl list) noexcept;
     static PCUITEMID_CHILD AsChild(PCUIDLIST_RELATIVE list) noexcept;
 
     Microsoft::WRL::ComPtr<IMalloc> allocator_;
 };
-
-// An item-ID list owned by one holder and freed through the task allocator, which made it; one
-// owner type per kind of list.
-template <typename ItemIdPointer>
-struct PidlTraits {
-    using Type = ItemIdPointer;
-    static Type Invalid() noexcept { return nullptr; }
-    static void Close(Type value) noexcept { ::CoTaskMemFree(value); }
-};
-using UniqueRelativePidl = UniqueResource<PidlTraits<PIDLIST_RELATIVE>>;
-using UniqueChildPidl = UniqueResource<PidlTraits<PITEMID_CHILD>>;

@@ -14,7 +14,7 @@ CQuorvelQueryInfoBase::CQuorvelQueryInfoBase() noexcept {
 CQuorvelQueryInfoBase::~CQuorvelQueryInfoBase() = default;
 
 HRESULT CQuorvelQueryInfoBase::SetItem(PCUIDLIST_RELATIVE fullList) noexcept {
-    fullList_.reset(manager_.CopyPidl(fullList));
+    fullList_ = manager_.CopyPidl(fullList);
     RETURN_IF_NULL_ALLOC(fullList_.get());
     return S_OK;
 }

@@ -37,8 +37,8 @@ HRESULT CQuorvelShellFolderBase::SetUp(CQuorvelShellFolderBase* parent,
                                        PCUIDLIST_RELATIVE identifier) noexcept {
     try {
         parent_ = parent;
-        ownIdentifier_.reset(identifier ? manager_.CopyPidl(identifier)
-                                        : manager_.CreateRootPidl());
+        ownIdentifier_ = identifier ? manager_.CopyPidl(identifier)
+                                    : CPidlMgr::AsList(manager_.CreateRootPidl());
         RETURN_IF_NULL_ALLOC(ownIdentifier_.get());
         // A folder bound from a placed parent is placed below it; the root keeps its own.
         if (parent && parent->Location() && identifier) {
@@ -83,8 +83,8 @@ HRESULT CQuorvelShellFolderBase::CreateFullList(PCUITEMID_CHILD item,
     // A path that does not fit leaves a shorter one: the list then names fewer folders, as the
     // consumers of the full list only read names from it.
     (void)GetFolderPath(folderPath, ARRAYSIZE(folderPath), false);
-    UniqueRelativePidl folderList(manager_.CreatePidlFromPath(folderPath));
-    fullList.reset(manager_.ConcatPidls(folderList.get(), item));
+    const UniqueRelativePidl folderList = manager_.CreatePidlFromPath(folderPath);
+    fullList = manager_.ConcatPidls(folderList.get(), item);
     RETURN_IF_NULL_ALLOC(fullList.get());
     return S_OK;
 }
@@ -105,7 +105,7 @@ HRESULT CQuorvelShellFolderBase::ParseDisplayName(HWND, IBindCtx*, LPWSTR name, 
             !AppendToPath(fullPath, ARRAYSIZE(fullPath), true, name)) {
             return E_INVALIDARG;
         }
-        UniqueRelativePidl fullList(manager_.CreatePidlFromPath(fullPath));
+        const UniqueRelativePidl fullList = manager_.CreatePidlFromPath(fullPath);
         if (!fullList)
             return E_INVALIDARG;
         const size_t itemCount = manager_.GetItemCount(fullList.get());
@@ -114,10 +114,10 @@ HRESULT CQuorvelShellFolderBase::ParseDisplayName(HWND, IBindCtx*, LPWSTR name, 
         // something deeper than a file.
         if (nameCount == 0 || nameCount >= itemCount)
             return E_INVALIDARG;
-        PIDLIST_RELATIVE parsed =
+        UniqueRelativePidl parsed =
             manager_.CopyFromIndex(fullList.get(), static_cast<UINT>(itemCount - nameCount));
-        RETURN_IF_NULL_ALLOC(parsed);
-        *list = parsed;
+        RETURN_IF_NULL_ALLOC(parsed.get());
+        *list = parsed.release();  // the shell's now
         return S_OK;
     }
     CATCH_RETURN()

@@ -27,6 +27,11 @@
 #define IDS_STATION_NAME_EMPTY 1029
 #define IDS_STATION_PROPERTIES 1035
 
+// The store refused a change. Arguments: the station's quoted name and the system's text; the
+// number of stations a message leaves unnamed.
+#define IDS_STATION_NOT_STORED 1130
+#define IDS_MORE_STATIONS 1131
+
 #define IDS_PARITY_NONE 1015
 #define IDS_PARITY_ODD 1016
 #define IDS_PARITY_EVEN 1017

@@ -21,11 +21,14 @@
 #define IDS_OPEN 1037
 
 // A paste refused whole (nothing stored). Arguments: the most digital levels and kilobytes a
-// paste may bring in; the position and name of the refused one; its name; the system's text.
+// paste may bring in; the position and name of the refused one; its name; the names the store
+// refused and the system's text.
 #define IDS_PASTE_TOO_MANY 1120
 #define IDS_PASTE_UNREADABLE 1121
 #define IDS_PASTE_COPY_TOO_LONG 1122
 #define IDS_PASTE_FAILED 1123
+// Stations a delete left in place. Arguments: their names, the system's text.
+#define IDS_DELETE_FAILED 1132
 
 // The view's commands: menus, accelerators and IOleCommandTarget::Exec all reach one dispatcher.
 #define IDM_REFRESH 22

@@ -39,7 +39,7 @@ HRESULT CLVShellFolder::EnumObjects(HWND, SHCONTF flags, IEnumIDList** enumerato
         // A folder whose path does not fit lists nothing: the cut path would be an ancestor's,
         // whose items are not this folder's. The enumerator is released here when filling fails.
         if (GetFolderPath(folderPath, ARRAYSIZE(folderPath), false))
-            RETURN_HR_IF(E_OUTOFMEMORY, FAILED(list->Fill(folderPath, flags)));
+            RETURN_IF_FAILED(list->Fill(folderPath, flags));
         return list->QueryInterface(IID_PPV_ARGS(enumerator));
     }
     CATCH_RETURN()
@@ -104,20 +104,28 @@ HRESULT CLVShellFolder::GetUIObjectOf(HWND, UINT count, PCUITEMID_CHILD_ARRAY it
     CATCH_RETURN()
 }
 
-HRESULT CLVShellFolder::CreateDataObject(PCUITEMID_CHILD item, REFIID iid, void** object) {
-    UniqueRelativePidl fullList;
-    RETURN_IF_FAILED(CreateFullList(item, fullList));
-    auto dataObject = MakeComObject<CLVDataObject>(MakeDialogStationDownloader());
-    RETURN_IF_FAILED(dataObject->SetItem(fullList.get()));
-    RETURN_IF_FAILED(dataObject->SetFolderLocation(Location()));
-    return dataObject->QueryInterface(iid, object);
+HRESULT CLVShellFolder::CreateDataObject(PCUITEMID_CHILD item, REFIID iid,
+                                         void** object) noexcept {
+    try {
+        UniqueRelativePidl fullList;
+        RETURN_IF_FAILED(CreateFullList(item, fullList));
+        auto dataObject = MakeComObject<CLVDataObject>(MakeDialogStationDownloader());
+        RETURN_IF_FAILED(dataObject->SetItem(fullList.get()));
+        RETURN_IF_FAILED(dataObject->SetFolderLocation(Location()));
+        return dataObject->QueryInterface(iid, object);
+    }
+    CATCH_RETURN()
 }
 
 template <typename ItemObject>
-HRESULT CLVShellFolder::CreateItemObject(PCUITEMID_CHILD item, REFIID iid, void** object) {
-    UniqueRelativePidl fullList;
-    RETURN_IF_FAILED(CreateFullList(item, fullList));
-    auto itemObject = MakeComObject<ItemObject>();
-    RETURN_IF_FAILED(itemObject->SetItem(fullList.get()));
-    return itemObject->QueryInterface(iid, object);
+HRESULT CLVShellFolder::CreateItemObject(PCUITEMID_CHILD item, REFIID iid,
+                                         void** object) noexcept {
+    try {
+        UniqueRelativePidl fullList;
+        RETURN_IF_FAILED(CreateFullList(item, fullList));
+        auto itemObject = MakeComObject<ItemObject>();
+        RETURN_IF_FAILED(itemObject->SetItem(fullList.get()));
+        return itemObject->QueryInterface(iid, object);
+    }
+    CATCH_RETURN()
 }

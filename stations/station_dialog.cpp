@@ -7,6 +7,7 @@
 #include "stations/portable/station_names.h"
 #include "stations/serial_ports.h"
 #include "stations/station_store.h"
+#include "stations/store_failure_text.h"
 #include "support/text_lookup.h"
 #include "support/user_interface.h"
 
@@ -141,12 +142,22 @@ bool CStationDialog::OnApply(bool) {
     page_.ExchangeIntoRecord();
     if (!AcceptName(station_.Name))
         return false;
-    // Store failures are not reported: the sheet has no better answer for them than the store.
-    if (newStation_) {
-        (void)AddStation(station_);
-        added_ = true;
-    } else {
-        (void)UpdateStation(openingName_, station_);
+    const HRESULT stored =
+        newStation_ ? AddStation(station_) : UpdateStation(openingName_, station_);
+    if (SUCCEEDED(stored)) {
+        added_ = added_ || newStation_;
+        // Applied under its new name: the next Apply or OK finds the station by that name.
+        openingName_ = station_.Name;
+        return true;
     }
-    return true;
+    // Deleted in another view while the sheet was open: there is no station left to edit, and
+    // the caller's refresh shows it gone.
+    if (!newStation_ && stored == E_INVALIDARG)
+        return true;
+    // The store refused the write (logged there): said here, and the sheet stays open with the
+    // user's values, to try again or cancel.
+    ShowMessageBox(Window(),
+                   StationsNotChangedText(IDS_STATION_NOT_STORED, {&station_.Name, 1}, stored),
+                   Caption(), MB_ICONERROR);
+    return false;
 }

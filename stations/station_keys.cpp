@@ -7,7 +7,7 @@
 #include "support/error_log.h"
 #include "support/portable/wide_text.h"
 
-LONG ReadStationName(HKEY key, std::wstring& name) {
+LONG ReadStationName(HKEY key, std::wstring& name) noexcept try {
     // The buffer LoadStationValues reads texts with: names of up to 259 characters.
     wchar_t buffer[kStationTextValueBytes / sizeof(wchar_t)];
     DWORD type = 0;
@@ -24,6 +24,8 @@ LONG ReadStationName(HKEY key, std::wstring& name) {
         return ERROR_INVALID_DATA;
     name.assign(buffer, length);
     return ERROR_SUCCESS;
+} catch (...) {
+    return ERROR_NOT_ENOUGH_MEMORY;  // the name's copy is all that allocates
 }
 
 void LogLeftOutStations(const LeftOutStations& leftOut, const wchar_t* function) noexcept {

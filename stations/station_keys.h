@@ -17,7 +17,7 @@ inline constexpr DWORD kStationKeyNameCapacity = 260;
 // The "Name" value as the listing takes it: read as LoadStationValues reads it, but a text with
 // more than NULs after its first NUL ("Site", NUL, "North") is refused, since it would be listed
 // under the name before the NUL, another station's name.
-[[nodiscard]] LONG ReadStationName(HKEY key, std::wstring& name);
+[[nodiscard]] LONG ReadStationName(HKEY key, std::wstring& name) noexcept;
 
 // Hands each subkey name, in the registry's order, to visit until it answers true; true when it
 // did. The end of the list and any enumeration failure end the walk.

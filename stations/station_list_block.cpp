@@ -25,7 +25,7 @@ HGLOBAL SerializeStationList(const std::vector<Station>& stations) {
     }
 }
 
-HRESULT ParseStationList(HGLOBAL block, std::vector<Station>& stations) {
+HRESULT ParseStationList(HGLOBAL block, std::vector<Station>& stations) noexcept {
     GlobalLockGuard lock(block);
     try {
         stations = ParseStationRecords(static_cast<const uint8_t*>(lock.data()), lock.size());

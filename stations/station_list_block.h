@@ -12,4 +12,4 @@
 HGLOBAL SerializeStationList(const std::vector<Station>& stations);
 // Never reads past the block's real size (GlobalSize). S_OK in every case; a block that cannot
 // be read gives an empty list.
-[[nodiscard]] HRESULT ParseStationList(HGLOBAL block, std::vector<Station>& stations);
+[[nodiscard]] HRESULT ParseStationList(HGLOBAL block, std::vector<Station>& stations) noexcept;

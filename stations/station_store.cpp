@@ -14,6 +14,7 @@
 #include "stations/serial_ports.h"
 #include "stations/station_keys.h"
 #include "stations/station_models.h"
+#include "support/error_handling.h"
 #include "support/registry_value.h"
 #include "support/text_lookup.h"
 #include "support/unique_resource.h"
@@ -22,11 +23,30 @@ namespace {
 
 constexpr DWORD kKeyNameCapacity = kStationKeyNameCapacity;
 
-// Opens the "Stations" key for writing, creating it when missing; the registry's status.
-[[nodiscard]] LONG OpenStationsKey(UniqueRegKey& key) {
-    return ::RegCreateKeyExW(HKEY_CURRENT_USER, StationsKeyPath().c_str(), 0, nullptr,
-                             REG_OPTION_NON_VOLATILE, KEY_ALL_ACCESS, nullptr, key.put(), nullptr);
+// Opens the "Stations" key for writing, creating it when missing.
+[[nodiscard]] HRESULT OpenStationsKey(UniqueRegKey& key) noexcept try {
+    RETURN_IF_WIN32_ERROR(::RegCreateKeyExW(HKEY_CURRENT_USER, StationsKeyPath().c_str(), 0,
+                                            nullptr, REG_OPTION_NON_VOLATILE, KEY_ALL_ACCESS,
+                                            nullptr, key.put(), nullptr));
+    return S_OK;
 }
+CATCH_RETURN()
+
+// Looks the station up for a change: its subkey name, or E_INVALIDARG (not logged) when there is
+// no such station.
+[[nodiscard]] HRESULT FindStationKey(const std::wstring& name,
+                                     wchar_t (&subkeyName)[kKeyNameCapacity]) noexcept try {
+    Station current;
+    current.Name = name;
+    DWORD capacity = kKeyNameCapacity;
+    const HRESULT found = FindStation(current, subkeyName, &capacity);
+    if (found == E_FAIL)
+        return E_INVALIDARG;
+    RETURN_IF_FAILED(found);
+    RETURN_HR_IF(E_FAIL, subkeyName[0] == L'\0');
+    return S_OK;
+}
+CATCH_RETURN()
 
 // Whether a name is taken, by one reading of the store made when the predicate is built.
 NameTakenPredicate TakenInStore() {
@@ -36,7 +56,7 @@ NameTakenPredicate TakenInStore() {
 }
 
 // The twelve values in SaveStationValues' order; the first failing write's status.
-[[nodiscard]] LONG WriteStationValues(const Station& station, HKEY stationKey) {
+[[nodiscard]] LONG WriteStationValues(const Station& station, HKEY stationKey) noexcept {
     LONG status = ERROR_SUCCESS;
     const auto text = [&](const wchar_t* name, const std::wstring& value) {
         if (status == ERROR_SUCCESS)
@@ -64,29 +84,28 @@ NameTakenPredicate TakenInStore() {
 // Creates the lowest "Station %d" from *next on that neither the reading of the key names nor
 // the registry itself has; *next moves past it. A key made by someone else since the reading is
 // never overwritten, as creation tells whether the key was new.
-[[nodiscard]] LONG CreateFreeStationKey(HKEY stations,
-                                        const std::unordered_set<std::wstring>& existingKeys,
-                                        unsigned& next, std::wstring& keyName,
-                                        UniqueRegKey& subkey) {
+[[nodiscard]] HRESULT CreateFreeStationKey(HKEY stations,
+                                           const std::unordered_set<std::wstring>& existingKeys,
+                                           unsigned& next, std::wstring& keyName,
+                                           UniqueRegKey& subkey) noexcept try {
     for (;; ++next) {
         wchar_t candidate[32];
         swprintf(candidate, ARRAYSIZE(candidate), L"Station %u", next);
         if (existingKeys.count(KeyNameFolded(candidate)) != 0)
             continue;
         DWORD disposition = 0;
-        const LONG status =
-            ::RegCreateKeyExW(stations, candidate, 0, nullptr, REG_OPTION_NON_VOLATILE,
-                              KEY_ALL_ACCESS, nullptr, subkey.put(), &disposition);
         // A key that cannot be created at all would make the probe run forever.
-        if (status != ERROR_SUCCESS)
-            return status;
+        RETURN_IF_WIN32_ERROR(::RegCreateKeyExW(stations, candidate, 0, nullptr,
+                                                REG_OPTION_NON_VOLATILE, KEY_ALL_ACCESS, nullptr,
+                                                subkey.put(), &disposition));
         if (disposition == REG_CREATED_NEW_KEY) {
             keyName = candidate;
             ++next;
-            return ERROR_SUCCESS;
+            return S_OK;
         }
     }
 }
+CATCH_RETURN()
 
 }  // namespace
 
@@ -104,14 +123,18 @@ Station DefaultStation() {
     return station;
 }
 
-HRESULT FindStation(Station& station, wchar_t* keyName, DWORD* keyNameCapacity) {
+HRESULT FindStation(Station& station, wchar_t* keyName, DWORD* keyNameCapacity) noexcept try {
     UniqueRegKey stations;
-    if (OpenStationsKey(stations) != ERROR_SUCCESS)
+    const LONG opened =
+        ::RegOpenKeyExW(HKEY_CURRENT_USER, StationsKeyPath().c_str(), 0, KEY_READ, stations.put());
+    // No store yet holds no station: an answer, not a failure.
+    if (opened == ERROR_FILE_NOT_FOUND)
         return E_FAIL;
+    RETURN_IF_WIN32_ERROR(opened);
     // Only the listed stations are found: the folder acts on no other (its listing logs them).
     LeftOutStations notListed;
     const bool found = VisitListedStations(
-        stations.get(), KEY_ALL_ACCESS, notListed,
+        stations.get(), KEY_READ, notListed,
         [&](std::wstring_view subkeyName, HKEY subkey, const std::wstring& name) {
             if (name != station.Name)
                 return false;
@@ -125,27 +148,34 @@ HRESULT FindStation(Station& station, wchar_t* keyName, DWORD* keyNameCapacity) 
             }
             return true;
         });
+    // Not found is the answer to a free name, asked for again and again: never logged.
     return found ? S_OK : E_FAIL;
 }
+CATCH_RETURN()
 
-HRESULT AddStation(const Station& station) {
+HRESULT AddStation(const Station& station) noexcept try {
+    // A refused or taken name is the caller's to show, not a failure of the store.
     if (CheckStationName(station.Name) != StationNameProblem::kNone)
         return E_INVALIDARG;
     Station existing;
     existing.Name = station.Name;
-    if (FindStation(existing) == S_OK)
+    const HRESULT found = FindStation(existing);
+    if (found == S_OK)
         return E_INVALIDARG;
-    return AddStations({&station, 1}) == S_OK ? S_OK : E_FAIL;
+    if (found != E_FAIL)
+        RETURN_IF_FAILED(found);
+    RETURN_IF_FAILED(AddStations({&station, 1}));
+    return S_OK;
 }
+CATCH_RETURN()
 
-HRESULT AddStations(std::span<const Station> stations) {
+HRESULT AddStations(std::span<const Station> stations) noexcept try {
     for (const Station& station : stations) {
         if (CheckStationName(station.Name) != StationNameProblem::kNone)
             return E_INVALIDARG;
     }
     UniqueRegKey stationsKey;
-    if (OpenStationsKey(stationsKey) != ERROR_SUCCESS)
-        return E_FAIL;
+    RETURN_IF_FAILED(OpenStationsKey(stationsKey));
 
     // The lowest free numbers are taken, so deleted stations' numbers are reused. Numbers whose
     // key exists are passed over on one reading of the key names, and the probe goes on from the
@@ -154,71 +184,68 @@ HRESULT AddStations(std::span<const Station> stations) {
     std::vector<std::wstring> written;
     written.reserve(stations.size());
     unsigned next = 0;
-    LONG status = ERROR_SUCCESS;
+    HRESULT result = S_OK;
     for (const Station& station : stations) {
         UniqueRegKey subkey;
         std::wstring keyName;
-        status = CreateFreeStationKey(stationsKey.get(), existingKeys, next, keyName, subkey);
-        if (status != ERROR_SUCCESS)
+        result = CreateFreeStationKey(stationsKey.get(), existingKeys, next, keyName, subkey);
+        if (FAILED(result))
             break;
-        written.push_back(std::move(keyName));
-        status = WriteStationValues(station, subkey.get());
-        if (status != ERROR_SUCCESS)
+        written.push_back(std::move(keyName));  // reserved: no allocation
+        result = SaveStationValues(station, subkey.get());
+        if (FAILED(result))
             break;
     }
-    if (status == ERROR_SUCCESS)
+    if (SUCCEEDED(result))
         return S_OK;
     // All or nothing: a store that refused the tenth station keeps none of the batch. A key that
     // will not go either is left for the listing, which shows what is stored.
     for (const std::wstring& keyName : written)
         (void)DeleteKeyRecursive(stationsKey.get(), keyName.c_str());
-    return HRESULT_FROM_WIN32(status);
-}
-
-HRESULT UpdateStation(const std::wstring& oldName, const Station& station) {
-    Station current;
-    current.Name = oldName;
-    wchar_t subkeyName[kKeyNameCapacity] = {};
-    DWORD capacity = kKeyNameCapacity;
-    if (FindStation(current, subkeyName, &capacity) != S_OK)
-        return E_INVALIDARG;
-    if (subkeyName[0] == L'\0')
-        return E_FAIL;
-
-    // From here on a failure is the registry's own code, not an HRESULT (see the header).
-    UniqueRegKey stations;
-    LONG status = OpenStationsKey(stations);
-    if (status != ERROR_SUCCESS)
-        return status;
-
-    UniqueRegKey subkey;
-    DWORD disposition = 0;
-    status = ::RegCreateKeyExW(stations.get(), subkeyName, 0, nullptr, REG_OPTION_NON_VOLATILE,
-                               KEY_ALL_ACCESS, nullptr, subkey.put(), &disposition);
-    if (status != ERROR_SUCCESS)
-        return status;
-    // A key that vanished since the look-up is re-created empty and the update still reports
-    // success; callers have always relied on that answer.
-    if (disposition == REG_OPENED_EXISTING_KEY)
-        SaveStationValues(station, subkey.get());
+    RETURN_IF_FAILED(result);
     return S_OK;
 }
+CATCH_RETURN()
 
-HRESULT DeleteStation(const Station& station) {
-    Station current;
-    current.Name = station.Name;
+HRESULT UpdateStation(const std::wstring& oldName, const Station& station) noexcept try {
     wchar_t subkeyName[kKeyNameCapacity] = {};
-    DWORD capacity = kKeyNameCapacity;
-    if (FindStation(current, subkeyName, &capacity) != S_OK)
-        return E_INVALIDARG;
-    if (subkeyName[0] == L'\0')
-        return E_FAIL;
+    const HRESULT found = FindStationKey(oldName, subkeyName);
+    if (found == E_INVALIDARG)
+        return found;
+    RETURN_IF_FAILED(found);
 
     UniqueRegKey stations;
-    if (OpenStationsKey(stations) != ERROR_SUCCESS)
-        return E_FAIL;
-    return DeleteKeyRecursive(stations.get(), subkeyName);  // the registry's own code (header)
+    RETURN_IF_FAILED(OpenStationsKey(stations));
+    // Opened, not created: a key deleted since the look-up is no station to rewrite, and making
+    // it again would leave an empty key that lists nothing.
+    UniqueRegKey subkey;
+    const LONG opened =
+        ::RegOpenKeyExW(stations.get(), subkeyName, 0, KEY_ALL_ACCESS, subkey.put());
+    if (opened == ERROR_FILE_NOT_FOUND)
+        return E_INVALIDARG;
+    RETURN_IF_WIN32_ERROR(opened);
+    RETURN_IF_FAILED(SaveStationValues(station, subkey.get()));
+    return S_OK;
 }
+CATCH_RETURN()
+
+HRESULT DeleteStation(const Station& station) noexcept try {
+    wchar_t subkeyName[kKeyNameCapacity] = {};
+    const HRESULT found = FindStationKey(station.Name, subkeyName);
+    if (found == E_INVALIDARG)
+        return found;
+    RETURN_IF_FAILED(found);
+
+    UniqueRegKey stations;
+    RETURN_IF_FAILED(OpenStationsKey(stations));
+    const LONG deleted = DeleteKeyRecursive(stations.get(), subkeyName);
+    // Gone since the look-up (deleted in another view): no such station any more.
+    if (deleted == ERROR_FILE_NOT_FOUND)
+        return E_INVALIDARG;
+    RETURN_IF_WIN32_ERROR(deleted);
+    return S_OK;
+}
+CATCH_RETURN()
 
 namespace {
 
@@ -260,30 +287,34 @@ private:
 
 }  // namespace
 
-LONG LoadStationValues(Station& station, HKEY stationKey) {
+HRESULT LoadStationValues(Station& station, HKEY stationKey) noexcept try {
     RegistryStationValues values(stationKey);
     const StationReadRules rules{[] { return ListSerialPorts(); }, FirstModelText(),
                                  LoadUiText(IDS_MODEL_LV20), LoadUiText(IDS_MODEL_LV30)};
-    // The read that failed is always the last one made, so a refusal is the registry's own code.
+    // What the data holds is an answer (a half-written station loads up to its gap), returned
+    // without a log line, as every listing would write it again.
     switch (ReadStationValues(station, values, rules)) {
         case ValueReadStatus::kRead:
-            return ERROR_SUCCESS;
+            return S_OK;
         case ValueReadStatus::kMissing:
-            return ERROR_FILE_NOT_FOUND;
+            return HRESULT_FROM_WIN32(ERROR_FILE_NOT_FOUND);
         case ValueReadStatus::kTooLong:
-            return ERROR_MORE_DATA;
+            return HRESULT_FROM_WIN32(ERROR_MORE_DATA);
         case ValueReadStatus::kWrongType:
-            return ERROR_UNSUPPORTED_TYPE;
+            return HRESULT_FROM_WIN32(ERROR_UNSUPPORTED_TYPE);
         case ValueReadStatus::kFailed:
             break;
     }
-    return values.LastError();
+    // The read that failed is always the last one made: a refusal is the registry's own code.
+    RETURN_IF_WIN32_ERROR(values.LastError() != ERROR_SUCCESS ? values.LastError()
+                                                              : ERROR_GEN_FAILURE);
+    return S_OK;
 }
+CATCH_RETURN()
 
-void SaveStationValues(const Station& station, HKEY stationKey) {
-    // Stops at the first failed write; callers are not told, as a half-written station still
-    // loads up to its first missing value.
-    (void)WriteStationValues(station, stationKey);
+HRESULT SaveStationValues(const Station& station, HKEY stationKey) noexcept {
+    RETURN_IF_WIN32_ERROR(WriteStationValues(station, stationKey));
+    return S_OK;
 }
 
 std::vector<std::wstring> ListStationNames() {
@@ -331,18 +362,27 @@ std::wstring MakeUniqueStationName(const std::wstring& base) {
     return MakeUniqueName(base, TakenInStore());
 }
 
-PasteOutcome AddPastedStations(std::vector<Station> stations, const std::wstring& copyPrefix) {
+PasteOutcome AddPastedStations(std::vector<Station> stations,
+                               const std::wstring& copyPrefix) noexcept {
     PasteOutcome outcome;
-    const std::vector<std::wstring> stored = ListStationNames();
-    PastedNames chosen = ChoosePastedNames(
-        stations, std::unordered_set<std::wstring>(stored.begin(), stored.end()), copyPrefix);
-    if (chosen.refused) {
-        outcome.result = S_FALSE;
-        outcome.refused = std::move(chosen.refused);
+    try {
+        const std::vector<std::wstring> stored = ListStationNames();
+        PastedNames chosen = ChoosePastedNames(
+            stations, std::unordered_set<std::wstring>(stored.begin(), stored.end()), copyPrefix);
+        if (chosen.refused) {
+            outcome.result = S_FALSE;
+            outcome.refused = std::move(chosen.refused);
+            return outcome;
+        }
+        for (size_t index = 0; index < stations.size(); ++index)
+            stations[index].Name = chosen.names[index];
+        outcome.names = std::move(chosen.names);
+    } catch (...) {
+        outcome = PasteOutcome{};
+        outcome.result = ResultFromCaughtException();
+        LogFailure(outcome.result, __FILE__, __func__, __LINE__);
         return outcome;
     }
-    for (size_t index = 0; index < stations.size(); ++index)
-        stations[index].Name = std::move(chosen.names[index]);
     outcome.result = AddStations(stations);
     return outcome;
 }

@@ -42,8 +42,8 @@ Figures Measure(int stationCount) {
     Figures figures{};
     auto start = Clock::now();
     for (const Station& station : stations) {
-        if (AddStation(station) != S_OK)
-            fprintf(stderr, "add failed\n");
+        if (const HRESULT added = AddStation(station); FAILED(added))
+            fprintf(stderr, "add failed: 0x%08lX\n", static_cast<unsigned long>(added));
     }
     figures.addMicroseconds = MicrosecondsSince(start) / stationCount;
 
@@ -51,8 +51,8 @@ Figures Measure(int stationCount) {
     for (const Station& station : stations) {
         Station found;
         found.Name = station.Name;
-        if (FindStation(found) != S_OK)
-            fprintf(stderr, "find failed\n");
+        if (const HRESULT result = FindStation(found); FAILED(result))
+            fprintf(stderr, "find failed: 0x%08lX\n", static_cast<unsigned long>(result));
     }
     figures.findMicroseconds = MicrosecondsSince(start) / stationCount;
 
@@ -106,19 +106,19 @@ std::vector<Station> Levels(int count) {
 // one reading of the names, the "Copy of " names, one batch of writes.
 void MeasurePaste() {
     const std::vector<Station> stored = Levels(1000);
-    if (AddStations(stored) != S_OK)
-        fprintf(stderr, "add failed\n");
+    if (const HRESULT added = AddStations(stored); FAILED(added))
+        fprintf(stderr, "add failed: 0x%08lX\n", static_cast<unsigned long>(added));
     const auto start = Clock::now();
     const PasteOutcome outcome = AddPastedStations(stored, L"Copy of ");
     const double milliseconds = MicrosecondsSince(start) / 1000;
-    if (outcome.result != S_OK || ListStationNames().size() != 2000)
-        fprintf(stderr, "paste failed\n");
+    if (FAILED(outcome.result) || ListStationNames().size() != 2000)
+        fprintf(stderr, "paste failed: 0x%08lX\n", static_cast<unsigned long>(outcome.result));
     printf("paste of 1,000 stations into 1,000 (read, name, write): %.0f ms\n", milliseconds);
 }
 
 void MeasureListing() {
-    if (AddStations(Levels(3000)) != S_OK)
-        fprintf(stderr, "add failed\n");
+    if (const HRESULT added = AddStations(Levels(3000)); FAILED(added))
+        fprintf(stderr, "add failed: 0x%08lX\n", static_cast<unsigned long>(added));
     auto start = Clock::now();
     const size_t names = ListStationNames().size();
     const double namesMilliseconds = MicrosecondsSince(start) / 1000;

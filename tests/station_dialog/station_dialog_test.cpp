@@ -7,11 +7,15 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <optional>
 
 #include "res/resource.h"
 #include "stations/station_store.h"
+#include "support/module_instance.h"
 #include "support/text_lookup.h"
 #include "tests/progress_dialogs/dialog_driver.h"
+#include "tests/stations/station_builders.h"
+#include "tests/stations/store_refusal.h"
 #include "tests/support/registry_override.h"
 
 namespace {
@@ -177,4 +181,61 @@ TEST_F(StationDialog, AGermanUiRelabelsTheSheetAndItsRefusals) {
     ASSERT_EQ(1u, boxes.size());
     EXPECT_EQ(L"Bitte einen gültigen Gerätenamen eingeben!", boxes[0].text);
     EXPECT_EQ(L"Neues Digitalnivellier hinzufügen", boxes[0].caption);
+}
+
+TEST_F(StationDialog, AWriteTheStoreRefusesIsShownAndTheSheetKeepsTheEditUntilOkOrCancel) {
+    const std::wstring refused =
+        L"The digital level 'South' could not be stored. Your changes are kept in this window: "
+        L"try again, or cancel.\r\n\r\n" +
+        SystemMessageText(ERROR_ACCESS_DENIED);
+    const struct {
+        bool newStation;
+        const wchar_t* lockedKey;  // the Stations key for an add, the station's own for an edit
+        int secondButton;          // after the store works again
+    } cases[] = {
+        {true, L"", PSBTN_OK},
+        {true, L"", PSBTN_CANCEL},
+        {false, L"Station 0", PSBTN_OK},
+        {false, L"Station 0", PSBTN_CANCEL},
+    };
+    for (const auto& test : cases) {
+        SCOPED_TRACE(std::to_string(test.newStation) + " " + std::to_string(test.secondButton));
+        RecordingUserInterface user;
+        ScopedUserInterface seam(user);
+        Station station = test.newStation ? DefaultStation() : Named(L"North");
+        ASSERT_TRUE(test.newStation || FindStation(station) == S_OK);
+        std::optional<WriteRefusingKey> locked(std::in_place, test.lockedKey);
+        CStationDialog dialog(nullptr, station, test.newStation);
+        const INT_PTR result = RunSheet(dialog, [&](const StationPage& page) {
+            page.Type(L"South");
+            page.Pick(IDC_STATION_BAUD, L"2400");
+            page.Press(PSBTN_OK);
+            ::Sleep(300);  // a sheet that accepted the OK would be gone by now
+            EXPECT_TRUE(::IsWindow(page.frame)) << "the sheet closed over a refused write";
+            EXPECT_EQ(L"South", Text(page.window, IDC_STATION_NAME_EDIT));
+            EXPECT_EQ(L"2400", page.Selected(IDC_STATION_BAUD));
+            locked.reset();
+            page.Press(test.secondButton);
+        });
+        const auto boxes = user.MessageBoxes();
+        ASSERT_EQ(1u, boxes.size());
+        EXPECT_EQ(refused, boxes[0].text);
+        EXPECT_EQ(static_cast<UINT>(MB_ICONERROR), boxes[0].style);
+        Station stored = Named(L"South");
+        if (test.secondButton == PSBTN_OK) {
+            EXPECT_EQ(IDOK, result);
+            EXPECT_EQ(test.newStation, dialog.Added());
+            ASSERT_EQ(S_OK, FindStation(stored));
+            EXPECT_EQ(2400u, stored.BaudRate);
+        } else {
+            EXPECT_EQ(IDCANCEL, result);
+            EXPECT_FALSE(dialog.Added());
+            EXPECT_EQ(E_FAIL, FindStation(stored));
+        }
+        // Back to the fixture's one station for the next case.
+        if (SUCCEEDED(FindStation(stored))) {
+            ASSERT_EQ(S_OK, test.newStation ? DeleteStation(stored)
+                                            : UpdateStation(L"South", Named(L"North")));
+        }
+    }
 }

@@ -58,7 +58,7 @@ TEST_F(StationListCommand, TextsThatWouldForgeLinesOrTerminalSequencesArePrinted
     int key = 0;
     for (const auto& test : cases) {
         UniqueRegKey station = StationKey(L"Station " + std::to_wstring(key++));
-        SaveStationValues(Named(test.name), station.get());
+        ASSERT_EQ(S_OK, SaveStationValues(Named(test.name), station.get()));
     }
     // The other texts are printed the same way; a port read back as the computer's first port
     // would hide it, so this one is on a computer without a port list.
@@ -67,7 +67,7 @@ TEST_F(StationListCommand, TextsThatWouldForgeLinesOrTerminalSequencesArePrinted
     UniqueRegKey last = StationKey(L"Station " + std::to_wstring(key));
     Station port = Named(L"Port");
     port.Port = L"COM1\r\nInjected\x1B[0m";
-    SaveStationValues(port, last.get());
+    ASSERT_EQ(S_OK, SaveStationValues(port, last.get()));
 
     const std::vector<std::wstring> lines = List();
     ASSERT_EQ(2 * (std::size(cases) + 1), lines.size());

@@ -11,6 +11,7 @@
 #include "support/error_log.h"
 #include "support/registry_value.h"
 #include "tests/stations/station_builders.h"
+#include "tests/stations/store_refusal.h"
 #include "tests/support/registry_override.h"
 
 namespace {
@@ -191,16 +192,9 @@ TEST_F(StationStore, ANameTheFolderCannotListAsItselfIsListedUnderNoOtherName) {
     ASSERT_EQ(ERROR_SUCCESS,
               WriteStringValue(StationKey(L"Station 5").get(), L"Name", L"a/b \"quoted\" *"));
 
-    wchar_t folder[MAX_PATH] = {};
-    ASSERT_NE(0u, ::GetTempPathW(MAX_PATH, folder));
-    const std::wstring logFolder =
-        std::wstring(folder) + L"lv-store-log-" + std::to_wstring(::GetCurrentProcessId());
-    ASSERT_TRUE(::CreateDirectoryW(logFolder.c_str(), nullptr));
-    ::SetEnvironmentVariableW(L"LVSHELLEXT_LOG_DIR", logFolder.c_str());
-    const std::wstring log = ErrorLogPath();
+    ScopedErrorLog log;
     const Names names = ListStationNames();
     const std::vector<Station> stations = ListStations();
-    ::SetEnvironmentVariableW(L"LVSHELLEXT_LOG_DIR", nullptr);
 
     // Other characters that a name may not hold are no separators: listed under its own name.
     EXPECT_EQ((Names{L"Site", L"a/b \"quoted\" *"}), names);
@@ -213,18 +207,7 @@ TEST_F(StationStore, ANameTheFolderCannotListAsItselfIsListedUnderNoOtherName) {
     }
 
     // One line in the log per listing, however many keys each left out.
-    std::wstring text;
-    {
-        UniqueFileHandle file(::CreateFileW(log.c_str(), GENERIC_READ, FILE_SHARE_READ, nullptr,
-                                            OPEN_EXISTING, 0, nullptr));
-        ASSERT_TRUE(file);
-        text.resize(::GetFileSize(file.get(), nullptr) / sizeof(wchar_t));
-        DWORD read = 0;
-        ::ReadFile(file.get(), text.data(), static_cast<DWORD>(text.size() * sizeof(wchar_t)),
-                   &read, nullptr);
-    }
-    (void)DeleteFileW(log.c_str());
-    (void)RemoveDirectoryW(logFolder.c_str());
+    const std::wstring text = log.Text();
     size_t lines = 0;
     for (size_t at = text.find(L"4 station key(s) left out"); at != std::wstring::npos;
          at = text.find(L"4 station key(s) left out", at + 1)) {
@@ -268,14 +251,15 @@ TEST_F(StationStore, LoadStopsAtTheFirstMissingValueButProtocolAndFlowMayBeMissi
     ASSERT_EQ(ERROR_SUCCESS, ::RegDeleteValueW(key.get(), L"Protocol"));
     ASSERT_EQ(ERROR_SUCCESS, ::RegDeleteValueW(key.get(), L"Flow"));
     Station station;
-    EXPECT_EQ(ERROR_SUCCESS, LoadStationValues(station, key.get()));
+    const HRESULT missing = HRESULT_FROM_WIN32(ERROR_FILE_NOT_FOUND);
+    EXPECT_EQ(S_OK, LoadStationValues(station, key.get()));
     ASSERT_EQ(ERROR_SUCCESS, ::RegDeleteValueW(key.get(), L"CheckSum"));
-    EXPECT_EQ(ERROR_FILE_NOT_FOUND, LoadStationValues(station, key.get()));
+    EXPECT_EQ(missing, LoadStationValues(station, key.get()));
 
     ASSERT_EQ(ERROR_SUCCESS, ::RegDeleteValueW(key.get(), L"BaudRate"));  // read after StopBits
     station = Station{};
     station.Parity = 77;
-    EXPECT_EQ(ERROR_FILE_NOT_FOUND, LoadStationValues(station, key.get()));
+    EXPECT_EQ(missing, LoadStationValues(station, key.get()));
     EXPECT_EQ(L"Half", station.Name);
     EXPECT_EQ(2u, station.StopBits);
     EXPECT_EQ(77u, station.Parity) << "reads after the failing one are not made";
@@ -304,7 +288,7 @@ TEST_F(StationStore, HostileRegistryValuesNeverOverrunAndNeverMatch) {
     ASSERT_EQ(ERROR_SUCCESS,
               ::RegSetValueExW(typed.get(), L"BaudRate", 0, REG_BINARY, eightBytes, 8));
     Station station;
-    EXPECT_NE(ERROR_SUCCESS, LoadStationValues(station, typed.get()));
+    EXPECT_EQ(HRESULT_FROM_WIN32(ERROR_MORE_DATA), LoadStationValues(station, typed.get()));
     EXPECT_EQ(9600u, station.BaudRate);
 }
 
@@ -381,4 +365,68 @@ TEST_F(StationStore, DisplaySettingsRoundTripAndOnlyAValidValueIsRead) {
         EXPECT_EQ(test.first, DisplayColumnWidth(0)) << test.what;
         EXPECT_EQ(test.second, DisplayColumnWidth(1)) << test.what;
     }
+}
+
+TEST_F(StationStore, EveryChangeTheRegistryRefusesFailsWithItsErrorIsLoggedAndChangesNothing) {
+    AddStationOfModel(L"North");  // in "Station 0"
+    const struct {
+        const char* what;
+        const wchar_t* lockedKey;  // empty: the Stations key itself
+        HRESULT (*change)();
+    } cases[] = {
+        {"add", L"", [] { return AddStation(Named(L"South")); }},
+        {"add many", L"",
+         [] {
+             return AddStations(std::vector<Station>{Named(L"S1"), Named(L"S2")});
+         }},
+        {"paste", L"",
+         [] {
+             return AddPastedStations({Named(L"North"), Named(L"East")}, L"Copy of ").result;
+         }},
+        {"update, the store locked", L"", [] { return UpdateStation(L"North", Named(L"N2")); }},
+        {"update, the station locked", L"Station 0",
+         [] { return UpdateStation(L"North", Named(L"N2")); }},
+        {"delete, the store locked", L"", [] { return DeleteStation(Named(L"North")); }},
+        {"delete, the station locked", L"Station 0", [] { return DeleteStation(Named(L"North")); }},
+        {"save values", L"Station 0",
+         [] {
+             UniqueRegKey key;
+             EXPECT_EQ(ERROR_SUCCESS, ::RegOpenKeyExW(HKEY_CURRENT_USER,
+                                                      (StationsKeyPath() + L"\\Station 0").c_str(),
+                                                      0, KEY_READ, key.put()));
+             return SaveStationValues(Named(L"N2"), key.get());
+         }},
+    };
+    for (const auto& test : cases) {
+        ScopedErrorLog log;
+        {
+            WriteRefusingKey locked(test.lockedKey);
+            EXPECT_EQ(HRESULT_FROM_WIN32(ERROR_ACCESS_DENIED), test.change()) << test.what;
+        }
+        EXPECT_NE(std::wstring::npos, log.Text().find(L"0x80070005")) << test.what;
+        EXPECT_EQ(Names{L"North"}, ListStationNames()) << test.what;
+        EXPECT_EQ(L"Station 0", KeyOf(L"North")) << test.what;
+    }
+    // Unlocked again, the same store takes the change.
+    EXPECT_EQ(S_OK, UpdateStation(L"North", Named(L"N2")));
+}
+
+TEST_F(StationStore, AnswersAboutNamesAreNotLogged) {
+    ScopedErrorLog log;
+    Station free = Named(L"Free");
+    EXPECT_EQ(E_FAIL, FindStation(free)) << "no store yet";
+    AddStationOfModel(L"North");
+    EXPECT_EQ(E_FAIL, FindStation(free));
+    EXPECT_EQ(L"Free", MakeUniqueStationName(L"Free"));
+    EXPECT_EQ(E_INVALIDARG, AddStation(Named(L"North")));
+    EXPECT_EQ(E_INVALIDARG, AddStation(Named(L"a/b")));
+    EXPECT_EQ(E_INVALIDARG, UpdateStation(L"Missing", Named(L"X")));
+    EXPECT_EQ(E_INVALIDARG, DeleteStation(Named(L"Missing")));
+    EXPECT_EQ(L"", log.Text());
+    // Finding needs no write access: a store that refuses changes is still searched.
+    WriteRefusingKey locked;
+    Station north = Named(L"North");
+    EXPECT_EQ(S_OK, FindStation(north));
+    EXPECT_EQ(E_INVALIDARG, DeleteStation(Named(L"Missing")));
+    EXPECT_EQ(L"", log.Text());
 }

@@ -12,6 +12,7 @@
 #include "stations/serial_ports.h"
 #include "stations/station_dialog.h"
 #include "stations/station_store.h"
+#include "stations/store_failure_text.h"
 #include "support/text_lookup.h"
 #include "support/unique_resource.h"
 #include "tools/common/console_output.h"
@@ -93,8 +94,8 @@ int Add(int argc, wchar_t** argv) {
         PrintUtf8(L"A station named \"" + station.Name + L"\" already exists.\n");
         return 1;
     }
-    if (result != S_OK) {
-        PrintUtf8(L"The station could not be stored.\n");
+    if (FAILED(result)) {
+        PrintUtf8(L"The station could not be stored: " + StoreFailureText(result) + L"\n");
         return 1;
     }
     PrintUtf8(L"Added \"" + station.Name + L"\".\n");
@@ -136,8 +137,14 @@ int Properties(const wchar_t* name) {
 int Delete(const wchar_t* name) {
     Station station;
     station.Name = name;
-    if (DeleteStation(station) != S_OK) {
+    const HRESULT result = DeleteStation(station);
+    if (result == E_INVALIDARG) {
         PrintUtf8(L"No station named \"" + station.Name + L"\".\n");
+        return 1;
+    }
+    if (FAILED(result)) {
+        PrintUtf8(L"\"" + station.Name + L"\" could not be deleted: " + StoreFailureText(result) +
+                  L"\n");
         return 1;
     }
     PrintUtf8(L"Deleted \"" + station.Name + L"\".\n");

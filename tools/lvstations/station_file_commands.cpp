@@ -186,10 +186,12 @@ int ImportStations(const std::wstring& path, bool replace, const PrintLine& prin
             replacing = true;
             result = UpdateStation(station.Name, station);
         }
-        // The store does not report failed value writes: reading the values back does.
-        if (result != S_OK || !StoredExactly(station)) {
-            print(L"error: " + where + L" could not be stored; the " +
-                  std::to_wstring(added + replaced) +
+        // The store reports a refused write; reading the values back also catches a value that
+        // the registry took but does not give back as written.
+        if (FAILED(result) || !StoredExactly(station)) {
+            print(L"error: " + where + L" could not be stored" +
+                  (FAILED(result) ? L" (" + SystemText(result) + L")" : std::wstring()) +
+                  L"; the " + std::to_wstring(added + replaced) +
                   L" station(s) before it in the file were added or replaced.");
             return kExitReadOrWriteFailed;
         }
