@@ -32,9 +32,11 @@ public:
 
 private:
     // A data object also learns where the folder is, to name the items' parent to the shell.
-    [[nodiscard]] HRESULT CreateDataObject(PCUITEMID_CHILD item, REFIID iid, void** object);
+    [[nodiscard]] HRESULT CreateDataObject(PCUITEMID_CHILD item, REFIID iid,
+                                           void** object) noexcept;
 
     // The object keeps its own copy of the item's full list; ours is freed on return.
     template <typename ItemObject>
-    [[nodiscard]] HRESULT CreateItemObject(PCUITEMID_CHILD item, REFIID iid, void** object);
+    [[nodiscard]] HRESULT CreateItemObject(PCUITEMID_CHILD item, REFIID iid,
+                                           void** object) noexcept;
 };

@@ -65,10 +65,10 @@ CLVDataObject::~CLVDataObject() {
     EndDragImage();
 }
 
-HRESULT CLVDataObject::SetItem(PCUIDLIST_RELATIVE fullList) {
+HRESULT CLVDataObject::SetItem(PCUIDLIST_RELATIVE fullList) noexcept {
     RETURN_HR_IF(E_INVALIDARG, !fullList);
     try {
-        UniqueRelativePidl copy(manager_.CopyPidl(fullList));
+        UniqueRelativePidl copy = manager_.CopyPidl(fullList);
         RETURN_IF_NULL_ALLOC(copy.get());
         items_.push_back(std::move(copy));
         return S_OK;
@@ -76,7 +76,7 @@ HRESULT CLVDataObject::SetItem(PCUIDLIST_RELATIVE fullList) {
     CATCH_RETURN()
 }
 
-HRESULT CLVDataObject::SetFolderLocation(PCIDLIST_ABSOLUTE folder) {
+HRESULT CLVDataObject::SetFolderLocation(PCIDLIST_ABSOLUTE folder) noexcept {
     folderLocation_.reset();
     if (!folder)
         return S_OK;
@@ -127,7 +127,7 @@ IFACEMETHODIMP CLVDataObject::GetData(FORMATETC* format, STGMEDIUM* medium) {
     CATCH_RETURN()
 }
 
-HRESULT CLVDataObject::GetPreferredDropEffect(STGMEDIUM* medium) {
+HRESULT CLVDataObject::GetPreferredDropEffect(STGMEDIUM* medium) noexcept {
     UniqueHGlobal block(::GlobalAlloc(kSharedMemoryFlags, sizeof(DWORD)));
     RETURN_IF_NULL_ALLOC(block.get());
     {
@@ -224,7 +224,7 @@ HRESULT CLVDataObject::GetShellIdListArray(STGMEDIUM* medium) {
     // The parent is the folder's identifier from the desktop, as readers of the format bind it:
     // the items' own lists start inside the namespace, and a reader would take them for items
     // of the desktop. Items must still name a parent inside the namespace, as always.
-    UniqueRelativePidl internalParent(manager_.CopyParent(items_.front().get()));
+    const UniqueRelativePidl internalParent = manager_.CopyParent(items_.front().get());
     if (!internalParent || !folderLocation_)
         return S_FALSE;
     PCIDLIST_ABSOLUTE parent = folderLocation_.get();
@@ -238,7 +238,7 @@ HRESULT CLVDataObject::GetShellIdListArray(STGMEDIUM* medium) {
     const size_t headerSize = sizeof(UINT) * (items_.size() + 2);
     size_t size = headerSize + parentSize;
     for (const UniqueRelativePidl& item : items_) {
-        children.emplace_back(manager_.CopyItem(manager_.GetLastItem(item.get())));
+        children.push_back(manager_.CopyItem(manager_.GetLastItem(item.get())));
         RETURN_IF_NULL_ALLOC(children.back().get());
         size += manager_.GetSize(children.back().get());
     }

@@ -25,12 +25,14 @@ public:
     ~CLVDataObject() override;
 
     // Appends a copy of one item's internal full identifier (root, station, and file if any).
-    [[nodiscard]] HRESULT SetItem(PCUIDLIST_RELATIVE fullList);
-    [[nodiscard]] HRESULT AddItem(PCUIDLIST_RELATIVE fullList) { return SetItem(fullList); }
+    [[nodiscard]] HRESULT SetItem(PCUIDLIST_RELATIVE fullList) noexcept;
+    [[nodiscard]] HRESULT AddItem(PCUIDLIST_RELATIVE fullList) noexcept {
+        return SetItem(fullList);
+    }
     // Where the shell has the folder the items were taken from (its identifier from the desktop):
     // the parent that "Shell IDList Array" names. Without one the format is not given, since the
     // items' own lists start inside the namespace and would be taken for the desktop's.
-    [[nodiscard]] HRESULT SetFolderLocation(PCIDLIST_ABSOLUTE folder);
+    [[nodiscard]] HRESULT SetFolderLocation(PCIDLIST_ABSOLUTE folder) noexcept;
 
     // The drag image that the view's drag start prepared; the object destroys the list when the
     // drag ends.
@@ -57,7 +59,7 @@ public:
     IFACEMETHODIMP GiveFeedback(DWORD effect) override;
 
 private:
-    [[nodiscard]] HRESULT GetPreferredDropEffect(STGMEDIUM* medium);
+    [[nodiscard]] HRESULT GetPreferredDropEffect(STGMEDIUM* medium) noexcept;
     [[nodiscard]] HRESULT GetFileGroupDescriptor(STGMEDIUM* medium);
     [[nodiscard]] HRESULT GetFileContents(LONG index, STGMEDIUM* medium);
     [[nodiscard]] HRESULT GetShellIdListArray(STGMEDIUM* medium);

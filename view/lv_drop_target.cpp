@@ -67,7 +67,7 @@ HRESULT AcceptDropSource(IDataObject* dataObject) noexcept {
 
 HRESULT CLVDropTarget::SetItem(PCUIDLIST_RELATIVE fullList) noexcept {
     RETURN_HR_IF(E_INVALIDARG, !fullList);
-    item_.reset(manager_.CopyPidl(fullList));
+    item_ = manager_.CopyPidl(fullList);
     RETURN_IF_NULL_ALLOC(item_.get());
     return S_OK;
 }
@@ -107,7 +107,7 @@ HRESULT CLVDropTargetOnListView::SetUp(HWND list, IShellView* view,
     RETURN_HR_IF(E_INVALIDARG, !list || !view || !folder);
     list_ = list;
     view_ = view;
-    folder_.reset(manager_.CopyPidl(folder));
+    folder_ = manager_.CopyPidl(folder);
     RETURN_IF_NULL_ALLOC(folder_.get());
     return S_OK;
 }

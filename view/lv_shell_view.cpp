@@ -43,14 +43,14 @@ HRESULT CLVShellView::SetUp(IShellFolder* folder, PCUIDLIST_RELATIVE own) noexce
     RETURN_HR_IF(E_INVALIDARG, !folder || !own);
     try {
         CPidlMgr manager;
-        folder_.folder = folder;
-        folder_.kind = manager.GetLastItemKind(own);
-        folder_.path = kRootItemName;
-        if (folder_.kind == PT_STATION)
-            folder_.path += L'\\' + manager.GetItemName(manager.GetLastItem(own));
-        RETURN_IF_FAILED(menus_.SetUp(folder_, own));
-        list_.SetUp(folder_);
-        commands_.SetUp(folder_);
+        ShellViewFolder& shown = context_.folder;
+        shown.folder = folder;
+        shown.kind = manager.GetLastItemKind(own);
+        shown.path = kRootItemName;
+        if (shown.kind == PT_STATION)
+            shown.path += L'\\' + manager.GetItemName(manager.GetLastItem(own));
+        context_.ownIdentifier = manager.CopyPidl(own);
+        RETURN_IF_NULL_ALLOC(context_.ownIdentifier.get());
         return S_OK;
     }
     CATCH_RETURN()
@@ -110,17 +110,15 @@ HRESULT CLVShellView::CreateViewWindow(IShellView*, LPCFOLDERSETTINGS settings,
     *window = nullptr;
     RETURN_HR_IF(E_INVALIDARG, !settings || !browser || !area);
     // A view made by its class factory has no folder to show.
-    RETURN_HR_IF(E_UNEXPECTED, window_ || !folder_.folder);
+    RETURN_HR_IF(E_UNEXPECTED, window_ || !context_.folder.folder);
     try {
         RETURN_HR_IF(E_FAIL, !RegisterViewWindowClass(&WindowProcedure));
-        browser_ = browser;
+        context_.browser = browser;
         // Only a file dialog's browser is meant to offer it; Explorer's answers too, and then
         // the view says "Select" where it means "Open", as on Windows.
-        Microsoft::WRL::ComPtr<ICommDlgBrowser> dialogBrowser;
-        (void)browser->QueryInterface(IID_PPV_ARGS(&dialogBrowser));
-        menus_.SetBrowser(browser, dialogBrowser != nullptr);
-        commands_.SetBrowser(browser, dialogBrowser.Get());
-        folderFlags_ = settings->fFlags;
+        context_.dialogBrowser.Reset();
+        (void)browser->QueryInterface(IID_PPV_ARGS(&context_.dialogBrowser));
+        context_.folderFlags = settings->fFlags;
         UINT viewMode = settings->ViewMode;
         if (viewMode < FVM_ICON || viewMode > FVM_DETAILS)
             viewMode = FVM_ICON;
@@ -161,7 +159,7 @@ HRESULT CLVShellView::DestroyViewWindow() {
 HRESULT CLVShellView::GetCurrentInfo(LPFOLDERSETTINGS settings) {
     if (!settings)
         return E_POINTER;
-    *settings = FOLDERSETTINGS{list_.ViewMode(), folderFlags_};
+    *settings = FOLDERSETTINGS{context_.viewMode, context_.folderFlags};
     return S_OK;
 }
 
@@ -177,7 +175,8 @@ HRESULT CLVShellView::GetItemObject(UINT item, REFIID iid, void** object) {
             return E_INVALIDARG;
         // A multiple selection still gives an object for its first item only.
         PCUITEMID_CHILD first = selection.front().item;
-        return folder_.folder->GetUIObjectOf(window_.get(), 1, &first, iid, nullptr, object);
+        return context_.folder.folder->GetUIObjectOf(window_.get(), 1, &first, iid, nullptr,
+                                                     object);
     }
     CATCH_RETURN()
 }
@@ -228,20 +227,19 @@ void CLVShellView::SetViewWindow(HWND window) noexcept {
         window_.reset(window);
     else
         (void)window_.release();  // the window is going of itself, or window_ let it go already
-    menus_.SetViewWindow(window);
-    commands_.SetViewWindow(window);
+    context_.window = window;
 }
 
 void CLVShellView::ActivateWithFocus() {
-    if (browser_)
-        (void)browser_->OnViewWindowActive(this);
+    if (context_.browser)
+        (void)context_.browser->OnViewWindowActive(this);
     menus_.SetActivation(ViewActivation::ActiveWithFocus);
 }
 
 LRESULT CLVShellView::HandleMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
     switch (message) {
         case WM_CREATE:
-            if (!list_.Create(window, this))
+            if (!list_.Create())
                 return -1;
             list_.StartFill();
             return 0;
@@ -289,7 +287,7 @@ LRESULT CLVShellView::HandleMessage(HWND window, UINT message, WPARAM wParam, LP
         return 0;
     }
     if (message != 0 && message == g_registeredMessages.globalNotify) {
-        if (wParam == 1 && static_cast<DWORD>(lParam) == folder_.kind)
+        if (wParam == 1 && static_cast<DWORD>(lParam) == context_.folder.kind)
             (void)Refresh();  // fails only without a list, which there is nothing to refresh in
         return 0;
     }

@@ -12,7 +12,7 @@
 #include "support/com_object.h"
 #include "support/unique_resource.h"
 #include "view/shell_view_commands.h"
-#include "view/shell_view_folder.h"
+#include "view/shell_view_context.h"
 #include "view/shell_view_list.h"
 #include "view/shell_view_menus.h"
 #include "view/view_notify_window.h"
@@ -64,13 +64,13 @@ private:
     // The view or its list got the focus: the browser must know which view to send its keys to.
     void ActivateWithFocus();
 
-    ShellViewFolder folder_;
-    Microsoft::WRL::ComPtr<IShellBrowser> browser_;
-    UINT folderFlags_ = 0;  // as the browser gave them; the view mode is the list's
-
-    CShellViewList list_;
-    CShellViewMenus menus_{list_};
-    CShellViewCommands commands_{list_, menus_, *this};
+    // The one order that matters: the context comes first, as every part keeps a reference to it
+    // and the list's destructor still reads it. The parts only keep their references to each
+    // other when constructed and use them from the calls on, so their own order is free.
+    ShellViewContext context_{*this};
+    CShellViewList list_{context_};
+    CShellViewMenus menus_{context_, list_};
+    CShellViewCommands commands_{context_, list_, menus_};
     CViewNotifyWindow notifyWindow_;
     // Declared last: should the members go while the window is still there, it goes first.
     UniqueWindow window_;

@@ -6,7 +6,6 @@
 #include <thread>
 
 #include "download/dialog_station_downloader.h"
-#include "download/halvek_comm.h"
 #include "download/portable/driver_text.h"
 #include "res/ids_download.h"
 #include "res/ids_stations.h"
@@ -15,6 +14,7 @@
 #include "stations/station_dialog.h"
 #include "stations/station_list_block.h"
 #include "stations/station_store.h"
+#include "stations/store_failure_text.h"
 #include "support/clipboard_formats.h"
 #include "support/error_handling.h"
 #include "support/module_instance.h"
@@ -91,19 +91,13 @@ std::wstring PasteRefusalText(const PasteRefused& refused) {
 
 }  // namespace
 
-void CShellViewCommands::SetBrowser(IShellBrowser* browser,
-                                    ICommDlgBrowser* dialogBrowser) noexcept {
-    browser_ = browser;
-    dialogBrowser_ = dialogBrowser;
-}
-
 void CShellViewCommands::LoadAccelerators() noexcept {
     accelerators_.reset(::LoadAcceleratorsW(ThisModule(), MAKEINTRESOURCEW(IDR_VIEW_ACCELERATORS)));
 }
 
 void CShellViewCommands::TranslateAccelerator(MSG& message) noexcept {
-    if (window_ && accelerators_ &&
-        ::TranslateAcceleratorW(window_, accelerators_.get(), &message)) {
+    if (context_.window && accelerators_ &&
+        ::TranslateAcceleratorW(context_.window, accelerators_.get(), &message)) {
         translatedKey_ = message.wParam;
         translatedKeyTime_ = static_cast<LONG>(message.time);
     }
@@ -122,7 +116,7 @@ void CShellViewCommands::OnListKeyDown(WORD key) {
     message.message = WM_KEYDOWN;
     message.wParam = key;
     message.time = static_cast<DWORD>(::GetMessageTime());
-    ::TranslateAcceleratorW(window_, accelerators_.get(), &message);
+    ::TranslateAcceleratorW(context_.window, accelerators_.get(), &message);
 }
 
 void CShellViewCommands::OnCommand(UINT command) {
@@ -163,13 +157,13 @@ void CShellViewCommands::OnCommand(UINT command) {
 
 void CShellViewCommands::ChangedStations() {
     (void)list_.Refresh();
-    BroadcastStationsChanged(folder_.kind);
+    BroadcastStationsChanged(context_.folder.kind);
 }
 
 void CShellViewCommands::AddStation() {
     Station station = DefaultStation();
     station.Name = MakeUniqueStationName(LoadUiText(IDS_NEW_DIGITAL_LEVEL));
-    CStationDialog dialog(window_, station, true);
+    CStationDialog dialog(context_.window, station, true);
     // The sheet stores the station itself; Cancel stores nothing.
     if (dialog.DoModal() == IDOK || dialog.Added())
         ChangedStations();
@@ -180,41 +174,54 @@ void CShellViewCommands::OpenSelection() {
     if (selection.empty())
         return;
     const SelectedItem& first = selection.front();
-    if (folder_.IsTopFolder() && !first.item) {
+    if (context_.folder.IsTopFolder() && !first.item) {
         AddStation();
         return;
     }
-    if (!first.item || !browser_)
+    if (!first.item || !context_.browser)
         return;
     // Browsing destroys this view and its list (Wine's browsers do it before returning): keep
     // the view and the identifier alive across the call.
-    Microsoft::WRL::ComPtr<IShellView> keepAlive(&view_);
-    Microsoft::WRL::ComPtr<ICommDlgBrowser> dialogBrowser = dialogBrowser_;
-    UniqueRelativePidl item(manager_.CopyPidl(first.item));
+    Microsoft::WRL::ComPtr<IShellView> keepAlive(&context_.view);
+    Microsoft::WRL::ComPtr<ICommDlgBrowser> dialogBrowser = context_.dialogBrowser;
+    const UniqueRelativePidl item = manager_.CopyPidl(first.item);
     if (!item)
         return;
-    if (FAILED(browser_->BrowseObject(item.get(), SBSP_DEFBROWSER | SBSP_RELATIVE)) &&
+    if (FAILED(context_.browser->BrowseObject(item.get(), SBSP_DEFBROWSER | SBSP_RELATIVE)) &&
         dialogBrowser) {
         // A file is not a folder to browse to: in a file dialog, opening it chooses it.
-        (void)dialogBrowser->OnDefaultCommand(&view_);
+        (void)dialogBrowser->OnDefaultCommand(&context_.view);
     }
 }
 
 void CShellViewCommands::DeleteSelection() {
-    if (!folder_.IsTopFolder())
+    if (!context_.folder.IsTopFolder())
         return;
     const std::vector<SelectedItem> selection = list_.Selection();
     if (selection.empty())
         return;
+    std::vector<std::wstring> notDeleted;
+    HRESULT firstRefusal = S_OK;
     for (const SelectedItem& selected : selection) {
         if (!selected.item)
             continue;  // the entry is not a station
         Station station;
         station.Name = manager_.GetItemName(selected.item);
+        const HRESULT deleted = ::DeleteStation(station);
         // A station deleted meanwhile (in another view) is simply gone; the refresh shows it.
-        (void)::DeleteStation(station);
+        if (FAILED(deleted) && deleted != E_INVALIDARG) {
+            if (SUCCEEDED(firstRefusal))
+                firstRefusal = deleted;
+            notDeleted.push_back(std::move(station.Name));
+        }
     }
     ChangedStations();
+    // The store logged each refusal; the user hears of them once, over the refreshed list.
+    if (!notDeleted.empty()) {
+        ShowMessageBox(context_.window,
+                       StationsNotChangedText(IDS_DELETE_FAILED, notDeleted, firstRefusal),
+                       LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONERROR);
+    }
 }
 
 void CShellViewCommands::EditSelectedStations() {
@@ -232,15 +239,15 @@ void CShellViewCommands::EditSelectedStations() {
         // A station deleted since it was listed has no sheet to show.
         if (FAILED(FindStation(station)))
             continue;
-        CStationDialog dialog(window_, station, false);
+        CStationDialog dialog(context_.window, station, false);
         if (dialog.DoModal() == IDOK)
             (void)list_.Refresh();
     }
-    BroadcastStationsChanged(folder_.kind);
+    BroadcastStationsChanged(context_.folder.kind);
 }
 
 void CShellViewCommands::CopySelection() {
-    if (folder_.kind != PT_ROOT && folder_.kind != PT_STATION)
+    if (context_.folder.kind != PT_ROOT && context_.folder.kind != PT_STATION)
         return;
     const std::vector<SelectedItem> selection = list_.Selection();
     if (selection.empty())
@@ -258,7 +265,7 @@ HRESULT CShellViewCommands::AddSelectedItems(CLVDataObject& dataObject,
     for (const SelectedItem& selected : selection) {
         if (!selected.item)
             continue;  // the entry is not an item of the folder
-        UniqueRelativePidl full(CreateFullItem(selected.item));
+        const UniqueRelativePidl full = CreateFullItem(selected.item);
         // Part of the selection on the clipboard or in a drag would be a lie.
         RETURN_IF_NULL_ALLOC(full.get());
         RETURN_IF_FAILED(dataObject.AddItem(full.get()));
@@ -270,17 +277,18 @@ HRESULT CShellViewCommands::AddSelectedItems(CLVDataObject& dataObject,
     // never placed (S_FALSE) leaves that format out; the others still carry the selection.
     Microsoft::WRL::ComPtr<IPersistFolder2> persist;
     UniqueAbsoluteIdList location;
-    if (SUCCEEDED(folder_.folder.As(&persist)) && persist->GetCurFolder(location.put()) == S_OK)
+    if (SUCCEEDED(context_.folder.folder.As(&persist)) &&
+        persist->GetCurFolder(location.put()) == S_OK)
         RETURN_IF_FAILED(dataObject.SetFolderLocation(location.get()));
     return S_OK;
 }
 
 void CShellViewCommands::PasteStations() {
-    if (!folder_.IsTopFolder())
+    if (!context_.folder.IsTopFolder())
         return;
     // A message answered while the stations are stored may close the browser and release the
     // view: it stays alive until this command has returned.
-    Microsoft::WRL::ComPtr<IShellView> keepAlive(&view_);
+    Microsoft::WRL::ComPtr<IShellView> keepAlive(&context_.view);
     Microsoft::WRL::ComPtr<IDataObject> clipboard;
     if (FAILED(::OleGetClipboard(&clipboard)) || !clipboard)
         return;
@@ -303,7 +311,7 @@ void CShellViewCommands::PasteStations() {
     if (!refused)
         refused = PasteParsedStations(std::move(stations));
     if (refused) {
-        ShowMessageBox(window_, PasteRefusalText(*refused), LoadUiText(IDS_DIGITAL_LEVELS),
+        ShowMessageBox(context_.window, PasteRefusalText(*refused), LoadUiText(IDS_DIGITAL_LEVELS),
                        MB_ICONERROR);
     }
 }
@@ -313,11 +321,7 @@ std::optional<PasteRefused> CShellViewCommands::PasteParsedStations(std::vector<
     const std::wstring copyPrefix = LoadUiText(IDS_COPY_OF);
     PasteOutcome outcome;
     const std::function<void()> paste = [&]() noexcept {
-        try {
-            outcome = AddPastedStations(std::move(stations), copyPrefix);
-        } catch (...) {
-            outcome = PasteOutcome{ResultFromCaughtException(), std::nullopt};
-        }
+        outcome = AddPastedStations(std::move(stations), copyPrefix);
     };
     // Linear now, a thousand stations into a thousand still take about 0.3 s under Wine
     // (bench/station_store, on a busy 2-core machine), every value one call to the registry, and
@@ -332,12 +336,11 @@ std::optional<PasteRefused> CShellViewCommands::PasteParsedStations(std::vector<
     pasting_ = false;
     if (outcome.refused)
         return outcome.refused;
+    // Logged by the store; all or nothing, so the message names every station of the block.
     if (FAILED(outcome.result)) {
-        LogFailure(outcome.result, __FILE__, __func__, __LINE__);
-        ShowMessageBox(
-            window_,
-            FormatDriverText(LoadUiText(IDS_PASTE_FAILED), {SystemResultText(outcome.result)}),
-            LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONERROR);
+        ShowMessageBox(context_.window,
+                       StationsNotChangedText(IDS_PASTE_FAILED, outcome.names, outcome.result),
+                       LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONERROR);
     }
     // Once, for the whole block; after a failure too, for the rare key that would not go again.
     ChangedStations();
@@ -355,7 +358,7 @@ void CShellViewCommands::SetViewMode(UINT mode) {
 
 void CShellViewCommands::BeginDrag() {
     // Only a station's file leaves by drag; stations themselves move by copy and paste.
-    if (folder_.kind != PT_STATION)
+    if (context_.folder.kind != PT_STATION)
         return;
     const std::vector<SelectedItem> selection = list_.Selection();
     if (selection.empty())
@@ -376,6 +379,7 @@ void CShellViewCommands::BeginDrag() {
     (void)::DoDragDrop(dataObject.Get(), dataObject.Get(), DROPEFFECT_COPY, &effect);
 }
 
-PIDLIST_RELATIVE CShellViewCommands::CreateFullItem(PCUITEMID_CHILD item) const {
-    return manager_.CreatePidlFromPath((folder_.path + L'\\' + manager_.GetItemName(item)).c_str());
+UniqueRelativePidl CShellViewCommands::CreateFullItem(PCUITEMID_CHILD item) const {
+    const std::wstring path = context_.folder.path + L'\\' + manager_.GetItemName(item);
+    return manager_.CreatePidlFromPath(path.c_str());
 }

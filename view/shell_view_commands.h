@@ -12,7 +12,7 @@
 #include "namespace/pidl_manager.h"
 #include "stations/portable/pasted_stations.h"
 #include "support/unique_resource.h"
-#include "view/shell_view_folder.h"
+#include "view/shell_view_context.h"
 #include "view/shell_view_list.h"
 #include "view/shell_view_menus.h"
 
@@ -21,17 +21,14 @@ class CLVDataObject;
 class CShellViewCommands {
 public:
     // The commands act on the list's selection; a new view mode is shown by the list and
-    // marked in the menus. view is the view itself, as the browser knows it: opening an item
-    // keeps it alive across the browse, and a file dialog is told of its default command.
-    CShellViewCommands(CShellViewList& list, CShellViewMenus& menus, IShellView& view) noexcept
-        : list_(list), menus_(menus), view_(view) {}
+    // marked in the menus. The context's view window owns the sheets and receives the keys'
+    // commands. All three are only kept here.
+    CShellViewCommands(ShellViewContext& context, CShellViewList& list,
+                       CShellViewMenus& menus) noexcept
+        : context_(context), list_(list), menus_(menus) {}
     CShellViewCommands(const CShellViewCommands&) = delete;
     CShellViewCommands& operator=(const CShellViewCommands&) = delete;
 
-    void SetUp(const ShellViewFolder& folder) { folder_ = folder; }
-    void SetBrowser(IShellBrowser* browser, ICommDlgBrowser* dialogBrowser) noexcept;
-    // The view window: it owns the sheets and receives the keys' commands; null once it is gone.
-    void SetViewWindow(HWND window) noexcept { window_ = window; }
     void LoadAccelerators() noexcept;
     void UnloadAccelerators() noexcept { accelerators_.reset(); }
 
@@ -65,16 +62,12 @@ private:
     [[nodiscard]] HRESULT AddSelectedItems(CLVDataObject& dataObject,
                                            const std::vector<SelectedItem>& selection) const;
     // Items' internal full identifiers: the folder's path, then the item.
-    PIDLIST_RELATIVE CreateFullItem(PCUITEMID_CHILD item) const;
+    [[nodiscard]] UniqueRelativePidl CreateFullItem(PCUITEMID_CHILD item) const;
 
+    ShellViewContext& context_;
     CShellViewList& list_;
     CShellViewMenus& menus_;
-    IShellView& view_;
     CPidlMgr manager_;
-    ShellViewFolder folder_;
-    Microsoft::WRL::ComPtr<IShellBrowser> browser_;
-    Microsoft::WRL::ComPtr<ICommDlgBrowser> dialogBrowser_;
-    HWND window_ = nullptr;
     UniqueAccelerators accelerators_;
     // The last key that TranslateAccelerator turned into a command: when the browser goes on to
     // dispatch that same message, the list must not turn it into a command again.

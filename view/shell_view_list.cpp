@@ -22,10 +22,6 @@ namespace {
 // The fill thread only enumerates the registry; a megabyte is what it was always given.
 constexpr SIZE_T kFillThreadStackSize = 1024 * 1024;
 
-// Process-wide, as the display settings are: every view sorts the way the last click asked.
-int g_sortColumn = 1;  // 1-based
-int g_sortDirection = 1;
-
 DWORD ListViewType(UINT mode) noexcept {
     switch (mode) {
         case FVM_SMALLICON:
@@ -108,24 +104,24 @@ int CALLBACK CompareItems(LPARAM first, LPARAM second, LPARAM context) {
 
 }  // namespace
 
-bool CShellViewList::Create(HWND view, IShellView* dropView) {
-    view_ = view;
+bool CShellViewList::Create() {
+    const HWND view = context_.window;
     // Clipping its siblings keeps the animation visible over the list while a fill runs.
     const DWORD style = WS_CHILD | WS_VISIBLE | WS_TABSTOP | WS_CLIPSIBLINGS | LVS_AUTOARRANGE |
-                        LVS_SHAREIMAGELISTS | LVS_SHOWSELALWAYS | ListViewType(viewMode_);
+                        LVS_SHAREIMAGELISTS | LVS_SHOWSELALWAYS | ListViewType(context_.viewMode);
     // No label editing: stations are renamed in their property sheet only.
-    if (!list_.Create(view_, style, WS_EX_CLIENTEDGE, IDC_VIEW_LIST))
+    if (!view || !list_.Create(view, style, WS_EX_CLIENTEDGE, IDC_VIEW_LIST))
         return false;
     RECT area{};
-    ::GetClientRect(view_, &area);
+    ::GetClientRect(view, &area);
     ::MoveWindow(list_.Window(), 0, 0, area.right, area.bottom, FALSE);
     ApplyViewModeStyle();
     ResetColumnsAndImages();
     // Files dropped on a station row or into a station's folder. Without OLE (a host that did not
     // initialise it) the view simply takes no drops.
     auto dropTarget = MakeComObject<CLVDropTargetOnListView>();
-    UniqueRelativePidl folder(manager_.CreatePidlFromPath(folder_.path.c_str()));
-    if (folder && SUCCEEDED(dropTarget->SetUp(list_.Window(), dropView, folder.get())))
+    const UniqueRelativePidl folder = manager_.CreatePidlFromPath(context_.folder.path.c_str());
+    if (folder && SUCCEEDED(dropTarget->SetUp(list_.Window(), &context_.view, folder.get())))
         dropTargetRegistered_ = SUCCEEDED(::RegisterDragDrop(list_.Window(), dropTarget.Get()));
     return true;
 }
@@ -138,7 +134,6 @@ void CShellViewList::Destroy() noexcept {
     dropTargetRegistered_ = false;
     list_.Destroy();
     animation_.reset();
-    view_ = nullptr;
 }
 
 void CShellViewList::Resize(int width, int height) noexcept {
@@ -146,7 +141,7 @@ void CShellViewList::Resize(int width, int height) noexcept {
 }
 
 void CShellViewList::SetViewMode(UINT mode) {
-    viewMode_ = mode;
+    context_.viewMode = mode;
     if (!list_.Window())
         return;
     ApplyViewModeStyle();
@@ -158,8 +153,9 @@ void CShellViewList::ApplyViewModeStyle() noexcept {
     if (!list)
         return;
     const LONG_PTR style = ::GetWindowLongPtrW(list, GWL_STYLE);
-    ::SetWindowLongPtrW(list, GWL_STYLE,
-                        (style & ~static_cast<LONG_PTR>(LVS_TYPEMASK)) | ListViewType(viewMode_));
+    ::SetWindowLongPtrW(
+        list, GWL_STYLE,
+        (style & ~static_cast<LONG_PTR>(LVS_TYPEMASK)) | ListViewType(context_.viewMode));
     constexpr DWORD kClickMask = LVS_EX_TRACKSELECT | LVS_EX_ONECLICKACTIVATE | LVS_EX_UNDERLINEHOT;
     list_.Send(LVM_SETEXTENDEDLISTVIEWSTYLE, kClickMask, ClickStyles());
 }
@@ -168,7 +164,7 @@ void CShellViewList::ResetColumnsAndImages() {
     list_.Send(LVM_DELETEALLITEMS);
     while (list_.Send(LVM_DELETECOLUMN, 0)) {
     }
-    if (viewMode_ == FVM_DETAILS) {
+    if (context_.viewMode == FVM_DETAILS) {
         std::wstring name = LoadUiText(IDS_NAME_COLUMN);
         LVCOLUMNW column{};
         column.mask = LVCF_FMT | LVCF_TEXT | LVCF_WIDTH | LVCF_SUBITEM;
@@ -177,7 +173,7 @@ void CShellViewList::ResetColumnsAndImages() {
         column.pszText = name.data();
         list_.Send(LVM_INSERTCOLUMNW, 0, reinterpret_cast<LPARAM>(&column));
     }
-    if (viewMode_ == FVM_ICON)
+    if (context_.viewMode == FVM_ICON)
         list_.Send(LVM_SETIMAGELIST, LVSIL_NORMAL, reinterpret_cast<LPARAM>(LargeIconList()));
     else
         list_.Send(LVM_SETIMAGELIST, LVSIL_SMALL, reinterpret_cast<LPARAM>(SmallIconList()));
@@ -197,11 +193,12 @@ HRESULT CShellViewList::Refresh() noexcept {
 void CShellViewList::StartFill() {
     // A newer fill takes the animation over; the older thread's result is still taken.
     animation_.reset();
+    const HWND view = context_.window;
     RECT area{};
-    ::GetClientRect(view_, &area);
+    ::GetClientRect(view, &area);
     animation_.reset(::CreateWindowExW(
         0, ANIMATE_CLASSW, L"", WS_CHILD | WS_VISIBLE | ACS_CENTER | ACS_TRANSPARENT | ACS_AUTOPLAY,
-        0, 0, area.right, area.bottom, view_,
+        0, 0, area.right, area.bottom, view,
         reinterpret_cast<HMENU>(static_cast<UINT_PTR>(IDC_VIEW_ANIMATION)), ThisModule(), nullptr));
     if (animation_) {
         ::SetWindowPos(animation_.get(), HWND_TOP, 0, 0, 0, 0, SWP_NOMOVE | SWP_NOSIZE);
@@ -210,7 +207,7 @@ void CShellViewList::StartFill() {
                        reinterpret_cast<LPARAM>(MAKEINTRESOURCEW(IDR_SEARCH_ANIMATION)));
     }
 
-    auto request = std::make_unique<FillRequest>(FillRequest{folder_.folder, view_});
+    auto request = std::make_unique<FillRequest>(FillRequest{context_.folder.folder, view});
     UniqueHandle thread(::CreateThread(nullptr, kFillThreadStackSize, &FillThread, request.get(),
                                        STACK_SIZE_PARAM_IS_A_RESERVATION, nullptr));
     if (!thread) {
@@ -228,12 +225,13 @@ void CShellViewList::StopFill() noexcept {
     for (UniqueHandle& thread : fillThreads_)
         ::WaitForSingleObject(thread.get(), INFINITE);
     fillThreads_.clear();
-    if (!view_)
+    const HWND view = context_.window;
+    if (!view)
         return;
     // Results posted to a window about to go would be lost with their enumerators.
     MSG message;
     const UINT ready = g_registeredMessages.getEnumIdList;
-    while (ready && ::PeekMessageW(&message, view_, ready, ready, PM_REMOVE)) {
+    while (ready && ::PeekMessageW(&message, view, ready, ready, PM_REMOVE)) {
         if (auto* enumerator = reinterpret_cast<IEnumIDList*>(message.lParam))
             enumerator->Release();
     }
@@ -253,7 +251,7 @@ void CShellViewList::OnEnumeratorReady(IEnumIDList* enumerator) {
     // late replaces what is shown instead of adding to it.
     list_.Send(LVM_DELETEALLITEMS);
     int index = 0;
-    if (folder_.IsTopFolder()) {
+    if (context_.folder.IsTopFolder()) {
         std::wstring entry = LoadUiText(IDS_ADD_NEW_DIGITAL_LEVEL);
         LVITEMW item{};
         item.mask = LVIF_TEXT | LVIF_IMAGE | LVIF_PARAM;
@@ -286,21 +284,22 @@ void CShellViewList::OnEnumeratorReady(IEnumIDList* enumerator) {
 }
 
 void CShellViewList::Sort(int columnArgument) {
-    SortContext context{folder_.folder.Get(), columnArgument};
-    list_.Send(LVM_SORTITEMS, reinterpret_cast<WPARAM>(&context),
+    SortContext sort{context_.folder.folder.Get(), columnArgument};
+    list_.Send(LVM_SORTITEMS, reinterpret_cast<WPARAM>(&sort),
                reinterpret_cast<LPARAM>(&CompareItems));
 }
 
 void CShellViewList::OnColumnClick(int column) {
-    if (column + 1 == g_sortColumn)
-        g_sortDirection = -g_sortDirection;
-    g_sortColumn = column + 1;
-    Sort(g_sortDirection * g_sortColumn);
+    ViewSortOrder& order = context_.sort;
+    if (column + 1 == order.column)
+        order.direction = -order.direction;
+    order.column = column + 1;
+    Sort(order.direction * order.column);
 }
 
 void CShellViewList::OnHeaderEndTrack() noexcept {
     // The header applies the new width after this notification: read it back afterwards.
-    ::PostMessageW(view_, kReadColumnWidthsMessage, 0, 0);
+    ::PostMessageW(context_.window, kReadColumnWidthsMessage, 0, 0);
 }
 
 void CShellViewList::ReadColumnWidths() noexcept {
@@ -321,7 +320,7 @@ void CShellViewList::OnGetDisplayInfo(NMLVDISPINFOW& info) {
     if (info.item.mask & LVIF_TEXT) {
         STRRET name{};
         if (info.item.pszText && info.item.cchTextMax > 0 &&
-            SUCCEEDED(folder_.folder->GetDisplayNameOf(item, SHGDN_NORMAL, &name)))
+            SUCCEEDED(context_.folder.folder->GetDisplayNameOf(item, SHGDN_NORMAL, &name)))
             (void)::StrRetToBufW(&name, item, info.item.pszText, info.item.cchTextMax);
     }
     if (info.item.mask & LVIF_IMAGE) {
@@ -329,9 +328,10 @@ void CShellViewList::OnGetDisplayInfo(NMLVDISPINFOW& info) {
         wchar_t location[MAX_PATH] = {};
         int index = kRootIconIndex;
         UINT flags = 0;
-        if (SUCCEEDED(
-                folder_.folder->GetUIObjectOf(view_, 1, &item, IID_IExtractIconW, nullptr,
-                                              reinterpret_cast<void**>(icon.GetAddressOf()))) &&
+        const HRESULT found = context_.folder.folder->GetUIObjectOf(
+            context_.window, 1, &item, IID_IExtractIconW, nullptr,
+            reinterpret_cast<void**>(icon.GetAddressOf()));
+        if (SUCCEEDED(found) &&
             FAILED(icon->GetIconLocation(0, location, ARRAYSIZE(location), &index, &flags)))
             index = kRootIconIndex;
         info.item.iImage = index;

@@ -10,7 +10,7 @@
 
 #include "namespace/pidl_manager.h"
 #include "support/unique_resource.h"
-#include "view/shell_view_folder.h"
+#include "view/shell_view_context.h"
 #include "view/shell_view_list_window.h"
 
 // Posted to the view window after a column's width was dragged; the view hands it back to
@@ -25,17 +25,16 @@ public:
         PCUITEMID_CHILD item;
     };
 
-    CShellViewList() noexcept = default;
+    // Only kept: the context is read from the calls on.
+    explicit CShellViewList(ShellViewContext& context) noexcept : context_(context) {}
     CShellViewList(const CShellViewList&) = delete;
     CShellViewList& operator=(const CShellViewList&) = delete;
     ~CShellViewList() { Destroy(); }
 
-    void SetUp(const ShellViewFolder& folder) { folder_ = folder; }
-
     // Creates the control in the view window (in the chosen view mode) and registers its drop
-    // target, which holds dropView until the control is destroyed; false when the control could
+    // target, which holds the view until the control is destroyed; false when the control could
     // not be made.
-    [[nodiscard]] bool Create(HWND view, IShellView* dropView);
+    [[nodiscard]] bool Create();
     // Waits for the fills, revokes the drop target, destroys the control and the animation.
     void Destroy() noexcept;
 
@@ -45,8 +44,8 @@ public:
     }
     void Resize(int width, int height) noexcept;
 
-    UINT ViewMode() const noexcept { return viewMode_; }
-    // Recorded before the control exists; afterwards its style, columns and images follow.
+    // Recorded in the context before the control exists; afterwards the control's style, columns
+    // and images follow.
     void SetViewMode(UINT mode);
     // The user's click settings (one click or two) may have changed.
     void ApplyViewModeStyle() noexcept;
@@ -74,10 +73,8 @@ private:
     void ResetColumnsAndImages();
     void Sort(int columnArgument);
 
+    ShellViewContext& context_;
     CPidlMgr manager_;
-    ShellViewFolder folder_;
-    UINT viewMode_ = FVM_ICON;
-    HWND view_ = nullptr;  // the view window, the list's parent, while the list exists
     CShellViewListWindow list_;
     bool dropTargetRegistered_ = false;
     UniqueWindow animation_;

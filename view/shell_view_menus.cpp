@@ -53,26 +53,11 @@ void InsertGroup(HMENU menu, UINT position, bool byPosition,
 
 }  // namespace
 
-HRESULT CShellViewMenus::SetUp(const ShellViewFolder& folder, PCUIDLIST_RELATIVE own) noexcept {
-    try {
-        folder_ = folder;
-        ownIdentifier_.reset(manager_.CopyPidl(own));
-        RETURN_IF_NULL_ALLOC(ownIdentifier_.get());
-        return S_OK;
-    }
-    CATCH_RETURN()
-}
-
-void CShellViewMenus::SetBrowser(IShellBrowser* browser, bool inFileDialog) noexcept {
-    browser_ = browser;
-    inFileDialog_ = inFileDialog;
-}
-
 MenuContext CShellViewMenus::CurrentMenuContext() const {
     MenuContext context;
-    context.folderKind = folder_.kind;
-    context.inFileDialog = inFileDialog_;
-    context.viewMode = list_.ViewMode();
+    context.folderKind = context_.folder.kind;
+    context.inFileDialog = context_.InFileDialog();
+    context.viewMode = context_.viewMode;
     for (const CShellViewList::SelectedItem& selected : list_.Selection()) {
         context.hasSelection = true;
         if (!selected.item)
@@ -93,17 +78,19 @@ void CShellViewMenus::SetActivation(ViewActivation state) {
 }
 
 void CShellViewMenus::RemoveMenus() noexcept {
-    if (!menu_ || !browser_)
+    const Microsoft::WRL::ComPtr<IShellBrowser>& browser = context_.browser;
+    if (!menu_ || !browser)
         return;
     // Wine's browsers implement neither call; Explorer's do. Either way the menu goes.
-    (void)browser_->SetMenuSB(nullptr, nullptr, nullptr);
-    (void)browser_->RemoveMenusSB(menu_.get());
+    (void)browser->SetMenuSB(nullptr, nullptr, nullptr);
+    (void)browser->RemoveMenusSB(menu_.get());
     menu_.reset();
 }
 
 void CShellViewMenus::BuildMenus() {
     RemoveMenus();
-    if (activation_ == ViewActivation::Deactivated || !browser_)
+    const Microsoft::WRL::ComPtr<IShellBrowser>& browser = context_.browser;
+    if (activation_ == ViewActivation::Deactivated || !browser)
         return;
     UniqueMenu menu(::CreateMenu());
     if (!menu)
@@ -111,7 +98,7 @@ void CShellViewMenus::BuildMenus() {
     OLEMENUGROUPWIDTHS widths{};
     // A browser without menus (as Wine's are) leaves the view working from its keyboard and
     // its pop-up menu.
-    if (FAILED(browser_->InsertMenusSB(menu.get(), &widths)))
+    if (FAILED(browser->InsertMenusSB(menu.get(), &widths)))
         return;
     const MenuContext context = CurrentMenuContext();
     if (const HMENU file = SubMenuOf(menu.get(), FCIDM_MENU_FILE)) {
@@ -137,8 +124,8 @@ void CShellViewMenus::BuildMenus() {
         }
     }
     // The menu is the browser's to show from here; it stays ours to remove and destroy.
-    if (FAILED(browser_->SetMenuSB(menu.get(), nullptr, view_))) {
-        (void)browser_->RemoveMenusSB(menu.get());
+    if (FAILED(browser->SetMenuSB(menu.get(), nullptr, context_.window))) {
+        (void)browser->RemoveMenusSB(menu.get());
         return;
     }
     menu_ = std::move(menu);
@@ -157,22 +144,23 @@ void CShellViewMenus::UpdateMenuStates() noexcept {
                                      MF_BYCOMMAND | (item.enabled ? MF_ENABLED : MF_GRAYED));
             }
         }
-        const UINT checked = CommandOfViewMode(list_.ViewMode());
+        const UINT checked = CommandOfViewMode(context_.viewMode);
         ::CheckMenuRadioItem(menu_.get(), IDM_LARGE_ICONS, IDM_DETAILS, checked, MF_BYCOMMAND);
     }
     CATCH_LOG()
 }
 
 void CShellViewMenus::ShowStatusText() {
-    if (!browser_)
+    const Microsoft::WRL::ComPtr<IShellBrowser>& browser = context_.browser;
+    if (!browser)
         return;
     // One part over the whole bar, "Quorvel Digital Levels: " and the folder's name, 260
     // characters at most.
     std::wstring text = LoadUiText(IDS_DIGITAL_LEVELS) + L": ";
     STRRET name{};
-    PCUITEMID_CHILD own = manager_.GetLastItem(ownIdentifier_.get());
+    PCUITEMID_CHILD own = manager_.GetLastItem(context_.ownIdentifier.get());
     wchar_t folderName[MAX_PATH] = {};
-    if (SUCCEEDED(folder_.folder->GetDisplayNameOf(own, SHGDN_NORMAL, &name)))
+    if (SUCCEEDED(context_.folder.folder->GetDisplayNameOf(own, SHGDN_NORMAL, &name)))
         (void)::StrRetToBufW(&name, own, folderName, ARRAYSIZE(folderName));
     text += folderName;
     if (text.size() >= MAX_PATH)
@@ -180,10 +168,10 @@ void CShellViewMenus::ShowStatusText() {
     int partEdge = -1;
     LRESULT ignored = 0;
     // A browser without a status bar shows nothing, and nothing else depends on it.
-    (void)browser_->SendControlMsg(FCW_STATUS, SB_SETPARTS, 1, reinterpret_cast<LPARAM>(&partEdge),
-                                   &ignored);
-    (void)browser_->SendControlMsg(FCW_STATUS, SB_SETTEXTW, 0,
-                                   reinterpret_cast<LPARAM>(text.c_str()), &ignored);
+    (void)browser->SendControlMsg(FCW_STATUS, SB_SETPARTS, 1, reinterpret_cast<LPARAM>(&partEdge),
+                                  &ignored);
+    (void)browser->SendControlMsg(FCW_STATUS, SB_SETTEXTW, 0,
+                                  reinterpret_cast<LPARAM>(text.c_str()), &ignored);
 }
 
 void CShellViewMenus::ShowPopupMenu(POINT position) {
@@ -208,5 +196,6 @@ void CShellViewMenus::ShowPopupMenu(POINT position) {
         ::ClientToScreen(list_.Window(), &position);
     }
     // The chosen item comes back as WM_COMMAND to the view window.
-    ::TrackPopupMenu(popup.get(), TPM_RIGHTBUTTON, position.x, position.y, 0, view_, nullptr);
+    ::TrackPopupMenu(popup.get(), TPM_RIGHTBUTTON, position.x, position.y, 0, context_.window,
+                     nullptr);
 }

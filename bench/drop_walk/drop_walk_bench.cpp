@@ -134,7 +134,7 @@ void MeasureIn(const std::wstring& folder, const Scenario& scenario) {
     const double makeSeconds = std::chrono::duration<double>(Clock::now() - makeStart).count();
     ComPtr<IDataObject> data = ShellDataObject(folder);
     CPidlMgr manager;
-    UniqueRelativePidl station(manager.CreatePidlFromPath(L"Quorvel Digital Level\\Bench"));
+    UniqueRelativePidl station = manager.CreatePidlFromPath(L"Quorvel Digital Level\\Bench");
     if (!data || !station) {
         std::printf("%-48s no data object\n", scenario.name);
         return;

@@ -87,7 +87,7 @@ bool AddStations(int count) {
         swprintf(name, ARRAYSIZE(name), L"Level %04d", number);
         Station station = DefaultStation();
         station.Name = name;
-        if (AddStation(station) != S_OK)
+        if (FAILED(AddStation(station)))
             return false;
     }
     return true;
@@ -114,7 +114,7 @@ HRESULT MakeTopFolderView(TopFolderView& made) {
     UniqueAbsoluteIdList computer;
     if (FAILED(result = ::SHGetSpecialFolderLocation(nullptr, CSIDL_DRIVES, computer.put())))
         return result;
-    UniqueChildPidl own(manager.CreateRootPidl());
+    UniqueChildPidl own = manager.CreateRootPidl();
     made.absolute.reset(::ILCombine(computer.get(), own.get()));
     return made.absolute ? S_OK : E_OUTOFMEMORY;
 }

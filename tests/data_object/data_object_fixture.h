@@ -104,7 +104,7 @@ protected:
         auto object = downloader ? MakeComObject<CLVDataObject>(std::move(downloader))
                                  : MakeComObject<CLVDataObject>(MakeDialogStationDownloader());
         for (const wchar_t* path : paths) {
-            UniqueRelativePidl list(manager_.CreatePidlFromPath(path));
+            UniqueRelativePidl list = manager_.CreatePidlFromPath(path);
             EXPECT_EQ(S_OK, object->SetItem(list.get()));
         }
         Microsoft::WRL::ComPtr<IDataObject> data;

@@ -150,7 +150,7 @@ TEST_F(DataObject, ShellIdListArrayGivesEveryChildItsOwnOffsetInsideTheBlock) {
         ASSERT_EQ(S_OK, object->SetFolderLocation(folder.get()));
         for (size_t index = 0; index < count; ++index) {
             const std::wstring path = std::wstring(L"Quorvel Digital Level\\") + names[index];
-            UniqueRelativePidl list(manager_.CreatePidlFromPath(path.c_str()));
+            UniqueRelativePidl list = manager_.CreatePidlFromPath(path.c_str());
             ASSERT_EQ(S_OK, object->SetItem(list.get()));
         }
         UniqueStgMedium medium;
@@ -197,7 +197,7 @@ TEST_F(DataObject, ShellIdListArrayGivesEveryChildItsOwnOffsetInsideTheBlock) {
                            TYMED_HGLOBAL, none))
         << "no place";
     auto rootOnly = MakeComObject<CLVDataObject>(MakeDialogStationDownloader());
-    UniqueRelativePidl root(manager_.CreatePidlFromPath(L"Quorvel Digital Level"));
+    UniqueRelativePidl root = manager_.CreatePidlFromPath(L"Quorvel Digital Level");
     ASSERT_EQ(S_OK, rootOnly->SetItem(root.get()));
     ASSERT_EQ(S_OK, rootOnly->SetFolderLocation(folder.get()));
     EXPECT_EQ(S_FALSE, Get(rootOnly.Get(), CFSTR_SHELLIDLIST, TYMED_HGLOBAL, none)) << "no parent";

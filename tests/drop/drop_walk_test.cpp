@@ -129,7 +129,8 @@ protected:
         Dropped dropped;
         RunWithWatchdog([&] {
             CPidlMgr manager;
-            UniqueRelativePidl station(manager.CreatePidlFromPath(L"Quorvel Digital Level\\North"));
+            const UniqueRelativePidl station =
+                manager.CreatePidlFromPath(L"Quorvel Digital Level\\North");
             const DroppedSourcesReceiver receiver =
                 [&](const std::wstring&, const std::shared_ptr<TSourceList>& sources) {
                     dropped.received.push_back(*sources);

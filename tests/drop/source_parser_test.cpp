@@ -148,16 +148,14 @@ TEST_F(SourceParserTest, DropSourcesAreAcceptedByTheirFormats) {
 TEST_F(SourceParserTest, ShellItemsUnderARealFolderAreParsedAsTheirFiles) {
     const std::wstring first = scratch_.File(L"x.lv");
     const std::wstring second = scratch_.File(L"y.lv");
-    PIDLIST_ABSOLUTE folder = nullptr, one = nullptr, two = nullptr;
-    ASSERT_EQ(S_OK, ::SHParseDisplayName(scratch_.Path().c_str(), nullptr, &folder, 0, nullptr));
-    ASSERT_EQ(S_OK, ::SHParseDisplayName(first.c_str(), nullptr, &one, 0, nullptr));
-    ASSERT_EQ(S_OK, ::SHParseDisplayName(second.c_str(), nullptr, &two, 0, nullptr));
+    UniqueAbsoluteIdList folder, one, two;
+    ASSERT_EQ(S_OK,
+              ::SHParseDisplayName(scratch_.Path().c_str(), nullptr, folder.put(), 0, nullptr));
+    ASSERT_EQ(S_OK, ::SHParseDisplayName(first.c_str(), nullptr, one.put(), 0, nullptr));
+    ASSERT_EQ(S_OK, ::SHParseDisplayName(second.c_str(), nullptr, two.put(), 0, nullptr));
     auto data = MakeComObject<BlockDataObject>();
     data->blocks[RegisteredFormat(ClipboardFormat::ShellIdList)] =
-        IdListArrayBlock(folder, {::ILFindLastID(one), ::ILFindLastID(two)});
-    ::ILFree(folder);
-    ::ILFree(one);
-    ::ILFree(two);
+        IdListArrayBlock(folder.get(), {::ILFindLastID(one.get()), ::ILFindLastID(two.get())});
     EXPECT_EQ((std::vector<TSourceDescriptor>{{first, first, 0}, {second, second, 0}}),
               Parse(data.Get()));
     // Not deep: shell items are not opened, and a source with nothing else gives nothing.
@@ -230,7 +228,22 @@ TEST_F(SourceParserTest, BlocksThatLieAreReadOnlyWithinThemselves) {
     }
 }
 
-TEST_F(SourceParserTest, ANullSourceAndAFailedMarshallingAreWrittenToTheErrorLog) {
+// The line of the first log entry that starts with the given source, result and function, as in
+// "source_parser.cpp - 0x80070057 (ParseDataObject, 123)"; 0 when there is none.
+int LoggedLine(const std::wstring& log, const wchar_t* function, HRESULT result) {
+    wchar_t head[128];
+    swprintf(head, 128, L"source_parser.cpp - 0x%08X (%ls, ", static_cast<unsigned>(result),
+             function);
+    const size_t at = log.find(head);
+    if (at == std::wstring::npos)
+        return 0;
+    const wchar_t* number = log.c_str() + at + wcslen(head);
+    wchar_t* end = nullptr;
+    const long line = wcstol(number, &end, 10);
+    return end != number && *end == L')' ? static_cast<int>(line) : 0;
+}
+
+TEST_F(SourceParserTest, RefusedCallsAreWrittenToTheErrorLogWhereTheyAreRefused) {
     ::SetEnvironmentVariableW(L"LVSHELLEXT_LOG_DIR", scratch_.Path().c_str());
     TSourceParser parser(true);
     EXPECT_EQ(E_INVALIDARG, parser.ParseDataObject(nullptr, L"", true));
@@ -238,6 +251,7 @@ TEST_F(SourceParserTest, ANullSourceAndAFailedMarshallingAreWrittenToTheErrorLog
     refusing->refuseMarshalling = true;
     const HRESULT marshalling = parser.ParseDataObject(refusing.Get(), L"", true);
     EXPECT_TRUE(FAILED(marshalling));
+    EXPECT_EQ(E_INVALIDARG, parser.GetDataObject(nullptr));
     const std::wstring log = ErrorLogPath();
     ::SetEnvironmentVariableW(L"LVSHELLEXT_LOG_DIR", nullptr);
 
@@ -248,12 +262,14 @@ TEST_F(SourceParserTest, ANullSourceAndAFailedMarshallingAreWrittenToTheErrorLog
     DWORD read = 0;
     ::ReadFile(file.get(), text.data(), static_cast<DWORD>(text.size() * sizeof(wchar_t)), &read,
                nullptr);
-    wchar_t expected[128];
-    EXPECT_NE(std::wstring::npos,
-              text.find(L"SourceParser - 0x80070057 (TSourceParser::ParseDataObject, 57)"));
-    swprintf(expected, 128, L"SourceParser - 0x%08X (TSourceParser::ParseDataObject, 64)",
-             static_cast<unsigned>(marshalling));
-    EXPECT_NE(std::wstring::npos, text.find(expected)) << "in the log: " << text.size();
+    // Each entry names the file, the function and the line of its own check: three checks,
+    // three lines, the marshalling after the null check as in the source.
+    const int nullSource = LoggedLine(text, L"ParseDataObject", E_INVALIDARG);
+    const int failedMarshalling = LoggedLine(text, L"ParseDataObject", marshalling);
+    const int nullOut = LoggedLine(text, L"GetDataObject", E_INVALIDARG);
+    EXPECT_GT(nullSource, 0) << "in the log: " << text.size();
+    EXPECT_GT(failedMarshalling, nullSource);
+    EXPECT_GT(nullOut, failedMarshalling);
 }
 
 }  // namespace

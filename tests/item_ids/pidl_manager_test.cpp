@@ -20,7 +20,7 @@ namespace {
 class PidlManager : public ::testing::Test {
 protected:
     UniqueRelativePidl Path(const wchar_t* path) {
-        return UniqueRelativePidl(manager_.CreatePidlFromPath(path));
+        return manager_.CreatePidlFromPath(path);
     }
 
     std::vector<DWORD> KindsOf(PCUIDLIST_RELATIVE list) {
@@ -39,14 +39,14 @@ using Kinds = std::vector<DWORD>;
 }  // namespace
 
 TEST_F(PidlManager, CopiesAndJoinsCarryTheSlackBytes) {
-    UniqueChildPidl item(manager_.CreateItemPidl(L"Quorvel Digital Level\\A"));
+    UniqueChildPidl item = manager_.CreateItemPidl(L"Quorvel Digital Level\\A");
     ASSERT_TRUE(item);
     EXPECT_EQ(25u, manager_.GetSize(item.get()));
     // Copies and joins step by cb, so the five slack bytes travel along.
-    UniqueChildPidl root(manager_.CreateRootPidl());
-    UniqueRelativePidl joined(manager_.ConcatPidls(root.get(), item.get()));
+    UniqueChildPidl root = manager_.CreateRootPidl();
+    UniqueRelativePidl joined = manager_.ConcatPidls(root.get(), item.get());
     EXPECT_EQ(root.get()->mkid.cb + 23u + 2u, manager_.GetSize(joined.get()));
-    UniqueRelativePidl copy(manager_.CopyPidl(joined.get()));
+    UniqueRelativePidl copy = manager_.CopyPidl(joined.get());
     ASSERT_EQ(manager_.GetSize(joined.get()), manager_.GetSize(copy.get()));
     EXPECT_EQ(0, memcmp(joined.get(), copy.get(), manager_.GetSize(copy.get())));
 }
@@ -62,9 +62,9 @@ TEST_F(PidlManager, CreationFromPathsAndKindTestsOfTheLastItem) {
     for (const wchar_t* nothing : {L"", L"\\\\", static_cast<const wchar_t*>(nullptr)})
         EXPECT_FALSE(Path(nothing));
 
-    UniqueChildPidl stationItem(manager_.CreateItemPidl(L"Quorvel Digital Level\\S1\\file1.lv"));
+    UniqueChildPidl stationItem = manager_.CreateItemPidl(L"Quorvel Digital Level\\S1\\file1.lv");
     EXPECT_EQ((Kinds{PT_STATION}), KindsOf(stationItem.get()));
-    UniqueChildPidl rootItem(manager_.CreateItemPidl(L"\\Quorvel Digital Level"));
+    UniqueChildPidl rootItem = manager_.CreateItemPidl(L"\\Quorvel Digital Level");
     EXPECT_EQ((Kinds{PT_ROOT}), KindsOf(rootItem.get()));
     EXPECT_EQ(L"Quorvel Digital Level", manager_.GetItemName(rootItem.get()));
 
@@ -90,10 +90,10 @@ TEST_F(PidlManager, ParsingPrefixIsCopiedWithoutTerminatorWhenCut) {
 TEST_F(PidlManager, ValidityFollowsTheStore) {
     RegistryOverride registry;
     AddStationOfModel(L"Station 1");
-    UniqueChildPidl station(manager_.CreateItemPidl(L"Quorvel Digital Level\\Station 1"));
-    UniqueChildPidl otherCase(manager_.CreateItemPidl(L"Quorvel Digital Level\\station 1"));
+    UniqueChildPidl station = manager_.CreateItemPidl(L"Quorvel Digital Level\\Station 1");
+    UniqueChildPidl otherCase = manager_.CreateItemPidl(L"Quorvel Digital Level\\station 1");
     UniqueRelativePidl file = Path(L"Quorvel Digital Level\\Gone\\file1.lv");
-    UniqueRelativePidl fileItem(manager_.CopyFromIndex(file.get(), 2));
+    UniqueRelativePidl fileItem = manager_.CopyFromIndex(file.get(), 2);
     EXPECT_TRUE(manager_.IsValid(station.get()));
     EXPECT_FALSE(manager_.IsValid(otherCase.get())) << "the store compares names case-sensitively";
     EXPECT_TRUE(manager_.IsValid(fileItem.get()));

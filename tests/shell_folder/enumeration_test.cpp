@@ -51,8 +51,8 @@ TEST_F(ShellFolderTest, NextSkipAndResetFollowTheEnumerationRules) {
     auto names = [&](ULONG count) {
         std::vector<std::wstring> fetchedNames;
         for (ULONG index = 0; index < count; ++index) {
-            fetchedNames.push_back(manager_.GetItemName(items[index]));
-            ::CoTaskMemFree(items[index]);
+            const UniqueChildPidl fetchedItem(items[index]);
+            fetchedNames.push_back(manager_.GetItemName(fetchedItem.get()));
         }
         return fetchedNames;
     };

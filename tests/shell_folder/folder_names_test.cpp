@@ -57,7 +57,7 @@ TEST_F(ShellFolderTest, AttributesByKindAndValidation) {
     UniqueChildPidl station = StationItem(L"Station 1");
     UniqueChildPidl deleted = StationItem(L"Gone");
     UniqueChildPidl file = FileItem(L"file1.lv");
-    UniqueChildPidl root(manager_.CreateRootPidl());
+    UniqueChildPidl root = manager_.CreateRootPidl();
     const SFGAOF stationBits = 0x20000100;
     const struct {
         const char* rule;

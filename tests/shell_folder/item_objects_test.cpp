@@ -64,7 +64,7 @@ TEST_F(ShellFolderTest, InfoTipIsThePathOfTheFullIdentifier) {
 
 TEST_F(ShellFolderTest, IconLocationByKindOfTheLastItem) {
     UniqueChildPidl station = StationItem(L"Station 1");
-    UniqueChildPidl rootItem(manager_.CreateRootPidl());
+    UniqueChildPidl rootItem = manager_.CreateRootPidl();
     ComPtr<IShellFolder> stationFolder = Bind(root_.Get(), station);
     ASSERT_TRUE(stationFolder);
     UniqueChildPidl file = FileItem(L"file1.lv");

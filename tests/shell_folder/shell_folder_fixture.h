@@ -49,13 +49,12 @@ protected:
     }
 
     UniqueChildPidl StationItem(const std::wstring& name) const {
-        return UniqueChildPidl(
-            manager_.CreateItemPidl((L"Quorvel Digital Level\\" + name).c_str()));
+        return manager_.CreateItemPidl((L"Quorvel Digital Level\\" + name).c_str());
     }
     UniqueChildPidl FileItem(const std::wstring& name) const {
-        UniqueRelativePidl full(
-            manager_.CreatePidlFromPath((L"Quorvel Digital Level\\S\\" + name).c_str()));
-        return UniqueChildPidl(manager_.CopyItem(manager_.GetLastItem(full.get())));
+        const UniqueRelativePidl full =
+            manager_.CreatePidlFromPath((L"Quorvel Digital Level\\S\\" + name).c_str());
+        return manager_.CopyItem(manager_.GetLastItem(full.get()));
     }
 
     // ParseDisplayName of a (writable copy of the) name; the list is null after a failure.

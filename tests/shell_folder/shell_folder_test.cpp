@@ -71,7 +71,7 @@ TEST_F(ShellFolderTest, BindToStationThenParseAndNameItsFile) {
     ASSERT_EQ(S_OK, Parse(stationFolder.Get(), L"file1.lv", file));
     EXPECT_EQ((Items{{PT_FILE, L"file1.lv"}}), ItemsOf(file));
     // One item, as the shell then hands it back: a child.
-    const UniqueChildPidl fileItem(manager_.CopyItem(file.get()));
+    const UniqueChildPidl fileItem = manager_.CopyItem(file.get());
     std::wstring text;
     ASSERT_EQ(S_OK, DisplayName(stationFolder.Get(), fileItem, SHGDN_FORPARSING, text));
     EXPECT_EQ(std::wstring(kPrefix) + L"\\Station 1\\file1.lv", text);

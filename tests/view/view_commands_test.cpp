@@ -3,6 +3,11 @@
 // (pasting other programs' blocks: view_paste_test.cpp).
 #include "tests/view/view_fixture.h"
 
+#include <algorithm>
+#include <list>
+
+#include "tests/stations/store_refusal.h"
+
 namespace {
 
 TEST_F(ShellViewTest, AddRefusesBadNamesThenStoresAGoodOneWithTheDefaults) {
@@ -137,6 +142,35 @@ TEST_F(ShellViewTest, AChangeInOneViewRefreshesAnotherOfTheSameKind) {
         WaitForFill(second);
     }
     EXPECT_EQ((std::vector<std::wstring>{kEntry, L"B"}), Texts(second));
+}
+
+TEST_F(ShellViewTest, DeleteRemovesWhatItCanAndNamesTheRestInOneBoundedMessage) {
+    std::vector<Station> levels;
+    for (int number = 1; number <= 14; ++number)
+        levels.push_back(Named((number < 10 ? L"Level 0" : L"Level ") + std::to_wstring(number)));
+    ASSERT_EQ(S_OK, AddStations(levels));  // "Station 0" to "Station 13"
+    std::list<WriteRefusingKey> locked;
+    for (int key = 0; key < 12; ++key)
+        locked.emplace_back(L"Station " + std::to_wstring(key));
+    CExplorerWindow& browser = Open();
+    Select(browser, {0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14});
+    ASSERT_EQ(S_OK, DeleteStation(levels[13]));  // gone meanwhile: no failure, simply gone
+    EXPECT_EQ(S_OK, Command(browser, 1288));
+
+    const auto boxes = user_.MessageBoxes();
+    ASSERT_EQ(1u, boxes.size());
+    std::wstring named;
+    for (int number = 1; number <= 10; ++number)
+        named += L"'" + levels[number - 1].Name + L"'\r\n";
+    EXPECT_EQ(L"These digital levels could not be deleted:\r\n" + named + L"and 2 more\r\n\r\n" +
+                  SystemMessageText(ERROR_ACCESS_DENIED),
+              boxes[0].text);
+    EXPECT_EQ(browser.ViewWindow(), boxes[0].owner);
+    EXPECT_EQ(L"Quorvel Digital Levels", boxes[0].caption);
+    const std::vector<std::wstring> left = ListStationNames();
+    EXPECT_EQ(12u, left.size());
+    EXPECT_EQ(std::count(left.begin(), left.end(), levels[12].Name), 0) << "the free one went";
+    EXPECT_EQ(13u, Texts(browser).size()) << "the list shows what is left";
 }
 
 }  // namespace

@@ -16,7 +16,7 @@ protected:
     ComPtr<CLVDropTargetOnListView> ListTarget(CExplorerWindow& browser,
                                                const std::wstring& folderPath) {
         auto target = MakeComObject<CLVDropTargetOnListView>();
-        UniqueRelativePidl folder(manager_.CreatePidlFromPath(folderPath.c_str()));
+        UniqueRelativePidl folder = manager_.CreatePidlFromPath(folderPath.c_str());
         EXPECT_EQ(S_OK, target->SetUp(List(browser), browser.View(), folder.get()));
         EXPECT_EQ(S_OK, target->SetReceiver([this](const std::wstring& station,
                                                    const std::shared_ptr<TSourceList>& sources) {

@@ -111,15 +111,15 @@ protected:
         ComPtr<IPersistFolder> persist;
         EXPECT_EQ(S_OK, folder.As(&persist));
         EXPECT_EQ(S_OK, persist->Initialize(nullptr));
-        UniqueRelativePidl own(manager_.CreateRootPidl());
+        UniqueRelativePidl own = CPidlMgr::AsList(manager_.CreateRootPidl());
         if (!station.empty()) {
-            UniqueChildPidl item(
-                manager_.CreateItemPidl((L"Quorvel Digital Level\\" + station).c_str()));
+            const UniqueChildPidl item =
+                manager_.CreateItemPidl((L"Quorvel Digital Level\\" + station).c_str());
             ComPtr<IShellFolder> stationFolder;
             EXPECT_EQ(S_OK,
                       folder->BindToObject(item.get(), nullptr, IID_PPV_ARGS(&stationFolder)));
             folder = stationFolder;
-            own.reset(manager_.ConcatPidls(own.get(), item.get()));
+            own = manager_.ConcatPidls(own.get(), item.get());
         }
         ComPtr<IShellView> view;
         EXPECT_EQ(S_OK, folder->CreateViewObject(nullptr, IID_PPV_ARGS(&view)));
@@ -127,10 +127,9 @@ protected:
         options.visible = true;
         EXPECT_EQ(S_OK, CExplorerWindow::Create(options, browser));
         // The browser's record of where it is: My Computer, then the folder's own items.
-        PIDLIST_ABSOLUTE computer = nullptr;
-        EXPECT_EQ(S_OK, ::SHGetSpecialFolderLocation(nullptr, CSIDL_DRIVES, &computer));
-        UniqueAbsoluteIdList absolute(::ILCombine(computer, own.get()));
-        ::CoTaskMemFree(computer);
+        UniqueAbsoluteIdList computer;
+        EXPECT_EQ(S_OK, ::SHGetSpecialFolderLocation(nullptr, CSIDL_DRIVES, computer.put()));
+        UniqueAbsoluteIdList absolute(::ILCombine(computer.get(), own.get()));
         EXPECT_EQ(S_OK, browser->BrowseToView(view.Get(), absolute.get()));
         browsers_.push_back(browser);
         WaitForFill(*browser.Get());

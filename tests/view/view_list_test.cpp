@@ -91,6 +91,27 @@ TEST_F(ShellViewTest, TheFirstClickOnNameSortsDescendingAndTheNextAscending) {
     EXPECT_EQ((std::vector<std::wstring>{kEntry, L"A", L"b", L"c"}), Texts(browser));
 }
 
+// Each view keeps its own order: a click in one view does not turn the next click in another.
+TEST_F(ShellViewTest, TwoViewsInOneProcessSortEachByItsOwnClicks) {
+    for (const wchar_t* name : {L"b", L"A", L"c"})
+        AddStationOfModel(name);
+    const std::vector<std::wstring> descending{kEntry, L"c", L"b", L"A"};
+    const std::vector<std::wstring> ascending{kEntry, L"A", L"b", L"c"};
+    CExplorerWindow& first = Open(L"", Details());
+    CExplorerWindow& second = Open(L"", Details());
+    NotifyFromList(first, LVN_COLUMNCLICK, -1, 0);
+    EXPECT_EQ(descending, Texts(first));
+    // The second view has not been clicked yet: its first click sorts descending too.
+    NotifyFromList(second, LVN_COLUMNCLICK, -1, 0);
+    EXPECT_EQ(descending, Texts(second));
+    NotifyFromList(second, LVN_COLUMNCLICK, -1, 0);
+    EXPECT_EQ(ascending, Texts(second));
+    // And the first goes on from its own one click, whatever the second did.
+    NotifyFromList(first, LVN_COLUMNCLICK, -1, 0);
+    EXPECT_EQ(ascending, Texts(first));
+    EXPECT_EQ(ascending, Texts(second));
+}
+
 TEST_F(ShellViewTest, TheStatusBarNamesTheFolderInOnePart) {
     AddStationOfModel(L"North");
     CExplorerWindow& top = Open();

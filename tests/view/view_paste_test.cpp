@@ -11,6 +11,7 @@
 #include "stations/portable/station_list_format.h"
 #include "support/clipboard_formats.h"
 #include "support/registry_value.h"
+#include "tests/stations/store_refusal.h"
 
 namespace {
 
@@ -264,6 +265,26 @@ TEST_F(PasteTest, AStationNamedWithABackslashIsNotListedAsAnotherAndActsOnNone) 
     EXPECT_EQ(ERROR_SUCCESS, ReadStringValue(StationKey(L"Station 0").get(), L"Name", 520, other));
     EXPECT_EQ(L"Site\\North", other);
     EXPECT_EQ(Names{kEntry}, Texts(browser));
+}
+
+TEST_F(PasteTest, AStoreThatRefusesTheWriteNamesTheStationsItWouldHaveAdded) {
+    AddStationOfModel(L"A");
+    CExplorerWindow& browser = Open();
+    PutBlockOnClipboard(SerializeStationRecords(StationsNamed({L"A", L"B"})));
+    {
+        WriteRefusingKey locked;
+        EXPECT_EQ(S_OK, Command(browser, 1282));
+    }
+    ASSERT_EQ(1u, user_.MessageBoxes().size());
+    EXPECT_EQ(
+        L"Nothing was pasted: these digital levels could not be stored:\r\n'Copy of A'\r\n"
+        L"'B'\r\n\r\n" +
+            SystemMessageText(ERROR_ACCESS_DENIED),
+        user_.MessageBoxes()[0].text);
+    EXPECT_EQ(Names{L"A"}, ListStationNames());
+    // The same paste once the store takes writes again.
+    EXPECT_EQ(S_OK, Command(browser, 1282));
+    EXPECT_EQ((Names{L"A", L"Copy of A", L"B"}), ListStationNames());
 }
 
 }  // namespace
