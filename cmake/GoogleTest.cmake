@@ -13,6 +13,11 @@ add_subdirectory(${LV_GTEST_SOURCE_DIR} ${CMAKE_BINARY_DIR}/googletest EXCLUDE_F
 
 add_library(lv_gtest_main INTERFACE)
 target_link_libraries(lv_gtest_main INTERFACE gtest_main)
+if(WIN32)
+    # What the test programs are compiled with too (lv_add_test): see there.
+    target_compile_options(gtest PRIVATE -O1 -g1)
+    target_compile_options(gtest_main PRIVATE -O1 -g1)
+endif()
 if(LV_SANITIZE AND NOT WIN32)
     target_compile_options(gtest PRIVATE -fsanitize=address,undefined)
     target_compile_options(gtest_main PRIVATE -fsanitize=address,undefined)

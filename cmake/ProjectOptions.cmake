@@ -44,6 +44,10 @@ function(lv_add_test name)
     add_executable(${name} ${ARG_UNPARSED_ARGUMENTS})
     target_link_libraries(${name} PRIVATE ${ARG_LIBS} lv_options lv_gtest_main)
     if(WIN32)
+        # Test files are GoogleTest's templates above all: at -O1 with line tables only they
+        # compile in about 60 % of the time of -O2 with full debug information, which was most of
+        # the Windows build. The code under test keeps the release options it ships with.
+        target_compile_options(${name} PRIVATE -O1 -g1)
         # Test executables carry the module's resources (string table) so that text lookups
         # made through the executable's own module find them.
         lv_add_module_resources(${name})

@@ -17,7 +17,7 @@ public:
     // Stops the download thread and waits for it without limit, then deletes it.
     ~CDownloadProgressDialog() override;
 
-    HRESULT DownloadResult() const noexcept override;
+    [[nodiscard]] HRESULT DownloadResult() const noexcept override;
 
 protected:
     BOOL OnInitDialog() override;

@@ -4,10 +4,10 @@
 #include <new>
 #include <utility>
 
-#include "download/halvek_comm.h"
 #include "download/portable/driver_text.h"
 #include "res/resource.h"
 #include "support/error_handling.h"
+#include "support/module_instance.h"
 #include "support/read_only_file.h"
 #include "support/text_lookup.h"
 #include "support/user_interface.h"
@@ -178,18 +178,21 @@ void DownloadTarget::Remove() noexcept {
     reservation_.clear();
 }
 
-HRESULT PrepareDownloadTarget(HWND owner, DownloadTarget& target) {
-    std::wstring folder;
-    HRESULT result = TemporaryFolder(folder);
-    if (SUCCEEDED(result))
-        result = DownloadTarget::Create(folder, target);
-    if (SUCCEEDED(result))
+HRESULT PrepareDownloadTarget(HWND owner, DownloadTarget& target) noexcept {
+    try {
+        std::wstring folder;
+        HRESULT result = TemporaryFolder(folder);
+        if (SUCCEEDED(result))
+            result = DownloadTarget::Create(folder, target);
+        if (SUCCEEDED(result))
+            return result;
+        if (folder.size() > 1 && folder.back() == L'\\')
+            folder.pop_back();
+        ShowMessageBox(owner,
+                       FormatDriverText(LoadUiText(IDS_TEMPORARY_FOLDER_UNUSABLE),
+                                        {folder, SystemResultText(result)}),
+                       LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONSTOP);
         return result;
-    if (folder.size() > 1 && folder.back() == L'\\')
-        folder.pop_back();
-    ShowMessageBox(owner,
-                   FormatDriverText(LoadUiText(IDS_TEMPORARY_FOLDER_UNUSABLE),
-                                    {folder, SystemResultText(result)}),
-                   LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONSTOP);
-    return result;
+    }
+    CATCH_RETURN()
 }

@@ -66,4 +66,4 @@ private:
 // A fresh target in the user's temporary folder. When the folder cannot take it, the user is told
 // which folder and why (owner, which may be null, owns the box) before anything else happens,
 // and the failure is returned.
-[[nodiscard]] HRESULT PrepareDownloadTarget(HWND owner, DownloadTarget& target);
+[[nodiscard]] HRESULT PrepareDownloadTarget(HWND owner, DownloadTarget& target) noexcept;

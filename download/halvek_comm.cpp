@@ -5,8 +5,9 @@
 #include <new>
 
 #include "res/resource.h"
-#include "support/read_only_file.h"
+#include "support/error_handling.h"
 #include "support/module_instance.h"
+#include "support/read_only_file.h"
 #include "support/text_lookup.h"
 
 namespace {
@@ -21,75 +22,69 @@ std::wstring ModuleDirectory() {
 
 }  // namespace
 
-std::wstring SystemResultText(HRESULT result, const std::wstring& insert) {
-    std::wstring text = SystemMessageText(static_cast<DWORD>(result), insert);
-    // Some systems keep their texts under the bare Win32 code only.
-    if (text.empty() && HRESULT_FACILITY(result) == FACILITY_WIN32)
-        text = SystemMessageText(HRESULT_CODE(result), insert);
-    if (text.empty()) {
-        wchar_t fallback[32] = {};
-        ::wsprintfW(fallback, L"0x%08X", static_cast<unsigned>(result));
-        text = fallback;
-        if (!insert.empty())
-            text += L" (" + insert + L")";
+HRESULT CheckReceivedFile(const std::wstring& path) noexcept {
+    try {
+        // Sharing read only: a library still writing the file holds it open for writing, and the
+        // open then fails with a sharing violation instead of handing on half a file.
+        UniqueFileHandle file;
+        uint64_t size = 0;
+        const HRESULT opened = OpenReadOnlyFile(path, file, size);
+        if (FAILED(opened))
+            return opened;
+        if (size == 0)
+            return HRESULT_FROM_WIN32(ERROR_INVALID_DATA);
+        // A file that ends where its drive ran out of room was most likely cut short there.
+        const size_t slash = path.find_last_of(L"\\/");
+        const std::wstring folder = slash == std::wstring::npos ? path : path.substr(0, slash + 1);
+        ULARGE_INTEGER available{};
+        if (::GetDiskFreeSpaceExW(folder.c_str(), &available, nullptr, nullptr) &&
+            available.QuadPart == 0) {
+            return HRESULT_FROM_WIN32(ERROR_DISK_FULL);
+        }
+        return S_OK;
     }
-    return text;
+    CATCH_RETURN()
 }
 
-HRESULT CheckReceivedFile(const std::wstring& path) {
-    // Sharing read only: a library still writing the file holds it open for writing, and the
-    // open then fails with a sharing violation instead of handing on half a file.
-    UniqueFileHandle file;
-    uint64_t size = 0;
-    const HRESULT opened = OpenReadOnlyFile(path, file, size);
-    if (FAILED(opened))
-        return opened;
-    if (size == 0)
-        return HRESULT_FROM_WIN32(ERROR_INVALID_DATA);
-    // A file that ends where its drive ran out of room was most likely cut short there.
-    const size_t slash = path.find_last_of(L"\\/");
-    const std::wstring folder = slash == std::wstring::npos ? path : path.substr(0, slash + 1);
-    ULARGE_INTEGER available{};
-    if (::GetDiskFreeSpaceExW(folder.c_str(), &available, nullptr, nullptr) &&
-        available.QuadPart == 0) {
-        return HRESULT_FROM_WIN32(ERROR_DISK_FULL);
+HRESULT CreateHalvekObject(UniqueHalvekObject& object, std::wstring& errorText) noexcept {
+    try {
+        return CreateHalvekObjectFrom(ModuleDirectory() + L"HalvekComm.dll", object, errorText);
     }
-    return S_OK;
-}
-
-HRESULT CreateHalvekObject(UniqueHalvekObject& object, std::wstring& errorText) {
-    return CreateHalvekObjectFrom(ModuleDirectory() + L"HalvekComm.dll", object, errorText);
+    CATCH_RETURN()
 }
 
 HRESULT CreateHalvekObjectFrom(const std::wstring& libraryPath, UniqueHalvekObject& object,
-                               std::wstring& errorText) {
-    object.reset();
-    // The library's own dependencies come from its folder and the system's, never from the
-    // host's current directory or PATH, where anyone may put a file of that name. (Windows 7
-    // needs its update KB2533623 for these flags; without it the load fails and says so.)
-    // Deliberately never freed: the library keeps threads and state of its own.
-    const HMODULE library = ::LoadLibraryExW(
-        libraryPath.c_str(), nullptr,
-        LOAD_LIBRARY_SEARCH_DLL_LOAD_DIR | LOAD_LIBRARY_SEARCH_DEFAULT_DIRS);
-    if (!library) {
-        const HRESULT result = HRESULT_FROM_WIN32(::GetLastError());
-        errorText = SystemResultText(result, libraryPath);
-        return result;
+                               std::wstring& errorText) noexcept {
+    try {
+        object.reset();
+        // The library's own dependencies come from its folder and the system's, never from the
+        // host's current directory or PATH, where anyone may put a file of that name. (Windows 7
+        // needs its update KB2533623 for these flags; without it the load fails and says so.)
+        // Deliberately never freed: the library keeps threads and state of its own.
+        const HMODULE library =
+            ::LoadLibraryExW(libraryPath.c_str(), nullptr,
+                             LOAD_LIBRARY_SEARCH_DLL_LOAD_DIR | LOAD_LIBRARY_SEARCH_DEFAULT_DIRS);
+        if (!library) {
+            const HRESULT result = HRESULT_FROM_WIN32(::GetLastError());
+            errorText = SystemResultText(result, libraryPath);
+            return result;
+        }
+        const auto createInstance = reinterpret_cast<HalvekCreateInstanceFunction>(
+            reinterpret_cast<void*>(::GetProcAddress(library, "CreateInstance")));
+        if (!createInstance) {
+            const HRESULT result = HRESULT_FROM_WIN32(::GetLastError());
+            errorText = SystemResultText(result);
+            return result;
+        }
+        object.reset(createInstance());
+        if (!object) {
+            errorText = SystemResultText(E_OUTOFMEMORY);
+            return E_OUTOFMEMORY;
+        }
+        (void)object->Initialize();  // its result means nothing to this system
+        return S_OK;
     }
-    const auto createInstance = reinterpret_cast<HalvekCreateInstanceFunction>(
-        reinterpret_cast<void*>(::GetProcAddress(library, "CreateInstance")));
-    if (!createInstance) {
-        const HRESULT result = HRESULT_FROM_WIN32(::GetLastError());
-        errorText = SystemResultText(result);
-        return result;
-    }
-    object.reset(createInstance());
-    if (!object) {
-        errorText = SystemResultText(E_OUTOFMEMORY);
-        return E_OUTOFMEMORY;
-    }
-    (void)object->Initialize();  // its result means nothing to this system
-    return S_OK;
+    CATCH_RETURN()
 }
 
 std::unique_ptr<uint8_t[]> MakeHalvekPointsBuffer() {

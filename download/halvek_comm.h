@@ -64,11 +64,13 @@ constexpr size_t kHalvekPointsBufferSize = kHalvekPointRecords * kHalvekPointRec
 
 // Loads the library from this module's directory (it stays loaded for the process) and creates
 // one object. On failure object stays null and errorText holds the system's text for the error.
-[[nodiscard]] HRESULT CreateHalvekObject(UniqueHalvekObject& object, std::wstring& errorText);
+[[nodiscard]] HRESULT CreateHalvekObject(UniqueHalvekObject& object,
+                                         std::wstring& errorText) noexcept;
 // The same with the library at libraryPath (a full path); its dependencies are looked for in its
 // own folder and the system's, never in the current directory or PATH.
 [[nodiscard]] HRESULT CreateHalvekObjectFrom(const std::wstring& libraryPath,
-                                             UniqueHalvekObject& object, std::wstring& errorText);
+                                             UniqueHalvekObject& object,
+                                             std::wstring& errorText) noexcept;
 
 // A new points buffer with every half's marker set to -1; null when memory is short.
 std::unique_ptr<uint8_t[]> MakeHalvekPointsBuffer();
@@ -86,11 +88,7 @@ std::string HalvekFilePath(const std::wstring& path);
 // one still writes it, it holds data and its drive did not run out of room (the library's own
 // success says nothing about a write that the disk cut short); otherwise the HRESULT of what is
 // wrong.
-[[nodiscard]] HRESULT CheckReceivedFile(const std::wstring& path);
+[[nodiscard]] HRESULT CheckReceivedFile(const std::wstring& path) noexcept;
 
 // The string-table text for a library result code.
 std::wstring HalvekResultText(int32_t code);
-
-// The system's text for an HRESULT, with an optional insert for %1; a hexadecimal form when the
-// system has no text for it.
-std::wstring SystemResultText(HRESULT result, const std::wstring& insert = std::wstring());

@@ -6,6 +6,7 @@
 
 #include "download/portable/driver_text.h"
 #include "res/resource.h"
+#include "support/module_instance.h"
 #include "support/registered_messages.h"
 #include "support/text_lookup.h"
 #include "support/user_interface.h"

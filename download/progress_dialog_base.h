@@ -18,7 +18,7 @@ public:
     // Why a dialog ended without a file, once DoModal has returned: a failure HRESULT when the
     // download failed for a reason of the system's (the disk refused the file), so that the
     // caller can fail the copy with it rather than report a cancel; S_OK or S_FALSE otherwise.
-    virtual HRESULT DownloadResult() const noexcept { return downloadResult_; }
+    [[nodiscard]] virtual HRESULT DownloadResult() const noexcept { return downloadResult_; }
 
 protected:
     // parent may be null (the data object runs the dialog without one).

@@ -30,5 +30,5 @@ public:
     // to delete.
     [[nodiscard]] virtual HRESULT Download(HWND owner, const Station& station,
                                            const PrepareTargetFunction& prepareTarget,
-                                           std::wstring& file) = 0;
+                                           std::wstring& file) noexcept = 0;
 };

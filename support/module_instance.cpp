@@ -49,3 +49,18 @@ std::wstring SystemMessageText(DWORD code, const std::wstring& insert) {
         text.pop_back();
     return text;
 }
+
+std::wstring SystemResultText(HRESULT result, const std::wstring& insert) {
+    std::wstring text = SystemMessageText(static_cast<DWORD>(result), insert);
+    // Some systems keep their texts under the bare Win32 code only.
+    if (text.empty() && HRESULT_FACILITY(result) == FACILITY_WIN32)
+        text = SystemMessageText(HRESULT_CODE(result), insert);
+    if (text.empty()) {
+        wchar_t fallback[32] = {};
+        ::wsprintfW(fallback, L"0x%08X", static_cast<unsigned>(result));
+        text = fallback;
+        if (!insert.empty())
+            text += L" (" + insert + L")";
+    }
+    return text;
+}

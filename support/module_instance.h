@@ -15,3 +15,6 @@ std::wstring ThisModulePath();
 // The system's text for a message number (a Win32 error or an HRESULT), with insert as its %1;
 // line ends and trailing spaces removed; empty when the system has no text for it.
 std::wstring SystemMessageText(DWORD code, const std::wstring& insert = std::wstring());
+// The same for an HRESULT, also found under its bare Win32 code; its hexadecimal form (with the
+// insert after it) when the system has no text.
+std::wstring SystemResultText(HRESULT result, const std::wstring& insert = std::wstring());

@@ -99,10 +99,13 @@ IFACEMETHODIMP CLVDataObject::QueryInterface(REFIID iid, void** object) {
     return QISearch(this, table, iid, object);
 }
 
-HRESULT CLVDataObject::LoadItemStation(PCUIDLIST_RELATIVE item, Station& station) const {
-    station = DefaultStation();
-    station.Name = StationNameFromPath(ItemPath(manager_, item));
-    return FindStation(station);
+HRESULT CLVDataObject::LoadItemStation(PCUIDLIST_RELATIVE item, Station& station) const noexcept {
+    try {
+        station = DefaultStation();
+        station.Name = StationNameFromPath(ItemPath(manager_, item));
+        return FindStation(station);
+    }
+    CATCH_RETURN()
 }
 
 IFACEMETHODIMP CLVDataObject::GetData(FORMATETC* format, STGMEDIUM* medium) {
@@ -139,147 +142,159 @@ HRESULT CLVDataObject::GetPreferredDropEffect(STGMEDIUM* medium) noexcept {
     return ReturnHGlobal(std::move(block), medium);
 }
 
-HRESULT CLVDataObject::GetFileGroupDescriptor(STGMEDIUM* medium) {
-    if (items_.empty())
-        return S_FALSE;
-    const size_t size = sizeof(UINT) + sizeof(FILEDESCRIPTORW) * items_.size();
-    UniqueHGlobal block(::GlobalAlloc(kSharedMemoryFlags, size));
-    RETURN_IF_NULL_ALLOC(block.get());
-    {
-        GlobalLockGuard lock(block.get());
-        RETURN_IF_NULL_ALLOC(lock.data());
-        auto* group = static_cast<FILEGROUPDESCRIPTORW*>(lock.data());
-        group->cItems = static_cast<UINT>(items_.size());
-        for (size_t index = 0; index < items_.size(); ++index) {
-            Station station;
-            // A station that cannot be loaded still names its file, with the default model's name.
-            const std::wstring name = LoadItemStation(items_[index].get(), station) == S_OK
-                                          ? StationFileName(station.Model)
-                                          : StationFileName(std::wstring());
-            // No size, time or attributes are announced: the file does not exist yet.
-            wcsncpy(group->fgd[index].cFileName, name.c_str(), MAX_PATH - 1);
+HRESULT CLVDataObject::GetFileGroupDescriptor(STGMEDIUM* medium) noexcept {
+    try {
+        if (items_.empty())
+            return S_FALSE;
+        const size_t size = sizeof(UINT) + sizeof(FILEDESCRIPTORW) * items_.size();
+        UniqueHGlobal block(::GlobalAlloc(kSharedMemoryFlags, size));
+        RETURN_IF_NULL_ALLOC(block.get());
+        {
+            GlobalLockGuard lock(block.get());
+            RETURN_IF_NULL_ALLOC(lock.data());
+            auto* group = static_cast<FILEGROUPDESCRIPTORW*>(lock.data());
+            group->cItems = static_cast<UINT>(items_.size());
+            for (size_t index = 0; index < items_.size(); ++index) {
+                Station station;
+                // A station that cannot be loaded still names its file, as the default model's.
+                const std::wstring name = LoadItemStation(items_[index].get(), station) == S_OK
+                                              ? StationFileName(station.Model)
+                                              : StationFileName(std::wstring());
+                // No size, time or attributes are announced: the file does not exist yet.
+                wcsncpy(group->fgd[index].cFileName, name.c_str(), MAX_PATH - 1);
+            }
         }
+        return ReturnHGlobal(std::move(block), medium);
     }
-    return ReturnHGlobal(std::move(block), medium);
+    CATCH_RETURN()
 }
 
-HRESULT CLVDataObject::GetFileContents(LONG index, STGMEDIUM* medium) {
-    if (items_.empty() || index < 0 || static_cast<size_t>(index) >= items_.size())
-        return S_FALSE;
-    PCUIDLIST_RELATIVE item = items_[index].get();
-    if (!manager_.IsFile(item))
-        return S_FALSE;
+HRESULT CLVDataObject::GetFileContents(LONG index, STGMEDIUM* medium) noexcept {
+    try {
+        if (items_.empty() || index < 0 || static_cast<size_t>(index) >= items_.size())
+            return S_FALSE;
+        PCUIDLIST_RELATIVE item = items_[index].get();
+        if (!manager_.IsFile(item))
+            return S_FALSE;
 
-    Station station;
-    const HRESULT loaded = LoadItemStation(item, station);
-    if (loaded != S_OK)
-        return loaded;
-
-    // The caller's active window, if any, owns the dialog so that it stays in front of it.
-    const HWND owner = ::GetActiveWindow();
-    RETURN_HR_IF(E_UNEXPECTED, !downloader_);
-    // A fresh temporary name for every request: asking twice downloads twice. The downloader
-    // asks for it once it can run, so that a download refused at once leaves no file.
-    DownloadTarget target;
-    const auto prepareTarget = [&](std::wstring& path) -> HRESULT {
-        const HRESULT prepared = PrepareDownloadTarget(owner, target);  // shows and logs
-        if (SUCCEEDED(prepared))
-            path = target.Path();
-        return prepared;
-    };
-    std::wstring file;
-    const HRESULT downloaded = downloader_->Download(owner, station, prepareTarget, file);
-    // A download that ended before its target was made has nothing to clean up; its failure
-    // (shown where it happened) fails the copy.
-    if (!target) {
-        if (FAILED(downloaded))
-            LV_LOG_AND_RETURN(downloaded);
-        return S_FALSE;
-    }
-    // Whatever the download wrote goes with the target: a partial file when the download did not
-    // complete (the target's end deletes it), the file the stream reads when it did.
-    RETURN_IF_FAILED(target.AddWrittenFile(file));
-    if (downloaded != S_OK) {
-        // A failure fails the copy with its reason, so that the caller reports a failure rather
-        // than a cancel.
-        if (FAILED(downloaded))
-            LV_LOG_AND_RETURN(downloaded);
-        return S_FALSE;
-    }
-
-    // The stream takes the target over and reads the file from here on, so that nobody writes,
-    // renames or replaces it between the download and the last read. A file that cannot be
-    // opened now is no download: no stream over nothing (its release removes the target).
-    auto stream = MakeComObject<CStream2>();
-    RETURN_IF_FAILED(stream->Bind(std::move(target)));
-    medium->tymed = TYMED_ISTREAM;
-    medium->pstm = stream.Detach();
-    medium->pUnkForRelease = nullptr;
-    return S_OK;
-}
-
-HRESULT CLVDataObject::GetShellIdListArray(STGMEDIUM* medium) {
-    if (items_.empty())
-        return S_FALSE;
-    // The parent is the folder's identifier from the desktop, as readers of the format bind it:
-    // the items' own lists start inside the namespace, and a reader would take them for items
-    // of the desktop. Items must still name a parent inside the namespace, as always.
-    const UniqueRelativePidl internalParent = manager_.CopyParent(items_.front().get());
-    if (!internalParent || !folderLocation_)
-        return S_FALSE;
-    PCIDLIST_ABSOLUTE parent = folderLocation_.get();
-
-    // The block: cidl, then one offset for the parent and one for each child (aoffset), then
-    // the parent's list and each child's one-item list, each with its terminator. Every child
-    // has its own offset, unlike the one shared slot that older versions wrote: an offset left 0
-    // makes any reader walk the header as an item-ID list and run past the block.
-    const UINT parentSize = manager_.GetSize(parent);
-    std::vector<UniqueChildPidl> children;
-    const size_t headerSize = sizeof(UINT) * (items_.size() + 2);
-    size_t size = headerSize + parentSize;
-    for (const UniqueRelativePidl& item : items_) {
-        children.push_back(manager_.CopyItem(manager_.GetLastItem(item.get())));
-        RETURN_IF_NULL_ALLOC(children.back().get());
-        size += manager_.GetSize(children.back().get());
-    }
-
-    UniqueHGlobal block(::GlobalAlloc(kSharedMemoryFlags, size));
-    RETURN_IF_NULL_ALLOC(block.get());
-    {
-        GlobalLockGuard lock(block.get());
-        RETURN_IF_NULL_ALLOC(lock.data());
-        auto* bytes = static_cast<BYTE*>(lock.data());
-        // Written as bytes: CIDA declares a one-entry aoffset that the block outgrows.
-        const auto writeHeaderValue = [bytes](size_t slot, size_t value) {
-            const UINT field = static_cast<UINT>(value);
-            memcpy(bytes + sizeof(UINT) * slot, &field, sizeof field);
-        };
-        writeHeaderValue(0, items_.size());
-        size_t offset = headerSize;
-        writeHeaderValue(1, offset);
-        memcpy(bytes + offset, parent, parentSize);
-        offset += parentSize;
-        for (size_t index = 0; index < children.size(); ++index) {
-            const UINT childSize = manager_.GetSize(children[index].get());
-            writeHeaderValue(index + 2, offset);
-            memcpy(bytes + offset, children[index].get(), childSize);
-            offset += childSize;
-        }
-    }
-    return ReturnHGlobal(std::move(block), medium);
-}
-
-HRESULT CLVDataObject::GetStationList(STGMEDIUM* medium) {
-    std::vector<Station> stations;
-    for (const UniqueRelativePidl& item : items_) {
         Station station;
-        // Stations that no longer load are left out silently.
-        if (LoadItemStation(item.get(), station) == S_OK)
-            stations.push_back(station);
+        const HRESULT loaded = LoadItemStation(item, station);
+        if (loaded != S_OK)
+            return loaded;
+
+        // The caller's active window, if any, owns the dialog so that it stays in front of it.
+        const HWND owner = ::GetActiveWindow();
+        RETURN_HR_IF(E_UNEXPECTED, !downloader_);
+        // A fresh temporary name for every request: asking twice downloads twice. The downloader
+        // asks for it once it can run, so that a download refused at once leaves no file.
+        DownloadTarget target;
+        const auto prepareTarget = [&](std::wstring& path) -> HRESULT {
+            const HRESULT prepared = PrepareDownloadTarget(owner, target);  // shows and logs
+            if (SUCCEEDED(prepared))
+                path = target.Path();
+            return prepared;
+        };
+        std::wstring file;
+        const HRESULT downloaded = downloader_->Download(owner, station, prepareTarget, file);
+        // A download that ended before its target was made has nothing to clean up; its failure
+        // (shown where it happened) fails the copy.
+        if (!target) {
+            if (FAILED(downloaded))
+                LV_LOG_AND_RETURN(downloaded);
+            return S_FALSE;
+        }
+        // Whatever the download wrote goes with the target: a partial file when the download did
+        // not complete (the target's end deletes it), the file the stream reads when it did.
+        RETURN_IF_FAILED(target.AddWrittenFile(file));
+        if (downloaded != S_OK) {
+            // A failure fails the copy with its reason, so that the caller reports a failure rather
+            // than a cancel.
+            if (FAILED(downloaded))
+                LV_LOG_AND_RETURN(downloaded);
+            return S_FALSE;
+        }
+
+        // The stream takes the target over and reads the file from here on, so that nobody writes,
+        // renames or replaces it between the download and the last read. A file that cannot be
+        // opened now is no download: no stream over nothing (its release removes the target).
+        auto stream = MakeComObject<CStream2>();
+        RETURN_IF_FAILED(stream->Bind(std::move(target)));
+        medium->tymed = TYMED_ISTREAM;
+        medium->pstm = stream.Detach();
+        medium->pUnkForRelease = nullptr;
+        return S_OK;
     }
-    UniqueHGlobal block(SerializeStationList(stations));
-    RETURN_IF_NULL_ALLOC(block.get());
-    return ReturnHGlobal(std::move(block), medium);
+    CATCH_RETURN()
+}
+
+HRESULT CLVDataObject::GetShellIdListArray(STGMEDIUM* medium) noexcept {
+    try {
+        if (items_.empty())
+            return S_FALSE;
+        // The parent is the folder's identifier from the desktop, as readers of the format bind it:
+        // the items' own lists start inside the namespace, and a reader would take them for items
+        // of the desktop. Items must still name a parent inside the namespace, as always.
+        const UniqueRelativePidl internalParent = manager_.CopyParent(items_.front().get());
+        if (!internalParent || !folderLocation_)
+            return S_FALSE;
+        PCIDLIST_ABSOLUTE parent = folderLocation_.get();
+
+        // The block: cidl, then one offset for the parent and one for each child (aoffset), then
+        // the parent's list and each child's one-item list, each with its terminator. Every child
+        // has its own offset, unlike the one shared slot that older versions wrote: an offset left
+        // 0 makes any reader walk the header as an item-ID list and run past the block.
+        const UINT parentSize = manager_.GetSize(parent);
+        std::vector<UniqueChildPidl> children;
+        const size_t headerSize = sizeof(UINT) * (items_.size() + 2);
+        size_t size = headerSize + parentSize;
+        for (const UniqueRelativePidl& item : items_) {
+            children.push_back(manager_.CopyItem(manager_.GetLastItem(item.get())));
+            RETURN_IF_NULL_ALLOC(children.back().get());
+            size += manager_.GetSize(children.back().get());
+        }
+
+        UniqueHGlobal block(::GlobalAlloc(kSharedMemoryFlags, size));
+        RETURN_IF_NULL_ALLOC(block.get());
+        {
+            GlobalLockGuard lock(block.get());
+            RETURN_IF_NULL_ALLOC(lock.data());
+            auto* bytes = static_cast<BYTE*>(lock.data());
+            // Written as bytes: CIDA declares a one-entry aoffset that the block outgrows.
+            const auto writeHeaderValue = [bytes](size_t slot, size_t value) {
+                const UINT field = static_cast<UINT>(value);
+                memcpy(bytes + sizeof(UINT) * slot, &field, sizeof field);
+            };
+            writeHeaderValue(0, items_.size());
+            size_t offset = headerSize;
+            writeHeaderValue(1, offset);
+            memcpy(bytes + offset, parent, parentSize);
+            offset += parentSize;
+            for (size_t index = 0; index < children.size(); ++index) {
+                const UINT childSize = manager_.GetSize(children[index].get());
+                writeHeaderValue(index + 2, offset);
+                memcpy(bytes + offset, children[index].get(), childSize);
+                offset += childSize;
+            }
+        }
+        return ReturnHGlobal(std::move(block), medium);
+    }
+    CATCH_RETURN()
+}
+
+HRESULT CLVDataObject::GetStationList(STGMEDIUM* medium) noexcept {
+    try {
+        std::vector<Station> stations;
+        for (const UniqueRelativePidl& item : items_) {
+            Station station;
+            // Stations that no longer load are left out silently.
+            if (LoadItemStation(item.get(), station) == S_OK)
+                stations.push_back(station);
+        }
+        UniqueHGlobal block(SerializeStationList(stations));
+        RETURN_IF_NULL_ALLOC(block.get());
+        return ReturnHGlobal(std::move(block), medium);
+    }
+    CATCH_RETURN()
 }
 
 IFACEMETHODIMP CLVDataObject::QueryGetData(FORMATETC* format) {

@@ -60,13 +60,13 @@ public:
 
 private:
     [[nodiscard]] HRESULT GetPreferredDropEffect(STGMEDIUM* medium) noexcept;
-    [[nodiscard]] HRESULT GetFileGroupDescriptor(STGMEDIUM* medium);
-    [[nodiscard]] HRESULT GetFileContents(LONG index, STGMEDIUM* medium);
-    [[nodiscard]] HRESULT GetShellIdListArray(STGMEDIUM* medium);
-    [[nodiscard]] HRESULT GetStationList(STGMEDIUM* medium);
+    [[nodiscard]] HRESULT GetFileGroupDescriptor(STGMEDIUM* medium) noexcept;
+    [[nodiscard]] HRESULT GetFileContents(LONG index, STGMEDIUM* medium) noexcept;
+    [[nodiscard]] HRESULT GetShellIdListArray(STGMEDIUM* medium) noexcept;
+    [[nodiscard]] HRESULT GetStationList(STGMEDIUM* medium) noexcept;
 
     // The station named by an item's path; the store's status when it cannot be loaded.
-    [[nodiscard]] HRESULT LoadItemStation(PCUIDLIST_RELATIVE item, Station& station) const;
+    [[nodiscard]] HRESULT LoadItemStation(PCUIDLIST_RELATIVE item, Station& station) const noexcept;
     void EndDragImage() noexcept;
 
     std::shared_ptr<StationDownloader> downloader_;

@@ -259,28 +259,31 @@ void CShellViewCommands::CopySelection() {
         (void)::OleSetClipboard(dataObject.Get());
 }
 
-HRESULT CShellViewCommands::AddSelectedItems(CLVDataObject& dataObject,
-                                             const std::vector<SelectedItem>& selection) const {
-    bool added = false;
-    for (const SelectedItem& selected : selection) {
-        if (!selected.item)
-            continue;  // the entry is not an item of the folder
-        const UniqueRelativePidl full = CreateFullItem(selected.item);
-        // Part of the selection on the clipboard or in a drag would be a lie.
-        RETURN_IF_NULL_ALLOC(full.get());
-        RETURN_IF_FAILED(dataObject.AddItem(full.get()));
-        added = true;
+HRESULT CShellViewCommands::AddSelectedItems(
+    CLVDataObject& dataObject, const std::vector<SelectedItem>& selection) const noexcept {
+    try {
+        bool added = false;
+        for (const SelectedItem& selected : selection) {
+            if (!selected.item)
+                continue;  // the entry is not an item of the folder
+            const UniqueRelativePidl full = CreateFullItem(selected.item);
+            // Part of the selection on the clipboard or in a drag would be a lie.
+            RETURN_IF_NULL_ALLOC(full.get());
+            RETURN_IF_FAILED(dataObject.AddItem(full.get()));
+            added = true;
+        }
+        if (!added)
+            return S_FALSE;
+        // Where the shell has our folder, for the parent of "Shell IDList Array". A folder that was
+        // never placed (S_FALSE) leaves that format out; the others still carry the selection.
+        Microsoft::WRL::ComPtr<IPersistFolder2> persist;
+        UniqueAbsoluteIdList location;
+        if (SUCCEEDED(context_.folder.folder.As(&persist)) &&
+            persist->GetCurFolder(location.put()) == S_OK)
+            RETURN_IF_FAILED(dataObject.SetFolderLocation(location.get()));
+        return S_OK;
     }
-    if (!added)
-        return S_FALSE;
-    // Where the shell has our folder, for the parent of "Shell IDList Array". A folder that was
-    // never placed (S_FALSE) leaves that format out; the others still carry the selection.
-    Microsoft::WRL::ComPtr<IPersistFolder2> persist;
-    UniqueAbsoluteIdList location;
-    if (SUCCEEDED(context_.folder.folder.As(&persist)) &&
-        persist->GetCurFolder(location.put()) == S_OK)
-        RETURN_IF_FAILED(dataObject.SetFolderLocation(location.get()));
-    return S_OK;
+    CATCH_RETURN()
 }
 
 void CShellViewCommands::PasteStations() {

@@ -59,8 +59,8 @@ private:
     void ChangedStations();
     // The selected items with an identifier, added to the data object by their full identifiers;
     // S_FALSE when the selection held none.
-    [[nodiscard]] HRESULT AddSelectedItems(CLVDataObject& dataObject,
-                                           const std::vector<SelectedItem>& selection) const;
+    [[nodiscard]] HRESULT AddSelectedItems(
+        CLVDataObject& dataObject, const std::vector<SelectedItem>& selection) const noexcept;
     // Items' internal full identifiers: the folder's path, then the item.
     [[nodiscard]] UniqueRelativePidl CreateFullItem(PCUITEMID_CHILD item) const;
 

@@ -37,12 +37,13 @@ public:
     // offers them; deep false stops at virtual items (their own data objects are not opened).
     // Each outermost call is one drop, with its own entry and time limits and log allowance.
     [[nodiscard]] HRESULT ParseDataObject(IDataObject* dataObject, const std::wstring& rootPath,
-                                          bool deep);
+                                          bool deep) noexcept;
     // The first parsed data object, for use on another thread: once. S_FALSE before any parse.
     [[nodiscard]] HRESULT GetDataObject(IDataObject** dataObject) noexcept;
-    [[nodiscard]] HRESULT ParsePath(const std::wstring& path, const std::wstring& rootPath);
+    [[nodiscard]] HRESULT ParsePath(const std::wstring& path,
+                                    const std::wstring& rootPath) noexcept;
     // A shell item given as its parent folder (absolute) and its own ID.
-    [[nodiscard]] HRESULT ParsePIDL(PCIDLIST_ABSOLUTE parent, PCUITEMID_CHILD child);
+    [[nodiscard]] HRESULT ParsePIDL(PCIDLIST_ABSOLUTE parent, PCUITEMID_CHILD child) noexcept;
 
     // Wildcard patterns (as in "*.tmp") of paths to leave out; none by default.
     void SetPathFilter(std::vector<std::wstring> patterns) { filter_ = std::move(patterns); }
@@ -59,17 +60,18 @@ public:
 
 private:
     [[nodiscard]] HRESULT ParseSources(IDataObject* dataObject, const std::wstring& rootPath,
-                                       bool deep);
-    [[nodiscard]] HRESULT ParseDropFiles(IDataObject* dataObject, const FORMATETC& format);
+                                       bool deep) noexcept;
+    [[nodiscard]] HRESULT ParseDropFiles(IDataObject* dataObject, const FORMATETC& format) noexcept;
     [[nodiscard]] HRESULT ParseFileGroup(IDataObject* dataObject, const FORMATETC& format,
-                                         bool wide, const std::wstring& rootPath);
+                                         bool wide, const std::wstring& rootPath) noexcept;
     [[nodiscard]] HRESULT ParseItemArray(IDataObject* dataObject, const FORMATETC& format,
-                                         bool rootOnly, std::wstring& rootPath);
+                                         bool rootOnly, std::wstring& rootPath) noexcept;
     // A path whose attributes are known (read, or found by the folder's enumeration).
     [[nodiscard]] HRESULT ParseEntry(const std::wstring& path, const std::wstring& rootPath,
-                                     DWORD attributes);
-    [[nodiscard]] HRESULT ParseShortcut(const std::wstring& path, bool& parsed);
-    [[nodiscard]] HRESULT ParseFolder(const std::wstring& path, const std::wstring& rootPath);
+                                     DWORD attributes) noexcept;
+    [[nodiscard]] HRESULT ParseShortcut(const std::wstring& path, bool& parsed) noexcept;
+    [[nodiscard]] HRESULT ParseFolder(const std::wstring& path,
+                                      const std::wstring& rootPath) noexcept;
     [[nodiscard]] bool Filtered(const std::wstring& path) const noexcept;
     void Add(const std::wstring& rootPath, const std::wstring& path, uint32_t index);
 

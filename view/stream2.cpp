@@ -34,31 +34,33 @@ void CStream2::Discard() noexcept {
     deleteWhenFinished_ = false;
 }
 
-HRESULT CStream2::Bind(const std::wstring& path, bool deleteWhenFinished) {
-    std::lock_guard<std::mutex> guard(lock_);
-    path_ = path;
-    deleteWhenFinished_ = deleteWhenFinished;
-    // Kept open from here on: the size announced and the bytes read are those of one file.
-    const HRESULT opened = OpenReadOnlyFile(path_, file_, size_);
-    if (FAILED(opened))
-        return opened;
-    position_ = 0;
-    state_ = kReading;
-    return S_OK;
-}
-
-HRESULT CStream2::Bind(DownloadTarget target) {
-    std::lock_guard<std::mutex> guard(lock_);
-    RETURN_HR_IF(E_INVALIDARG, !target);
+HRESULT CStream2::Bind(const std::wstring& path, bool deleteWhenFinished) noexcept {
     try {
-        path_ = target.WrittenFile();
+        std::lock_guard<std::mutex> guard(lock_);
+        path_ = path;
+        deleteWhenFinished_ = deleteWhenFinished;
+        // Kept open from here on: the size announced and the bytes read are those of one file.
+        return StartReading(OpenReadOnlyFile(path_, file_, size_));
     }
     CATCH_RETURN()
-    download_ = std::move(target);
-    deleteWhenFinished_ = true;
-    // Held from the download's end to the stream's: the size announced and the bytes read are
-    // those of the file the download wrote, which nobody can write, rename or delete meanwhile.
-    const HRESULT opened = download_.OpenForReading(file_, size_);
+}
+
+HRESULT CStream2::Bind(DownloadTarget target) noexcept {
+    try {
+        std::lock_guard<std::mutex> guard(lock_);
+        RETURN_HR_IF(E_INVALIDARG, !target);
+        path_ = target.WrittenFile();
+        download_ = std::move(target);
+        deleteWhenFinished_ = true;
+        // Held from the download's end to the stream's: the size announced and the bytes read
+        // are those of the file the download wrote, which nobody can write, rename or delete
+        // meanwhile.
+        return StartReading(download_.OpenForReading(file_, size_));
+    }
+    CATCH_RETURN()
+}
+
+HRESULT CStream2::StartReading(HRESULT opened) noexcept {
     if (FAILED(opened))
         return opened;
     position_ = 0;
@@ -79,7 +81,7 @@ void CStream2::Finish() noexcept {
     Discard();
 }
 
-HRESULT CStream2::ReadLocked(void* buffer, ULONG wanted, ULONG* got) {
+HRESULT CStream2::ReadLocked(void* buffer, ULONG wanted, ULONG* got) noexcept {
     if (got)
         *got = 0;
     if (state_ == kFinished)

@@ -23,11 +23,11 @@ public:
 
     // Opens the file and takes its size. Fails with the open's HRESULT when the file cannot be
     // read: a stream over a missing file would hand the caller an empty file as a good one.
-    [[nodiscard]] HRESULT Bind(const std::wstring& path, bool deleteWhenFinished);
+    [[nodiscard]] HRESULT Bind(const std::wstring& path, bool deleteWhenFinished) noexcept;
     // Takes a download's target over: reads what the download wrote, and removes the target (its
     // files and its reservation) once, when read to the end or when the stream goes. Fails with
     // the open's HRESULT, the target then removed when the stream goes.
-    [[nodiscard]] HRESULT Bind(DownloadTarget target);
+    [[nodiscard]] HRESULT Bind(DownloadTarget target) noexcept;
 
     IFACEMETHODIMP QueryInterface(REFIID iid, void** object) override;
 
@@ -56,7 +56,9 @@ public:
 private:
     enum State : DWORD { kNotOpened = 0, kReading = 2, kFinished = 3 };
 
-    [[nodiscard]] HRESULT ReadLocked(void* buffer, ULONG wanted, ULONG* got);
+    // After a bind's open: the stream reads from the start once the open succeeded.
+    [[nodiscard]] HRESULT StartReading(HRESULT opened) noexcept;
+    [[nodiscard]] HRESULT ReadLocked(void* buffer, ULONG wanted, ULONG* got) noexcept;
     // Closes the file and, when asked at binding, deletes it; the state ends finished.
     void Finish() noexcept;
     // Closes the file and deletes what the stream was asked to delete, once.

@@ -26,7 +26,7 @@ public:
         : result_(result), written_(std::move(written)), refusesAtOnce_(refusesAtOnce) {}
 
     HRESULT Download(HWND, const Station& station, const PrepareTargetFunction& prepareTarget,
-                     std::wstring& file) override {
+                     std::wstring& file) noexcept override {
         ++runs;
         stationName = station.Name;
         if (refusesAtOnce_)

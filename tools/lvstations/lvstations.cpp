@@ -12,7 +12,7 @@
 #include "stations/serial_ports.h"
 #include "stations/station_dialog.h"
 #include "stations/station_store.h"
-#include "stations/store_failure_text.h"
+#include "support/module_instance.h"
 #include "support/text_lookup.h"
 #include "support/unique_resource.h"
 #include "tools/common/console_output.h"
@@ -95,7 +95,7 @@ int Add(int argc, wchar_t** argv) {
         return 1;
     }
     if (FAILED(result)) {
-        PrintUtf8(L"The station could not be stored: " + StoreFailureText(result) + L"\n");
+        PrintUtf8(L"The station could not be stored: " + SystemResultText(result) + L"\n");
         return 1;
     }
     PrintUtf8(L"Added \"" + station.Name + L"\".\n");
@@ -143,7 +143,7 @@ int Delete(const wchar_t* name) {
         return 1;
     }
     if (FAILED(result)) {
-        PrintUtf8(L"\"" + station.Name + L"\" could not be deleted: " + StoreFailureText(result) +
+        PrintUtf8(L"\"" + station.Name + L"\" could not be deleted: " + SystemResultText(result) +
                   L"\n");
         return 1;
     }

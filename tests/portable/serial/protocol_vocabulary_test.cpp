@@ -21,13 +21,20 @@ constexpr MessageCode kCodes[] = {
     MessageCode::PortNotOpened,
 };
 
-TEST(ProtocolVocabulary, EveryProcedureHasItsOwnStoredSelectorAndComesBackFromIt) {
-    std::set<uint32_t> stored;
-    for (const ReceiveProcedure procedure : kProcedures) {
-        const uint32_t selector = StoredSelectorOf(procedure);
-        EXPECT_TRUE(stored.insert(selector).second) << selector << " names two procedures";
-        EXPECT_EQ(ProcedureOfStoredSelector(selector), procedure) << selector;
+// Each name has a number of its own, and that number gives the name back.
+template <typename Name, size_t count, typename ToNumber, typename FromNumber>
+void ExpectOwnNumbersThatComeBack(const Name (&names)[count], ToNumber toNumber,
+                                  FromNumber fromNumber) {
+    std::set<uint32_t> numbers;
+    for (const Name name : names) {
+        const uint32_t number = toNumber(name);
+        EXPECT_TRUE(numbers.insert(number).second) << number << " stands for two names";
+        EXPECT_EQ(fromNumber(number), name) << number;
     }
+}
+
+TEST(ProtocolVocabulary, EveryProcedureHasItsOwnStoredSelectorAndComesBackFromIt) {
+    ExpectOwnNumbersThatComeBack(kProcedures, StoredSelectorOf, ProcedureOfStoredSelector);
 }
 
 TEST(ProtocolVocabulary, AStoredSelectorThatNamesNoProcedureIsRefused) {
@@ -46,12 +53,8 @@ TEST(ProtocolVocabulary, AStoredSelectorThatNamesNoProcedureIsRefused) {
 }
 
 TEST(ProtocolVocabulary, PostedCodesComeBackAndOtherNumbersNameNoCode) {
-    std::set<uint32_t> posted;
-    for (const MessageCode code : kCodes) {
-        const uint32_t number = PostedCodeOf(code);
-        EXPECT_TRUE(posted.insert(number).second) << number << " names two codes";
-        EXPECT_EQ(MessageCodeOfPosted(number), code) << number;
-    }
+    ExpectOwnNumbersThatComeBack(kCodes, PostedCodeOf,
+                                 [](uint32_t number) { return MessageCodeOfPosted(number); });
     int named = 0;
     for (uint64_t number = 0; number < 256; ++number)
         named += MessageCodeOfPosted(number).has_value();
