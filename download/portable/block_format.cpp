@@ -8,14 +8,18 @@
 using namespace serial_bytes;
 
 namespace {
+
+// CRC-16 as Y-Modem computes it: polynomial x^16 + x^12 + x^5 + 1, most significant bit first.
 constexpr uint16_t kCrcPolynomial = 0x1021;
 constexpr uint16_t kCrcTopBit = 0x8000;
 constexpr int kBitsPerByte = 8;
+// Y-Modem numbers the header block, which carries the file's name and size, 0.
 constexpr uint8_t kYModemHeaderNumber = 0;
 // The line check: the signed sum's remainder, moved into printable text.
 constexpr int32_t kLineCheckModulus = 64;
 constexpr int32_t kLineCheckBase = 0x20;
 constexpr uint32_t kDecimalBase = 10;
+
 }  // namespace
 
 void BuildCrcTable(CrcTable& table) noexcept {

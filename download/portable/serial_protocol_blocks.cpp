@@ -7,14 +7,19 @@
 using namespace serial_bytes;
 
 namespace {
+
+// The BCC procedure polls with ENQ again after this long without a first block, answers a block
+// this many times before it gives up on it, and acknowledges the end this often.
 constexpr uint32_t kEnqRepollMilliseconds = 4000;
 constexpr int kBccTries = 5;
-constexpr int kYModemNakLimit = 10;
 constexpr int kFinalAcks = 10;
+// Y-Modem gives up after this many refused blocks in a row.
+constexpr int kYModemNakLimit = 10;
 constexpr uint32_t kNoProgress = 0;
 // The progress the raw stream and the BCC blocks show: steps of a tenth and of a twentieth.
 constexpr uint32_t kRawStreamSteps = 10;
 constexpr uint32_t kBccBlockSteps = 20;
+
 }  // namespace
 
 size_t SerialProtocol::ReadBurst(std::optional<uint8_t> firstByte) {
