@@ -6,6 +6,7 @@
 #include "download/portable/port_setup.h"
 #include "download/portable/serial_protocol.h"
 #include "download/win32_serial_port.h"
+#include "stations/serial_ports.h"
 #include "support/module_instance.h"
 
 namespace {
@@ -21,12 +22,8 @@ TAZComm::TAZComm(TParserCallBack* callback, TAZCommParams* params)
       file_(std::make_unique<Win32ReceiveFile>(params->OutputPath)),
       protocol_(std::make_unique<SerialProtocol>(*port_, g_clock, *file_, *callback, g_texts,
                                                  params->Protocol)) {
-    if (OpenPort()) {
+    if (OpenPort())
         protocol_->SetPortOpen(true);
-        return;
-    }
-    callback_->ShowMessage(MessageCode::PortNotOpened,
-                           g_texts.Text(DriverText::PortNotOpened).c_str());
 }
 
 TAZComm::~TAZComm() {
@@ -46,10 +43,16 @@ bool TAZComm::OpenPort() {
         port_->Open(params_->PortName, params_->DeviceControlBlock, params_->Timeouts);
     if (error == ERROR_SUCCESS)
         return true;
-    // Only a configuration failure has a system text of its own; a port that did not open
-    // gets the driver's message alone.
-    if (port_->IsValid())
-        callback_->ShowMessage(MessageCode::Error, SystemMessageText(error).c_str());
+    // The computer's list is read now, not when the station was loaded: an adapter may have
+    // been plugged in or out since.
+    PortOpenProblem problem;
+    problem.port = params_->PortName;
+    problem.present = ListSerialPorts();
+    problem.failure = ClassifyPortOpenFailure(error, port_->IsValid(),
+                                              IsPortListed(problem.port, problem.present));
+    problem.systemText = SystemResultText(HRESULT_FROM_WIN32(error));
+    callback_->ShowMessage(MessageCode::PortNotOpened,
+                           PortOpenProblemText(problem, g_texts.PortProblems()).c_str());
     return false;
 }
 

@@ -37,9 +37,10 @@ static_assert(sizeof(ReceiveProcedure) == sizeof(uint32_t));
 // only Stop() may be called from another.
 class TAZComm {
 public:
-    // Configures and opens the port. On failure reports MessageCode::PortNotOpened (after the
-    // system text, MessageCode::Error, where there is one) and leaves the object unusable: every
-    // receive then fails.
+    // Configures and opens the port. On failure reports MessageCode::PortNotOpened once, with a
+    // text that says whether the port is not on the computer now (naming the ports that are),
+    // in use by another program, or refused for another reason (the system's text), and leaves
+    // the object unusable: every receive then fails.
     // Neither pointer is owned; both must outlive the driver.
     TAZComm(TParserCallBack* callback, TAZCommParams* params);
     ~TAZComm();

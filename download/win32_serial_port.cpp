@@ -43,6 +43,22 @@ COMMTIMEOUTS ToCommTimeouts(const PortTimeouts& timeouts) noexcept {
     return result;
 }
 
+PortOpenFailure ClassifyPortOpenFailure(DWORD error, bool opened, bool listed) noexcept {
+    // A handle that opened belongs to a device that is there, whatever its set-up refused.
+    if (opened)
+        return PortOpenFailure::Other;
+    switch (error) {
+        case ERROR_ACCESS_DENIED:
+        case ERROR_SHARING_VIOLATION:
+            return PortOpenFailure::InUse;
+        case ERROR_FILE_NOT_FOUND:
+        case ERROR_PATH_NOT_FOUND:
+            return PortOpenFailure::NotPresent;
+        default:
+            return listed ? PortOpenFailure::Other : PortOpenFailure::NotPresent;
+    }
+}
+
 Win32SerialPort::~Win32SerialPort() {
     Close();
 }
@@ -222,4 +238,9 @@ WideString StringTableDriverTexts::Text(DriverText text) const {
 
 WideString StringTableDriverTexts::SystemErrorText(uint32_t code) const {
     return SystemMessageText(code);
+}
+
+PortProblemTexts StringTableDriverTexts::PortProblems() const {
+    return {LoadUiText(IDS_SERIAL_PORT_NOT_PRESENT), LoadUiText(IDS_SERIAL_PORT_NOT_PRESENT_NONE),
+            LoadUiText(IDS_SERIAL_PORT_NOT_OPENED)};
 }

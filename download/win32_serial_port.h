@@ -6,6 +6,7 @@
 #include <string>
 
 #include "download/portable/driver_text.h"
+#include "download/portable/port_open_problem.h"
 #include "download/portable/port_setup.h"
 #include "download/portable/protocol_io.h"
 #include "support/unique_resource.h"
@@ -14,6 +15,11 @@
 // StopBits.
 void ApplyDeviceControlFields(const DeviceControlFields& fields, DCB& dcb) noexcept;
 COMMTIMEOUTS ToCommTimeouts(const PortTimeouts& timeouts) noexcept;
+
+// The case of a failed Open: its error, whether the handle was opened (configuration failed)
+// and whether the computer's port list holds the port.
+[[nodiscard]] PortOpenFailure ClassifyPortOpenFailure(DWORD error, bool opened,
+                                                      bool listed) noexcept;
 
 // A COM port opened with CreateFileW and configured with SetCommState/SetCommTimeouts; the
 // settings found are saved and put back by Close.
@@ -73,4 +79,6 @@ class StringTableDriverTexts final : public DriverTextSource {
 public:
     WideString Text(DriverText text) const override;
     WideString SystemErrorText(uint32_t code) const override;
+    // The texts of a port that did not open.
+    PortProblemTexts PortProblems() const;
 };

@@ -31,6 +31,10 @@
 // number of stations a message leaves unnamed.
 #define IDS_STATION_NOT_STORED 1130
 #define IDS_MORE_STATIONS 1131
+// The mark of a stored port that this computer does not list now (the port's name for %s), and
+// the refusal of a value the station may not hold (the value's name, then why).
+#define IDS_PORT_NOT_PRESENT 1146
+#define IDS_STATION_VALUE_REFUSED 1147
 
 #define IDS_PARITY_NONE 1015
 #define IDS_PARITY_ODD 1016

@@ -1,9 +1,12 @@
-// The station property sheet: lists, exchange, the three name checks and the store.
+// The station property sheet: lists (ports read anew on opening), exchange, checks and the store.
 #include "stations/station_dialog.h"
 
+#include <algorithm>
 #include <cwchar>
+#include <vector>
 
 #include "res/resource.h"
+#include "stations/portable/station_fields.h"
 #include "stations/portable/station_names.h"
 #include "stations/serial_ports.h"
 #include "stations/station_store.h"
@@ -13,7 +16,34 @@
 
 namespace {
 
-const wchar_t* const kBaudRates[] = {L"300", L"600", L"1200", L"2400", L"4800", L"9600"};
+// The sheet's rates, with the station's own when the station rule allows it and the list lacks
+// it, in ascending order.
+std::vector<std::wstring> BaudRateEntries(uint32_t own) {
+    std::vector<uint32_t> rates(SheetBaudRates().begin(), SheetBaudRates().end());
+    if (!RefusedNumber(StationField::kBaudRate, own) &&
+        std::find(rates.begin(), rates.end(), own) == rates.end()) {
+        rates.insert(std::upper_bound(rates.begin(), rates.end(), own), own);
+    }
+    std::vector<std::wstring> entries;
+    for (uint32_t rate : rates)
+        entries.push_back(std::to_wstring(rate));
+    return entries;
+}
+
+// Replaces the first "%s" of text by what, the second by more.
+std::wstring Filled(std::wstring text, const std::wstring& what, const std::wstring& more = {}) {
+    for (const std::wstring* value : {&what, &more}) {
+        const size_t insert = text.find(L"%s");
+        if (insert == std::wstring::npos)
+            break;
+        text.replace(insert, 2, *value);
+    }
+    return text;
+}
+
+std::vector<WideString> ModelTexts() {
+    return {LoadUiText(IDS_MODEL_LV10), LoadUiText(IDS_MODEL_LV20), LoadUiText(IDS_MODEL_LV30)};
+}
 
 std::wstring ParityText(uint32_t parity) {
     return LoadUiText(parity == 1 ? IDS_PARITY_ODD : parity == 2 ? IDS_PARITY_EVEN : IDS_PARITY_NONE);
@@ -40,9 +70,9 @@ CStationGeneralPage::CStationGeneralPage(Station& station, bool newStation)
 void CStationGeneralPage::OnInitDialog() {
     // The port and model lists sort themselves (COM10 before COM2); baud and parity keep this
     // order.
-    for (const std::wstring& port : ListSerialPorts())
-        AddListEntry(IDC_STATION_PORT, port);
-    for (const wchar_t* rate : kBaudRates)
+    storedPort_ = station_.Port;
+    FillPortList();
+    for (const std::wstring& rate : BaudRateEntries(station_.BaudRate))
         AddListEntry(IDC_STATION_BAUD, rate);
     for (UINT id : {IDS_PARITY_NONE, IDS_PARITY_ODD, IDS_PARITY_EVEN})
         AddListEntry(IDC_STATION_PARITY, LoadUiText(id));
@@ -50,7 +80,7 @@ void CStationGeneralPage::OnInitDialog() {
         AddListEntry(IDC_STATION_MODEL, LoadUiText(id));
 
     name_ = station_.Name;
-    port_ = station_.Port;
+    port_ = AbsentPortText().empty() ? station_.Port : AbsentPortText();
     baudRate_ = std::to_wstring(station_.BaudRate);
     parity_ = ParityText(station_.Parity);
     model_ = station_.Model;
@@ -64,7 +94,38 @@ void CStationGeneralPage::OnInitDialog() {
     UpdateControls();
 }
 
+std::wstring CStationGeneralPage::AbsentPortText() const {
+    if (storedPort_.empty())
+        return {};
+    const std::vector<std::wstring> ports = ListSerialPorts();
+    if (std::find(ports.begin(), ports.end(), storedPort_) != ports.end())
+        return {};
+    return Filled(LoadUiText(IDS_PORT_NOT_PRESENT), storedPort_);
+}
+
+void CStationGeneralPage::FillPortList() {
+    std::vector<std::wstring> entries = ListSerialPorts();
+    const bool absent = !storedPort_.empty() &&
+                        std::find(entries.begin(), entries.end(), storedPort_) == entries.end();
+    const std::wstring marked = Filled(LoadUiText(IDS_PORT_NOT_PRESENT), storedPort_);
+    if (absent)
+        entries.push_back(marked);
+    // Kept by its meaning: the stored port, plugged in meanwhile, loses its mark.
+    UpdateFields();
+    std::wstring selected = port_;
+    if (selected == marked && !absent)
+        selected = storedPort_;
+    else if (selected == storedPort_ && absent)
+        selected = marked;
+    SetListEntries(IDC_STATION_PORT, entries, selected);
+}
+
 void CStationGeneralPage::OnCommand(WORD controlId, WORD notification) {
+    // The port list is read anew each time it opens: an adapter plugged in meanwhile appears.
+    if (controlId == IDC_STATION_PORT && notification == CBN_DROPDOWN) {
+        FillPortList();
+        return;
+    }
     // Only an existing station has changes to apply before OK: a new one is stored by OK alone.
     if (newStation_)
         return;
@@ -80,7 +141,9 @@ void CStationGeneralPage::OnCommand(WORD controlId, WORD notification) {
 void CStationGeneralPage::ExchangeIntoRecord() {
     UpdateFields();
     station_.Name = name_;
-    station_.Port = port_;
+    // The mark is display only: the record keeps the port's own name.
+    const std::wstring marked = Filled(LoadUiText(IDS_PORT_NOT_PRESENT), storedPort_);
+    station_.Port = !storedPort_.empty() && port_ == marked ? storedPort_ : port_;
     station_.BaudRate = BaudRateFromText(baudRate_);
     if (parity_ == LoadUiText(IDS_PARITY_NONE))
         station_.Parity = 0;
@@ -123,10 +186,7 @@ bool CStationDialog::AcceptName(const std::wstring& name) const {
         existing.Name = name;
         if (FindStation(existing) == S_OK) {
             refusal = IDS_STATION_EXISTS;
-            text = LoadUiText(IDS_STATION_EXISTS);
-            const size_t insert = text.find(L"%s");
-            if (insert != std::wstring::npos)
-                text.replace(insert, 2, name);
+            text = Filled(LoadUiText(IDS_STATION_EXISTS), name);
         }
     }
     if (refusal == 0)
@@ -138,9 +198,20 @@ bool CStationDialog::AcceptName(const std::wstring& name) const {
     return false;
 }
 
+bool CStationDialog::AcceptValues() const {
+    const std::optional<StationFieldRefusal> refusal = RefusedStation(station_, ModelTexts());
+    if (!refusal)
+        return true;
+    ShowMessageBox(Window(),
+                   Filled(LoadUiText(IDS_STATION_VALUE_REFUSED),
+                          StationFieldOf(refusal->field).valueName, refusal->reason),
+                   Caption(), MB_ICONERROR);
+    return false;
+}
+
 bool CStationDialog::OnApply(bool) {
     page_.ExchangeIntoRecord();
-    if (!AcceptName(station_.Name))
+    if (!AcceptName(station_.Name) || !AcceptValues())
         return false;
     const HRESULT stored =
         newStation_ ? AddStation(station_) : UpdateStation(openingName_, station_);

@@ -15,7 +15,8 @@ public:
     CStationGeneralPage(Station& station, bool newStation);
 
     // Controls → exchange texts → record, with the conversions of the sheet: an unknown baud text
-    // reads as 0, parity by its current text (no selection keeps the record's).
+    // reads as 0, the marked absent port as the stored port, parity by its current text (no
+    // selection keeps the record's).
     void ExchangeIntoRecord();
 
 protected:
@@ -23,8 +24,14 @@ protected:
     void OnCommand(WORD controlId, WORD notification) override;
 
 private:
+    // The computer's ports now, plus the stored port marked when it is not among them; the
+    // selection is kept.
+    void FillPortList();
+    std::wstring AbsentPortText() const;
+
     Station& station_;
     bool newStation_;
+    std::wstring storedPort_;  // the record's port when the page opened
     std::wstring name_;
     std::wstring port_;
     std::wstring baudRate_;
@@ -47,6 +54,8 @@ protected:
 private:
     // Shows the refusal for a name that cannot be stored; true when the name may be stored.
     bool AcceptName(const std::wstring& name) const;
+    // Shows the refusal for any other value the station may not hold; true when none.
+    bool AcceptValues() const;
     std::wstring Caption() const;
 
     bool newStation_;

@@ -79,6 +79,24 @@ void CPropertyPage::AddListEntry(int controlId, const std::wstring& text) noexce
     }
 }
 
+void CPropertyPage::SetListEntries(int controlId, const std::vector<std::wstring>& entries,
+                                   const std::wstring& selected) {
+    const HWND list = window_ ? ::GetDlgItem(window_, controlId) : nullptr;
+    if (!list)
+        return;
+    ::SendMessageW(list, CB_RESETCONTENT, 0, 0);
+    for (const std::wstring& entry : entries)
+        ::SendMessageW(list, CB_ADDSTRING, 0, reinterpret_cast<LPARAM>(entry.c_str()));
+    // A sorted list places entries where it likes: the selection is found afterwards, exactly.
+    LRESULT found = CB_ERR;
+    const LRESULT count = ::SendMessageW(list, CB_GETCOUNT, 0, 0);
+    for (LRESULT index = 0; !selected.empty() && index < count && found == CB_ERR; ++index) {
+        if (ListEntryText(list, index) == selected)
+            found = index;
+    }
+    ::SendMessageW(list, CB_SETCURSEL, static_cast<WPARAM>(found), 0);
+}
+
 void CPropertyPage::SetModified() noexcept {
     if (window_)
         PropSheet_Changed(SheetWindowOf(window_), window_);

@@ -35,6 +35,10 @@ protected:
 
     void SetControlText(int controlId, const std::wstring& text) noexcept;
     void AddListEntry(int controlId, const std::wstring& text) noexcept;
+    // Replaces a drop-down list's entries and selects the one whose text equals selected exactly
+    // (none when no entry does). Sends no selection-change notification.
+    void SetListEntries(int controlId, const std::vector<std::wstring>& entries,
+                        const std::wstring& selected);
     // Tells the sheet that the page holds changes: the sheet enables Apply.
     void SetModified() noexcept;
 

@@ -6,6 +6,7 @@
 #include <cstring>
 #include <cwchar>
 
+#include "download/download_attempt.h"
 #include "download/download_target.h"
 #include "stations/station_list_block.h"
 #include "stations/station_models.h"
@@ -195,10 +196,12 @@ HRESULT CLVDataObject::GetFileContents(LONG index, STGMEDIUM* medium) noexcept {
             return prepared;
         };
         std::wstring file;
+        DownloadAttempt attempt(station);
         const HRESULT downloaded = downloader_->Download(owner, station, prepareTarget, file);
         // A download that ended before its target was made has nothing to clean up; its failure
         // (shown where it happened) fails the copy.
         if (!target) {
+            attempt.Finish(downloaded, nullptr);
             if (FAILED(downloaded))
                 LV_LOG_AND_RETURN(downloaded);
             return S_FALSE;
@@ -206,6 +209,8 @@ HRESULT CLVDataObject::GetFileContents(LONG index, STGMEDIUM* medium) noexcept {
         // Whatever the download wrote goes with the target: a partial file when the download did
         // not complete (the target's end deletes it), the file the stream reads when it did.
         RETURN_IF_FAILED(target.AddWrittenFile(file));
+        // Kept (when complete) and journaled before the shell can lose it; this never fails it.
+        attempt.Finish(downloaded, &target);
         if (downloaded != S_OK) {
             // A failure fails the copy with its reason, so that the caller reports a failure rather
             // than a cancel.

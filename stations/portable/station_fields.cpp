@@ -1,4 +1,4 @@
-// The station fields' table and the values the station sheet and the download accept in them.
+// The station fields' table and the one rule for the values a station may hold.
 #include "stations/portable/station_fields.h"
 
 #include <algorithm>
@@ -24,8 +24,10 @@ constexpr std::array<StationFieldInfo, kStationFieldCount> kFields = {{
     {StationField::kCheckSum, WIDE_TEXT("CheckSum"), nullptr, &Station::CheckSum},
 }};
 
-// The baud rates of the sheet's list, in its order.
-constexpr uint32_t kBaudRates[] = {300, 600, 1200, 2400, 4800, 9600};
+constexpr uint32_t kBaudRates[] = {300,  600,   1200,  2400,  4800,  9600,
+                                   14400, 19200, 38400, 57600, 115200};
+// The first six, which the sheet always lists.
+constexpr size_t kSheetBaudRateCount = 6;
 
 struct NumberRange {
     uint32_t lowest;
@@ -81,6 +83,14 @@ std::optional<StationField> StationFieldNamed(WideStringView valueName) noexcept
     return std::nullopt;
 }
 
+std::span<const uint32_t> StationBaudRates() noexcept {
+    return kBaudRates;
+}
+
+std::span<const uint32_t> SheetBaudRates() noexcept {
+    return std::span<const uint32_t>(kBaudRates).first(kSheetBaudRateCount);
+}
+
 std::optional<WideString> RefusedNumber(StationField field, uint32_t value) {
     if (field == StationField::kBaudRate) {
         if (std::find(std::begin(kBaudRates), std::end(kBaudRates), value) != std::end(kBaudRates))
@@ -116,6 +126,18 @@ std::optional<WideString> RefusedText(StationField field, WideStringView text,
                 (known.empty() ? AsciiWide("\"") : AsciiWide(", \"")) + model + AsciiWide("\"");
         return AsciiWide("\"") + WideString(text) +
                AsciiWide("\" is not a model; the models are ") + known;
+    }
+    return std::nullopt;
+}
+
+std::optional<StationFieldRefusal> RefusedStation(const Station& station,
+                                                  std::span<const WideString> modelTexts) {
+    for (const StationFieldInfo& info : kFields) {
+        std::optional<WideString> reason =
+            info.number ? RefusedNumber(info.field, station.*info.number)
+                        : RefusedText(info.field, station.*info.text, modelTexts);
+        if (reason)
+            return StationFieldRefusal{info.field, std::move(*reason)};
     }
     return std::nullopt;
 }

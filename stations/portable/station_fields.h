@@ -46,8 +46,14 @@ const StationFieldInfo& StationFieldOf(StationField field) noexcept;
 // registry compares value names.
 std::optional<StationField> StationFieldNamed(WideStringView valueName) noexcept;
 
-// Why a number is refused, or nullopt when the field may hold it. The station sheet offers the
-// baud rates 300 to 9600 and the three parities; the fields it does not show take the codes their
+// The standard baud rates from 300 to 115200, which a station may hold, in ascending order.
+std::span<const uint32_t> StationBaudRates() noexcept;
+
+// The rates the station sheet always lists (300 to 9600); it adds a station's own standard rate.
+std::span<const uint32_t> SheetBaudRates() noexcept;
+
+// Why a number is refused, or nullopt when the field may hold it: a baud rate of
+// StationBaudRates, the three parities, and for the fields the sheet does not show the codes their
 // consumers know: stop bits 0 to 2 (one, one and a half, two), data bits 5 to 8, protocol
 // selectors 0 to 3, flow selectors 0 to 2, block checksums 0 or 1.
 std::optional<WideString> RefusedNumber(StationField field, uint32_t value);
@@ -58,3 +64,13 @@ std::optional<WideString> RefusedNumber(StationField field, uint32_t value);
 // the port is a warning for the caller, since COM numbers differ between computers.
 std::optional<WideString> RefusedText(StationField field, WideStringView text,
                                       std::span<const WideString> modelTexts);
+
+struct StationFieldRefusal {
+    StationField field;
+    WideString reason;  // English, for a person
+};
+
+// The one check of a whole station, field by field in the store's order, that the sheet, adding
+// from the command line and the station file share: the first field refused, or nullopt.
+std::optional<StationFieldRefusal> RefusedStation(const Station& station,
+                                                  std::span<const WideString> modelTexts);

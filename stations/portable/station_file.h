@@ -43,7 +43,7 @@ struct StationFileError {
     WideString reason;  // English, for a person
 };
 
-// "line 12, BaudRate: 19200 is not one of ..."; "the file is ..." when the file as a whole is
+// "line 12, BaudRate: 28800 is not one of ..."; "the file is ..." when the file as a whole is
 // meant.
 WideString DescribeStationFileError(const StationFileError& error);
 

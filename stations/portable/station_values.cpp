@@ -1,8 +1,6 @@
 // One station's values read in the store's order, each read bounded by its buffer.
 #include "stations/portable/station_values.h"
 
-#include <algorithm>
-
 #include "stations/portable/model_rules.h"
 
 namespace {
@@ -38,10 +36,13 @@ ValueReadStatus ReadStationValues(Station& station, StationValueSource& source,
     status = ReadText(source, WIDE_TEXT("Port"), station.Port);
     if (status != ValueReadStatus::kRead)
         return status;
-    // A port the computer no longer has becomes its first one; with no list, it stays.
+    // A port the computer no longer has becomes its only one: a USB adapter that came back
+    // under another number. With several present, any one of them is a guess (another
+    // instrument, or a wait on the wrong device), and with none there is nothing to take: the
+    // stored port stays, and opening it names the ports present.
     const std::vector<WideString> ports =
         rules.listSerialPorts ? rules.listSerialPorts() : std::vector<WideString>();
-    if (!ports.empty() && std::find(ports.begin(), ports.end(), station.Port) == ports.end())
+    if (ports.size() == 1 && ports.front() != station.Port)
         station.Port = ports.front();
 
     // Parity twice: the store has always read it so, and the second read is harmless.

@@ -39,7 +39,8 @@ struct StationReadRules {
 // Manufacturer, Model, Software, Protocol, Flow and CheckSum, stopping at the first read that
 // fails and returning its status; Protocol and Flow may fail (keys written before they existed),
 // and CheckSum's status is the result. Fields not reached keep what the record held. A port the
-// computer's list lacks becomes the list's first (an empty list leaves it); a model other than
+// computer's list lacks becomes the list's port when it holds exactly one (none or several leave
+// it); a model other than
 // the second and third becomes the first.
 [[nodiscard]] ValueReadStatus ReadStationValues(Station& station, StationValueSource& source,
                                                 const StationReadRules& rules);

@@ -89,9 +89,19 @@ protected:
         AddStationOfModel(L"North");
         AddStationOfModel(L"South", IDS_MODEL_LV30);
         AddStationOfModel(L"East");
+        // Download records (kept copies, journal) go to a folder of the test's own, never the
+        // prefix user's.
+        records_ = std::filesystem::temp_directory_path() /
+                   (L"lvrecords-" + std::to_wstring(::GetCurrentProcessId()));
+        std::filesystem::remove_all(records_);
+        std::filesystem::create_directories(records_);
+        ::SetEnvironmentVariableW(L"LVSHELLEXT_DOWNLOADS_DIR", records_.c_str());
     }
 
     void TearDown() override {
+        ::SetEnvironmentVariableW(L"LVSHELLEXT_DOWNLOADS_DIR", nullptr);
+        std::error_code ignored;  // a file still held shows in the test that held it
+        std::filesystem::remove_all(records_, ignored);
         ::OleUninitialize();
         EXPECT_EQ(0, ModuleLockCount()) << "a reference was leaked";
     }
@@ -134,4 +144,5 @@ protected:
     // The local machine too: the prefix's serial ports would replace the stored ones.
     RegistryOverride registry_{RegistryOverride::Hives::CurrentUserAndLocalMachine};
     CPidlMgr manager_;
+    std::filesystem::path records_;
 };

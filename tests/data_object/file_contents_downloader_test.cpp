@@ -5,10 +5,17 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
 #include <memory>
 #include <optional>
 #include <string>
+#include <vector>
 
+#include "download/download_journal.h"
+#include "download/kept_downloads.h"
 #include "download/station_downloader.h"
 #include "tests/data_object/data_object_fixture.h"
 
@@ -56,7 +63,104 @@ private:
     const bool refusesAtOnce_;
 };
 
-class FileContentsDownloader : public DataObject {};
+namespace fs = std::filesystem;
+
+// Reads what a download leaves in the records (kept copies, journal; the fixture's scratch
+// folder).
+class FileContentsDownloader : public DataObject {
+protected:
+
+    // One completed (or otherwise ended) download of North; the stream's content, if any.
+    HRESULT DownloadNorth(HRESULT result, std::optional<std::string> written,
+                          std::string* content = nullptr, bool refusesAtOnce = false) {
+        ScriptedDialogs dialogs(IDOK);
+        ScopedUserInterface scope(dialogs);
+        auto downloader =
+            std::make_shared<ScriptedDownloader>(result, std::move(written), refusesAtOnce);
+        UniqueStgMedium medium;
+        const HRESULT got =
+            Get(Over({kNorthFile}, downloader).Get(), CFSTR_FILECONTENTS, TYMED_ISTREAM, medium, 0);
+        if (got == S_OK && content)
+            *content = ReadToEnd(medium.get().pstm);
+        return got;
+    }
+
+    fs::path Kept(const wchar_t* station = L"North") const {
+        return records_ / kKeptDownloadsFolderName / station;
+    }
+
+    // The files in a folder, by name.
+    static std::vector<std::wstring> FilesIn(const fs::path& folder) {
+        std::vector<std::wstring> names;
+        std::error_code missing;
+        for (const auto& entry : fs::directory_iterator(folder, missing))
+            names.push_back(entry.path().filename().wstring());
+        std::sort(names.begin(), names.end());
+        return names;
+    }
+
+    static std::string ReadFile(const fs::path& path) {
+        std::ifstream in(path, std::ios::binary);
+        return {std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>()};
+    }
+
+    // The journal's records, read as a spreadsheet reads CSV (RFC 4180); the mark is checked.
+    std::vector<std::vector<std::string>> Journal(const wchar_t* name = kJournalFileName) const {
+        const std::string text = ReadFile(records_ / name);
+        std::vector<std::vector<std::string>> records;
+        EXPECT_EQ("\xEF\xBB\xBF", text.substr(0, 3)) << "a byte-order mark first";
+        std::vector<std::string> record(1);
+        bool quoted = false;
+        for (size_t index = 3; index < text.size(); ++index) {
+            const char c = text[index];
+            if (quoted && c == '"' && index + 1 < text.size() && text[index + 1] == '"') {
+                record.back().push_back('"');
+                ++index;
+            } else if (c == '"') {
+                quoted = !quoted;
+            } else if (!quoted && c == ',') {
+                record.emplace_back();
+            } else if (!quoted && c == '\r' && index + 1 < text.size() && text[index + 1] == '\n') {
+                records.push_back(record);
+                record.assign(1, std::string());
+                ++index;
+            } else {
+                record.back().push_back(c);
+            }
+        }
+        EXPECT_EQ(1u, record.size()) << "the last record ends its line";
+        return records;
+    }
+
+    static void SetPolicy(HKEY hive, const wchar_t* name, DWORD value) {
+        HKEY created = nullptr;
+        ASSERT_EQ(ERROR_SUCCESS, ::RegCreateKeyExW(hive, kKeepingPolicyKey, 0, nullptr, 0,
+                                                   KEY_SET_VALUE, nullptr, &created, nullptr));
+        const UniqueRegKey key(created);
+        ASSERT_EQ(ERROR_SUCCESS, ::RegSetValueExW(key.get(), name, 0, REG_DWORD,
+                                                  reinterpret_cast<const BYTE*>(&value),
+                                                  sizeof value));
+    }
+
+    // A kept file of a station, of the given size, last written daysAgo days ago.
+    fs::path PlaceKept(const wchar_t* station, const wchar_t* name, size_t size, int daysAgo) {
+        fs::create_directories(Kept(station));
+        const fs::path path = Kept(station) / name;
+        std::ofstream(path, std::ios::binary) << std::string(size, 'k');
+        FILETIME now{};
+        ::GetSystemTimeAsFileTime(&now);
+        ULARGE_INTEGER time{{now.dwLowDateTime, now.dwHighDateTime}};
+        time.QuadPart -= static_cast<ULONGLONG>(daysAgo) * 24 * 60 * 60 * 10000000ULL;
+        const FILETIME written{time.LowPart, time.HighPart};
+        UniqueFileHandle file(::CreateFileW(path.c_str(), FILE_WRITE_ATTRIBUTES, 0, nullptr,
+                                            OPEN_EXISTING, 0, nullptr));
+        EXPECT_TRUE(::SetFileTime(file.get(), nullptr, nullptr, &written));
+        return path;
+    }
+};
+
+enum Column { kStart, kStation, kPort, kBaud, kParity, kModel, kProcedure, kBytes, kSeconds,
+              kResult, kMessage, kKeptFile, kColumns };
 
 TEST_F(FileContentsDownloader, OnlyAReportedCompleteFileBecomesAStreamAndNothingIsLeftBehind) {
     const std::string partial = "A,01,Z\r\n1,0.0";
@@ -119,6 +223,175 @@ TEST_F(FileContentsDownloader, EachRequestRunsItsOwnDownloadUnderAFreshName) {
     EXPECT_EQ(S_FALSE, Get(data.Get(), CFSTR_FILECONTENTS, TYMED_ISTREAM, medium, 0));
     EXPECT_EQ(2, downloader->runs);
     EXPECT_NE(first, downloader->writtenPath);
+}
+
+TEST_F(FileContentsDownloader, ACompletedDownloadIsKeptWholeAndJournaledOk) {
+    std::string content;
+    ASSERT_EQ(S_OK, DownloadNorth(S_OK, kContent, &content));
+    EXPECT_EQ(kContent, content);
+    const std::vector<std::wstring> kept = FilesIn(Kept());
+    ASSERT_EQ(1u, kept.size());
+    // "YYYY-MM-DD HHMMSS.lv"
+    EXPECT_EQ(20u, kept[0].size()) << kept[0];
+    EXPECT_TRUE(kept[0].ends_with(L".lv"));
+    EXPECT_EQ(kContent, ReadFile(Kept() / kept[0]));
+
+    const auto journal = Journal();
+    ASSERT_EQ(2u, journal.size());
+    EXPECT_EQ("start", journal[0][kStart]);
+    ASSERT_EQ(static_cast<size_t>(kColumns), journal[1].size());
+    EXPECT_EQ("North", journal[1][kStation]);
+    EXPECT_EQ("ok", journal[1][kResult]);
+    EXPECT_EQ(std::to_string(std::string(kContent).size()), journal[1][kBytes]);
+    EXPECT_EQ("", journal[1][kMessage]);
+    EXPECT_EQ((Kept() / kept[0]).string(), journal[1][kKeptFile]);
+    EXPECT_EQ(25u, journal[1][kStart].size()) << "with its offset: " << journal[1][kStart];
+
+    // The next one in the same folder, never over the first.
+    ASSERT_EQ(S_OK, DownloadNorth(S_OK, std::string("second")));
+    const std::vector<std::wstring> both = FilesIn(Kept());
+    ASSERT_EQ(2u, both.size());
+    EXPECT_EQ(kContent, ReadFile(Kept() / kept[0]));
+    EXPECT_EQ(3u, Journal().size()) << "one header, one row each";
+}
+
+TEST_F(FileContentsDownloader, EveryAttemptLeavesARowAndOnlyACompletedOneAKeptFile) {
+    struct Case {
+        const char* what;
+        HRESULT download;
+        std::optional<std::string> written;
+        bool refusesAtOnce;
+        const char* result;
+        bool message;  // the row says why
+    } const cases[] = {
+        {"cancelled half way", S_FALSE, "A,01", false, "cancelled", false},
+        {"refused by a full disk", HRESULT_FROM_WIN32(ERROR_DISK_FULL), "A,01", false, "failed",
+         true},
+        {"refused before its target", HRESULT_FROM_WIN32(ERROR_BUSY), std::nullopt, true,
+         "failed", true},
+    };
+    size_t rows = 1;
+    for (const Case& test : cases) {
+        SCOPED_TRACE(test.what);
+        EXPECT_EQ(test.download, DownloadNorth(test.download, test.written, nullptr,
+                                               test.refusesAtOnce));
+        EXPECT_TRUE(FilesIn(Kept()).empty());
+        const auto journal = Journal();
+        ASSERT_EQ(++rows, journal.size());
+        EXPECT_EQ(test.result, journal.back()[kResult]);
+        EXPECT_EQ(test.message, !journal.back()[kMessage].empty()) << journal.back()[kMessage];
+        EXPECT_EQ("", journal.back()[kKeptFile]);
+        EXPECT_EQ(test.refusesAtOnce ? "0" : "4", journal.back()[kBytes]);
+    }
+}
+
+TEST_F(FileContentsDownloader, AKeptFolderThatCannotBeWrittenStillHandsTheStreamOver) {
+    // A file where the folder of kept downloads should be.
+    std::ofstream(records_ / kKeptDownloadsFolderName) << "in the way";
+    std::string content;
+    ASSERT_EQ(S_OK, DownloadNorth(S_OK, kContent, &content));
+    EXPECT_EQ(kContent, content);
+    const auto journal = Journal();
+    ASSERT_EQ(2u, journal.size());
+    EXPECT_EQ("ok", journal[1][kResult]);
+    EXPECT_EQ("", journal[1][kKeptFile]);
+    EXPECT_FALSE(journal[1][kMessage].empty()) << "the row names why nothing was kept";
+}
+
+TEST_F(FileContentsDownloader, AJournalThatCannotBeOpenedFailsNothing) {
+    std::ofstream(records_ / kJournalFileName) << "held";
+    UniqueFileHandle holder(::CreateFileW((records_ / kJournalFileName).c_str(), GENERIC_READ, 0,
+                                          nullptr, OPEN_EXISTING, 0, nullptr));
+    ASSERT_NE(INVALID_HANDLE_VALUE, holder.get());
+    std::string content;
+    ASSERT_EQ(S_OK, DownloadNorth(S_OK, kContent, &content));
+    EXPECT_EQ(kContent, content);
+    EXPECT_EQ(1u, FilesIn(Kept()).size());
+}
+
+TEST_F(FileContentsDownloader, TheJournalRotatesAtItsLimit) {
+    const std::string old = "\xEF\xBB\xBF" + std::string(kJournalRotationBytes - 20, 'x') + "\r\n";
+    std::ofstream(records_ / kJournalFileName, std::ios::binary) << old;
+    ASSERT_EQ(S_FALSE, DownloadNorth(S_FALSE, std::nullopt));
+    EXPECT_EQ(old, ReadFile(records_ / kOldJournalFileName));
+    const auto journal = Journal();
+    ASSERT_EQ(2u, journal.size());
+    EXPECT_EQ("cancelled", journal[1][kResult]);
+}
+
+TEST_F(FileContentsDownloader, RetentionPrunesByAgeAndSizeAndKeepsEachStationsNewest) {
+    // By age (default 90 days): the old ones go, but East's only copy is its newest.
+    const fs::path oldNorth = PlaceKept(L"North", L"2025-01-01 080000.lv", 10, 120);
+    const fs::path youngNorth = PlaceKept(L"North", L"2026-11-01 080000.lv", 10, 20);
+    const fs::path oldEast = PlaceKept(L"East", L"2025-01-01 080000.lv", 10, 300);
+    const fs::path olderEast = PlaceKept(L"East", L"2024-01-01 080000.lv", 10, 400);
+    ASSERT_EQ(S_OK, DownloadNorth(S_OK, kContent));
+    EXPECT_FALSE(fs::exists(oldNorth));
+    EXPECT_TRUE(fs::exists(youngNorth));
+    EXPECT_TRUE(fs::exists(oldEast));
+    EXPECT_FALSE(fs::exists(olderEast));
+
+    // By size: 1 MB in all lets the oldest go until the rest fit; East's newest stays.
+    SetPolicy(HKEY_CURRENT_USER, kKeepDownloadsMegabytesValue, 1);
+    const fs::path bigEast = PlaceKept(L"East", L"2026-11-20 080000.lv", 600 * 1024, 1);
+    const fs::path bigNorth = PlaceKept(L"North", L"2026-11-21 080000.lv", 600 * 1024, 2);
+    ASSERT_EQ(S_OK, DownloadNorth(S_OK, kContent));
+    EXPECT_TRUE(fs::exists(bigEast));
+    EXPECT_FALSE(fs::exists(oldEast));
+    EXPECT_FALSE(fs::exists(bigNorth));
+    EXPECT_FALSE(fs::exists(youngNorth));
+    EXPECT_EQ(2u, FilesIn(Kept()).size()) << "the two copies made here";
+}
+
+TEST_F(FileContentsDownloader, PolicyValuesComeFromTheMachineBeforeTheUser) {
+    struct Case {
+        const char* what;
+        std::optional<DWORD> machineDays, userDays, userMegabytes;
+        uint32_t days, megabytes;
+    } const cases[] = {
+        {"none", std::nullopt, std::nullopt, std::nullopt, 90, 1024},
+        {"the user's", std::nullopt, 30, 5, 30, 5},
+        {"the machine's first", 10, 30, 5, 10, 5},
+        {"off", 0, 30, std::nullopt, 0, 1024},
+    };
+    for (const Case& test : cases) {
+        SCOPED_TRACE(test.what);
+        for (const HKEY hive : {HKEY_LOCAL_MACHINE, HKEY_CURRENT_USER})
+            (void)::RegDeleteTreeW(hive, kKeepingPolicyKey);  // absent at first
+        if (test.machineDays)
+            SetPolicy(HKEY_LOCAL_MACHINE, kKeepDownloadsDaysValue, *test.machineDays);
+        if (test.userDays)
+            SetPolicy(HKEY_CURRENT_USER, kKeepDownloadsDaysValue, *test.userDays);
+        if (test.userMegabytes)
+            SetPolicy(HKEY_CURRENT_USER, kKeepDownloadsMegabytesValue, *test.userMegabytes);
+        const RetentionLimits limits = ReadKeepingPolicy();
+        EXPECT_EQ(test.days, limits.Days);
+        EXPECT_EQ(test.megabytes, limits.Megabytes);
+    }
+    // A value of the wrong type is no policy.
+    HKEY created = nullptr;
+    ASSERT_EQ(ERROR_SUCCESS, ::RegCreateKeyExW(HKEY_LOCAL_MACHINE, kKeepingPolicyKey, 0, nullptr,
+                                               0, KEY_SET_VALUE, nullptr, &created, nullptr));
+    const UniqueRegKey key(created);
+    ASSERT_EQ(ERROR_SUCCESS, ::RegSetValueExW(key.get(), kKeepDownloadsDaysValue, 0, REG_SZ,
+                                              reinterpret_cast<const BYTE*>(L"7"), 4));
+    EXPECT_EQ(30u, ReadKeepingPolicy().Days);
+}
+
+TEST_F(FileContentsDownloader, KeepingOffKeepsNothingAndPrunesNothing) {
+    SetPolicy(HKEY_CURRENT_USER, kKeepDownloadsDaysValue, 0);
+    const fs::path old = PlaceKept(L"North", L"2020-01-01 080000.lv", 10, 2000);
+    const fs::path older = PlaceKept(L"North", L"2019-01-01 080000.lv", 10, 2400);
+    std::string content;
+    ASSERT_EQ(S_OK, DownloadNorth(S_OK, kContent, &content));
+    EXPECT_EQ(kContent, content);
+    EXPECT_EQ(2u, FilesIn(Kept()).size());
+    EXPECT_TRUE(fs::exists(old) && fs::exists(older));
+    const auto journal = Journal();
+    ASSERT_EQ(2u, journal.size());
+    EXPECT_EQ("ok", journal[1][kResult]);
+    EXPECT_EQ("", journal[1][kKeptFile]);
+    EXPECT_EQ("", journal[1][kMessage]);
 }
 
 }  // namespace

@@ -64,12 +64,12 @@ TEST(StationFile, MissingKeysTakeTheStoresDefaults) {
     EXPECT_EQ(Defaults(WIDE_TEXT("Bare")), contents.stations[0].station);
 }
 
-TEST(StationFile, AcceptsEveryValueTheSheetAndTheDownloadKnow) {
+TEST(StationFile, AcceptsEveryValueTheStationRuleAllows) {
     const struct {
         const char* key;
         std::vector<uint32_t> values;
     } fields[] = {
-        {"BaudRate", {300, 600, 1200, 2400, 4800, 9600}},
+        {"BaudRate", {300, 600, 1200, 2400, 4800, 9600, 14400, 19200, 38400, 57600, 115200}},
         {"Parity", {0, 1, 2}},
         {"StopBits", {0, 1, 2}},
         {"DataBits", {5, 6, 7, 8}},
@@ -243,10 +243,10 @@ TEST(StationFile, ACutFileNeverChangesTheStationsBeforeTheCut) {
 }
 
 TEST(StationFile, DescribesAnErrorByLineAndField) {
-    const StationFileContents contents = Read("[A]\n\nBaudRate = 19200\n");
+    const StationFileContents contents = Read("[A]\n\nBaudRate = 28800\n");
     ASSERT_TRUE(contents.error);
-    EXPECT_EQ(WIDE_TEXT("line 3, BaudRate: 19200 is not one of the baud rates 300, 600, 1200, "
-                        "2400, 4800, 9600"),
+    EXPECT_EQ(WIDE_TEXT("line 3, BaudRate: 28800 is not one of the baud rates 300, 600, 1200, "
+                        "2400, 4800, 9600, 14400, 19200, 38400, 57600, 115200"),
               DescribeStationFileError(*contents.error));
     EXPECT_EQ(WIDE_TEXT("the file is UTF-16 text; save it as UTF-8"),
               DescribeStationFileError(*Read(std::string("\xFF\xFE[\0A\0]\0", 8)).error));

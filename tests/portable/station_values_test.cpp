@@ -272,22 +272,34 @@ TEST(StationValues, TextsAreReadOnlyInsideTheirBytesAndUpTo520OfThem) {
     }
 }
 
-TEST(StationValues, APortTheComputerLacksBecomesItsFirstAndAnUnknownModelTheFirstModel) {
+TEST(StationValues, AnAbsentPortBecomesTheOnlyPortPresentAndAnUnknownModelTheFirstModel) {
+    const WideString none;
+    const std::vector<WideString> one = {WIDE_TEXT("COM7")};
+    const std::vector<WideString> several = {WIDE_TEXT("COM3"), WIDE_TEXT("COM4")};
     const struct {
         WideString stored;
         std::vector<WideString> ports;
         WideString read;
     } ports[] = {
+        // No port present: nothing to take, the stored one stays.
         {WIDE_TEXT("COM9"), {}, WIDE_TEXT("COM9")},
-        {WIDE_TEXT("COM9"), {WIDE_TEXT("COM3"), WIDE_TEXT("COM4")}, WIDE_TEXT("COM3")},
-        {WIDE_TEXT("COM4"), {WIDE_TEXT("COM3"), WIDE_TEXT("COM4")}, WIDE_TEXT("COM4")},
-        {WIDE_TEXT("com4"), {WIDE_TEXT("COM3"), WIDE_TEXT("COM4")}, WIDE_TEXT("COM3")},
-        {WideString(), {WIDE_TEXT("COM7")}, WIDE_TEXT("COM7")},
+        {none, {}, none},
+        // One present: a renumbered adapter; a present port stays.
+        {WIDE_TEXT("COM9"), one, WIDE_TEXT("COM7")},
+        {none, one, WIDE_TEXT("COM7")},
+        {WIDE_TEXT("com7"), one, WIDE_TEXT("COM7")},
+        {WIDE_TEXT("COM7"), one, WIDE_TEXT("COM7")},
+        // Several present: a present port stays, and so does an absent one.
+        {WIDE_TEXT("COM4"), several, WIDE_TEXT("COM4")},
+        {WIDE_TEXT("COM9"), several, WIDE_TEXT("COM9")},
+        {WIDE_TEXT("com4"), several, WIDE_TEXT("com4")},
+        {none, several, none},
     };
     for (const auto& test : ports) {
         StationValueTable key = WrittenKey();
         key.SetText(WIDE_TEXT("Port"), test.stored);
-        EXPECT_EQ(test.read, Read(key, test.ports).station.Port) << Narrow(test.stored);
+        EXPECT_EQ(test.read, Read(key, test.ports).station.Port)
+            << Narrow(test.stored) << " with " << test.ports.size() << " port(s)";
     }
     // The port list is consulted even when a later read fails, and the port kept.
     StationValueTable key = WrittenKey();

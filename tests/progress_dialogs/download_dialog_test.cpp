@@ -9,6 +9,7 @@
 #include "support/text_lookup.h"
 #include "tests/progress_dialogs/dialog_driver.h"
 #include "tests/serial/instrument.h"
+#include "tests/support/registry_override.h"
 
 namespace {
 
@@ -63,6 +64,8 @@ TEST_F(DownloadDialog, AStrayOkBeforeStartIsIgnoredAndTextsQueuedAtCloseAreFreed
 }
 
 TEST_F(DownloadDialog, ShowsItsTextsUntilStartWhenAMissingPortShowsItsBoxAndTheDialogCloses) {
+    RegistryOverride registry(RegistryOverride::Hives::CurrentUserAndLocalMachine);
+    registry.SetSerialPorts({L"COM40", L"COM41"});
     station_.Port = kMissingPort;
     CDownloadProgressDialog dialog(nullptr, station_, output_.wstring());
     const INT_PTR result = RunDialog(dialog, [](HWND window) {
@@ -78,7 +81,11 @@ TEST_F(DownloadDialog, ShowsItsTextsUntilStartWhenAMissingPortShowsItsBoxAndTheD
         Press(window, IDC_START);
     });
     EXPECT_EQ(result, IDCANCEL);
-    ExpectOneBox(user_, L"Can not open COM port. Port is already open by another program",
+    // The box names the ports the computer lists when Start is pressed.
+    ExpectOneBox(user_,
+                 L"COM49 is not on this PC now. Ports present: COM40, COM41. Check the "
+                 L"instrument's cable and its USB adapter, or choose one of these ports in the "
+                 L"station's properties.",
                  MB_ICONSTOP);
 }
 

@@ -9,12 +9,15 @@
 #include <cstring>
 #include <fstream>
 #include <iterator>
+#include <string>
+#include <vector>
 
 #include "download/az_comm.h"
 #include "download/win32_serial_port.h"
 #include "support/unique_resource.h"
 #include "tests/portable/serial/fake_serial.h"
 #include "tests/serial/instrument.h"
+#include "tests/support/registry_override.h"
 
 namespace {
 
@@ -38,8 +41,8 @@ TEST(SerialDriver, FillsTheRecordsDeviceControlBlockAndTimeOutsEvenWhenThePortIs
     RecordingCallback callback;
     TAZComm driver(&callback, &params);
     EXPECT_FALSE(driver.IsPortOpen());
-    EXPECT_EQ(callback.messages, OnlyMessage(MessageCode::PortNotOpened,
-                                             EnglishTexts().Text(DriverText::PortNotOpened)));
+    ASSERT_EQ(1u, callback.messages.size());
+    EXPECT_EQ(MessageCode::PortNotOpened, callback.messages[0].code);
     EXPECT_EQ(params.DeviceControlBlock.XonLim, 1024);
     EXPECT_FALSE(params.DeviceControlBlock.fOutX);  // BCC blocks: no software flow control
     EXPECT_EQ(params.Timeouts.ReadIntervalTimeout, 50u);
@@ -74,6 +77,92 @@ TEST(SerialDriver, CancelMidTransferReportsAndFreesThePort) {
     std::ifstream file(output.c_str(), std::ios::binary);
     const std::string received{std::istreambuf_iterator<char>(file), {}};
     EXPECT_EQ(std::count(received.begin(), received.end(), '\n'), 3) << "the header and two lines";
+}
+
+const wchar_t kAdvice[] =
+    L"Check the instrument's cable and its USB adapter, or choose one of these ports in the "
+    L"station's properties.";
+const wchar_t kAdviceNoPorts[] =
+    L"Check the instrument's cable and its USB adapter, or choose another port in the station's "
+    L"properties.";
+
+// The one message a driver on this port gives while the computer lists these ports.
+std::vector<RecordedMessage> PortNotOpenedMessages(const wchar_t* port,
+                                                   const std::vector<std::wstring>& listed) {
+    RegistryOverride registry(RegistryOverride::Hives::CurrentUserAndLocalMachine);
+    registry.SetSerialPorts(listed);
+    TAZCommParams params = LineParams(port, L"never.lv");
+    RecordingCallback callback;
+    TAZComm driver(&callback, &params);
+    EXPECT_FALSE(driver.IsPortOpen()) << port;
+    return callback.messages;
+}
+
+TEST(SerialDriverPortProblems, APortNotPresentNamesThePortsTheComputerListsNow) {
+    const struct {
+        const wchar_t* port;
+        std::vector<std::wstring> listed;
+        std::wstring text;
+    } cases[] = {
+        {L"\\\\.\\COM38", {L"COM3", L"COM7"},
+         L"COM38 is not on this PC now. Ports present: COM3, COM7. " + std::wstring(kAdvice)},
+        {L"COM38", {L"COM12"},
+         L"COM38 is not on this PC now. Ports present: COM12. " + std::wstring(kAdvice)},
+        {L"COM38", {},
+         L"COM38 is not on this PC now, and this PC has no serial ports at the moment. " +
+             std::wstring(kAdviceNoPorts)},
+        // Listed but gone (an adapter pulled before the list caught up): the system finds no
+        // device, which is what counts.
+        {L"COM38", {L"COM3", L"com38"},
+         L"COM38 is not on this PC now. Ports present: COM3, com38. " + std::wstring(kAdvice)},
+    };
+    for (const auto& test : cases) {
+        EXPECT_EQ(PortNotOpenedMessages(test.port, test.listed),
+                  OnlyMessage(MessageCode::PortNotOpened, test.text))
+            << test.port;
+    }
+}
+
+TEST(SerialDriverPortProblems, APortHeldByAnotherHandleIsInUse) {
+    UniqueFileHandle held(::CreateFileW(kDriverPort, GENERIC_READ | GENERIC_WRITE, 0, nullptr,
+                                        OPEN_EXISTING, 0, nullptr));
+    ASSERT_TRUE(held) << ::GetLastError();
+    UniqueFileHandle second(::CreateFileW(kDriverPort, GENERIC_READ | GENERIC_WRITE, 0, nullptr,
+                                          OPEN_EXISTING, 0, nullptr));
+    const DWORD secondError = ::GetLastError();
+    if (second) {
+        // Windows refuses a second open of a COM port with ERROR_ACCESS_DENIED; Wine 8 opens it
+        // (tried), so the case cannot be made here. Its classification is tested below.
+        GTEST_SKIP() << "Wine gap: a COM port held open exclusively opens a second time";
+    }
+    EXPECT_EQ(secondError, static_cast<DWORD>(ERROR_ACCESS_DENIED));
+    EXPECT_EQ(PortNotOpenedMessages(kDriverPort, {L"COM20", L"COM21"}),
+              OnlyMessage(MessageCode::PortNotOpened,
+                          L"Can not open COM port. Port is already open by another program"));
+}
+
+TEST(SerialDriverPortProblems, EachFailureIsClassifiedByWhatTheUserCanDo) {
+    const struct {
+        DWORD error;
+        bool opened;
+        bool listed;
+        PortOpenFailure failure;
+    } cases[] = {
+        {ERROR_FILE_NOT_FOUND, false, true, PortOpenFailure::NotPresent},
+        {ERROR_PATH_NOT_FOUND, false, true, PortOpenFailure::NotPresent},
+        {ERROR_ACCESS_DENIED, false, true, PortOpenFailure::InUse},
+        {ERROR_ACCESS_DENIED, false, false, PortOpenFailure::InUse},
+        {ERROR_SHARING_VIOLATION, false, true, PortOpenFailure::InUse},
+        {ERROR_GEN_FAILURE, false, true, PortOpenFailure::Other},
+        {ERROR_GEN_FAILURE, false, false, PortOpenFailure::NotPresent},
+        // Opened, then refused its settings: the device is there.
+        {ERROR_INVALID_PARAMETER, true, false, PortOpenFailure::Other},
+        {ERROR_FILE_NOT_FOUND, true, true, PortOpenFailure::Other},
+    };
+    for (const auto& test : cases) {
+        EXPECT_EQ(test.failure, ClassifyPortOpenFailure(test.error, test.opened, test.listed))
+            << test.error << " opened " << test.opened << " listed " << test.listed;
+    }
 }
 
 TEST(SerialDriverSetup, DeviceControlFlagsLandInTheirBits) {

@@ -107,7 +107,7 @@ TEST_F(StationDialog, NewStationOpensWithTheListsAndStoresOnOkOnly) {
     }
 }
 
-TEST_F(StationDialog, EditModeShowsUnlistedValuesAsNoSelectionAndApplyStoresBeforeCancel) {
+TEST_F(StationDialog, EditModeKeepsWhatTheRecordHoldsAndRefusesAValueTheRuleDoesNot) {
     Station odd = DefaultStation();
     odd.Name = L"Odd one";
     odd.BaudRate = 19200;
@@ -118,30 +118,38 @@ TEST_F(StationDialog, EditModeShowsUnlistedValuesAsNoSelectionAndApplyStoresBefo
     odd.Flow = 1;
     odd.Manufacturer = L"Maker";
     ASSERT_EQ(S_OK, AddStation(odd));
-    Station station = odd;  // as the folder holds it: the store would read the port as COM3
+    Station station = odd;
     station.Model = L"Some other level";
     CStationDialog dialog(nullptr, station, false);
     const INT_PTR result = RunSheet(dialog, [&](const StationPage& page) {
         EXPECT_EQ(L"Digital Level properties", Text(page.frame));
-        EXPECT_EQ(L"", page.Selected(IDC_STATION_BAUD)) << "19200 is not offered";
+        EXPECT_EQ(L"19200", page.Selected(IDC_STATION_BAUD)) << "the station's own rate";
         EXPECT_EQ(L"None", page.Selected(IDC_STATION_PARITY));
-        EXPECT_EQ(L"", page.Selected(IDC_STATION_PORT));
+        EXPECT_EQ(L"COM9 (not present)", page.Selected(IDC_STATION_PORT));
         EXPECT_EQ(L"", page.Selected(IDC_STATION_MODEL));
         EXPECT_FALSE(page.ApplyEnabled());
         page.Type(L"North");  // another station's name: accepted when editing
         EXPECT_TRUE(page.ApplyEnabled());
+        page.Press(PSBTN_APPLYNOW);  // refused: no model
+        EXPECT_TRUE(::IsWindow(page.frame));
+        page.Pick(IDC_STATION_MODEL, L"Quorvel LV-20");
         page.Press(PSBTN_APPLYNOW);
         EXPECT_TRUE(::IsWindow(page.frame));
         page.Press(PSBTN_CANCEL);
     });
     EXPECT_EQ(IDCANCEL, result);
-    EXPECT_TRUE(user_.MessageBoxes().empty());
+    const auto boxes = user_.MessageBoxes();
+    ASSERT_EQ(1u, boxes.size());
+    EXPECT_EQ(L"This digital level cannot be stored: its value Model is not allowed (\"\" is not "
+              L"a model; the models are \"Quorvel LV-10\", \"Quorvel LV-20\", \"Quorvel "
+              L"LV-30\").",
+              boxes[0].text);
     const std::vector<std::wstring> names = ListStationNames();
     EXPECT_EQ(2, std::count(names.begin(), names.end(), L"North")) << "Apply stored the rename";
-    EXPECT_EQ(0u, station.BaudRate);
+    EXPECT_EQ(19200u, station.BaudRate);
     EXPECT_EQ(0u, station.Parity);
-    EXPECT_EQ(L"", station.Port);
-    EXPECT_EQ(L"", station.Model) << "no selection reads back as no text";
+    EXPECT_EQ(L"COM9", station.Port) << "the mark is not stored";
+    EXPECT_EQ(L"Quorvel LV-20", station.Model);
     // Values the page does not show are kept.
     EXPECT_EQ(2u, station.StopBits);
     EXPECT_EQ(8u, station.DataBits);
@@ -149,16 +157,70 @@ TEST_F(StationDialog, EditModeShowsUnlistedValuesAsNoSelectionAndApplyStoresBefo
     EXPECT_EQ(L"Maker", station.Manufacturer);
 }
 
+TEST_F(StationDialog, AnAbsentPortAnd19200SurviveOkAndAnAdapterPluggedInAppearsWhenTheListOpens) {
+    registry_.SetSerialPorts({L"COM7", L"COM8"});
+    Station fast = DefaultStation();
+    fast.Name = L"Fast";
+    fast.Port = L"COM9";
+    fast.BaudRate = 19200;
+    ASSERT_EQ(S_OK, AddStation(fast));  // "Station 1", after the fixture's North
+    Station station = fast;
+    CStationDialog dialog(nullptr, station, false);
+    std::vector<std::wstring> listed;
+    const INT_PTR result = RunSheet(dialog, [&](const StationPage& page) {
+        EXPECT_EQ(L"COM9 (not present)", page.Selected(IDC_STATION_PORT));
+        EXPECT_EQ(L"19200", page.Selected(IDC_STATION_BAUD));
+        registry_.SetSerialPorts({L"COM7", L"COM8", L"COM12"});
+        const HWND ports = ::GetDlgItem(page.window, IDC_STATION_PORT);
+        ::SendMessageW(ports, CB_SHOWDROPDOWN, TRUE, 0);
+        for (LRESULT i = 0; i < ::SendMessageW(ports, CB_GETCOUNT, 0, 0); ++i) {
+            wchar_t text[64] = {};
+            ::SendMessageW(ports, CB_GETLBTEXT, i, reinterpret_cast<LPARAM>(text));
+            listed.push_back(text);
+        }
+        EXPECT_EQ(L"COM9 (not present)", page.Selected(IDC_STATION_PORT)) << "kept selected";
+        // The mark fits beside the list's button: measured in the list's own font.
+        const HDC dc = ::GetDC(ports);
+        const HGDIOBJ font =
+            ::SelectObject(dc, reinterpret_cast<HFONT>(::SendMessageW(ports, WM_GETFONT, 0, 0)));
+        const std::wstring longest = L"COM12 (not present)";
+        SIZE extent{};
+        ::GetTextExtentPoint32W(dc, longest.c_str(), static_cast<int>(longest.size()), &extent);
+        ::SelectObject(dc, font);
+        ::ReleaseDC(ports, dc);
+        RECT box{};
+        ::GetClientRect(ports, &box);
+        EXPECT_LT(extent.cx, box.right - ::GetSystemMetrics(SM_CXVSCROLL) - 4);
+        ::SendMessageW(ports, CB_SHOWDROPDOWN, FALSE, 0);
+        page.Press(PSBTN_OK);
+    });
+    EXPECT_EQ(IDOK, result);
+    EXPECT_TRUE(user_.MessageBoxes().empty());
+    EXPECT_EQ((std::vector<std::wstring>{L"COM12", L"COM7", L"COM8", L"COM9 (not present)"}),
+              listed);
+    // Read back from the registry: the store's own reading would replace an absent port.
+    const std::wstring key = StationsKeyPath() + L"\\Station 1";
+    wchar_t port[16] = {};
+    DWORD portBytes = sizeof port;
+    ASSERT_EQ(ERROR_SUCCESS, ::RegGetValueW(HKEY_CURRENT_USER, key.c_str(), L"Port",
+                                            RRF_RT_REG_SZ, nullptr, port, &portBytes));
+    EXPECT_STREQ(L"COM9", port);
+    DWORD baud = 0, baudBytes = sizeof baud;
+    ASSERT_EQ(ERROR_SUCCESS, ::RegGetValueW(HKEY_CURRENT_USER, key.c_str(), L"BaudRate",
+                                            RRF_RT_REG_DWORD, nullptr, &baud, &baudBytes));
+    EXPECT_EQ(19200u, baud);
+}
+
 TEST_F(StationDialog, OkOnAStationMissingFromTheStoreShowsItsWholeNameAndStoresNothing) {
     Station station = DefaultStation();
-    station.Name = std::wstring(300, L'n');  // longer than the store keeps: never found there
+    station.Name = std::wstring(259, L'n');  // the longest name the rule allows, never stored
     CStationDialog dialog(nullptr, station, false);
     const INT_PTR result = RunSheet(dialog, [&](const StationPage& page) {
         EXPECT_EQ(station.Name, Text(page.window, IDC_STATION_NAME_EDIT));
         page.Press(PSBTN_OK);
     });
     EXPECT_EQ(IDOK, result);
-    EXPECT_EQ(std::wstring(300, L'n'), station.Name);
+    EXPECT_EQ(std::wstring(259, L'n'), station.Name);
     EXPECT_EQ(std::vector<std::wstring>{L"North"}, ListStationNames());
 }
 

@@ -217,17 +217,21 @@ TEST_F(StationStore, ANameTheFolderCannotListAsItselfIsListedUnderNoOtherName) {
     EXPECT_NE(std::wstring::npos, text.find(L"(first: \"Station 0\")"));
 }
 
-TEST_F(StationStore, PortFallsBackToTheFirstListedPort) {
+TEST_F(StationStore, AnAbsentPortFallsBackOnlyToTheOnePortPresent) {
     Station station = Named(L"A");
     station.Port = L"COM9";
     ASSERT_EQ(S_OK, AddStation(station));
     ASSERT_EQ(S_OK, FindStation(station));
     EXPECT_EQ(L"COM9", station.Port) << "no serial ports on the machine: the stored port stays";
 
+    registry_.SetSerialPorts({L"COM4"});
+    ASSERT_EQ(S_OK, FindStation(station));
+    EXPECT_EQ(L"COM4", station.Port) << "one port present: the renumbered adapter";
+
     registry_.SetSerialPorts({L"COM3", L"COM4"});
     EXPECT_EQ((Names{L"COM3", L"COM4"}), ListSerialPorts());
     ASSERT_EQ(S_OK, FindStation(station));
-    EXPECT_EQ(L"COM3", station.Port);
+    EXPECT_EQ(L"COM9", station.Port) << "several ports present: the first would be a guess";
 }
 
 TEST_F(StationStore, UnknownModelsReadBackAsTheFirstModel) {

@@ -4,10 +4,12 @@
 #include <commctrl.h>
 
 #include <cwchar>
+#include <optional>
 #include <string>
 #include <vector>
 
 #include "res/resource.h"
+#include "stations/portable/station_fields.h"
 #include "stations/portable/station_names.h"
 #include "stations/serial_ports.h"
 #include "stations/station_dialog.h"
@@ -31,7 +33,8 @@ const wchar_t kUsage[] =
     L"  lvstations ports                the serial ports of this computer\n"
     L"  lvstations add NAME [options]   adds a station (fails if the name is taken)\n"
     L"      --port COMn                 serial port (default: the first port of the computer)\n"
-    L"      --baud N                    baud rate (default 9600)\n"
+    L"      --baud N                    baud rate (default 9600): 300, 600, 1200, 2400, 4800,\n"
+    L"                                  9600, 14400, 19200, 38400, 57600 or 115200\n"
     L"      --parity none|odd|even      parity (default even)\n"
     L"      --model TEXT                \"Quorvel LV-10\" (default), \"Quorvel LV-20\" or "
     L"\"Quorvel LV-30\"\n"
@@ -87,6 +90,16 @@ int Add(int argc, wchar_t** argv) {
         PrintUtf8(L"A station name must not be empty, be longer than " +
                   std::to_wstring(kMaximumStationNameLength) +
                   L" characters or contain \\ / \" or *.\n");
+        return 1;
+    }
+    // The rule of the sheet and of station files: what is added here exports and imports back.
+    const std::vector<std::wstring> models = {LoadUiText(IDS_MODEL_LV10),
+                                              LoadUiText(IDS_MODEL_LV20),
+                                              LoadUiText(IDS_MODEL_LV30)};
+    if (const std::optional<StationFieldRefusal> refusal = RefusedStation(station, models)) {
+        PrintUtf8(L"The station cannot be added: " +
+                  std::wstring(StationFieldOf(refusal->field).valueName) + L": " +
+                  refusal->reason + L".\n");
         return 1;
     }
     const HRESULT result = AddStation(station);

@@ -84,10 +84,16 @@ std::wstring PortWarning(const std::wstring& path, const StationFileWarning& war
                         Quoted(warning.station) + L" uses the port " + Quoted(warning.port) + L", ";
     if (ports.empty())
         return text + L"and this computer lists no serial ports; stored as written.";
-    return text +
-           L"which this computer does not list; stored as written (until the port exists, "
-           L"the folder shows the computer's first port, " +
-           ports.front() + L").";
+    // As the store reads it back: the one port a computer has stands in for an absent one;
+    // among several, none is guessed.
+    if (ports.size() == 1) {
+        return text +
+               L"which this computer does not list; stored as written (until the port exists, "
+               L"the folder uses the computer's only port, " +
+               ports.front() + L").";
+    }
+    return text + L"which this computer does not list; stored as written (the download names the "
+                  L"ports present until the port exists).";
 }
 
 // Whether the store now holds the station exactly as the file gave it.

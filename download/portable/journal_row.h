@@ -1,0 +1,51 @@
+// The download journal's rows as CSV (RFC 4180) in UTF-8, without I/O.
+#pragma once
+
+#include <cstdint>
+#include <string>
+
+#include "support/portable/wide_text.h"
+
+enum class JournalResult { Ok, Cancelled, Failed };
+
+// A moment as the journal shows it: local time and its offset from UTC.
+struct JournalTime {
+    int Year = 0;
+    int Month = 0;
+    int Day = 0;
+    int Hour = 0;
+    int Minute = 0;
+    int Second = 0;
+    int OffsetMinutes = 0;  // local minus UTC
+};
+
+struct JournalRow {
+    JournalTime Start;
+    WideString Station;
+    WideString Port;
+    uint32_t Baud = 0;
+    uint32_t Parity = 0;     // the station's stored code: 0 none, 1 odd, 2 even
+    WideString Model;
+    uint32_t Procedure = 0;  // the station's stored selector
+    uint64_t Bytes = 0;
+    double Seconds = 0;
+    JournalResult Result = JournalResult::Failed;
+    WideString Message;
+    WideString KeptFile;
+};
+
+// The header row, CRLF-terminated.
+[[nodiscard]] std::string JournalHeader();
+
+// One row, CRLF-terminated; fields with a comma, a quote or a line break are quoted, quotes
+// doubled.
+[[nodiscard]] std::string FormatJournalRow(const JournalRow& row);
+
+// "2026-03-01T14:05:09+01:00"
+[[nodiscard]] std::string FormatJournalTime(const JournalTime& time);
+
+// UTF-16 to UTF-8; a lone surrogate becomes U+FFFD.
+[[nodiscard]] std::string Utf8FromWide(WideStringView text);
+
+// One CSV field, quoted when it must be.
+[[nodiscard]] std::string CsvField(std::string_view text);
