@@ -12,7 +12,7 @@ namespace {
 constexpr LONGLONG kFileTimeUnitsPerMinute = 60LL * 10000000;
 constexpr double kMillisecondsPerSecond = 1000.0;
 
-JournalTime LocalJournalTime(const FILETIME& utc) noexcept {
+LocalDateTime LocalJournalTime(const FILETIME& utc) noexcept {
     FILETIME local{};
     SYSTEMTIME parts{};
     if (!::FileTimeToLocalFileTime(&utc, &local) || !::FileTimeToSystemTime(&local, &parts))

@@ -140,8 +140,8 @@ HRESULT KeepDownload(const Station& station, const DownloadTarget& target,
             RETURN_IF_WIN32_BOOL_FALSE(writer.get() != INVALID_HANDLE_VALUE);
             RETURN_IF_FAILED(CopyWhole(reader.get(), writer.get()));
         }
-        const KeptFileTime time{localTime.wYear,  localTime.wMonth,  localTime.wDay,
-                                localTime.wHour,  localTime.wMinute, localTime.wSecond};
+        const LocalDateTime time{localTime.wYear, localTime.wMonth,  localTime.wDay,
+                                 localTime.wHour, localTime.wMinute, localTime.wSecond};
         const std::wstring extension = ModelExtension(station.Model);
         for (unsigned sequence = 1; sequence <= kMaxSameSecondNames; ++sequence) {
             const std::wstring name = folder + L"\\" + KeptFileName(time, extension, sequence);

@@ -104,7 +104,7 @@ std::string CsvField(std::string_view text) {
     return quoted;
 }
 
-std::string FormatJournalTime(const JournalTime& time) {
+std::string FormatJournalTime(const LocalDateTime& time) {
     const int offset = std::abs(time.OffsetMinutes);
     char text[64];
     std::snprintf(text, sizeof text, "%04d-%02d-%02dT%02d:%02d:%02d%c%02d:%02d", time.Year,

@@ -4,23 +4,13 @@
 #include <cstdint>
 #include <string>
 
+#include "download/portable/local_date_time.h"
 #include "support/portable/wide_text.h"
 
 enum class JournalResult { Ok, Cancelled, Failed };
 
-// A moment as the journal shows it: local time and its offset from UTC.
-struct JournalTime {
-    int Year = 0;
-    int Month = 0;
-    int Day = 0;
-    int Hour = 0;
-    int Minute = 0;
-    int Second = 0;
-    int OffsetMinutes = 0;  // local minus UTC
-};
-
 struct JournalRow {
-    JournalTime Start;
+    LocalDateTime Start;
     WideString Station;
     WideString Port;
     uint32_t Baud = 0;
@@ -42,7 +32,7 @@ struct JournalRow {
 [[nodiscard]] std::string FormatJournalRow(const JournalRow& row);
 
 // "2026-03-01T14:05:09+01:00"
-[[nodiscard]] std::string FormatJournalTime(const JournalTime& time);
+[[nodiscard]] std::string FormatJournalTime(const LocalDateTime& time);
 
 // UTF-16 to UTF-8; a lone surrogate becomes U+FFFD.
 [[nodiscard]] std::string Utf8FromWide(WideStringView text);

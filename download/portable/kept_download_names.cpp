@@ -90,7 +90,7 @@ WideString SafeFolderName(WideStringView stationName) {
     return name.empty() ? WideString(1, kReplacement) : name;
 }
 
-WideString KeptFileName(const KeptFileTime& time, WideStringView extension, unsigned sequence) {
+WideString KeptFileName(const LocalDateTime& time, WideStringView extension, unsigned sequence) {
     char text[64];
     std::snprintf(text, sizeof text, "%04d-%02d-%02d %02d%02d%02d", time.Year, time.Month,
                   time.Day, time.Hour, time.Minute, time.Second);

@@ -6,6 +6,7 @@
 #include <cstdint>
 #include <vector>
 
+#include "download/portable/local_date_time.h"
 #include "support/portable/wide_text.h"
 
 // The longest folder name made from a station's name, in UTF-16 units: room for the rest of the
@@ -18,19 +19,9 @@ constexpr size_t kKeptFolderNameLimit = 64;
 // or without an extension) gets a '_' in front. Never empty.
 [[nodiscard]] WideString SafeFolderName(WideStringView stationName);
 
-// A local time as the kept file's name shows it.
-struct KeptFileTime {
-    int Year = 0;
-    int Month = 0;
-    int Day = 0;
-    int Hour = 0;
-    int Minute = 0;
-    int Second = 0;
-};
-
 // "<YYYY-MM-DD HHMMSS><extension>", and for the second and later file of the same second
 // "<YYYY-MM-DD HHMMSS> (2)<extension>" and so on; sequence 1 is the plain name.
-[[nodiscard]] WideString KeptFileName(const KeptFileTime& time, WideStringView extension,
+[[nodiscard]] WideString KeptFileName(const LocalDateTime& time, WideStringView extension,
                                       unsigned sequence);
 
 // One kept file as retention sees it.

@@ -6,6 +6,7 @@
 
 #include "stations/portable/serial_port_list.h"
 #include "support/portable/byte_io.h"
+#include "tests/portable/registry_bytes.h"
 
 namespace {
 
@@ -17,18 +18,6 @@ struct StoredValue {
     RegistryValueType type;
     std::vector<uint8_t> data;
 };
-
-std::vector<uint8_t> Terminated(WideStringView text) {
-    std::vector<uint8_t> bytes;
-    AppendWideZ(bytes, text);
-    return bytes;
-}
-
-std::vector<uint8_t> Units(WideStringView text) {
-    std::vector<uint8_t> bytes = Terminated(text);
-    bytes.resize(bytes.size() - 2);
-    return bytes;
-}
 
 StoredValue Port(WideStringView device, WideStringView port) {
     return {WideString(device), RegistryValueType::kText, Terminated(port)};

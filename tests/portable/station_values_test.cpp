@@ -7,6 +7,7 @@
 
 #include "stations/portable/station_fields.h"
 #include "stations/portable/station_values.h"
+#include "tests/portable/registry_bytes.h"
 #include "tests/portable/station_value_table.h"
 
 namespace {
@@ -26,18 +27,6 @@ const Names kFullOrder = {WIDE_TEXT("Name"),     WIDE_TEXT("Port"),         WIDE
 
 std::string Narrow(WideStringView text) {
     return std::string(text.begin(), text.end());
-}
-
-std::vector<uint8_t> Terminated(WideStringView text) {
-    std::vector<uint8_t> bytes;
-    AppendWideZ(bytes, text);
-    return bytes;
-}
-
-std::vector<uint8_t> Units(WideStringView text) {
-    std::vector<uint8_t> bytes = Terminated(text);
-    bytes.resize(bytes.size() - 2);  // without its terminator
-    return bytes;
 }
 
 // A record whose every value differs from the defaults.

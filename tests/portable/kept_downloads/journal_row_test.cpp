@@ -91,7 +91,7 @@ TEST(JournalRow, ColumnsInOrder) {
 
 TEST(JournalRow, TimeCarriesItsOffset) {
     struct Case {
-        JournalTime time;
+        LocalDateTime time;
         const char* expected;
     } const cases[] = {
         {{2026, 1, 2, 3, 4, 5, 0}, "2026-01-02T03:04:05+00:00"},

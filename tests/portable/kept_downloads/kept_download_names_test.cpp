@@ -52,7 +52,7 @@ TEST(SafeFolderName, NeverSplitsASurrogatePair) {
 }
 
 TEST(KeptFileName, NamesTheSecondAndCountsRepeats) {
-    const KeptFileTime time{2026, 3, 1, 4, 5, 9};
+    const LocalDateTime time{2026, 3, 1, 4, 5, 9};
     EXPECT_EQ(W("2026-03-01 040509.lv"), KeptFileName(time, W(".lv"), 1));
     EXPECT_EQ(W("2026-03-01 040509 (2).lv"), KeptFileName(time, W(".lv"), 2));
     EXPECT_EQ(W("2026-03-01 040509 (13).hvr"), KeptFileName(time, W(".hvr"), 13));
