@@ -42,8 +42,10 @@ endfunction()
 function(lv_add_test name)
     cmake_parse_arguments(ARG "" "" "LIBS" ${ARGN})
     add_executable(${name} ${ARG_UNPARSED_ARGUMENTS})
-    target_link_libraries(${name} PRIVATE ${ARG_LIBS} lv_options lv_gtest_main)
+    target_link_libraries(${name} PRIVATE ${ARG_LIBS} lv_options)
     if(WIN32)
+        # GoogleTest's main with a watchdog that names a hanging case (tests/support).
+        target_link_libraries(${name} PRIVATE lv_test_main)
         # Test files are GoogleTest's templates above all: at -O1 with line tables only they
         # compile in about 60 % of the time of -O2 with full debug information, which was most of
         # the Windows build. The code under test keeps the release options it ships with.
@@ -56,6 +58,7 @@ function(lv_add_test name)
         target_link_libraries(${name} PRIVATE lv_error_log_test_folder)
         add_test(NAME ${name} COMMAND ${PROJECT_SOURCE_DIR}/scripts/wine-run $<TARGET_FILE:${name}>)
     else()
+        target_link_libraries(${name} PRIVATE lv_gtest_main)
         add_test(NAME ${name} COMMAND ${name})
     endif()
 endfunction()

@@ -7,7 +7,6 @@
 #include <cwchar>
 #include <filesystem>
 #include <fstream>
-#include <latch>
 #include <set>
 #include <string>
 #include <thread>
@@ -67,15 +66,19 @@ TEST(DownloadTarget, TargetsPreparedAtOnceGetNamesOfTheirOwn) {
     constexpr int kRounds = 20;
     std::vector<DownloadTarget> targets(2 * kRounds);
     for (int round = 0; round < kRounds; ++round) {
-        std::latch start(2);
+        // A manual-reset event as the starting gun: this toolchain's std::latch waits through
+        // libstdc++'s atomic wait, which on Windows can miss its wake-up and hang the test.
+        const UniqueHandle start(::CreateEventW(nullptr, TRUE, FALSE, nullptr));
+        ASSERT_NE(nullptr, start.get());
         HRESULT results[2] = {E_FAIL, E_FAIL};
         std::thread threads[2];
         for (int side = 0; side < 2; ++side) {
             threads[side] = std::thread([&, side] {
-                start.arrive_and_wait();
+                ::WaitForSingleObject(start.get(), INFINITE);
                 results[side] = DownloadTarget::Create(folder.Path(), targets[2 * round + side]);
             });
         }
+        ::SetEvent(start.get());
         for (std::thread& thread : threads)
             thread.join();
         ASSERT_EQ(S_OK, results[0]);
