@@ -1,13 +1,20 @@
 // Kept downloads: the whole-or-nothing copy, the policy and the pruning.
 #include "download/kept_downloads.h"
 
+#include <shellapi.h>
+
 #include <vector>
 
 #include "download/download_records_folder.h"
+#include "download/portable/driver_text.h"
+#include "res/resource.h"
 #include "stations/station_models.h"
 #include "support/error_handling.h"
+#include "support/module_instance.h"
 #include "support/registry_value.h"
+#include "support/text_lookup.h"
 #include "support/unique_resource.h"
+#include "support/user_interface.h"
 
 namespace {
 
@@ -200,4 +207,33 @@ void PruneKeptDownloads(const std::wstring& downloadsFolder, RetentionLimits lim
         }
     }
     CATCH_LOG()
+}
+
+HRESULT OpenKeptDownloadsFolder(HWND owner, int showCommand) noexcept {
+    try {
+        const std::wstring folder = KeptDownloadsFolder();
+        const HRESULT made =
+            folder.empty() ? HRESULT_FROM_WIN32(ERROR_PATH_NOT_FOUND) : EnsureFolder(folder);
+        if (FAILED(made)) {
+            // Without a path the user is told where it should have been.
+            const std::wstring shown =
+                folder.empty() ? L"%LOCALAPPDATA%\\Quorvel\\Digital Levels\\Downloads" : folder;
+            ShowMessageBox(owner,
+                           FormatDriverText(LoadUiText(IDS_KEPT_DOWNLOADS_UNAVAILABLE),
+                                            {shown, SystemResultText(made)}),
+                           LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONSTOP);
+            return made;
+        }
+        SHELLEXECUTEINFOW execute{};
+        execute.cbSize = sizeof execute;
+        // The caller (rundll32) ends its process as soon as this returns: an activation that
+        // went on in the background would die with it.
+        execute.fMask = SEE_MASK_NOASYNC;
+        execute.hwnd = owner;
+        execute.lpFile = folder.c_str();
+        execute.nShow = showCommand;
+        RETURN_IF_WIN32_BOOL_FALSE(::ShellExecuteExW(&execute));
+        return S_OK;
+    }
+    CATCH_RETURN()
 }

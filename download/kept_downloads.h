@@ -34,3 +34,8 @@ void PruneKeptDownloads(const std::wstring& downloadsFolder, RetentionLimits lim
 
 // "<records>\Downloads", empty when the records folder cannot be had.
 [[nodiscard]] std::wstring KeptDownloadsFolder() noexcept;
+
+// Opens "<records>\Downloads" in a shell window (the Start menu's "Kept downloads"), created first
+// so that it opens before the first download too. A folder that cannot be had is shown to the
+// user over owner; a shell that cannot open it shows its own message.
+[[nodiscard]] HRESULT OpenKeptDownloadsFolder(HWND owner, int showCommand) noexcept;

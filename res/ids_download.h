@@ -44,4 +44,7 @@
 #define IDS_DOWNLOAD_INCOMPLETE 1101
 // A second download through the external library while one runs (or has not ended yet).
 #define IDS_LIBRARY_DOWNLOAD_RUNNING 1102
+// The Start menu's "Kept downloads" cannot make or reach the folder. Arguments: the folder, the
+// system's text.
+#define IDS_KEPT_DOWNLOADS_UNAVAILABLE 1103
 // The results -101 and -102 use the serial driver's texts 1070 and 1053 (res/ids_serial.h).

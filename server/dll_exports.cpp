@@ -1,7 +1,9 @@
-// The entry points of the COM server: DllMain and the four exports.
+// The entry points of the COM server: DllMain and the four exports; and the Start menu's "Kept
+// downloads", which rundll32 calls.
 #include <windows.h>
 #include <objbase.h>
 
+#include "download/kept_downloads.h"
 #include "server/class_table.h"
 #include "server/module_app.h"
 #include "server/registration.h"
@@ -41,4 +43,18 @@ STDAPI DllRegisterServer() {
 
 STDAPI DllUnregisterServer() {
     return UnregisterServer(g_module);
+}
+
+
+// rundll32 "<folder>\LVShellExt.dll",OpenKeptDownloads: rundll32 takes the W form first.
+// Opens the current user's folder of kept downloads; the command line is not read.
+extern "C" void CALLBACK OpenKeptDownloadsW(HWND window, HINSTANCE, LPWSTR, int showCommand) {
+    // The shell may hand the folder to extensions that need a single-threaded apartment.
+    const HRESULT initialized =
+        ::CoInitializeEx(nullptr, COINIT_APARTMENTTHREADED | COINIT_DISABLE_OLE1DDE);
+    // A failure has been shown to the user and logged where it happened; rundll32 has no use
+    // for a result.
+    (void)OpenKeptDownloadsFolder(window, showCommand);
+    if (SUCCEEDED(initialized))
+        ::CoUninitialize();
 }

@@ -30,6 +30,7 @@ import secrets
 import shutil
 import subprocess
 import sys
+import time
 import zlib
 
 import folder_lock
@@ -70,6 +71,7 @@ START_MENU_FOLDER = "Quorvel Digital Levels"
 GUIDES = {"User guide": "User guide.html", "Benutzerhandbuch": "Benutzerhandbuch.html",
           "Administrator's guide": "Administrator's guide.html",
           "Administratorhandbuch": "Administratorhandbuch.html"}
+KEPT_DOWNLOADS = "Kept downloads"
 BINARIES = ["LVShellExt.dll", "lvcopy.exe", "lvrecv.exe", "lvstations.exe"]
 results = []
 
@@ -386,10 +388,44 @@ def check_shortcuts(prefix, folder):
         link = os.path.join(found[0], name + ".lnk") if found else ""
         if (folder + "\\" + target).encode("latin-1") not in file_bytes(link):
             wrong.append(name)
-    check(names == sorted(name + ".lnk" for name in GUIDES) and not wrong,
+    kept = file_bytes(os.path.join(found[0], KEPT_DOWNLOADS + ".lnk") if found else "")
+    # The rundll32 of the extension's bitness: in a 64-bit prefix the x86 package's is SysWOW64's.
+    system = "syswow64" if folder == PROGRAM_FILES_X86 else "system32"
+    if not (f"\\{system}\\rundll32.exe".encode() in kept.lower() and
+            f'"{folder}\\LVShellExt.dll",OpenKeptDownloads'.encode("utf-16-le") in kept):
+        wrong.append(KEPT_DOWNLOADS)
+    check(names == sorted(name + ".lnk" for name in list(GUIDES) + [KEPT_DOWNLOADS]) and not wrong,
           f"the Start-menu folder \"{START_MENU_FOLDER}\" has a shortcut to each guide in "
-          f"{folder}: {', '.join(GUIDES)}",
-          f"folders: {found}\nshortcuts: {names}\nnot naming their guide: {wrong}")
+          f"{folder}: {', '.join(GUIDES)}, and \"{KEPT_DOWNLOADS}\" runs the extension in it",
+          f"folders: {found}\nshortcuts: {names}\nnot naming their target: {wrong}")
+
+
+def check_kept_downloads_entry(prefix):
+    """The Start-menu entry "Kept downloads", opened as a user opens it, before any download: the
+    user's folder is made and a window shows it. The window is closed again, so that the
+    uninstall after it finds nothing of the package in use."""
+    found = start_menu_folders(prefix)
+    link = os.path.join(found[0], KEPT_DOWNLOADS + ".lnk") if found else ""
+    # No pipes: the window's process inherits them and keeps them open. start returns once the
+    # shortcut is launched, not when rundll32 ends: the folder and the window are waited for.
+    started = subprocess.run(["wine", "start", "/unix", link], env=prefix.env,
+                             stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL, timeout=60)
+    made, shown = [], False
+    for _ in range(60):
+        made = glob.glob(os.path.join(prefix.unix("C:"), "users", "*", "AppData", "Local",
+                                      "Quorvel", "Digital Levels", "Downloads"))
+        shown = '"Downloads": ("explorer.exe"' in subprocess.run(
+            ["xwininfo", "-root", "-tree"], capture_output=True, text=True, errors="replace").stdout
+        if made and shown:
+            break
+        time.sleep(0.5)
+    check(started.returncode == 0 and len(made) == 1 and os.path.isdir(made[0]) and shown,
+          f"the Start-menu entry \"{KEPT_DOWNLOADS}\" makes the user's folder of kept downloads "
+          "and opens it in a window",
+          f"exit code of start {started.returncode}\nfolders: {made}\nwindow shown: {shown}")
+    # Asked to close (WM_CLOSE), as a user closes it.
+    subprocess.run(["wine", "taskkill", "/im", "explorer.exe"], env=prefix.env,
+                   stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL, timeout=60)
 
 
 def text_file(path):
@@ -449,6 +485,10 @@ for guide in ("Administrator's guide.html", "Administratorhandbuch.html"):
     check("<h1>" in page and 'src="admin/x86-refused.png"' in page and "INSTALLDIR" in page,
           f"{guide} is the administrator's guide as HTML, with its picture")
 check_shortcuts(prefix, PROGRAM_FILES)
+if os.environ.get("DISPLAY"):
+    check_kept_downloads_entry(prefix)
+else:
+    check(False, "opening the kept downloads needs a display (scripts/test starts one)")
 check(not any("halvekcomm" in name.lower()
               for folder in (r"C:\Program Files", r"C:\Program Files (x86)")
               for _, _, names in os.walk(prefix.unix(folder)) for name in names),
@@ -505,6 +545,9 @@ for folder in (r"C:\Program Files\Quorvel", r"C:\Program Files (x86)\Quorvel"):
     check(not os.path.exists(prefix.unix(folder)), f"{folder} is gone")
 check(not start_menu_folders(prefix),
       f"the Start-menu folder \"{START_MENU_FOLDER}\" and its shortcuts are gone")
+kept = glob.glob(os.path.join(prefix.unix("C:"), "users", "*", "AppData", "Local", "Quorvel",
+                              "Digital Levels", "Downloads"))
+check(len(kept) == 1, "the user's folder of kept downloads stays: it is the user's data")
 stations = prefix.wine(os.path.join(tools, "lvstations.exe"), "list")
 check(STATION in stations.stdout, "the user's station is still there", stations.stdout)
 check(STATION not in prefix.wine(os.path.join(tools, "lvbrowse.exe")).stdout,
