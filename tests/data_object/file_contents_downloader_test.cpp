@@ -17,6 +17,7 @@
 #include "download/download_journal.h"
 #include "download/kept_downloads.h"
 #include "download/station_downloader.h"
+#include "support/module_instance.h"
 #include "tests/data_object/data_object_fixture.h"
 
 using Microsoft::WRL::ComPtr;
@@ -296,6 +297,21 @@ TEST_F(FileContentsDownloader, AKeptFolderThatCannotBeWrittenStillHandsTheStream
     EXPECT_EQ("ok", journal[1][kResult]);
     EXPECT_EQ("", journal[1][kKeptFile]);
     EXPECT_FALSE(journal[1][kMessage].empty()) << "the row names why nothing was kept";
+}
+
+// The Start menu's "Kept downloads" with a file where the folder should be: the user is told
+// which folder and why, and no window is opened on something else.
+TEST_F(FileContentsDownloader, AKeptFolderThatCannotBeMadeIsNamedToTheUser) {
+    std::ofstream(records_ / kKeptDownloadsFolderName) << "in the way";
+    ScriptedDialogs dialogs(IDOK);
+    ScopedUserInterface scope(dialogs);
+    EXPECT_EQ(HRESULT_FROM_WIN32(ERROR_DIRECTORY), OpenKeptDownloadsFolder(nullptr, SW_SHOWNORMAL));
+    ASSERT_EQ(1u, dialogs.messages.size());
+    const std::wstring& text = dialogs.messages[0];
+    EXPECT_NE(std::wstring::npos, text.find((records_ / kKeptDownloadsFolderName).wstring()))
+        << text;
+    EXPECT_NE(std::wstring::npos, text.find(SystemResultText(HRESULT_FROM_WIN32(ERROR_DIRECTORY))))
+        << text;
 }
 
 TEST_F(FileContentsDownloader, AJournalThatCannotBeOpenedFailsNothing) {
