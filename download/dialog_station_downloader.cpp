@@ -13,7 +13,8 @@
 
 HRESULT DialogStationDownloader::Download(HWND owner, const Station& station,
                                           const PrepareTargetFunction& prepareTarget,
-                                          std::wstring& file) noexcept {
+                                          std::wstring& file,
+                                          std::wstring& shownFailure) noexcept {
     try {
         const bool external = IsExternalLibraryModel(station.Model);
         INT_PTR answer = -1;
@@ -23,6 +24,7 @@ HRESULT DialogStationDownloader::Download(HWND owner, const Station& station,
             answer = dialog.DoModal();
             completed = dialog.TransferCompleted();
             downloadResult = dialog.DownloadResult();
+            shownFailure = dialog.FailureText();
         };
         // One library download per process: the library's completion says nothing of which download
         // it ends. A second one is refused before its target, its dialog or the library is touched.
@@ -30,8 +32,9 @@ HRESULT DialogStationDownloader::Download(HWND owner, const Station& station,
         if (external) {
             claim = HalvekLibraryClaim::TryTake();
             if (!claim) {
-                ShowMessageBox(owner, LoadUiText(IDS_LIBRARY_DOWNLOAD_RUNNING),
-                               LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONEXCLAMATION);
+                shownFailure = LoadUiText(IDS_LIBRARY_DOWNLOAD_RUNNING);
+                ShowMessageBox(owner, shownFailure, LoadUiText(IDS_DIGITAL_LEVELS),
+                               MB_ICONEXCLAMATION);
                 return HRESULT_FROM_WIN32(ERROR_BUSY);
             }
         }

@@ -14,7 +14,7 @@ public:
     // the user is told so and ERROR_BUSY is returned, before any dialog opens.
     [[nodiscard]] HRESULT Download(HWND owner, const Station& station,
                                    const PrepareTargetFunction& prepareTarget,
-                                   std::wstring& file) noexcept override;
+                                   std::wstring& file, std::wstring& shownFailure) noexcept override;
 };
 
 // The downloader that production code hands to a data object (may throw bad_alloc).

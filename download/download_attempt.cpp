@@ -53,7 +53,8 @@ DownloadAttempt::DownloadAttempt(const Station& station) noexcept : station_(sta
     startTicks_ = ::GetTickCount64();
 }
 
-void DownloadAttempt::Finish(HRESULT result, const DownloadTarget* target) noexcept {
+void DownloadAttempt::Finish(HRESULT result, const DownloadTarget* target,
+                             const std::wstring& shownFailure) noexcept {
     try {
         JournalRow row;
         row.Start = LocalJournalTime(startUtc_);
@@ -66,8 +67,12 @@ void DownloadAttempt::Finish(HRESULT result, const DownloadTarget* target) noexc
         row.Bytes = WrittenBytes(target);
         row.Seconds = static_cast<double>(::GetTickCount64() - startTicks_) / kMillisecondsPerSecond;
         row.Result = ResultOf(result);
-        if (FAILED(result))
+        if (result != S_OK && !shownFailure.empty()) {
+            row.Result = JournalResult::Failed;
+            row.Message = shownFailure;
+        } else if (FAILED(result)) {
             row.Message = ResultText(result);
+        }
 
         if (result == S_OK && target && *target) {
             SYSTEMTIME completed{};

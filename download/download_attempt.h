@@ -13,10 +13,12 @@ public:
     explicit DownloadAttempt(const Station& station) noexcept;
 
     // result is the downloader's (S_OK complete, S_FALSE cancelled, else failed); target is null
-    // when the download ended before it had one. A completed download is kept (and the kept
-    // downloads pruned) before the row is written. Nothing here can fail the download: every
-    // failure is logged, and a failure to keep is named in the row.
-    void Finish(HRESULT result, const DownloadTarget* target) noexcept;
+    // when the download ended before it had one; shownFailure is the failure the user was shown,
+    // which makes an S_FALSE a failure and is the row's reason. A completed download is kept (and
+    // the kept downloads pruned) before the row is written. Nothing here can fail the download:
+    // every failure is logged, and a failure to keep is named in the row.
+    void Finish(HRESULT result, const DownloadTarget* target,
+                const std::wstring& shownFailure) noexcept;
 
 private:
     const Station& station_;

@@ -23,6 +23,13 @@ HRESULT CDownloadProgressDialog::DownloadResult() const noexcept {
     return thread_ ? thread_->DownloadResult() : CProgressDialogBase::DownloadResult();
 }
 
+std::wstring CDownloadProgressDialog::FailureText() const {
+    std::wstring text = CProgressDialogBase::FailureText();
+    if (text.empty() && thread_ && thread_->WaitExpired())
+        text = LoadUiText(IDS_SERIAL_WAIT_EXPIRED);
+    return text;
+}
+
 BOOL CDownloadProgressDialog::OnInitDialog() {
     // The Start button keeps its template text.
     ShowInitialTexts(IDS_DOWNLOAD_TITLE);
@@ -81,6 +88,7 @@ void CDownloadProgressDialog::OnThreadMessage(WPARAM code, LPARAM text) {
     if (kind == MessageCode::Error || kind == MessageCode::PortNotOpened) {
         // The dialog stays open: the thread ends and closes it. The text is freed once the box
         // is closed, which is what the thread waits for before it shows a box of its own.
+        NoteFailure(message);
         ShowMessageBox(Window(), message, LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONSTOP);
         CLVDownloadThread::FreeMessageText(text);
         return;

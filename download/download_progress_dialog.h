@@ -18,6 +18,7 @@ public:
     ~CDownloadProgressDialog() override;
 
     [[nodiscard]] HRESULT DownloadResult() const noexcept override;
+    [[nodiscard]] std::wstring FailureText() const override;
 
 protected:
     BOOL OnInitDialog() override;

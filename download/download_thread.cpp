@@ -116,6 +116,8 @@ DWORD CLVDownloadThread::Run() {
     const std::optional<TransferResult> result =
         driver_ ? std::optional(driver_->ReceiveLines()) : std::nullopt;
     if (result == TransferResult::Failed) {
+        // Before the box: the dialog may end while it is up, and its caller reads this then.
+        waitExpired_ = !IsStopRequested();
         // The dialog shows the driver's own messages (a full disk, say) in boxes of its own: one
         // box after the other, the reason before the summary, not two at once from two threads.
         WaitForShownTexts();

@@ -42,6 +42,9 @@ public:
     // system refused, S_FALSE for a receive that failed otherwise (time-out, cancel), S_OK when
     // the file is complete or no receive ended yet.
     [[nodiscard]] HRESULT DownloadResult() const noexcept { return result_.load(); }
+    // True once Run has shown "The waiting time of the data has expired." for a receive that
+    // failed without being asked to stop (a stop is the surveyor's cancel, not a failure).
+    [[nodiscard]] bool WaitExpired() const noexcept { return waitExpired_.load(); }
     const TAZCommParams& ConnectionRecord() const noexcept { return *params_; }
 
     // The text copies handed over with "Download Thread Message": the receiver frees each one
@@ -65,4 +68,5 @@ private:
     Station station_;
     bool received_ = false;  // written and read on the worker only
     std::atomic<HRESULT> result_{S_OK};  // written by the worker before it posts its end
+    std::atomic<bool> waitExpired_{false};  // likewise
 };

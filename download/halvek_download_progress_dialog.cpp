@@ -124,7 +124,7 @@ void CHalvekDownloadProgressDialog::OnStart() {
     const int32_t code = library_->StartDownload(kStartFirst, kStartSecond);
     if (code != kHalvekNoError) {
         claim_.ExpectCompletion(false);
-        FailWith(HalvekResultText(code));
+        FailWith(HalvekResultText(code), code == kHalvekCancelled);
         return;
     }
     SetStatus(IDS_DOWNLOADING);
@@ -133,7 +133,7 @@ void CHalvekDownloadProgressDialog::OnStart() {
 
 void CHalvekDownloadProgressDialog::OnLibraryResult(int32_t code) {
     if (code != kHalvekNoError) {
-        FailWith(HalvekResultText(code));
+        FailWith(HalvekResultText(code), code == kHalvekCancelled);
         return;
     }
     // The library writes its file under the given name with ".txt" added.
@@ -151,15 +151,17 @@ void CHalvekDownloadProgressDialog::OnCancelWaitOver() {
     // A completion already on its way ends the dialog with its own result.
     if (claim_.CompletionArrived())
         return;
-    FailWith(HalvekResultText(kHalvekCancelled));
+    FailWith(HalvekResultText(kHalvekCancelled), true);
 }
 
-void CHalvekDownloadProgressDialog::FailWith(const std::wstring& text) {
+void CHalvekDownloadProgressDialog::FailWith(const std::wstring& text, bool cancelled) {
     // One box per dialog: a result that arrives while the box is up (a late completion after the
     // cancel wait, say) finds the dialog already ending.
     if (ending_)
         return;
     ending_ = true;
+    if (!cancelled)
+        NoteFailure(text);
     ShowMessageBox(Window(), text, LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONEXCLAMATION);
     EndDialog(IDCANCEL);
 }

@@ -44,8 +44,9 @@ private:
     void OnStart();
     void OnLibraryResult(int32_t code);
     void OnCancelWaitOver();
-    // Shows the error box and ends the dialog with IDCANCEL.
-    void FailWith(const std::wstring& text);
+    // Shows the error box and ends the dialog with IDCANCEL. cancelled: the box reports the
+    // surveyor's own cancel, which is no failure.
+    void FailWith(const std::wstring& text, bool cancelled = false);
 
     HalvekLibraryClaim claim_;
     UniqueHalvekObject library_;

@@ -19,6 +19,10 @@ public:
     // download failed for a reason of the system's (the disk refused the file), so that the
     // caller can fail the copy with it rather than report a cancel; S_OK or S_FALSE otherwise.
     [[nodiscard]] virtual HRESULT DownloadResult() const noexcept { return downloadResult_; }
+    // The text of the failure the dialog showed the user (a port that could not be opened, a
+    // time-out, the library's error), once DoModal has returned; empty after a completion or the
+    // surveyor's cancel. The download records take it as the reason.
+    [[nodiscard]] virtual std::wstring FailureText() const { return failureText_; }
 
 protected:
     // parent may be null (the data object runs the dialog without one).
@@ -33,6 +37,11 @@ protected:
     void FinishTransfer();
     void SetStatus(UINT textId);
     void SetDownloadResult(HRESULT result) noexcept { downloadResult_ = result; }
+    // Keeps the first failure shown: the reason comes before any summary after it.
+    void NoteFailure(const std::wstring& text) {
+        if (failureText_.empty())
+            failureText_ = text;
+    }
 
     // An IDOK that did not come from FinishTransfer is ignored: on Windows, Enter in the
     // multi-line instructions (no ES_WANTRETURN) sends one, and a stray command must not pass a
@@ -49,4 +58,5 @@ private:
     std::wstring outputPath_;
     bool completed_ = false;
     HRESULT downloadResult_ = S_OK;
+    std::wstring failureText_;
 };

@@ -27,8 +27,10 @@ public:
     // S_FALSE: the surveyor cancelled, or the download ended without a file for no reason of the
     // system's. A failure: the download could not run, or the system refused the file (a full
     // disk), with its reason. Anything but S_OK may leave part of a file, which is the caller's
-    // to delete.
+    // to delete. shownFailure is set to the text of the failure the user was shown (a port that
+    // is not there, a time-out), if any: with S_FALSE too, since the user has seen it and the
+    // shell must not report it again, but the download records call it a failure.
     [[nodiscard]] virtual HRESULT Download(HWND owner, const Station& station,
                                            const PrepareTargetFunction& prepareTarget,
-                                           std::wstring& file) noexcept = 0;
+                                           std::wstring& file, std::wstring& shownFailure) noexcept = 0;
 };

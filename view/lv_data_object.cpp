@@ -196,12 +196,14 @@ HRESULT CLVDataObject::GetFileContents(LONG index, STGMEDIUM* medium) noexcept {
             return prepared;
         };
         std::wstring file;
+        std::wstring shownFailure;
         DownloadAttempt attempt(station);
-        const HRESULT downloaded = downloader_->Download(owner, station, prepareTarget, file);
+        const HRESULT downloaded =
+            downloader_->Download(owner, station, prepareTarget, file, shownFailure);
         // A download that ended before its target was made has nothing to clean up; its failure
         // (shown where it happened) fails the copy.
         if (!target) {
-            attempt.Finish(downloaded, nullptr);
+            attempt.Finish(downloaded, nullptr, shownFailure);
             if (FAILED(downloaded))
                 LV_LOG_AND_RETURN(downloaded);
             return S_FALSE;
@@ -210,7 +212,7 @@ HRESULT CLVDataObject::GetFileContents(LONG index, STGMEDIUM* medium) noexcept {
         // not complete (the target's end deletes it), the file the stream reads when it did.
         RETURN_IF_FAILED(target.AddWrittenFile(file));
         // Kept (when complete) and journaled before the shell can lose it; this never fails it.
-        attempt.Finish(downloaded, &target);
+        attempt.Finish(downloaded, &target, shownFailure);
         if (downloaded != S_OK) {
             // A failure fails the copy with its reason, so that the caller reports a failure rather
             // than a cancel.

@@ -29,14 +29,17 @@ namespace {
 class ScriptedDownloader final : public StationDownloader {
 public:
     // refusesAtOnce: answers before it asks for its target, as a download that cannot run does.
+    // shownFailure: what the user was shown, as the dialogs report it.
     ScriptedDownloader(HRESULT result, std::optional<std::string> written,
-                       bool refusesAtOnce = false)
-        : result_(result), written_(std::move(written)), refusesAtOnce_(refusesAtOnce) {}
+                       bool refusesAtOnce = false, std::wstring shownFailure = {})
+        : result_(result), written_(std::move(written)), refusesAtOnce_(refusesAtOnce),
+          shownFailure_(std::move(shownFailure)) {}
 
     HRESULT Download(HWND, const Station& station, const PrepareTargetFunction& prepareTarget,
-                     std::wstring& file) noexcept override {
+                     std::wstring& file, std::wstring& shownFailure) noexcept override {
         ++runs;
         stationName = station.Name;
+        shownFailure = shownFailure_;
         if (refusesAtOnce_)
             return result_;
         std::wstring target;
@@ -62,6 +65,7 @@ private:
     const HRESULT result_;
     const std::optional<std::string> written_;
     const bool refusesAtOnce_;
+    const std::wstring shownFailure_;
 };
 
 namespace fs = std::filesystem;
@@ -73,11 +77,12 @@ protected:
 
     // One completed (or otherwise ended) download of North; the stream's content, if any.
     HRESULT DownloadNorth(HRESULT result, std::optional<std::string> written,
-                          std::string* content = nullptr, bool refusesAtOnce = false) {
+                          std::string* content = nullptr, bool refusesAtOnce = false,
+                          const std::wstring& shownFailure = {}) {
         ScriptedDialogs dialogs(IDOK);
         ScopedUserInterface scope(dialogs);
-        auto downloader =
-            std::make_shared<ScriptedDownloader>(result, std::move(written), refusesAtOnce);
+        auto downloader = std::make_shared<ScriptedDownloader>(result, std::move(written),
+                                                               refusesAtOnce, shownFailure);
         UniqueStgMedium medium;
         const HRESULT got =
             Get(Over({kNorthFile}, downloader).Get(), CFSTR_FILECONTENTS, TYMED_ISTREAM, medium, 0);
@@ -257,32 +262,45 @@ TEST_F(FileContentsDownloader, ACompletedDownloadIsKeptWholeAndJournaledOk) {
 }
 
 TEST_F(FileContentsDownloader, EveryAttemptLeavesARowAndOnlyACompletedOneAKeptFile) {
+    // What the user saw: the row gives it word for word, quotes, commas and line breaks included.
+    const std::wstring notPresent = L"COM9 is not on this PC now. Ports present: COM3, COM7.";
+    const std::wstring waitExpired = L"The waiting time of the data has expired.";
     struct Case {
         const char* what;
         HRESULT download;
         std::optional<std::string> written;
         bool refusesAtOnce;
+        std::wstring shown;  // the failure the user was shown
         const char* result;
-        bool message;  // the row says why
+        std::string message;  // the row's reason; "*" any text but none
     } const cases[] = {
-        {"cancelled half way", S_FALSE, "A,01", false, "cancelled", false},
-        {"refused by a full disk", HRESULT_FROM_WIN32(ERROR_DISK_FULL), "A,01", false, "failed",
-         true},
-        {"refused before its target", HRESULT_FROM_WIN32(ERROR_BUSY), std::nullopt, true,
-         "failed", true},
+        {"cancelled half way", S_FALSE, "A,01", false, L"", "cancelled", ""},
+        {"refused by a full disk", HRESULT_FROM_WIN32(ERROR_DISK_FULL), "A,01", false, L"",
+         "failed", "*"},
+        {"refused before its target", HRESULT_FROM_WIN32(ERROR_BUSY), std::nullopt, true, L"",
+         "failed", "*"},
+        {"a port that is not there", S_FALSE, "", false, notPresent, "failed",
+         "COM9 is not on this PC now. Ports present: COM3, COM7."},
+        {"a time-out after part of the file", S_FALSE, "A,01", false, waitExpired, "failed",
+         "The waiting time of the data has expired."},
+        {"a library error shown over a system failure", HRESULT_FROM_WIN32(ERROR_DISK_FULL),
+         "A,01", false, L"Line 1,\r\n\"2\"", "failed", "Line 1,\r\n\"2\""},
     };
     size_t rows = 1;
     for (const Case& test : cases) {
         SCOPED_TRACE(test.what);
         EXPECT_EQ(test.download, DownloadNorth(test.download, test.written, nullptr,
-                                               test.refusesAtOnce));
+                                               test.refusesAtOnce, test.shown));
         EXPECT_TRUE(FilesIn(Kept()).empty());
         const auto journal = Journal();
         ASSERT_EQ(++rows, journal.size());
         EXPECT_EQ(test.result, journal.back()[kResult]);
-        EXPECT_EQ(test.message, !journal.back()[kMessage].empty()) << journal.back()[kMessage];
+        if (test.message == "*")
+            EXPECT_FALSE(journal.back()[kMessage].empty());
+        else
+            EXPECT_EQ(test.message, journal.back()[kMessage]);
         EXPECT_EQ("", journal.back()[kKeptFile]);
-        EXPECT_EQ(test.refusesAtOnce ? "0" : "4", journal.back()[kBytes]);
+        EXPECT_EQ(std::to_string(test.written ? test.written->size() : 0), journal.back()[kBytes]);
     }
 }
 

@@ -81,12 +81,13 @@ TEST_F(DownloadDialog, ShowsItsTextsUntilStartWhenAMissingPortShowsItsBoxAndTheD
         Press(window, IDC_START);
     });
     EXPECT_EQ(result, IDCANCEL);
-    // The box names the ports the computer lists when Start is pressed.
-    ExpectOneBox(user_,
-                 L"COM49 is not on this PC now. Ports present: COM40, COM41. Check the "
-                 L"instrument's cable and its USB adapter, or choose one of these ports in the "
-                 L"station's properties.",
-                 MB_ICONSTOP);
+    // The box names the ports the computer lists when Start is pressed; the records take it as
+    // the reason.
+    const wchar_t* const shown =
+        L"COM49 is not on this PC now. Ports present: COM40, COM41. Check the instrument's cable "
+        L"and its USB adapter, or choose one of these ports in the station's properties.";
+    ExpectOneBox(user_, shown, MB_ICONSTOP);
+    EXPECT_EQ(dialog.FailureText(), shown);
 }
 
 TEST_F(DownloadDialog, TransferFromTheInstrumentEndsWithOkAndTheExactFile) {
@@ -120,6 +121,7 @@ TEST_F(DownloadDialog, CancelDuringTransferWaitsForTheDriverToStop) {
             Press(window, IDCANCEL);
         });
         EXPECT_EQ(result, IDCANCEL);
+        EXPECT_EQ(dialog.FailureText(), L"") << "the surveyor's cancel is no failure";
     }
     // The dialog is gone: its destructor waited until the driver saw the stop and ended the
     // receive, which the thread reports with its one failure box, a cancel included.

@@ -40,10 +40,12 @@ struct LibraryDownload {
     const Station& station;
     std::wstring target;
     std::wstring file;
+    std::wstring shownFailure;
     HRESULT result = E_UNEXPECTED;
 
     INT_PTR DoModal() {
-        result = DialogStationDownloader().Download(nullptr, station, FixedTarget(target), file);
+        result = DialogStationDownloader().Download(nullptr, station, FixedTarget(target), file,
+                                                    shownFailure);
         return 0;
     }
 };
@@ -54,11 +56,12 @@ struct LibraryDownload {
 HRESULT DownloadOnAnotherThread(const Station& station, const std::wstring& target) {
     std::atomic<DWORD> thread{0};
     bool targetAsked = false;
+    std::wstring shownFailure;
     auto second = std::async(std::launch::async, [&] {
         thread = ::GetCurrentThreadId();
         std::wstring file;
-        return DialogStationDownloader().Download(nullptr, station,
-                                                  FixedTarget(target, &targetAsked), file);
+        return DialogStationDownloader().Download(
+            nullptr, station, FixedTarget(target, &targetAsked), file, shownFailure);
     });
     if (second.wait_for(std::chrono::seconds(10)) != std::future_status::ready) {
         ADD_FAILURE() << "the second download opened a dialog";
@@ -70,6 +73,8 @@ HRESULT DownloadOnAnotherThread(const Station& station, const std::wstring& targ
     const HRESULT result = second.get();
     EXPECT_EQ(result != HRESULT_FROM_WIN32(ERROR_BUSY), targetAsked)
         << "a refused download asked for its target";
+    if (result == HRESULT_FROM_WIN32(ERROR_BUSY))
+        EXPECT_EQ(LoadUiText(IDS_LIBRARY_DOWNLOAD_RUNNING), shownFailure) << "the records' reason";
     return result;
 }
 

@@ -69,6 +69,9 @@ TEST_F(HalvekDialog, EachFailureShowsItsTextInOneBoxAndCancelsWithoutAFile) {
         EXPECT_EQ(RunDialog(dialog, [](HWND window) { Press(window, IDC_START); }), IDCANCEL);
         ::SetEnvironmentVariableW(test.setting, nullptr);
         ExpectOneBox(user, test.text, MB_ICONEXCLAMATION);
+        // The library's "interrupted by the user" is the surveyor's cancel, no failure.
+        const bool cancelled = std::wcscmp(test.value, L"-102") == 0;
+        EXPECT_EQ(dialog.FailureText(), cancelled ? L"" : test.text) << "the records' reason";
         EXPECT_FALSE(fs::exists(written_));
         const bool setUpFailed = std::wcscmp(test.setting, L"HALVEKCOMM_FAIL") == 0;
         EXPECT_EQ(ReadAll(log_).find("StartDownload") == std::string::npos, setUpFailed)
@@ -109,6 +112,7 @@ TEST_F(HalvekDialog, CancelAfterStartWaitsForTheLibrarysEnd) {
     EXPECT_LT(::GetTickCount64() - started, 15000u);
     ExpectOneBox(user_, L"The communication's process is interrupted by the user",
                  MB_ICONEXCLAMATION);
+    EXPECT_EQ(dialog.FailureText(), L"") << "a cancel is no failure";
     EXPECT_NE(ReadAll(log_).find("Cancel\r\nCompleted -102\r\n"), std::string::npos);
 }
 
