@@ -9,9 +9,11 @@
 #include <filesystem>
 #include <fstream>
 #include <iterator>
+#include <map>
 #include <memory>
 #include <optional>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "download/download_journal.h"
@@ -341,6 +343,34 @@ TEST_F(FileContentsDownloader, AJournalThatCannotBeOpenedFailsNothing) {
     ASSERT_EQ(S_OK, DownloadNorth(S_OK, kContent, &content));
     EXPECT_EQ(kContent, content);
     EXPECT_EQ(1u, FilesIn(Kept()).size());
+}
+
+// Two writers at once (two Explorer windows, or lvcopy beside one) take turns: every row whole,
+// none lost, one header.
+TEST_F(FileContentsDownloader, TwoWritersAtOnceLeaveEveryRowWhole) {
+    constexpr int kRowsEach = 100;
+    const auto write = [&](const wchar_t* station) {
+        for (int index = 0; index < kRowsEach; ++index) {
+            JournalRow row;
+            row.Station = station;
+            row.Message = L"line one,\r\nline \"two\" " + std::to_wstring(index);
+            EXPECT_EQ(S_OK, AppendJournalRow(records_.wstring(), row));
+        }
+    };
+    std::thread first(write, L"First");
+    std::thread second(write, L"Second");
+    first.join();
+    second.join();
+    const auto journal = Journal();
+    ASSERT_EQ(1u + 2 * kRowsEach, journal.size());
+    std::map<std::string, int> rowsOf;
+    for (size_t index = 1; index < journal.size(); ++index) {
+        ASSERT_EQ(static_cast<size_t>(kColumns), journal[index].size()) << "row " << index;
+        EXPECT_EQ(0u, journal[index][kMessage].rfind("line one,\r\nline \"two\" ", 0));
+        ++rowsOf[journal[index][kStation]];
+    }
+    EXPECT_EQ(kRowsEach, rowsOf["First"]);
+    EXPECT_EQ(kRowsEach, rowsOf["Second"]);
 }
 
 TEST_F(FileContentsDownloader, TheJournalRotatesAtItsLimit) {
