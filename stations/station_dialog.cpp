@@ -41,6 +41,11 @@ std::wstring Filled(std::wstring text, const std::wstring& what, const std::wstr
     return text;
 }
 
+// A refusal's reason in the user interface's language: its format is the translation's key.
+std::wstring ReasonText(const RefusalReason& reason) {
+    return RefusalReason{TranslateUiText(reason.format), reason.arguments}.Text();
+}
+
 std::vector<WideString> ModelTexts() {
     return {LoadUiText(IDS_MODEL_LV10), LoadUiText(IDS_MODEL_LV20), LoadUiText(IDS_MODEL_LV30)};
 }
@@ -204,7 +209,7 @@ bool CStationDialog::AcceptValues() const {
         return true;
     ShowMessageBox(Window(),
                    Filled(LoadUiText(IDS_STATION_VALUE_REFUSED),
-                          StationFieldOf(refusal->field).valueName, refusal->reason),
+                          StationFieldOf(refusal->field).valueName, ReasonText(refusal->reason)),
                    Caption(), MB_ICONERROR);
     return false;
 }

@@ -29,29 +29,55 @@ constexpr uint32_t kBaudRates[] = {300,  600,   1200,  2400,  4800,  9600,
 // The first six, which the sheet always lists.
 constexpr size_t kSheetBaudRateCount = 6;
 
+// The formats of every refusal. Each is the English key of its translation: changing one's words
+// means changing its translation's too.
+constexpr WideStringView kBaudRateFormat = WIDE_TEXT("%s is not one of the baud rates %s");
+constexpr WideStringView kParityFormat =
+    WIDE_TEXT("%s is not allowed here: 0 (none), 1 (odd) or 2 (even)");
+constexpr WideStringView kStopBitsFormat =
+    WIDE_TEXT("%s is not allowed here: 0 (one stop bit), 1 (one and a half) or 2 (two)");
+constexpr WideStringView kDataBitsFormat = WIDE_TEXT("%s is not allowed here: from 5 to 8");
+constexpr WideStringView kProtocolFormat = WIDE_TEXT("%s is not allowed here: from 0 to 3");
+constexpr WideStringView kFlowFormat = WIDE_TEXT("%s is not allowed here: from 0 to 2");
+constexpr WideStringView kCheckSumFormat = WIDE_TEXT("%s is not allowed here: 0 (off) or 1 (on)");
+constexpr WideStringView kTooLongFormat = WIDE_TEXT("longer than %s characters");
+constexpr WideStringView kNulFormat = WIDE_TEXT("holds a NUL character");
+constexpr WideStringView kNoNameFormat = WIDE_TEXT("a station needs a name");
+constexpr WideStringView kNameCharactersFormat = WIDE_TEXT("a name may not hold \\ / \" or *");
+constexpr WideStringView kModelFormat = WIDE_TEXT("\"%s\" is not a model; the models are %s");
+
+constexpr WideStringView kFormats[] = {
+    kBaudRateFormat, kParityFormat,  kStopBitsFormat, kDataBitsFormat,      kProtocolFormat,
+    kFlowFormat,     kCheckSumFormat, kTooLongFormat,  kNulFormat,           kNoNameFormat,
+    kNameCharactersFormat, kModelFormat};
+
 struct NumberRange {
     uint32_t lowest;
     uint32_t highest;
-    const char* what;
+    WideStringView format;
 };
 
 std::optional<NumberRange> RangeOf(StationField field) {
     switch (field) {
         case StationField::kParity:
-            return NumberRange{0, 2, "0 (none), 1 (odd) or 2 (even)"};
+            return NumberRange{0, 2, kParityFormat};
         case StationField::kStopBits:
-            return NumberRange{0, 2, "0 (one stop bit), 1 (one and a half) or 2 (two)"};
+            return NumberRange{0, 2, kStopBitsFormat};
         case StationField::kDataBits:
-            return NumberRange{5, 8, "from 5 to 8"};
+            return NumberRange{5, 8, kDataBitsFormat};
         case StationField::kProtocol:
-            return NumberRange{0, 3, "from 0 to 3"};
+            return NumberRange{0, 3, kProtocolFormat};
         case StationField::kFlow:
-            return NumberRange{0, 2, "from 0 to 2"};
+            return NumberRange{0, 2, kFlowFormat};
         case StationField::kCheckSum:
-            return NumberRange{0, 1, "0 (off) or 1 (on)"};
+            return NumberRange{0, 1, kCheckSumFormat};
         default:
             return std::nullopt;
     }
+}
+
+RefusalReason Reason(WideStringView format, std::vector<WideString> arguments = {}) {
+    return {WideString(format), std::move(arguments)};
 }
 
 char AsciiLower(WideChar c) {
@@ -91,51 +117,74 @@ std::span<const uint32_t> SheetBaudRates() noexcept {
     return std::span<const uint32_t>(kBaudRates).first(kSheetBaudRateCount);
 }
 
-std::optional<WideString> RefusedNumber(StationField field, uint32_t value) {
+WideString RefusalReason::Text() const {
+    WideString text = format;
+    size_t from = 0;
+    for (const WideString& argument : arguments) {
+        const size_t at = text.find(WIDE_TEXT("%s"), from);
+        if (at == WideString::npos)
+            break;
+        text.replace(at, 2, argument);
+        from = at + argument.size();  // an argument's own "%s" stays as it is
+    }
+    return text;
+}
+
+std::optional<RefusalReason> RefusedNumberReason(StationField field, uint32_t value) {
     if (field == StationField::kBaudRate) {
         if (std::find(std::begin(kBaudRates), std::end(kBaudRates), value) != std::end(kBaudRates))
             return std::nullopt;
         WideString rates;
         for (uint32_t rate : kBaudRates)
             rates += (rates.empty() ? WideString() : AsciiWide(", ")) + DecimalWide(rate);
-        return DecimalWide(value) + AsciiWide(" is not one of the baud rates ") + rates;
+        return Reason(kBaudRateFormat, {DecimalWide(value), rates});
     }
     const std::optional<NumberRange> range = RangeOf(field);
     if (!range || (value >= range->lowest && value <= range->highest))
         return std::nullopt;
-    return DecimalWide(value) + AsciiWide(" is not allowed here: ") + AsciiWide(range->what);
+    return Reason(range->format, {DecimalWide(value)});
 }
 
-std::optional<WideString> RefusedText(StationField field, WideStringView text,
-                                      std::span<const WideString> modelTexts) {
-    if (text.size() > kMaximumStationTextLength) {
-        return AsciiWide("longer than ") + DecimalWide(kMaximumStationTextLength) +
-               AsciiWide(" characters");
-    }
+std::optional<RefusalReason> RefusedTextReason(StationField field, WideStringView text,
+                                               std::span<const WideString> modelTexts) {
+    if (text.size() > kMaximumStationTextLength)
+        return Reason(kTooLongFormat, {DecimalWide(kMaximumStationTextLength)});
     if (text.find(WideChar(0)) != WideStringView::npos)
-        return AsciiWide("holds a NUL character");
-    if (field == StationField::kName && !IsValidStationName(text)) {
-        return text.empty() ? AsciiWide("a station needs a name")
-                            : AsciiWide("a name may not hold \\ / \" or *");
-    }
+        return Reason(kNulFormat);
+    if (field == StationField::kName && !IsValidStationName(text))
+        return Reason(text.empty() ? kNoNameFormat : kNameCharactersFormat);
     if (field == StationField::kModel &&
         std::find(modelTexts.begin(), modelTexts.end(), text) == modelTexts.end()) {
         WideString known;
         for (const WideString& model : modelTexts)
             known +=
                 (known.empty() ? AsciiWide("\"") : AsciiWide(", \"")) + model + AsciiWide("\"");
-        return AsciiWide("\"") + WideString(text) +
-               AsciiWide("\" is not a model; the models are ") + known;
+        return Reason(kModelFormat, {WideString(text), known});
     }
     return std::nullopt;
+}
+
+std::optional<WideString> RefusedNumber(StationField field, uint32_t value) {
+    const std::optional<RefusalReason> reason = RefusedNumberReason(field, value);
+    return reason ? std::optional(reason->Text()) : std::nullopt;
+}
+
+std::optional<WideString> RefusedText(StationField field, WideStringView text,
+                                      std::span<const WideString> modelTexts) {
+    const std::optional<RefusalReason> reason = RefusedTextReason(field, text, modelTexts);
+    return reason ? std::optional(reason->Text()) : std::nullopt;
+}
+
+std::span<const WideStringView> RefusalFormats() noexcept {
+    return kFormats;
 }
 
 std::optional<StationFieldRefusal> RefusedStation(const Station& station,
                                                   std::span<const WideString> modelTexts) {
     for (const StationFieldInfo& info : kFields) {
-        std::optional<WideString> reason =
-            info.number ? RefusedNumber(info.field, station.*info.number)
-                        : RefusedText(info.field, station.*info.text, modelTexts);
+        std::optional<RefusalReason> reason =
+            info.number ? RefusedNumberReason(info.field, station.*info.number)
+                        : RefusedTextReason(info.field, station.*info.text, modelTexts);
         if (reason)
             return StationFieldRefusal{info.field, std::move(*reason)};
     }

@@ -4,6 +4,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <functional>
 #include <optional>
 #include <string>
@@ -74,7 +75,15 @@ TEST(StationFields, OneRuleForEveryFieldAndTheStationFileKeepsToIt) {
         ASSERT_EQ(test.refused.has_value(), refusal.has_value());
         if (refusal) {
             EXPECT_EQ(*test.refused, refusal->field);
-            EXPECT_FALSE(refusal->reason.empty());
+            // A format the translations know, with a value for each of its places.
+            const WideString& format = refusal->reason.format;
+            const auto formats = RefusalFormats();
+            EXPECT_NE(formats.end(), std::find(formats.begin(), formats.end(), format));
+            size_t places = 0;
+            for (size_t at = format.find(WIDE_TEXT("%s")); at != WideString::npos;
+                 at = format.find(WIDE_TEXT("%s"), at + 2))
+                ++places;
+            EXPECT_EQ(places, refusal->reason.arguments.size());
         }
         // A name the rule refuses cannot head a section, so the file is only asked about the
         // other fields.
@@ -90,4 +99,14 @@ TEST(StationFields, OneRuleForEveryFieldAndTheStationFileKeepsToIt) {
             EXPECT_EQ(StationFieldOf(refusal->field).valueName, back.error->field);
         }
     }
+}
+
+TEST(StationFields, AReasonsValuesAreFilledInOnceEvenWhenTheyHoldAPlaceOfTheirOwn) {
+    Station station = Defaults(WIDE_TEXT("Level"));
+    station.Model = WIDE_TEXT("%s");
+    const std::optional<StationFieldRefusal> refusal = RefusedStation(station, Rules().modelTexts);
+    ASSERT_TRUE(refusal);
+    EXPECT_EQ(WIDE_TEXT("\"%s\" is not a model; the models are \"Quorvel LV-10\", \"Quorvel "
+                        "LV-20\", \"Quorvel LV-30\""),
+              refusal->reason.Text());
 }

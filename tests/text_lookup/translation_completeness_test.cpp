@@ -9,6 +9,7 @@
 #include <string>
 #include <vector>
 
+#include "stations/portable/station_fields.h"
 #include "support/module_instance.h"
 #include "support/text_lookup.h"
 
@@ -40,13 +41,18 @@ std::vector<UINT> StringIds(HMODULE module) {
     return ids;
 }
 
+TranslationMap GermanFile() {
+    const std::wstring file =
+        FindTranslationFile(ModuleFilePath(ThisModule()), MAKELANGID(LANG_GERMAN, SUBLANG_GERMAN));
+    EXPECT_FALSE(file.empty()) << "no de-DE\\ShellExt.txt beside the test";
+    TranslationMap german;
+    EXPECT_EQ(S_OK, LoadTranslationFile(file, german));
+    return german;
+}
+
 TEST(GermanTranslation, CoversEveryTextOfTheStringTable) {
     const HMODULE module = ThisModule();
-    const std::wstring file =
-        FindTranslationFile(ModuleFilePath(module), MAKELANGID(LANG_GERMAN, SUBLANG_GERMAN));
-    ASSERT_FALSE(file.empty()) << "no de-DE\\ShellExt.txt beside the test";
-    TranslationMap german;
-    ASSERT_EQ(S_OK, LoadTranslationFile(file, german));
+    const TranslationMap german = GermanFile();
 
     const std::vector<UINT> ids = StringIds(module);
     ASSERT_GT(ids.size(), 50u) << "the string table was not read";
@@ -58,6 +64,26 @@ TEST(GermanTranslation, CoversEveryTextOfTheStringTable) {
         EXPECT_TRUE(found != german.end() && !found->second.empty())
             << "string " << id << " has no German entry: \""
             << std::string(english.begin(), english.end()) << "\"";
+    }
+}
+
+// The reasons the station sheet gives for a refused value are translated by their English format,
+// with the same number of values in the German one.
+TEST(GermanTranslation, CoversEveryReasonForARefusedStationValue) {
+    const TranslationMap german = GermanFile();
+    const auto places = [](const std::wstring& text) {
+        size_t count = 0;
+        for (size_t at = text.find(L"%s"); at != std::wstring::npos; at = text.find(L"%s", at + 2))
+            ++count;
+        return count;
+    };
+    for (const WideStringView format : RefusalFormats()) {
+        const std::wstring english(format);
+        const auto found = german.find(english);
+        ASSERT_TRUE(found != german.end() && !found->second.empty())
+            << "no German entry: \"" << std::string(english.begin(), english.end()) << "\"";
+        EXPECT_EQ(places(english), places(found->second))
+            << std::string(english.begin(), english.end());
     }
 }
 

@@ -99,7 +99,7 @@ int Add(int argc, wchar_t** argv) {
     if (const std::optional<StationFieldRefusal> refusal = RefusedStation(station, models)) {
         PrintUtf8(L"The station cannot be added: " +
                   std::wstring(StationFieldOf(refusal->field).valueName) + L": " +
-                  refusal->reason + L".\n");
+                  refusal->reason.Text() + L".\n");
         return 1;
     }
     const HRESULT result = AddStation(station);
