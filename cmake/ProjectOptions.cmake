@@ -11,6 +11,15 @@ if(WIN32)
         _WIN32_WINNT=0x0601 WINVER=0x0601 _WIN32_IE=0x0800 STRICT_TYPED_ITEMIDS)
     # Explorer loads the extension from anywhere: the runtime is linked in, not imported.
     target_link_options(lv_options INTERFACE -static -static-libgcc -static-libstdc++)
+    # Reproducible binaries: one commit gives the same bytes in any folder at any time. The
+    # source and build folders become fixed names in __FILE__ (the error log's places) and in the
+    # debugging information, and the PE header carries no link time.
+    # The build folder (the compiler's working folder) may lie inside the source folder: its
+    # mapping comes last, since the last one that matches is used.
+    target_compile_options(lv_options INTERFACE
+        -ffile-prefix-map=${PROJECT_SOURCE_DIR}=.
+        -ffile-prefix-map=${CMAKE_BINARY_DIR}=build)
+    target_link_options(lv_options INTERFACE -Wl,--no-insert-timestamp)
 elseif(LV_FUZZ)
     # Coverage instrumentation for every portable library that a fuzzer links.
     target_compile_options(lv_options INTERFACE -fsanitize=fuzzer-no-link,address,undefined -g)
