@@ -1,8 +1,9 @@
 // Kept downloads without I/O: safe folder names, kept file names, retention.
 #include "download/portable/kept_download_names.h"
 
+#include "support/portable/windows_file_names.h"
+
 #include <algorithm>
-#include <array>
 #include <cstdio>
 #include <map>
 
@@ -12,46 +13,7 @@ constexpr int64_t kSecondsPerDay = 24 * 60 * 60;
 constexpr uint64_t kBytesPerMegabyte = 1024 * 1024;
 constexpr WideChar kReplacement = WIDE_TEXT('_');
 
-bool IsRefusedCharacter(WideChar c) noexcept {
-    if (c < 0x20)
-        return true;
-    for (const WideChar refused : WideStringView(WIDE_TEXT("<>:\"/\\|?*"))) {
-        if (c == refused)
-            return true;
-    }
-    return false;
-}
-
 bool IsHighSurrogate(WideChar c) noexcept { return c >= 0xD800 && c <= 0xDBFF; }
-
-WideChar UpperAscii(WideChar c) noexcept {
-    return c >= WIDE_TEXT('a') && c <= WIDE_TEXT('z') ? static_cast<WideChar>(c - 0x20) : c;
-}
-
-// Windows takes the part before the first dot, trailing spaces ignored, as the device name;
-// COM and LPT also with the superscript digits one to three.
-bool IsDeviceName(WideStringView name) noexcept {
-    WideStringView stem = name.substr(0, name.find(WIDE_TEXT('.')));
-    while (!stem.empty() && stem.back() == WIDE_TEXT(' '))
-        stem.remove_suffix(1);
-    WideString upper;
-    for (const WideChar c : stem)
-        upper.push_back(UpperAscii(c));
-    for (const WideStringView device : {WIDE_TEXT("CON"), WIDE_TEXT("PRN"), WIDE_TEXT("AUX"),
-                                         WIDE_TEXT("NUL"), WIDE_TEXT("CONIN$"),
-                                         WIDE_TEXT("CONOUT$")}) {
-        if (upper == device)
-            return true;
-    }
-    if (upper.size() != 4)
-        return false;
-    const WideStringView prefix = WideStringView(upper).substr(0, 3);
-    if (prefix != WIDE_TEXT("COM") && prefix != WIDE_TEXT("LPT"))
-        return false;
-    const WideChar digit = upper[3];
-    return (digit >= WIDE_TEXT('1') && digit <= WIDE_TEXT('9')) || digit == 0x00B9 ||
-           digit == 0x00B2 || digit == 0x00B3;
-}
 
 void TrimTrailingDotsAndSpaces(WideString& name) {
     while (!name.empty() && (name.back() == WIDE_TEXT('.') || name.back() == WIDE_TEXT(' ')))
@@ -70,7 +32,7 @@ WideString AsciiToWide(const char* text) {
 WideString SafeFolderName(WideStringView stationName) {
     WideString name;
     for (const WideChar c : stationName)
-        name.push_back(IsRefusedCharacter(c) ? kReplacement : c);
+        name.push_back(IsForbiddenInFileName(c) ? kReplacement : c);
     // Leading spaces are legal but make a folder that Explorer lists out of place.
     const size_t first = name.find_first_not_of(WIDE_TEXT(' '));
     name.erase(0, first == WideString::npos ? name.size() : first);
@@ -81,7 +43,7 @@ WideString SafeFolderName(WideStringView stationName) {
         name.resize(length);
     }
     TrimTrailingDotsAndSpaces(name);
-    if (IsDeviceName(name)) {
+    if (!DeviceInFileName(name).empty()) {
         name.insert(name.begin(), kReplacement);
         if (name.size() > kKeptFolderNameLimit)
             name.resize(kKeptFolderNameLimit);  // a device name is short: only its extension goes

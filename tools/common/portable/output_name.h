@@ -2,6 +2,7 @@
 #pragma once
 
 #include "support/portable/wide_text.h"
+#include "support/portable/windows_file_names.h"
 
 // What a pattern may name. fileName is the file's own name from the folder ("file1.lv").
 struct OutputNameParts {
@@ -18,13 +19,6 @@ struct OutputNameParts {
 // The longest full path (folder, "\\" and name) that Windows opens without the long-path prefix:
 // MAX_PATH less its terminator.
 constexpr size_t kMaximumOutputPath = 259;
-
-// The device a file name stands for in Windows, or empty when it names a file. Windows takes the
-// part before the first dot, less trailing spaces, in any case, for a device when it is CON,
-// PRN, AUX, NUL, CONIN$, CONOUT$, COM0-COM9 or LPT0-LPT9 (also with a superscript 1, 2 or 3),
-// whatever extension follows: "aux.lv" and "Com1 .txt" open devices, not files. The names differ
-// between versions; this is the widest set.
-WideString DeviceInFileName(WideStringView name);
 
 // Whether Windows can create a file of this name in a folder whose full path has folderLength
 // characters (without its trailing backslash): no character a name cannot hold, no trailing dot
