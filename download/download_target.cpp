@@ -31,33 +31,36 @@ std::wstring WithoutExtension(const std::wstring& path) {
 
 // The user's temporary folder, with its trailing backslash, of any length GetTempPathW gives.
 // Where GetTempPathW fails, folder still names what TMP or TEMP says, for the message.
-HRESULT TemporaryFolder(std::wstring& folder) {
-    folder.clear();
-    for (int attempt = 0; attempt < 2; ++attempt) {  // the variable may grow between two calls
-        const DWORD needed = ::GetTempPathW(0, nullptr);
-        if (needed == 0)
-            break;
-        std::wstring directory(needed, L'\0');
-        const DWORD length = ::GetTempPathW(needed, directory.data());
-        if (length == 0)
-            break;
-        if (length < needed) {
-            directory.resize(length);
-            folder = std::move(directory);
-            return S_OK;
+[[nodiscard]] HRESULT TemporaryFolder(std::wstring& folder) noexcept {
+    try {
+        folder.clear();
+        for (int attempt = 0; attempt < 2; ++attempt) {  // the variable may grow between two calls
+            const DWORD needed = ::GetTempPathW(0, nullptr);
+            if (needed == 0)
+                break;
+            std::wstring directory(needed, L'\0');
+            const DWORD length = ::GetTempPathW(needed, directory.data());
+            if (length == 0)
+                break;
+            if (length < needed) {
+                directory.resize(length);
+                folder = std::move(directory);
+                return S_OK;
+            }
         }
+        // Failures are made into HRESULTs: a bare Win32 code would pass for success.
+        const HRESULT failure = LastErrorResult();
+        for (const wchar_t* variable : {L"TMP", L"TEMP"}) {
+            const DWORD size = ::GetEnvironmentVariableW(variable, nullptr, 0);
+            if (size == 0)
+                continue;
+            folder.assign(size, L'\0');
+            folder.resize(::GetEnvironmentVariableW(variable, folder.data(), size));
+            break;
+        }
+        LV_LOG_AND_RETURN(failure);
     }
-    // Failures are made into HRESULTs: a bare Win32 code would pass for success.
-    const HRESULT failure = LastErrorResult();
-    for (const wchar_t* variable : {L"TMP", L"TEMP"}) {
-        const DWORD size = ::GetEnvironmentVariableW(variable, nullptr, 0);
-        if (size == 0)
-            continue;
-        folder.assign(size, L'\0');
-        folder.resize(::GetEnvironmentVariableW(variable, folder.data(), size));
-        break;
-    }
-    LV_LOG_AND_RETURN(failure);
+    CATCH_RETURN()
 }
 
 }  // namespace

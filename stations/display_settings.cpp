@@ -28,18 +28,21 @@ public:
     ~StoreLock() { ::ReleaseSRWLockExclusive(&g_storeLock); }
 };
 
-HRESULT WriteWidths() {
-    UniqueRegKey root;
-    RETURN_IF_WIN32_ERROR(::RegCreateKeyExW(HKEY_CURRENT_USER, StationRootKeyPath().c_str(), 0,
-                                            nullptr, REG_OPTION_NON_VOLATILE, KEY_ALL_ACCESS,
-                                            nullptr, root.put(), nullptr));
-    DisplayColumnWidths widths{};
-    for (size_t column = 0; column < kDisplayColumnCount; ++column)
-        widths[column] = g_widths[column];
-    const auto data = DisplaySettingsBytes(widths);
-    RETURN_IF_WIN32_ERROR(::RegSetValueExW(root.get(), L"Display Settings", 0, REG_BINARY,
-                                           data.data(), static_cast<DWORD>(data.size())));
-    return S_OK;
+[[nodiscard]] HRESULT WriteWidths() noexcept {
+    try {
+        UniqueRegKey root;
+        RETURN_IF_WIN32_ERROR(::RegCreateKeyExW(HKEY_CURRENT_USER, StationRootKeyPath().c_str(), 0,
+                                                nullptr, REG_OPTION_NON_VOLATILE, KEY_ALL_ACCESS,
+                                                nullptr, root.put(), nullptr));
+        DisplayColumnWidths widths{};
+        for (size_t column = 0; column < kDisplayColumnCount; ++column)
+            widths[column] = g_widths[column];
+        const auto data = DisplaySettingsBytes(widths);
+        RETURN_IF_WIN32_ERROR(::RegSetValueExW(root.get(), L"Display Settings", 0, REG_BINARY,
+                                               data.data(), static_cast<DWORD>(data.size())));
+        return S_OK;
+    }
+    CATCH_RETURN()
 }
 
 }  // namespace

@@ -11,7 +11,8 @@
 
 namespace {
 
-HRESULT QueryFormat(IDataObject* dataObject, CLIPFORMAT wanted, DWORD tymed) {
+[[nodiscard]] HRESULT QueryFormat(IDataObject* dataObject, CLIPFORMAT wanted,
+                                  DWORD tymed) noexcept {
     FORMATETC format{wanted, nullptr, DVASPECT_CONTENT, -1, tymed};
     return dataObject->QueryGetData(&format);
 }
@@ -24,11 +25,15 @@ std::wstring StationNameOf(const CPidlMgr& manager, PCUIDLIST_RELATIVE fullList)
 }
 
 // Parses what was dropped; the parse's result when it fails.
-HRESULT ParseDrop(IDataObject* dataObject, std::shared_ptr<TSourceList>& sources) {
-    TSourceParser parser(true);
-    RETURN_IF_FAILED(parser.ParseDataObject(dataObject, std::wstring(), true));
-    sources = parser.Sources();
-    return S_OK;
+[[nodiscard]] HRESULT ParseDrop(IDataObject* dataObject,
+                                std::shared_ptr<TSourceList>& sources) noexcept {
+    try {
+        TSourceParser parser(true);
+        RETURN_IF_FAILED(parser.ParseDataObject(dataObject, std::wstring(), true));
+        sources = parser.Sources();
+        return S_OK;
+    }
+    CATCH_RETURN()
 }
 
 void HandOver(const DroppedSourcesReceiver& receiver, const std::wstring& station,
@@ -38,7 +43,8 @@ void HandOver(const DroppedSourcesReceiver& receiver, const std::wstring& statio
 }
 
 // Copies a receiver into a target's field: the copy may meet an allocation failure.
-HRESULT KeepReceiver(DroppedSourcesReceiver& field, const DroppedSourcesReceiver& receiver) {
+[[nodiscard]] HRESULT KeepReceiver(DroppedSourcesReceiver& field,
+                                   const DroppedSourcesReceiver& receiver) noexcept {
     try {
         field = receiver;
         return S_OK;

@@ -73,7 +73,7 @@ PCUITEMID_CHILD ChildListOf(const std::vector<uint8_t>& bytes) noexcept {
 // Hands the bytes of the data object's block in that format to read, within the block's own
 // size, while the block is locked; a block that cannot be fetched or locked is a failure.
 template <typename Read>
-HRESULT ReadBlock(IDataObject* dataObject, const FORMATETC& format, Read&& read) {
+[[nodiscard]] HRESULT ReadBlock(IDataObject* dataObject, const FORMATETC& format, Read&& read) {
     FORMATETC request = format;
     UniqueStgMedium medium;
     RETURN_IF_FAILED(dataObject->GetData(&request, medium.put()));

@@ -8,6 +8,7 @@
 #include <cstdio>
 #include <string>
 
+#include "support/error_handling.h"
 #include "support/unique_resource.h"
 #include "tools/common/console_output.h"
 
@@ -94,32 +95,37 @@ void PrintItem(IShellFolder* folder, PCUITEMID_CHILD item, const std::wstring& i
 }
 
 // Lists a folder's items; each folder item is entered once more when recursing.
-HRESULT ListFolder(IShellFolder* folder, const std::wstring& indent, bool recurse) {
-    ComPtr<IEnumIDList> items;
-    const HRESULT result =
-        folder->EnumObjects(nullptr, SHCONTF_FOLDERS | SHCONTF_NONFOLDERS, &items);
-    if (result != S_OK || !items)
-        return FAILED(result) ? result : S_OK;
-    int count = 0;
-    for (;;) {
-        PITEMID_CHILD raw = nullptr;
-        if (items->Next(1, &raw, nullptr) != S_OK)
-            break;
-        UniqueCoTaskMem item(raw);
-        ++count;
-        PrintItem(folder, raw, indent);
-        SFGAOF attributes = SFGAO_FOLDER;
-        PCUITEMID_CHILD child = raw;
-        if (recurse && SUCCEEDED(folder->GetAttributesOf(1, &child, &attributes)) &&
-            (attributes & SFGAO_FOLDER)) {
-            ComPtr<IShellFolder> subfolder;
-            if (SUCCEEDED(folder->BindToObject(raw, nullptr, IID_PPV_ARGS(&subfolder))))
-                ListFolder(subfolder.Get(), indent + L"        ", false);
+[[nodiscard]] HRESULT ListFolder(IShellFolder* folder, const std::wstring& indent,
+                                 bool recurse) noexcept {
+    try {
+        ComPtr<IEnumIDList> items;
+        const HRESULT result =
+            folder->EnumObjects(nullptr, SHCONTF_FOLDERS | SHCONTF_NONFOLDERS, &items);
+        if (result != S_OK || !items)
+            return FAILED(result) ? result : S_OK;
+        int count = 0;
+        for (;;) {
+            PITEMID_CHILD raw = nullptr;
+            if (items->Next(1, &raw, nullptr) != S_OK)
+                break;
+            UniqueCoTaskMem item(raw);
+            ++count;
+            PrintItem(folder, raw, indent);
+            SFGAOF attributes = SFGAO_FOLDER;
+            PCUITEMID_CHILD child = raw;
+            if (recurse && SUCCEEDED(folder->GetAttributesOf(1, &child, &attributes)) &&
+                (attributes & SFGAO_FOLDER)) {
+                ComPtr<IShellFolder> subfolder;
+                if (SUCCEEDED(folder->BindToObject(raw, nullptr, IID_PPV_ARGS(&subfolder))))
+                    // A subfolder that cannot be listed is left out; the listing goes on.
+                    (void)ListFolder(subfolder.Get(), indent + L"        ", false);
+            }
         }
+        if (count == 0)
+            PrintUtf8(indent + L"(empty)\n");
+        return S_OK;
     }
-    if (count == 0)
-        PrintUtf8(indent + L"(empty)\n");
-    return S_OK;
+    CATCH_RETURN()
 }
 
 int Browse(const wchar_t* station) {

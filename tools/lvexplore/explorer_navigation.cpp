@@ -8,7 +8,7 @@ using Microsoft::WRL::ComPtr;
 
 namespace {
 
-HRESULT BindToFolder(PCIDLIST_ABSOLUTE folder, ComPtr<IShellFolder>& bound) {
+[[nodiscard]] HRESULT BindToFolder(PCIDLIST_ABSOLUTE folder, ComPtr<IShellFolder>& bound) noexcept {
     ComPtr<IShellFolder> desktop;
     RETURN_IF_FAILED(::SHGetDesktopFolder(&desktop));
     if (ILIsEmpty(folder)) {

@@ -17,6 +17,7 @@
 #include "server/portable/installer_registry.h"
 #include "server/registrar.h"
 #include "server/registration.h"
+#include "support/error_handling.h"
 #include "support/unique_resource.h"
 
 namespace {
@@ -47,31 +48,34 @@ std::wstring GuidText(REFGUID guid) {
 // description), tab-separated: the installer registers the library with the system's own
 // RegisterTypeLib, as self-registration does, so the keys it writes (HELPDIR among them, which
 // no formatted text of an installer can express without a trailing backslash) are the same.
-HRESULT TypeLibraryRow(const std::wstring& path, std::string& row) {
-    Microsoft::WRL::ComPtr<ITypeLib> library;
-    HRESULT result = ::LoadTypeLibEx(path.c_str(), REGKIND_NONE, &library);
-    if (FAILED(result))
-        return result;
-    TLIBATTR* attributes = nullptr;
-    result = library->GetLibAttr(&attributes);
-    if (FAILED(result))
-        return result;
-    const TLIBATTR copy = *attributes;
-    library->ReleaseTLibAttr(attributes);
-    BSTR name = nullptr;
-    BSTR documentation = nullptr;
-    result = library->GetDocumentation(-1, &name, &documentation, nullptr, nullptr);
-    if (FAILED(result))
-        return result;
-    const std::wstring title = documentation ? documentation : (name ? name : L"");
-    ::SysFreeString(name);
-    ::SysFreeString(documentation);
-    // The table keeps the major version above the minor one's eight bits.
-    const std::wstring text = GuidText(copy.guid) + L"\t" + std::to_wstring(copy.lcid) + L"\t" +
-                              std::to_wstring((copy.wMajorVerNum << 8) | copy.wMinorVerNum) +
-                              L"\t" + title + L"\n";
-    row.assign(text.begin(), text.end());  // identifiers, numbers and an ASCII title
-    return S_OK;
+[[nodiscard]] HRESULT TypeLibraryRow(const std::wstring& path, std::string& row) noexcept {
+    try {
+        Microsoft::WRL::ComPtr<ITypeLib> library;
+        HRESULT result = ::LoadTypeLibEx(path.c_str(), REGKIND_NONE, &library);
+        if (FAILED(result))
+            return result;
+        TLIBATTR* attributes = nullptr;
+        result = library->GetLibAttr(&attributes);
+        if (FAILED(result))
+            return result;
+        const TLIBATTR copy = *attributes;
+        library->ReleaseTLibAttr(attributes);
+        BSTR name = nullptr;
+        BSTR documentation = nullptr;
+        result = library->GetDocumentation(-1, &name, &documentation, nullptr, nullptr);
+        if (FAILED(result))
+            return result;
+        const std::wstring title = documentation ? documentation : (name ? name : L"");
+        ::SysFreeString(name);
+        ::SysFreeString(documentation);
+        // The table keeps the major version above the minor one's eight bits.
+        const std::wstring text = GuidText(copy.guid) + L"\t" + std::to_wstring(copy.lcid) + L"\t" +
+                                  std::to_wstring((copy.wMajorVerNum << 8) | copy.wMinorVerNum) +
+                                  L"\t" + title + L"\n";
+        row.assign(text.begin(), text.end());  // identifiers, numbers and an ASCII title
+        return S_OK;
+    }
+    CATCH_RETURN()
 }
 
 int Write(const std::wstring& path, const std::wstring& fileId, const std::wstring& output,

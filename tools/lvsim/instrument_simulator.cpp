@@ -57,7 +57,7 @@ void InstrumentSimulator::Turnaround() {
     }
 }
 
-bool InstrumentSimulator::WriteAll(const char* bytes, size_t count) {
+bool InstrumentSimulator::WriteAll(const char* bytes, size_t count) noexcept {
     size_t sent = 0;
     while (sent < count) {
         const size_t moved =

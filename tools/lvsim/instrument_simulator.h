@@ -55,12 +55,13 @@ private:
     // Writes at the wire speed of the configured baud rate and framing: each byte leaves when
     // the one before it would have left the wire (or, with WholeWrites, all at once and the
     // call then waits out the wire time).
-    bool SendPaced(const std::string& bytes);
-    bool WriteAll(const char* bytes, size_t count);
+    [[nodiscard]] bool SendPaced(const std::string& bytes);
+    [[nodiscard]] bool WriteAll(const char* bytes, size_t count) noexcept;
     void Turnaround();
     // Reads until a CR LF ends an answer, or the answer time-out passes; empty when none.
     std::string ReadAnswer(uint32_t timeoutMs);
-    bool SendLineUntilAcknowledged(const std::string& line, bool corruptFirst, bool loseFirstAck);
+    [[nodiscard]] bool SendLineUntilAcknowledged(const std::string& line, bool corruptFirst,
+                                                 bool loseFirstAck);
 
     Win32SerialPort& port_;
     SimulatorOptions options_;

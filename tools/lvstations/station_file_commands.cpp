@@ -12,6 +12,7 @@
 #include "stations/portable/station_file.h"
 #include "stations/serial_ports.h"
 #include "stations/station_store.h"
+#include "support/error_handling.h"
 #include "support/module_instance.h"
 #include "support/read_only_file.h"
 #include "support/text_lookup.h"
@@ -35,30 +36,34 @@ std::wstring SystemText(HRESULT result) {
 }
 
 // At most kMaximumStationFileSize + 1 bytes: enough for the reader to refuse a larger file.
-HRESULT ReadFileStart(const std::wstring& path, std::vector<uint8_t>& bytes) {
-    UniqueFileHandle file;
-    uint64_t size = 0;
-    const HRESULT opened = OpenReadOnlyFile(path, file, size);
-    if (FAILED(opened))
-        return opened;
-    bytes.resize(static_cast<size_t>(std::min<uint64_t>(size, kMaximumStationFileSize + 1)));
-    size_t done = 0;
-    while (done < bytes.size()) {
-        DWORD read = 0;
-        if (!::ReadFile(file.get(), bytes.data() + done, static_cast<DWORD>(bytes.size() - done),
-                        &read, nullptr)) {
-            return HRESULT_FROM_WIN32(::GetLastError());
+[[nodiscard]] HRESULT ReadFileStart(const std::wstring& path,
+                                    std::vector<uint8_t>& bytes) noexcept {
+    try {
+        UniqueFileHandle file;
+        uint64_t size = 0;
+        const HRESULT opened = OpenReadOnlyFile(path, file, size);
+        if (FAILED(opened))
+            return opened;
+        bytes.resize(static_cast<size_t>(std::min<uint64_t>(size, kMaximumStationFileSize + 1)));
+        size_t done = 0;
+        while (done < bytes.size()) {
+            DWORD read = 0;
+            if (!::ReadFile(file.get(), bytes.data() + done,
+                            static_cast<DWORD>(bytes.size() - done), &read, nullptr)) {
+                return HRESULT_FROM_WIN32(::GetLastError());
+            }
+            if (read == 0)
+                break;  // the file shrank since its size was taken
+            done += read;
         }
-        if (read == 0)
-            break;  // the file shrank since its size was taken
-        done += read;
+        bytes.resize(done);
+        return S_OK;
     }
-    bytes.resize(done);
-    return S_OK;
+    CATCH_RETURN()
 }
 
 // Writes the whole file or, on any failure, removes what was written: no half file is left.
-HRESULT WriteWholeFile(const std::wstring& path, const std::string& bytes) {
+[[nodiscard]] HRESULT WriteWholeFile(const std::wstring& path, const std::string& bytes) noexcept {
     UniqueFileHandle file(::CreateFileW(path.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS,
                                         FILE_ATTRIBUTE_NORMAL, nullptr));
     if (!file)
@@ -92,8 +97,9 @@ std::wstring PortWarning(const std::wstring& path, const StationFileWarning& war
                L"the folder uses the computer's only port, " +
                ports.front() + L").";
     }
-    return text + L"which this computer does not list; stored as written (the download names the "
-                  L"ports present until the port exists).";
+    return text +
+           L"which this computer does not list; stored as written (the download names the "
+           L"ports present until the port exists).";
 }
 
 // Whether the store now holds the station exactly as the file gave it.

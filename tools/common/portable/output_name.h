@@ -24,7 +24,7 @@ constexpr size_t kMaximumOutputPath = 259;
 // characters (without its trailing backslash): no character a name cannot hold, no trailing dot
 // or space, no device, at most 255 characters, and at most kMaximumOutputPath with the folder.
 // False with a reason in error otherwise.
-bool IsCreatableFileName(WideStringView name, size_t folderLength, WideString& error);
+[[nodiscard]] bool IsCreatableFileName(WideStringView name, size_t folderLength, WideString& error);
 
 // Expands {station}, {date} (YYYY-MM-DD), {time} (HHMMSS), {name} (the file's own name without its
 // extension) and {ext} (its extension with the dot, ".lv" or ".hvr"); "{{" and "}}" stand for
@@ -33,5 +33,5 @@ bool IsCreatableFileName(WideStringView name, size_t folderLength, WideString& e
 // folder). Trailing dots and spaces, which Windows drops, and device names are refused too; a
 // device that the station's name makes is refused with a way around it ("_{station}"). False with
 // a reason in error for a pattern that names no usable file.
-bool ExpandOutputName(WideStringView pattern, const OutputNameParts& parts, WideString& name,
-                      WideString& error);
+[[nodiscard]] bool ExpandOutputName(WideStringView pattern, const OutputNameParts& parts,
+                                    WideString& name, WideString& error);
