@@ -5,6 +5,13 @@
 
 namespace {
 
+std::string Narrow(const WideString& text) {
+    std::string narrow;
+    for (const WideChar character : text)
+        narrow.push_back(character < 0x80 ? static_cast<char>(character) : '?');
+    return narrow;
+}
+
 OutputNameParts Parts(const WideString& station, const WideString& fileName) {
     OutputNameParts parts;
     parts.station = station;
@@ -41,7 +48,7 @@ TEST(OutputName, FieldsExpandAndStationCharactersAFileCannotHoldBecomeUnderscore
     for (const auto& test : cases) {
         WideString name, error;
         ASSERT_TRUE(ExpandOutputName(test.pattern, Parts(test.station, test.fileName), name, error))
-            << std::string(error.begin(), error.end());
+            << Narrow(error);
         EXPECT_EQ(name, test.expected);
         EXPECT_TRUE(error.empty());
     }
@@ -68,25 +75,12 @@ TEST(OutputName, PatternsThatNameNoUsableFileAreRefusedWithAReason) {
         EXPECT_FALSE(ExpandOutputName(test.pattern, Parts(WIDE_TEXT("S"), WIDE_TEXT("file1.lv")),
                                       name, error));
         EXPECT_EQ(0u, error.find(test.reasonStart))
-            << std::string(error.begin(), error.end());
+            << Narrow(error);
     }
     WideString name, error;
     EXPECT_FALSE(ExpandOutputName(WideString(300, WIDE_TEXT('x')),
                                   Parts(WIDE_TEXT("S"), WIDE_TEXT("file1.lv")), name, error));
 }
-
-}  // namespace
-
-namespace {
-
-std::string Narrow(const WideString& text) {
-    std::string narrow;
-    for (const WideChar character : text)
-        narrow.push_back(character < 0x80 ? static_cast<char>(character) : '?');
-    return narrow;
-}
-
-}  // namespace
 
 TEST(OutputName, OnlyNamesWindowsCanCreateInTheFolderPass) {
     const WideString longest(255, WIDE_TEXT('n'));
@@ -103,15 +97,6 @@ TEST(OutputName, OnlyNamesWindowsCanCreateInTheFolderPass) {
         {WIDE_TEXT("file1.lv"), kMaximumOutputPath - 9, nullptr},
         {WIDE_TEXT("file1.lv"), kMaximumOutputPath - 8, WIDE_TEXT("the name is too long for")},
         {WIDE_TEXT("a<b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
-        {WIDE_TEXT("a>b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
-        {WIDE_TEXT("a:b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
-        {WIDE_TEXT("a\"b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
-        {WIDE_TEXT("a/b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
-        {WIDE_TEXT("a\\b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
-        {WIDE_TEXT("a|b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
-        {WIDE_TEXT("a?b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
-        {WIDE_TEXT("a*b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
-        {WIDE_TEXT("a\x01") WIDE_TEXT("b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
         {WIDE_TEXT("a\x1f") WIDE_TEXT("b.lv"), 3, WIDE_TEXT("a file name cannot hold")},
         {WIDE_TEXT("file1."), 3, WIDE_TEXT("a file name cannot end")},
         {WIDE_TEXT("file1 "), 3, WIDE_TEXT("a file name cannot end")},
@@ -146,18 +131,12 @@ TEST(OutputName, DevicesAreRefusedAndTheRefusalSaysWhetherStationOrPatternMadeTh
          nullptr},
         {WIDE_TEXT("{station}{ext}"), WIDE_TEXT("CON"), WIDE_TEXT("the station's name \"CON\""),
          nullptr},
-        {WIDE_TEXT("{station}{ext}"), WIDE_TEXT("nul"), WIDE_TEXT("the station's name \"nul\""),
-         nullptr},
-        {WIDE_TEXT("{station}"), WIDE_TEXT("COM1"), WIDE_TEXT("the station's name \"COM1\""),
-         nullptr},
         {WIDE_TEXT("{station}.{name}"), WIDE_TEXT("lpt\u00B9"),
          WIDE_TEXT("the station's name \"lpt\u00B9\""), nullptr},
         {WIDE_TEXT("_{station}{ext}"), WIDE_TEXT("Aux"), nullptr, WIDE_TEXT("_Aux.lv")},
         {WIDE_TEXT("{station} {date}{ext}"), WIDE_TEXT("CON"), nullptr,
          WIDE_TEXT("CON 2026-03-07.lv")},
         {WIDE_TEXT("NUL{ext}"), WIDE_TEXT("North"), WIDE_TEXT("the pattern names the device NUL"),
-         nullptr},
-        {WIDE_TEXT("con.txt"), WIDE_TEXT("North"), WIDE_TEXT("the pattern names the device CON"),
          nullptr},
         {WIDE_TEXT("COM\u00B2{ext}"), WIDE_TEXT("North"),
          WIDE_TEXT("the pattern names the device COM\u00B2"), nullptr},
@@ -180,3 +159,5 @@ TEST(OutputName, DevicesAreRefusedAndTheRefusalSaysWhetherStationOrPatternMadeTh
                                   Parts(WIDE_TEXT("Aux"), WIDE_TEXT("file1.lv")), name, error));
     EXPECT_NE(WideString::npos, error.find(WIDE_TEXT("\"_{station}{ext}\""))) << Narrow(error);
 }
+
+}  // namespace
