@@ -71,9 +71,13 @@ protected:
     ComPtr<FakeView> view_;
 };
 
-TEST_F(ExplorerHost, WineFileSystemView_IsAChildOfTheFrameBetweenToolbarAndStatusBar) {
-    Open();
+// Browsing away from a view deactivates and destroys it; Wine's view takes its place.
+TEST_F(ExplorerHost, WineFileSystemView_ReplacesTheOldViewBetweenToolbarAndStatusBar) {
+    OpenOnFakeView(L"C:\\");
+    HWND oldWindow = window_->ViewWindow();
     ASSERT_EQ(S_OK, window_->BrowseToParsingName(L"C:\\windows"));
+    EXPECT_EQ(static_cast<UINT>(SVUIA_DEACTIVATE), view_->state);
+    EXPECT_FALSE(::IsWindow(oldWindow));
     ASSERT_NE(nullptr, window_->View());
     HWND fromView = nullptr;
     EXPECT_EQ(S_OK, window_->View()->GetWindow(&fromView));
@@ -83,22 +87,11 @@ TEST_F(ExplorerHost, WineFileSystemView_IsAChildOfTheFrameBetweenToolbarAndStatu
     EXPECT_LE(Bounds(window_->ViewWindow()).bottom, Bounds(window_->StatusBar()).top);
 }
 
-TEST_F(ExplorerHost, BrowseToParsingName_ReportsAnUnknownNameAsAParseFailure) {
-    Open();
-    EXPECT_FALSE(SUCCEEDED(window_->BrowseToParsingName(L"C:\\no such folder")));
-    EXPECT_EQ(BrowseStep::Parse, window_->FailedStep());
-    EXPECT_EQ(nullptr, window_->View());
-}
-
 // The popups, their shell ids and the View separator are seen by the view's own menu tests.
-TEST_F(ExplorerHost, InsertMenusSB_CountsFileAndEditInTheFirstGroupAndViewInTheThird) {
+TEST_F(ExplorerHost, MenusSB_CountFileAndEditFirstAndViewThirdAndComeOutAliveForTheBrowsersOwn) {
     OpenOnFakeView(L"C:\\");
     const LONG expected[6] = {2, 0, 1, 0, 0, 0};  // File and Edit; View
     EXPECT_TRUE(std::equal(expected, expected + 6, view_->widths.width));
-}
-
-TEST_F(ExplorerHost, RemoveMenusSB_TakesThePopupsOutAliveAndPutsTheBrowsersMenuBack) {
-    OpenOnFakeView(L"C:\\");
     HMENU shared = window_->MenuBar();
     const HMENU popups[] = {Popup(shared, FCIDM_MENU_FILE), Popup(shared, FCIDM_MENU_EDIT),
                             Popup(shared, FCIDM_MENU_VIEW)};
@@ -120,7 +113,7 @@ TEST_F(ExplorerHost, MenuCommand_OfAMergedItemGoesToTheViewWindowAndTheBrowsersS
     EXPECT_EQ(1, view_->refreshes);
 }
 
-TEST_F(ExplorerHost, StatusBar_ShowsWhatTheViewSendsAndAnswersIt) {
+TEST_F(ExplorerHost, StatusBar_ShowsWhatTheViewSendsAndAnswersItAsTheToolbarDoes) {
     OpenOnFakeView(L"C:\\");
     EXPECT_EQ(L"Fake status", window_->StatusText(0));
     int edges[] = {100, -1};
@@ -131,10 +124,7 @@ TEST_F(ExplorerHost, StatusBar_ShowsWhatTheViewSendsAndAnswersIt) {
     EXPECT_EQ(2, window_->StatusPartCount());
     EXPECT_EQ(S_OK, Browser()->SetStatusTextSB(L"Part one"));
     EXPECT_EQ(L"Part one", window_->StatusText(0));
-}
-
-TEST_F(ExplorerHost, GetControlWindow_GivesStatusBarAndToolbarOnly) {
-    Open();
+    // GetControlWindow gives these two controls only.
     const struct {
         UINT id;
         HRESULT result;
@@ -166,10 +156,13 @@ TEST_F(ExplorerHost, MenusNotImplemented_AnswersENotImplAsWinesBrowsersDo) {
     EXPECT_EQ(L"", window_->StatusText(0));
 }
 
-TEST_F(ExplorerHost, BrowseObject_FollowsRelativeParentAndBackRequests) {
+TEST_F(ExplorerHost, BrowseObject_FollowsRelativeParentAndBackRequestsAfterAnUnknownName) {
     Open();
     EXPECT_FALSE(window_->GoBack()) << "nowhere to go";
     EXPECT_FALSE(window_->GoUp()) << "nowhere to go";
+    EXPECT_FALSE(SUCCEEDED(window_->BrowseToParsingName(L"C:\\no such folder")));
+    EXPECT_EQ(BrowseStep::Parse, window_->FailedStep());
+    EXPECT_EQ(nullptr, window_->View());
     ASSERT_EQ(S_OK, window_->BrowseToParsingName(L"C:\\windows"));
     const UniqueAbsoluteIdList system32 = Parse(L"C:\\windows\\system32");
     const struct {
@@ -183,14 +176,6 @@ TEST_F(ExplorerHost, BrowseObject_FollowsRelativeParentAndBackRequests) {
         EXPECT_EQ(S_OK, Browser()->BrowseObject(step.list, step.flags)) << std::hex << step.flags;
         EXPECT_TRUE(IsAt(step.place)) << Place();
     }
-}
-
-TEST_F(ExplorerHost, BrowsingAway_DeactivatesAndDestroysTheOldView) {
-    OpenOnFakeView(L"C:\\");
-    HWND oldWindow = window_->ViewWindow();
-    ASSERT_EQ(S_OK, window_->BrowseToParsingName(L"C:\\windows"));
-    EXPECT_EQ(static_cast<UINT>(SVUIA_DEACTIVATE), view_->state);
-    EXPECT_FALSE(::IsWindow(oldWindow));
 }
 
 TEST_F(ExplorerHost, FrameKeys_ActOnlyWhenTheViewLeavesThem) {

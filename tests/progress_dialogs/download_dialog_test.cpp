@@ -1,6 +1,5 @@
 // The built-in download dialog: texts, a stray IDOK, a missing port, and transfers from the
-// instrument simulator over the virtual cable COM40-COM41 (completed byte for byte, and cancelled
-// midway).
+// instrument simulator over the virtual cable COM40-COM41, completed and cancelled midway.
 #include "download/download_progress_dialog.h"
 
 #include <optional>

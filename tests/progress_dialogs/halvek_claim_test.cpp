@@ -7,6 +7,7 @@
 #include <atomic>
 #include <chrono>
 #include <future>
+#include <memory>
 #include <string>
 #include <utility>
 
@@ -169,12 +170,21 @@ TEST_F(HalvekClaim, CancelEndsTheDialogWhenTheLibraryDoesNotAnswerAndItsLateEndR
         << log;
 }
 
-TEST_F(HalvekClaim, ADialogWithoutTheClaimRefusesToStart) {
-    const HalvekLibraryClaim held = HalvekLibraryClaim::TryTake();
-    ASSERT_TRUE(held);
-    CHalvekDownloadProgressDialog dialog(nullptr, station_, output_.wstring(),
+// The first dialog, cancelled before Start, ends at once; it holds the claim until it goes, and a
+// second dialog made meanwhile has none and refuses to start.
+TEST_F(HalvekClaim, ADialogHoldsTheClaimUntilItGoesAndOneWithoutItRefusesToStart) {
+    auto first = std::make_unique<CHalvekDownloadProgressDialog>(
+        nullptr, station_, output_.wstring(), HalvekLibraryClaim::TryTake());
+    EXPECT_EQ(IDCANCEL, RunDialog(*first, [](HWND window) {
+                  Press(window, IDCANCEL);
+                  EXPECT_TRUE(WaitFor([&] { return !::IsWindow(window); }, 5000));
+              }));
+    EXPECT_TRUE(user_.MessageBoxes().empty());
+    CHalvekDownloadProgressDialog second(nullptr, station_, output_.wstring(),
                                          HalvekLibraryClaim::TryTake());
-    EXPECT_EQ(IDCANCEL, RunDialog(dialog, [](HWND window) { Press(window, IDC_START); }));
+    EXPECT_EQ(IDCANCEL, RunDialog(second, [](HWND window) { Press(window, IDC_START); }));
     ExpectOneBox(user_, kRefusal, MB_ICONEXCLAMATION);
-    EXPECT_FALSE(fs::exists(log_)) << "the library was never loaded for it";
+    EXPECT_FALSE(fs::exists(log_)) << "the library was never asked for anything";
+    first.reset();
+    EXPECT_TRUE(HalvekLibraryClaim::TryTake());
 }

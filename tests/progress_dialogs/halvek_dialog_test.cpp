@@ -1,6 +1,5 @@
-// The external-library dialog with the substitute library: success, every failure the library
-// can report, cancel before and after Start, German texts; the adapter's port number, points
-// buffer, file path and the library's table slots.
+// The external-library dialog with the substitute library: success, every failure, cancel after
+// Start, German texts; the adapter's port number, points buffer, file path and table slots.
 #include "download/halvek_download_progress_dialog.h"
 
 #include <array>
@@ -79,27 +78,11 @@ TEST_F(HalvekDialog, EachFailureShowsItsTextInOneBoxAndCancelsWithoutAFile) {
     }
 }
 
-TEST_F(HalvekDialog, CancelBeforeStartEndsAtOnce) {
-    auto dialog = std::make_unique<CHalvekDownloadProgressDialog>(
-        nullptr, station_, output_.wstring(), HalvekLibraryClaim::TryTake());
-    const INT_PTR result = RunDialog(*dialog, [](HWND window) {
-        Press(window, IDCANCEL);
-        EXPECT_TRUE(WaitFor([&] { return !::IsWindow(window); }, 5000));
-    });
-    EXPECT_EQ(result, IDCANCEL);
-    EXPECT_TRUE(user_.MessageBoxes().empty());
-    EXPECT_FALSE(fs::exists(log_));  // the library was never asked for anything
-    EXPECT_FALSE(HalvekLibraryClaim::TryTake()) << "held until the dialog object goes";
-    dialog.reset();
-    EXPECT_TRUE(HalvekLibraryClaim::TryTake());
-}
-
 TEST_F(HalvekDialog, CancelAfterStartWaitsForTheLibrarysEnd) {
     ::SetEnvironmentVariableW(L"HALVEKCOMM_DELAY_MS", L"20000");
     ::SetEnvironmentVariableW(L"HALVEKCOMM_CANCEL_DELAY_MS", L"1500");
     CHalvekDownloadProgressDialog dialog(nullptr, station_, output_.wstring(),
                                          HalvekLibraryClaim::TryTake());
-    const ULONGLONG started = ::GetTickCount64();
     const INT_PTR result = RunDialog(dialog, [](HWND window) {
         Press(window, IDC_START);
         ASSERT_TRUE(WaitForText(window, IDC_STATUS_TEXT, L"Downloading...", 5000));
@@ -109,10 +92,10 @@ TEST_F(HalvekDialog, CancelAfterStartWaitsForTheLibrarysEnd) {
         EXPECT_TRUE(WaitForText(window, IDC_STATUS_TEXT, L"Terminating connection...", 5000));
     });
     EXPECT_EQ(result, IDCANCEL);
-    EXPECT_LT(::GetTickCount64() - started, 15000u);
     ExpectOneBox(user_, L"The communication's process is interrupted by the user",
                  MB_ICONEXCLAMATION);
     EXPECT_EQ(dialog.FailureText(), L"") << "a cancel is no failure";
+    // The library ended on the honoured cancel, not on its 20-second download.
     EXPECT_NE(ReadAll(log_).find("Cancel\r\nCompleted -102\r\n"), std::string::npos);
 }
 

@@ -82,7 +82,7 @@ using Names = std::vector<std::wstring>;
 
 }  // namespace
 
-TEST_F(ShellNamespace, CoCreateInstanceMakesTheFolderWhichHoldsTheModule) {
+TEST_F(ShellNamespace, CoCreateInstanceAndTheDesktopReachTheFolderWhichHoldsTheModule) {
     ComPtr<IShellFolder> folder;
     ASSERT_EQ(S_OK, ::CoCreateInstance(kShellFolderClassId, nullptr, CLSCTX_INPROC_SERVER,
                                        IID_PPV_ARGS(&folder)));
@@ -92,15 +92,15 @@ TEST_F(ShellNamespace, CoCreateInstanceMakesTheFolderWhichHoldsTheModule) {
     EXPECT_EQ(S_OK, persist->GetClassID(&classId));
     EXPECT_TRUE(::IsEqualCLSID(kShellFolderClassId, classId));
     EXPECT_EQ(S_FALSE, module_->CanUnloadNow());
-}
+    folder.Reset();
+    persist.Reset();
 
-TEST_F(ShellNamespace, TheDesktopFindsTheFolderUnderMyComputerAndBindsIntoAStation) {
+    // Found under My Computer, and bound into a station.
     ComPtr<IShellFolder> root = BindPath(kFolderPath);
     ASSERT_TRUE(root);
     EXPECT_EQ((Names{L"Station 1", L"Station 2"}),
               ListedNames(root.Get(), SHCONTF_FOLDERS | SHCONTF_NONFOLDERS));
     EXPECT_EQ(S_FALSE, module_->CanUnloadNow());
-
     ComPtr<IShellFolder> station = BindPath(kFolderPath + L"\\Station 2");
     ASSERT_TRUE(station);
     EXPECT_EQ(Names{L"file1.hvr"}, ListedNames(station.Get(), SHCONTF_NONFOLDERS));

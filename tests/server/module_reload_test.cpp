@@ -23,20 +23,16 @@ using Microsoft::WRL::ComPtr;
 namespace {
 
 // The folder made through the module's exports, as the shell makes it.
+// The folder is always the top folder, whatever list it is given (the folder tests pass none).
 ComPtr<IShellFolder> CreateFolder(const ExtensionModule& module) {
     ComPtr<IClassFactory> factory;
-    EXPECT_EQ(S_OK, module.GetClassObject(kShellFolderClassId, IID_PPV_ARGS(&factory)));
-    if (!factory)
-        return nullptr;
     ComPtr<IShellFolder> folder;
-    EXPECT_EQ(S_OK, factory->CreateInstance(nullptr, IID_PPV_ARGS(&folder)));
     ComPtr<IPersistFolder> persist;
-    if (folder) {
-        EXPECT_EQ(S_OK, folder.As(&persist));
-    }
-    // The folder is always the top folder, whatever list it is given (the folder tests pass none).
-    if (persist) {
-        EXPECT_EQ(S_OK, persist->Initialize(nullptr));
+    if (module.GetClassObject(kShellFolderClassId, IID_PPV_ARGS(&factory)) != S_OK ||
+        factory->CreateInstance(nullptr, IID_PPV_ARGS(&folder)) != S_OK ||
+        folder.As(&persist) != S_OK || persist->Initialize(nullptr) != S_OK) {
+        ADD_FAILURE() << "the top folder was not made";
+        return nullptr;
     }
     return folder;
 }

@@ -85,12 +85,16 @@ TEST_F(ShellFolderTest, IconLocationByKindOfTheLastItem) {
     }
 }
 
-TEST_F(ShellFolderTest, SharedIconListsFeedTheExtractor) {
+TEST_F(ShellFolderTest, SharedIconListsFeedTheExtractorAndAreNotBuiltFromAModuleWithoutIcons) {
     ComPtr<IExtractIconW> extractor;
     ASSERT_EQ(S_OK,
               UIObject(root_.Get(), StationItem(L"Station 1"), IID_IExtractIconW, &extractor));
 
+    // kernel32 holds none of the group icons 101, 102 and 104: no partial, shifted list is left.
     DestroySharedIconLists();
+    EXPECT_FALSE(BuildSharedIconLists(::GetModuleHandleW(L"kernel32.dll")));
+    EXPECT_EQ(nullptr, SmallIconList());
+    EXPECT_EQ(nullptr, LargeIconList());
     HICON large = reinterpret_cast<HICON>(1), small = reinterpret_cast<HICON>(1);
     EXPECT_EQ(E_FAIL, extractor->Extract(L"", 0, &large, &small, 0)) << "no lists, no icons";
     EXPECT_EQ(nullptr, large);
@@ -113,11 +117,4 @@ TEST_F(ShellFolderTest, SharedIconListsFeedTheExtractor) {
         EXPECT_EQ(nullptr, small) << index;
     }
     DestroySharedIconLists();
-}
-
-TEST_F(ShellFolderTest, IconListsAreNotBuiltFromAModuleWithoutTheIcons) {
-    // kernel32 holds none of the group icons 101, 102 and 104: no partial, shifted list is left.
-    EXPECT_FALSE(BuildSharedIconLists(::GetModuleHandleW(L"kernel32.dll")));
-    EXPECT_EQ(nullptr, SmallIconList());
-    EXPECT_EQ(nullptr, LargeIconList());
 }

@@ -1,6 +1,5 @@
-// The view's commands end to end, with the real property sheet on the virtual display: add, edit,
-// delete, copy and paste stations, open an item, and the broadcast that keeps two views in step
-// (pasting other programs' blocks: view_paste_test.cpp).
+// The view's commands end to end with the real property sheet: add, edit, delete, copy, paste,
+// open, and the broadcast that keeps two views in step (other programs' blocks: view_paste_test).
 #include "tests/view/view_fixture.h"
 
 #include <algorithm>
@@ -33,10 +32,12 @@ TEST_F(ShellViewTest, AddRefusesBadNamesThenStoresAGoodOneWithTheDefaults) {
     Station expected = DefaultStation();
     expected.Name = L"Deck 2";
     EXPECT_EQ(expected, stored);
-    EXPECT_EQ((std::vector<std::wstring>{kEntry, L"Deck 2", L"North"}), Texts(browser));
+    EXPECT_EQ((Names{kEntry, L"Deck 2", L"North"}), Texts(browser));
 }
 
-TEST_F(ShellViewTest, OpeningTheEntryStartsAddAndCancelStoresNothing) {
+// Opening the entry starts Add (cancelled here: nothing stored); opening a station browses to it.
+TEST_F(ShellViewTest, OpeningTheEntryStartsAddAndOpeningAStationBrowsesToIt) {
+    AddStationOfModel(L"North");
     CExplorerWindow& browser = Open();
     Select(browser, {0});
     {
@@ -45,25 +46,18 @@ TEST_F(ShellViewTest, OpeningTheEntryStartsAddAndCancelStoresNothing) {
         EXPECT_EQ(S_OK, Command(browser, 1289));
         EXPECT_EQ(1, user.Handled());
     }
-    EXPECT_TRUE(ListStationNames().empty());
+    EXPECT_EQ(Names{L"North"}, ListStationNames());
     EXPECT_EQ(0, browser.BrowseRequestCount());
-}
-
-TEST_F(ShellViewTest, OpeningAStationAsksTheBrowserToBrowseToIt) {
-    AddStationOfModel(L"North");
-    CExplorerWindow& browser = Open();
     Select(browser, {1});
     EXPECT_EQ(S_OK, Command(browser, 1289));
     EXPECT_EQ(1, browser.BrowseRequestCount());
 }
 
 TEST_F(ShellViewTest, PropertiesOpensOneSheetPerSelectedStationInListOrder) {
-    AddStationOfModel(L"A");
-    AddStationOfModel(L"B");
-    AddStationOfModel(L"C");
+    AddStationsOfModel({L"A", L"B", L"C"});
     CExplorerWindow& browser = Open();
     Select(browser, {3, 1});
-    std::vector<std::wstring> shown;
+    Names shown;
     {
         SheetUser user(::GetCurrentThreadId(), {[&](const StationPage& sheet) {
                                                     shown.push_back(sheet.Name());
@@ -76,63 +70,57 @@ TEST_F(ShellViewTest, PropertiesOpensOneSheetPerSelectedStationInListOrder) {
                                                 }});
         EXPECT_EQ(S_OK, Command(browser, 1287));
     }
-    EXPECT_EQ((std::vector<std::wstring>{L"A", L"C"}), shown);
-    EXPECT_EQ((std::vector<std::wstring>{kEntry, L"A2", L"B", L"C"}), Texts(browser));
+    EXPECT_EQ((Names{L"A", L"C"}), shown);
+    EXPECT_EQ((Names{kEntry, L"A2", L"B", L"C"}), Texts(browser));
 }
 
 TEST_F(ShellViewTest, StationsDeletedElsewhereAreSkippedByPropertiesAndDelete) {
-    AddStationOfModel(L"A");
-    AddStationOfModel(L"B");
+    AddStationsOfModel({L"A", L"B"});
     CExplorerWindow& browser = Open();
     Select(browser, {1, 2});
     ASSERT_EQ(S_OK, DeleteStation(Named(L"A")));
     {
-        std::vector<std::wstring> shown;
+        Names shown;
         SheetUser user(::GetCurrentThreadId(), {[&](const StationPage& sheet) {
                            shown.push_back(sheet.Name());
                            sheet.Press(PSBTN_CANCEL);
                        }});
         EXPECT_EQ(S_OK, Command(browser, 1287));
-        EXPECT_EQ(std::vector<std::wstring>{L"B"}, shown);
+        EXPECT_EQ(Names{L"B"}, shown);
     }
     // The broadcast refreshed the list: select the stale item again by name, then delete.
     browser.PumpMessages(100);
-    EXPECT_EQ((std::vector<std::wstring>{kEntry, L"B"}), Texts(browser));
+    EXPECT_EQ((Names{kEntry, L"B"}), Texts(browser));
     Select(browser, {1});
     ASSERT_EQ(S_OK, DeleteStation(Named(L"B")));
     EXPECT_EQ(S_OK, Command(browser, 1288));
-    EXPECT_EQ(std::vector<std::wstring>{kEntry}, Texts(browser));
+    EXPECT_EQ(Names{kEntry}, Texts(browser));
 }
 
 TEST_F(ShellViewTest, DeleteSkipsTheEntryAndAsksNothing) {
-    for (const wchar_t* name : {L"A", L"B", L"C"})
-        AddStationOfModel(name);
+    AddStationsOfModel({L"A", L"B", L"C"});
     CExplorerWindow& browser = Open();
     Select(browser, {0, 1, 3});
     EXPECT_EQ(S_OK, Command(browser, 1288));
     EXPECT_TRUE(user_.MessageBoxes().empty());
-    EXPECT_EQ(std::vector<std::wstring>{L"B"}, ListStationNames());
-    EXPECT_EQ((std::vector<std::wstring>{kEntry, L"B"}), Texts(browser));
+    EXPECT_EQ(Names{L"B"}, ListStationNames());
+    EXPECT_EQ((Names{kEntry, L"B"}), Texts(browser));
 }
 
 TEST_F(ShellViewTest, PastingPutsCopyOfInFrontUntilTheNameIsFree) {
-    AddStationOfModel(L"A");
-    AddStationOfModel(L"Copy of B");
-    AddStationOfModel(L"B");
+    AddStationsOfModel({L"A", L"Copy of B", L"B"});
     CExplorerWindow& browser = Open();
     Select(browser, {1, 2});  // A and B
     EXPECT_EQ(S_OK, Command(browser, 1281));
     EXPECT_EQ(S_OK, Command(browser, 1282));
     EXPECT_EQ(S_OK, Command(browser, 1282));
-    EXPECT_EQ((std::vector<std::wstring>{kEntry, L"A", L"B", L"Copy of A", L"Copy of B",
-                                         L"Copy of Copy of A", L"Copy of Copy of B",
-                                         L"Copy of Copy of Copy of B"}),
+    EXPECT_EQ((Names{kEntry, L"A", L"B", L"Copy of A", L"Copy of B", L"Copy of Copy of A",
+                     L"Copy of Copy of B", L"Copy of Copy of Copy of B"}),
               Texts(browser));
 }
 
 TEST_F(ShellViewTest, AChangeInOneViewRefreshesAnotherOfTheSameKind) {
-    AddStationOfModel(L"A");
-    AddStationOfModel(L"B");
+    AddStationsOfModel({L"A", L"B"});
     CExplorerWindow& first = Open();
     CExplorerWindow& second = Open();
     Select(first, {1});
@@ -141,7 +129,7 @@ TEST_F(ShellViewTest, AChangeInOneViewRefreshesAnotherOfTheSameKind) {
         second.PumpMessages(20);
         WaitForFill(second);
     }
-    EXPECT_EQ((std::vector<std::wstring>{kEntry, L"B"}), Texts(second));
+    EXPECT_EQ((Names{kEntry, L"B"}), Texts(second));
 }
 
 TEST_F(ShellViewTest, DeleteRemovesWhatItCanAndNamesTheRestInOneBoundedMessage) {
@@ -167,7 +155,7 @@ TEST_F(ShellViewTest, DeleteRemovesWhatItCanAndNamesTheRestInOneBoundedMessage) 
               boxes[0].text);
     EXPECT_EQ(browser.ViewWindow(), boxes[0].owner);
     EXPECT_EQ(L"Quorvel Digital Levels", boxes[0].caption);
-    const std::vector<std::wstring> left = ListStationNames();
+    const Names left = ListStationNames();
     EXPECT_EQ(12u, left.size());
     EXPECT_EQ(std::count(left.begin(), left.end(), levels[12].Name), 0) << "the free one went";
     EXPECT_EQ(13u, Texts(browser).size()) << "the list shows what is left";

@@ -41,45 +41,44 @@ public:
     std::vector<std::wstring> dropped;
 };
 
-// A plain top-level window under the cursor; a static control would not do, as it lets the
-// cursor's hit test through to whatever lies below it.
-UniqueWindow CreateTargetWindow() {
-    WNDCLASSW windowClass{};
-    windowClass.lpfnWndProc = ::DefWindowProcW;
-    windowClass.lpszClassName = L"ViewTestDropTarget";
-    ::RegisterClassW(&windowClass);
-    return UniqueWindow(::CreateWindowExW(WS_EX_TOPMOST, L"ViewTestDropTarget", L"",
-                                          WS_POPUP | WS_VISIBLE, 800, 600, 200, 200, nullptr,
-                                          nullptr, nullptr, nullptr));
-}
+// A plain top-level window under the cursor that records what is dropped on it; a static control
+// would not do, as it lets the cursor's hit test through to whatever lies below it.
+class TargetUnderTheCursor {
+public:
+    TargetUnderTheCursor() {
+        WNDCLASSW windowClass{};
+        windowClass.lpfnWndProc = ::DefWindowProcW;
+        windowClass.lpszClassName = L"ViewTestDropTarget";
+        (void)::RegisterClassW(&windowClass);  // registered already by an earlier test
+        window_.reset(::CreateWindowExW(WS_EX_TOPMOST, windowClass.lpszClassName, L"",
+                                        WS_POPUP | WS_VISIBLE, 800, 600, 200, 200, nullptr,
+                                        nullptr, nullptr, nullptr));
+        EXPECT_TRUE(window_);
+        EXPECT_EQ(S_OK, ::RegisterDragDrop(window_.get(), target_.Get()));
+        EXPECT_TRUE(::SetCursorPos(900, 700));
+    }
+    ~TargetUnderTheCursor() { EXPECT_EQ(S_OK, ::RevokeDragDrop(window_.get())); }
+    const std::vector<std::wstring>& Dropped() const { return target_->dropped; }
 
-TEST_F(ShellViewTest, AFileDraggedOutOfAStationReachesATargetWithItsName) {
+private:
+    UniqueWindow window_;
+    ComPtr<RecordingDropTarget> target_ = MakeComObject<RecordingDropTarget>();
+};
+
+// Only a station's files are dragged: the top folder's stations start no drag.
+TEST_F(ShellViewTest, AFileDraggedOutOfAStationReachesATargetWithItsNameAndAStationNone) {
     AddStationOfModel(L"S");
-    CExplorerWindow& browser = Open(L"S");
-    UniqueWindow targetWindow = CreateTargetWindow();
-    ASSERT_TRUE(targetWindow);
-    auto target = MakeComObject<RecordingDropTarget>();
-    ASSERT_EQ(S_OK, ::RegisterDragDrop(targetWindow.get(), target.Get()));
-    ASSERT_TRUE(::SetCursorPos(900, 700));
-    browser.PumpMessages(50);
+    const TargetUnderTheCursor target;
+    CExplorerWindow& top = Open();
+    Select(top, {1});
+    NotifyFromList(top, LVN_BEGINDRAG, 1, 0);
+    EXPECT_TRUE(target.Dropped().empty());
 
-    Select(browser, {0});
-    NotifyFromList(browser, LVN_BEGINDRAG, 0, 0);
-    EXPECT_EQ(std::vector<std::wstring>{L"file1.lv"}, target->dropped);
-    EXPECT_EQ(S_OK, ::RevokeDragDrop(targetWindow.get()));
-}
-
-TEST_F(ShellViewTest, TheTopFolderStartsNoDrag) {
-    AddStationOfModel(L"S");
-    CExplorerWindow& browser = Open();
-    UniqueWindow targetWindow = CreateTargetWindow();
-    auto target = MakeComObject<RecordingDropTarget>();
-    ASSERT_EQ(S_OK, ::RegisterDragDrop(targetWindow.get(), target.Get()));
-    ASSERT_TRUE(::SetCursorPos(900, 700));
-    Select(browser, {1});
-    NotifyFromList(browser, LVN_BEGINDRAG, 1, 0);
-    EXPECT_TRUE(target->dropped.empty());
-    EXPECT_EQ(S_OK, ::RevokeDragDrop(targetWindow.get()));
+    CExplorerWindow& station = Open(L"S");
+    station.PumpMessages(50);
+    Select(station, {0});
+    NotifyFromList(station, LVN_BEGINDRAG, 0, 0);
+    EXPECT_EQ(Names{L"file1.lv"}, target.Dropped());
 }
 
 }  // namespace

@@ -42,20 +42,9 @@ protected:
     ScratchFolder scratch_;
 };
 
-TEST_F(ViewDropTest, TheFirstRowIsNeverATargetAndAStationRowIsSelectedAndFocused) {
-    AddStationOfModel(L"North");
-    CExplorerWindow& browser = Open(L"", Details());
-    auto target = ListTarget(browser, L"Quorvel Digital Level");
-    DWORD effect = DROPEFFECT_NONE;
-    EXPECT_EQ(E_INVALIDARG, target->DragOver(0, RowPoint(browser, 0), &effect));
-    EXPECT_EQ(static_cast<DWORD>(DROPEFFECT_NONE), effect);
-    EXPECT_EQ(0u, RowState(browser, 0) | RowState(browser, 1));
-    EXPECT_EQ(S_OK, target->DragOver(0, RowPoint(browser, 1), &effect));
-    EXPECT_EQ(static_cast<DWORD>(DROPEFFECT_COPY), effect);
-    EXPECT_EQ(static_cast<UINT>(LVIS_SELECTED | LVIS_FOCUSED), RowState(browser, 1));
-}
-
-TEST_F(ViewDropTest, ADropOnAStationRowIsTheStationsDropAndOneInItsFolderIsRefusedAfterParsing) {
+// The first row is never a target; a station row is, selected and focused under the drag, and a
+// drop on it is the station's; a drop in a station's folder is refused once it has been parsed.
+TEST_F(ViewDropTest, OnlyAStationRowOfTheTopFolderTakesADrop) {
     AddStationOfModel(L"North");
     const std::wstring file = scratch_.File(L"job.lv");
     auto data = MakeComObject<BlockDataObject>();
@@ -63,7 +52,15 @@ TEST_F(ViewDropTest, ADropOnAStationRowIsTheStationsDropAndOneInItsFolderIsRefus
     const TSourceList expected{{file, file, 0}};
 
     CExplorerWindow& top = Open(L"", Details());
-    DWORD effect = DROPEFFECT_COPY;
+    auto target = ListTarget(top, L"Quorvel Digital Level");
+    DWORD effect = DROPEFFECT_NONE;
+    EXPECT_EQ(E_INVALIDARG, target->DragOver(0, RowPoint(top, 0), &effect));
+    EXPECT_EQ(static_cast<DWORD>(DROPEFFECT_NONE), effect);
+    EXPECT_EQ(0u, RowState(top, 0) | RowState(top, 1));
+    EXPECT_EQ(S_OK, target->DragOver(0, RowPoint(top, 1), &effect));
+    EXPECT_EQ(static_cast<DWORD>(DROPEFFECT_COPY), effect);
+    EXPECT_EQ(static_cast<UINT>(LVIS_SELECTED | LVIS_FOCUSED), RowState(top, 1));
+
     EXPECT_EQ(S_FALSE, ListTarget(top, L"Quorvel Digital Level")
                            ->Drop(data.Get(), 0, RowPoint(top, 1), &effect));
     EXPECT_EQ(E_INVALIDARG, ListTarget(top, L"Quorvel Digital Level")
@@ -153,8 +150,7 @@ public:
 };
 
 TEST_F(ViewDropTest, TwoFilesDraggedFromAnotherThreadReachTheStationUnderTheCursor) {
-    AddStationOfModel(L"North");
-    AddStationOfModel(L"South");
+    AddStationsOfModel({L"North", L"South"});
     const std::wstring first = scratch_.File(L"a.lv");
     const std::wstring second = scratch_.File(L"b.lv");
     CExplorerWindow& browser = Open(L"", Details());

@@ -1,6 +1,5 @@
-// The folder's view in a browser of our own, over a scratch store: opening the top folder or a
-// station, waiting for the fill, reading the list and the merged menus, and acting on property
-// sheets from another thread as a user would.
+// The folder's view in a browser of our own over a scratch store: opening a folder, waiting for
+// the fill, reading the list and menus, and acting on property sheets from another thread.
 #pragma once
 
 #include <windows.h>
@@ -30,6 +29,7 @@
 #include "tools/lvexplore/explorer_window.h"
 
 using Microsoft::WRL::ComPtr;
+using Names = std::vector<std::wstring>;
 
 // The top folder's first item, which starts adding a station.
 inline constexpr wchar_t kEntry[] = L"Add New Digital Level";
@@ -136,10 +136,11 @@ protected:
         return *browser.Get();
     }
 
-    static ExplorerOptions Details() {
-        ExplorerOptions options;
-        options.viewMode = FVM_DETAILS;
-        return options;
+    static ExplorerOptions Details() { return {.viewMode = FVM_DETAILS}; }
+
+    static void AddStationsOfModel(std::initializer_list<const wchar_t*> names) {
+        for (const wchar_t* name : names)
+            AddStationOfModel(name);
     }
 
     static int ThreadWindowCount() {
@@ -156,6 +157,9 @@ protected:
 
     static HWND List(const CExplorerWindow& browser) {
         return ::GetDlgItem(browser.ViewWindow(), 2000);
+    }
+    static DWORD ListStyle(const CExplorerWindow& browser) {
+        return ::GetWindowLongW(List(browser), GWL_STYLE) & LVS_TYPEMASK;
     }
 
     // Until the animation is gone: the fill's result has been put into the list.
@@ -177,8 +181,8 @@ protected:
         ::SendMessageW(browser.ViewWindow(), WM_NOTIFY, 2000, reinterpret_cast<LPARAM>(&info));
     }
 
-    static std::vector<std::wstring> Texts(const CExplorerWindow& browser) {
-        std::vector<std::wstring> texts;
+    static Names Texts(const CExplorerWindow& browser) {
+        Names texts;
         const HWND list = List(browser);
         const int count = ListView_GetItemCount(list);
         for (int index = 0; index < count; ++index) {

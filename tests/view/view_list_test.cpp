@@ -18,21 +18,25 @@ int ImageOf(HWND list, int index) {
 
 TEST_F(ShellViewTest, TopFolderListsTheEntryFirstThenStationsInNameOrder) {
     // With no stations the entry stands alone.
-    EXPECT_EQ(std::vector<std::wstring>{kEntry}, Texts(Open()));
-    for (const wchar_t* name : {L"bravo", L"Alpha", L"charlie"})
-        AddStationOfModel(name);
+    EXPECT_EQ(Names{kEntry}, Texts(Open()));
+    AddStationsOfModel({L"bravo", L"Alpha", L"charlie"});
     CExplorerWindow& browser = Open();
-    EXPECT_EQ((std::vector<std::wstring>{kEntry, L"Alpha", L"bravo", L"charlie"}), Texts(browser));
+    EXPECT_EQ((Names{kEntry, L"Alpha", L"bravo", L"charlie"}), Texts(browser));
     EXPECT_EQ(kRootIconIndex, ImageOf(List(browser), 0));
     EXPECT_EQ(kStationIconIndex, ImageOf(List(browser), 1));
 }
 
-// The list holds what the station folder enumerates; the name for each model is the folder's.
-TEST_F(ShellViewTest, StationFolderListsItsOneFileNamedByTheModel) {
-    AddStationOfModel(L"South", IDS_MODEL_LV30);
-    CExplorerWindow& browser = Open(L"South");
-    EXPECT_EQ(std::vector<std::wstring>{L"file1.hvr"}, Texts(browser));
-    EXPECT_EQ(kFileIconIndex, ImageOf(List(browser), 0));
+// A station's list holds what its folder enumerates: one file, named for the model by the folder.
+TEST_F(ShellViewTest, StationFolderListsItsOneFileAndTheStatusBarNamesTheFolderInOnePart) {
+    AddStationOfModel(L"North", IDS_MODEL_LV30);
+    CExplorerWindow& top = Open();
+    EXPECT_EQ(1, top.StatusPartCount());
+    // The top folder's own name is its root item's.
+    EXPECT_EQ(L"Quorvel Digital Levels: Quorvel Digital Level", top.StatusText());
+    CExplorerWindow& station = Open(L"North");
+    EXPECT_EQ(L"Quorvel Digital Levels: North", station.StatusText());
+    EXPECT_EQ(Names{L"file1.hvr"}, Texts(station));
+    EXPECT_EQ(kFileIconIndex, ImageOf(List(station), 0));
 }
 
 TEST_F(ShellViewTest, ViewModesSetTheListStyleAndDetailsShowsOneNameColumnAtTheStoredWidth) {
@@ -45,11 +49,11 @@ TEST_F(ShellViewTest, ViewModesSetTheListStyleAndDetailsShowsOneNameColumnAtTheS
     } modes[] = {{1284, LVS_SMALLICON}, {1285, LVS_LIST}, {1286, LVS_REPORT}, {1283, LVS_ICON}};
     for (const auto& mode : modes) {
         EXPECT_EQ(S_OK, Command(browser, mode.command));
-        EXPECT_EQ(mode.style, ::GetWindowLongW(list, GWL_STYLE) & LVS_TYPEMASK) << mode.command;
+        EXPECT_EQ(mode.style, ListStyle(browser)) << mode.command;
         FOLDERSETTINGS settings{};
         EXPECT_EQ(S_OK, browser.View()->GetCurrentInfo(&settings));
         EXPECT_EQ(mode.command - 1282, settings.ViewMode);
-        EXPECT_EQ(std::vector<std::wstring>{kEntry}, Texts(browser));
+        EXPECT_EQ(Names{kEntry}, Texts(browser));
     }
     EXPECT_EQ(S_OK, Command(browser, 1286));
     const HWND header = ListView_GetHeader(list);
@@ -81,22 +85,12 @@ TEST_F(ShellViewTest, ViewModesSetTheListStyleAndDetailsShowsOneNameColumnAtTheS
     SetDisplayColumnWidth(0, 100);
 }
 
-TEST_F(ShellViewTest, TheFirstClickOnNameSortsDescendingAndTheNextAscending) {
-    for (const wchar_t* name : {L"b", L"A", L"c"})
-        AddStationOfModel(name);
-    CExplorerWindow& browser = Open(L"", Details());
-    NotifyFromList(browser, LVN_COLUMNCLICK, -1, 0);
-    EXPECT_EQ((std::vector<std::wstring>{kEntry, L"c", L"b", L"A"}), Texts(browser));
-    NotifyFromList(browser, LVN_COLUMNCLICK, -1, 0);
-    EXPECT_EQ((std::vector<std::wstring>{kEntry, L"A", L"b", L"c"}), Texts(browser));
-}
-
-// Each view keeps its own order: a click in one view does not turn the next click in another.
+// Each view keeps its own order: the first click on Name sorts descending, the next ascending, and
+// a click in one view does not turn the next click in another.
 TEST_F(ShellViewTest, TwoViewsInOneProcessSortEachByItsOwnClicks) {
-    for (const wchar_t* name : {L"b", L"A", L"c"})
-        AddStationOfModel(name);
-    const std::vector<std::wstring> descending{kEntry, L"c", L"b", L"A"};
-    const std::vector<std::wstring> ascending{kEntry, L"A", L"b", L"c"};
+    AddStationsOfModel({L"b", L"A", L"c"});
+    const Names descending{kEntry, L"c", L"b", L"A"};
+    const Names ascending{kEntry, L"A", L"b", L"c"};
     CExplorerWindow& first = Open(L"", Details());
     CExplorerWindow& second = Open(L"", Details());
     NotifyFromList(first, LVN_COLUMNCLICK, -1, 0);
@@ -112,18 +106,8 @@ TEST_F(ShellViewTest, TwoViewsInOneProcessSortEachByItsOwnClicks) {
     EXPECT_EQ(ascending, Texts(second));
 }
 
-TEST_F(ShellViewTest, TheStatusBarNamesTheFolderInOnePart) {
-    AddStationOfModel(L"North");
-    CExplorerWindow& top = Open();
-    EXPECT_EQ(1, top.StatusPartCount());
-    // The top folder's own name is its root item's.
-    EXPECT_EQ(L"Quorvel Digital Levels: Quorvel Digital Level", top.StatusText());
-    EXPECT_EQ(L"Quorvel Digital Levels: North", Open(L"North").StatusText());
-}
-
 TEST_F(ShellViewTest, GetItemObjectAnswersForTheFirstSelectedItemOnly) {
-    AddStationOfModel(L"A");
-    AddStationOfModel(L"B");
+    AddStationsOfModel({L"A", L"B"});
     CExplorerWindow& browser = Open();
     ComPtr<IDataObject> object;
     EXPECT_EQ(E_INVALIDARG,
@@ -157,62 +141,52 @@ TEST_F(ShellViewTest, TheCommandTargetAnswersTheShellsTwoGroupsOnly) {
     EXPECT_EQ(OLECMDERR_E_UNKNOWNGROUP, target->QueryStatus(&unknown, 2, commands, nullptr));
     EXPECT_EQ(E_POINTER, target->QueryStatus(&CGID_Explorer, 2, nullptr, nullptr));
     EXPECT_EQ(OLECMDERR_E_UNKNOWNGROUP, target->Exec(&unknown, 1286, 0, nullptr, nullptr));
-    EXPECT_EQ(LVS_ICON, ::GetWindowLongW(List(browser), GWL_STYLE) & LVS_TYPEMASK);
+    EXPECT_EQ(static_cast<DWORD>(LVS_ICON), ListStyle(browser));
     EXPECT_EQ(S_OK, target->Exec(&CGID_ShellDocView, 1286, 0, nullptr, nullptr));
-    EXPECT_EQ(LVS_REPORT, ::GetWindowLongW(List(browser), GWL_STYLE) & LVS_TYPEMASK);
-}
-
-TEST_F(ShellViewTest, TranslateAcceleratorSaysNotHandledWhileCtrlCCopies) {
-    AddStationOfModel(L"North");
-    CExplorerWindow& browser = Open();
-    Select(browser, {1});
-    BYTE keys[256] = {};
-    ASSERT_TRUE(::GetKeyboardState(keys));
-    keys[VK_CONTROL] = 0x80;
-    ASSERT_TRUE(::SetKeyboardState(keys));
-    MSG message{};
-    message.hwnd = List(browser);
-    message.message = WM_KEYDOWN;
-    message.wParam = 'C';
-    message.lParam = 0x002E0001;
-    EXPECT_EQ(S_FALSE, browser.View()->TranslateAccelerator(&message));
-    keys[VK_CONTROL] = 0;
-    ASSERT_TRUE(::SetKeyboardState(keys));
-    browser.PumpMessages(50);
-    const UINT format = RegisteredFormat(ClipboardFormat::StationList);
-    EXPECT_TRUE(::IsClipboardFormatAvailable(format));
+    EXPECT_EQ(static_cast<DWORD>(LVS_REPORT), ListStyle(browser));
 }
 
 // Wine's browsers never call TranslateAccelerator: the list's own keys still give commands, and a
 // browser that does call it does not get each command twice.
 TEST_F(ShellViewTest, ShortcutsWorkWithAndWithoutTheBrowsersTranslationAndActOnce) {
-    AddStationOfModel(L"A");
-    AddStationOfModel(L"B");
+    AddStationsOfModel({L"A", L"B"});
     CExplorerWindow& browser = Open();
     Select(browser, {1});
     BYTE keys[256] = {};
     ASSERT_TRUE(::GetKeyboardState(keys));
-    const auto press = [&](WORD key, bool control, bool throughBrowser) {
-        keys[VK_CONTROL] = control ? 0x80 : 0;
+    const auto control = [&](bool down) {
+        keys[VK_CONTROL] = down ? 0x80 : 0;
         ASSERT_TRUE(::SetKeyboardState(keys));
+    };
+    // Handed to TranslateAccelerator, Ctrl+C copies and is still reported as not handled.
+    control(true);
+    MSG message{List(browser), WM_KEYDOWN, 'C', 0x002E0001, 0, {}};
+    EXPECT_EQ(S_FALSE, browser.View()->TranslateAccelerator(&message));
+    control(false);
+    browser.PumpMessages(50);
+    EXPECT_TRUE(::IsClipboardFormatAvailable(RegisteredFormat(ClipboardFormat::StationList)));
+    (void)::OleSetClipboard(nullptr);  // the key below must copy for itself
+    ASSERT_FALSE(::IsClipboardFormatAvailable(RegisteredFormat(ClipboardFormat::StationList)));
+
+    const auto press = [&](WORD key, bool withControl, bool throughBrowser) {
+        control(withControl);
         ::PostMessageW(List(browser), WM_KEYDOWN, key, 1);
         if (throughBrowser) {
             browser.PumpMessages(50);
         } else {
-            MSG message;
-            while (::PeekMessageW(&message, nullptr, 0, 0, PM_REMOVE))
-                ::DispatchMessageW(&message);
+            MSG posted;
+            while (::PeekMessageW(&posted, nullptr, 0, 0, PM_REMOVE))
+                ::DispatchMessageW(&posted);
         }
-        keys[VK_CONTROL] = 0;
-        ASSERT_TRUE(::SetKeyboardState(keys));
+        control(false);
         WaitForFill(browser);
     };
     press('C', true, false);
     press('V', true, true);
-    EXPECT_EQ((std::vector<std::wstring>{L"A", L"B", L"Copy of A"}), ListStationNames());
+    EXPECT_EQ((Names{L"A", L"B", L"Copy of A"}), ListStationNames());
     Select(browser, {1});  // A
     press(VK_DELETE, false, false);
-    EXPECT_EQ((std::vector<std::wstring>{L"B", L"Copy of A"}), ListStationNames());
+    EXPECT_EQ((Names{L"B", L"Copy of A"}), ListStationNames());
 }
 
 }  // namespace

@@ -30,8 +30,7 @@ bool Grayed(HMENU menu, UINT command) {
 }
 
 TEST_F(ShellViewTest, MergedItemsAreEnabledByWhatIsSelected) {
-    AddStationOfModel(L"A");
-    AddStationOfModel(L"B");
+    AddStationsOfModel({L"A", L"B"});
     CExplorerWindow& browser = Open();
     const struct {
         const char* selection;
@@ -109,13 +108,13 @@ TEST_F(ShellViewTest, AGermanUiTranslatesTheEntryTheMenusAndTheStatusText) {
     ASSERT_TRUE(SelectThreadUiLanguage(MAKELANGID(LANG_GERMAN, SUBLANG_GERMAN)));
     CExplorerWindow& browser = Open(L"", Details());
     const HMENU bar = browser.MenuBar();
-    const std::vector<std::wstring> entry = Texts(browser);
+    const Names entry = Texts(browser);
     const std::wstring open = Entry(bar, 1289).text;
     const std::wstring create = Entry(bar, 1280).text;
     const std::wstring copy = Entry(bar, 1281).text;
     const std::wstring status = browser.StatusText();
     EXPECT_TRUE(SelectThreadUiLanguage(before));
-    EXPECT_EQ(std::vector<std::wstring>{L"Neues Digitalnivellier hinzufügen"}, entry);
+    EXPECT_EQ(Names{L"Neues Digitalnivellier hinzufügen"}, entry);
     EXPECT_EQ(L"Öffnen", open);
     EXPECT_EQ(L"Digitalnivellier anlegen", create);
     EXPECT_EQ(L"&Kopieren", copy);
@@ -130,7 +129,7 @@ TEST_F(ShellViewTest, InAFileDialogOpenReadsSelect) {
 TEST_F(ShellViewTest, ABrowserWithoutMenusLeavesAWorkingView) {
     AddStationOfModel(L"North");
     CExplorerWindow& browser = Open(L"", {.menusNotImplemented = true});
-    EXPECT_EQ((std::vector<std::wstring>{kEntry, L"North"}), Texts(browser));
+    EXPECT_EQ((Names{kEntry, L"North"}), Texts(browser));
     Select(browser, {1});
     EXPECT_EQ(S_OK, Command(browser, 1281));
     EXPECT_TRUE(::IsClipboardFormatAvailable(RegisteredFormat(ClipboardFormat::StationList)));

@@ -1,7 +1,5 @@
-// Pasting stations through the view's Paste command, with real blocks on the clipboard: a
-// thousand into a thousand while the view answers messages, the limits and the names the store
-// could not keep (refused whole, with a message, nothing written), and a station another program
-// named with a backslash.
+// The view's Paste with other programs' blocks on the clipboard: a thousand into a thousand while
+// the view answers, blocks refused whole, a backslash in a stored name, a store that refuses.
 #include "tests/view/view_fixture.h"
 
 #include <atomic>
@@ -14,8 +12,6 @@
 #include "tests/stations/store_refusal.h"
 
 namespace {
-
-using Names = std::vector<std::wstring>;
 
 // Puts a station-list block on the clipboard as another program would, without a data object.
 void PutBlockOnClipboard(const std::vector<uint8_t>& block, size_t padding = 0) {
@@ -75,16 +71,7 @@ private:
     UniqueWindow window_;
 };
 
-class PasteTest : public ShellViewTest {
-protected:
-    // The texts of the message boxes shown so far.
-    std::vector<std::wstring> Messages() const {
-        std::vector<std::wstring> texts;
-        for (const auto& box : user_.MessageBoxes())
-            texts.push_back(box.text);
-        return texts;
-    }
-};
+class PasteTest : public ShellViewTest {};
 
 TEST_F(PasteTest, AThousandIntoAThousandWhileTheViewAnswersMessagesWithOneBroadcast) {
     Names stored;
@@ -130,7 +117,7 @@ TEST_F(PasteTest, AThousandIntoAThousandWhileTheViewAnswersMessagesWithOneBroadc
     EXPECT_EQ(S_OK, result);
     EXPECT_GT(answeredWhilePasting.load(), 0) << "the view did not answer while it pasted";
     EXPECT_EQ(0, unanswered.load());
-    EXPECT_TRUE(Messages().empty());
+    EXPECT_TRUE(user_.MessageBoxes().empty());
     std::set<std::wstring> expected(stored.begin(), stored.end());
     for (int number = 1; number < 1000; ++number)
         expected.insert(L"Copy of " + LevelName(number));
@@ -144,80 +131,68 @@ TEST_F(PasteTest, AThousandIntoAThousandWhileTheViewAnswersMessagesWithOneBroadc
     EXPECT_EQ(1, broadcasts.Count());
 }
 
-TEST_F(PasteTest, BlocksOverTheLimitsAreRefusedWholeWithAMessage) {
-    AddStationOfModel(L"Kept");
+// Each refused block writes nothing and says why in one box in the view. (The view's own Copy
+// cannot carry a name of 255 characters yet: the data object cuts the item's path at 260.)
+TEST_F(PasteTest, BlocksOverTheLimitsOrWithANameTheStoreCannotKeepAreRefusedWholeWithAMessage) {
+    const std::wstring longName(255, L'N');  // fits the store; "Copy of " in front would not
+    AddStationsOfModel({L"Kept", longName.c_str()});
+    const Names stored{L"Kept", longName};
     Names many;
     for (int number = 1; number <= 1001; ++number)
         many.push_back(LevelName(number));
+    std::vector<uint8_t> countOverLimit = SerializeStationRecords(StationsNamed({L"A"}));
+    countOverLimit[0] = 0xE9;  // 1001
+    countOverLimit[1] = 0x03;
     const std::wstring tooMany =
         L"Nothing was pasted: the clipboard holds more digital levels than can be pasted at once "
         L"(at most 1000, in 1024 KB).";
-    const struct {
-        const char* what;
-        std::vector<uint8_t> block;
-        size_t padding;
-    } cases[] = {
-        {"1,001 stations", SerializeStationRecords(StationsNamed(many)), 0},
-        {"a count over the limit with fewer records",
-         [] {
-             std::vector<uint8_t> block = SerializeStationRecords(StationsNamed({L"A"}));
-             block[0] = 0xE9;  // 1001
-             block[1] = 0x03;
-             return block;
-         }(),
-         0},
-        {"one station in a block of 1 MiB and a byte",
-         SerializeStationRecords(StationsNamed({L"A"})), 1024 * 1024},
+    // The second of three stations; the message quotes its name cut to 64 characters.
+    const auto unstorable = [](const Station& station, const std::wstring& quoted) {
+        return std::pair{SerializeStationRecords({Named(L"Good"), station, Named(L"Fine")}),
+                         L"Nothing was pasted: digital level 2 on the clipboard, '" + quoted +
+                             L"', cannot be stored as it is. A name must not be empty, be longer "
+                             L"than 259 characters or contain a backslash, slash, double quote or "
+                             L"asterisk, and no setting may be longer than 259 characters."};
     };
-    CExplorerWindow& browser = Open();
-    for (const auto& test : cases) {
-        PutBlockOnClipboard(test.block, test.padding);
-        const size_t before = user_.MessageBoxes().size();
-        EXPECT_EQ(S_OK, Command(browser, 1282)) << test.what;
-        const auto boxes = user_.MessageBoxes();
-        ASSERT_EQ(before + 1, boxes.size()) << test.what;
-        EXPECT_EQ(tooMany, boxes.back().text) << test.what;
-        EXPECT_EQ(browser.ViewWindow(), boxes.back().owner) << test.what;
-        EXPECT_EQ(static_cast<UINT>(MB_ICONERROR), boxes.back().style) << test.what;
-        EXPECT_EQ(Names{L"Kept"}, ListStationNames()) << test.what;
-    }
-    // At the limit itself the block goes in.
-    many.pop_back();
-    PutBlockOnClipboard(SerializeStationRecords(StationsNamed(many)));
-    EXPECT_EQ(S_OK, Command(browser, 1282));
-    EXPECT_EQ(1001u, ListStationNames().size());
-}
-
-TEST_F(PasteTest, ABlockWithANameTheStoreCannotKeepWritesNothingAndNamesIt) {
-    AddStationOfModel(L"Kept");
     Station longPort = Named(L"Long port");
     longPort.Port = std::wstring(260, L'P');
     const struct {
-        Station station;
-        std::wstring quoted;  // as the message quotes it
+        const char* what;
+        std::pair<std::vector<uint8_t>, std::wstring> blockAndText;
+        size_t padding = 0;
     } cases[] = {
-        {Named(L""), L""},
-        {Named(L"Site\\North"), L"Site\\North"},
-        {Named(L"c/d"), L"c/d"},
-        {Named(L"say \"x\""), L"say \"x\""},
-        {Named(L"st*r"), L"st*r"},
-        {Named(std::wstring(260, L'L')), std::wstring(64, L'L') + L"\x2026"},
-        {longPort, L"Long port"},
+        {"1,001 stations", {SerializeStationRecords(StationsNamed(many)), tooMany}},
+        {"a count over the limit with fewer records", {countOverLimit, tooMany}},
+        {"one station in a block of 1 MiB and a byte",
+         {SerializeStationRecords(StationsNamed({L"A"})), tooMany},
+         1024 * 1024},
+        {"an empty name", unstorable(Named(L""), L"")},
+        {"a backslash", unstorable(Named(L"Site\\North"), L"Site\\North")},
+        {"a slash", unstorable(Named(L"c/d"), L"c/d")},
+        {"a double quote", unstorable(Named(L"say \"x\""), L"say \"x\"")},
+        {"an asterisk", unstorable(Named(L"st*r"), L"st*r")},
+        {"260 characters",
+         unstorable(Named(std::wstring(260, L'L')), std::wstring(64, L'L') + L"\x2026")},
+        {"a port of 260 characters", unstorable(longPort, L"Long port")},
+        {"a name of 255 pasted over itself",
+         {SerializeStationRecords({Named(longName)}),
+          L"Nothing was pasted: the digital level '" + std::wstring(64, L'N') +
+              L"\x2026' already exists, and the name of its copy would be longer than 259 "
+              L"characters. Give it a shorter name and copy it again."}},
     };
     CExplorerWindow& browser = Open();
     for (const auto& test : cases) {
-        PutBlockOnClipboard(
-            SerializeStationRecords({Named(L"Good"), test.station, Named(L"Fine")}));
+        SCOPED_TRACE(test.what);
+        PutBlockOnClipboard(test.blockAndText.first, test.padding);
+        const size_t before = user_.MessageBoxes().size();
         EXPECT_EQ(S_OK, Command(browser, 1282));
-        ASSERT_FALSE(user_.MessageBoxes().empty());
-        EXPECT_EQ(L"Nothing was pasted: digital level 2 on the clipboard, '" + test.quoted +
-                      L"', cannot be stored as it is. A name must not be empty, be longer than "
-                      L"259 characters or contain a backslash, slash, double quote or asterisk, "
-                      L"and no setting may be longer than 259 characters.",
-                  user_.MessageBoxes().back().text);
-        EXPECT_EQ(Names{L"Kept"}, ListStationNames()) << test.quoted;
+        const auto boxes = user_.MessageBoxes();
+        ASSERT_EQ(before + 1, boxes.size());
+        EXPECT_EQ(test.blockAndText.second, boxes.back().text);
+        EXPECT_EQ(browser.ViewWindow(), boxes.back().owner);
+        EXPECT_EQ(static_cast<UINT>(MB_ICONERROR), boxes.back().style);
+        EXPECT_EQ(stored, ListStationNames());
     }
-    EXPECT_EQ(std::size(cases), user_.MessageBoxes().size());
 
     // A record cut short ends the block: the complete ones before it are pasted.
     std::vector<uint8_t> block = SerializeStationRecords({Named(L"Good"), Named(L"Fine")});
@@ -226,24 +201,13 @@ TEST_F(PasteTest, ABlockWithANameTheStoreCannotKeepWritesNothingAndNamesIt) {
     block.insert(block.end(), liar.begin(), liar.end());
     PutBlockOnClipboard(block);
     EXPECT_EQ(S_OK, Command(browser, 1282));
-    EXPECT_EQ((Names{L"Kept", L"Good", L"Fine"}), ListStationNames());
-    EXPECT_EQ((Names{kEntry, L"Fine", L"Good", L"Kept"}), Texts(browser));
-}
-
-TEST_F(PasteTest, ALongNamePastedOverItselfIsRefusedRatherThanCut) {
-    // 255 characters fit the store; "Copy of " in front would not. (The view's own Copy cannot
-    // carry a name this long yet: the data object cuts the item's path at 260 characters.)
-    const std::wstring name(255, L'N');
-    AddStationOfModel(name);
-    CExplorerWindow& browser = Open();
-    PutBlockOnClipboard(SerializeStationRecords({Named(name)}));
+    EXPECT_EQ((Names{L"Kept", longName, L"Good", L"Fine"}), ListStationNames());
+    EXPECT_EQ((Names{kEntry, L"Fine", L"Good", L"Kept", longName}), Texts(browser));
+    // At the limit itself the block goes in.
+    many.pop_back();
+    PutBlockOnClipboard(SerializeStationRecords(StationsNamed(many)));
     EXPECT_EQ(S_OK, Command(browser, 1282));
-    ASSERT_EQ(1u, user_.MessageBoxes().size());
-    EXPECT_EQ(L"Nothing was pasted: the digital level '" + std::wstring(64, L'N') +
-                  L"\x2026' already exists, and the name of its copy would be longer than 259 "
-                  L"characters. Give it a shorter name and copy it again.",
-              user_.MessageBoxes().front().text);
-    EXPECT_EQ(Names{name}, ListStationNames());
+    EXPECT_EQ(1004u, ListStationNames().size());
 }
 
 TEST_F(PasteTest, AStationNamedWithABackslashIsNotListedAsAnotherAndActsOnNone) {
