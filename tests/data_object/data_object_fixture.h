@@ -7,13 +7,17 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <filesystem>
+#include <fstream>
+#include <iterator>
 #include <memory>
 #include <string>
 #include <vector>
 
 #include "download/dialog_station_downloader.h"
 #include "download/station_downloader.h"
+#include "download/win32_serial_port.h"
 #include "namespace/pidl_manager.h"
 #include "stations/station_list_block.h"
 #include "stations/station_store.h"
@@ -27,6 +31,7 @@
 #include "view/lv_data_object.h"
 
 constexpr wchar_t kNorthFile[] = L"Quorvel Digital Level\\North\\file1.lv";
+constexpr wchar_t kSouthFile[] = L"Quorvel Digital Level\\South\\file1.hvr";  // an LV-30's
 // What a download writes in the tests that play one.
 constexpr char kContent[] = "A,01,Z\r\n1,0.000,12.5,!,\r\n";
 
@@ -70,15 +75,45 @@ inline bool FileExists(const std::wstring& path) {
     return ::GetFileAttributesW(path.c_str()) != INVALID_FILE_ATTRIBUTES;
 }
 
+inline std::string ContentOf(const std::filesystem::path& path) {
+    std::ifstream in(path, std::ios::binary);
+    return {std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>()};
+}
+
+// The files in a folder, by name; none when there is no such folder.
+inline std::vector<std::wstring> FilesIn(const std::filesystem::path& folder) {
+    std::vector<std::wstring> names;
+    std::error_code missing;
+    for (const auto& entry : std::filesystem::directory_iterator(folder, missing))
+        names.push_back(entry.path().filename().wstring());
+    std::sort(names.begin(), names.end());
+    return names;
+}
+
 // The downloads ("QRV" files) in the temporary folder.
 inline std::vector<std::wstring> TemporaryDownloads() {
-    std::vector<std::wstring> names;
-    for (const auto& entry :
-         std::filesystem::directory_iterator(std::filesystem::temp_directory_path())) {
-        if (entry.path().filename().wstring().starts_with(L"QRV"))
-            names.push_back(entry.path().filename().wstring());
-    }
+    std::vector<std::wstring> names = FilesIn(std::filesystem::temp_directory_path());
+    std::erase_if(names, [](const std::wstring& name) { return !name.starts_with(L"QRV"); });
     return names;
+}
+
+// The content written as the external library writes its file, shared with readers: a download
+// target may already hold the file for reading.
+inline void WriteAsTheLibraryDoes(const std::wstring& path, const std::string& content) {
+    UniqueFileHandle file(::CreateFileW(path.c_str(), GENERIC_WRITE, FILE_SHARE_READ, nullptr,
+                                        OPEN_ALWAYS, 0, nullptr));
+    DWORD written = 0;
+    ASSERT_TRUE(::WriteFile(file.get(), content.data(), static_cast<DWORD>(content.size()),
+                            &written, nullptr));
+}
+
+// The content written as the serial driver writes its output: through its own receive file.
+inline void WriteAsTheDriverDoes(const std::wstring& path, const std::string& content) {
+    Win32ReceiveFile file(path);
+    ASSERT_EQ(static_cast<uint32_t>(ERROR_SUCCESS), file.Create());
+    ASSERT_EQ(static_cast<uint32_t>(ERROR_SUCCESS),
+              file.Write(reinterpret_cast<const uint8_t*>(content.data()), content.size()));
+    ASSERT_EQ(static_cast<uint32_t>(ERROR_SUCCESS), file.Close());
 }
 
 class DataObject : public ::testing::Test {

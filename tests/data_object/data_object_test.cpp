@@ -70,7 +70,7 @@ TEST_F(DataObject, EnumerationListsFourFormatsButNotTheDropEffectWhichIsAlwaysCo
 
 TEST_F(DataObject, FileGroupDescriptorNamesFilesByModel) {
     ComPtr<IDataObject> data =
-        Over({kNorthFile, L"Quorvel Digital Level\\South\\file1.hvr",
+        Over({kNorthFile, kSouthFile,
               L"Quorvel Digital Level\\Deleted\\file1.hvr", L"Quorvel Digital Level"});
     UniqueStgMedium medium;
     ASSERT_EQ(S_OK, Get(data.Get(), CFSTR_FILEDESCRIPTORW, TYMED_HGLOBAL, medium));

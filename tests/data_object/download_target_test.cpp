@@ -6,63 +6,23 @@
 
 #include <cwchar>
 #include <filesystem>
-#include <fstream>
 #include <set>
 #include <string>
 #include <thread>
 #include <vector>
 
 #include "download/download_target.h"
-#include "download/win32_serial_port.h"
 #include "tests/data_object/data_object_fixture.h"
 #include "view/stream2.h"
 
-namespace {
-
-// A folder of the test's own in the temporary folder, removed with everything in it.
-class ScratchFolder {
-public:
-    ScratchFolder() {
-        path_ = std::filesystem::temp_directory_path() /
-                (L"lvtarget-" + std::to_wstring(::GetCurrentProcessId()));
-        std::filesystem::remove_all(path_);
-        std::filesystem::create_directories(path_);
-    }
-    ~ScratchFolder() {
-        std::error_code ignored;
-        std::filesystem::remove_all(path_, ignored);
-    }
-    std::wstring Path() const { return path_.wstring() + L"\\"; }
-    std::vector<std::wstring> Names() const {
-        std::vector<std::wstring> names;
-        for (const auto& entry : std::filesystem::directory_iterator(path_))
-            names.push_back(entry.path().filename().wstring());
-        return names;
-    }
-
-private:
-    std::filesystem::path path_;
+// The fixture's folder of download records stands in for the temporary folder.
+class DownloadTargets : public DataObject {
+protected:
+    std::wstring Folder() const { return records_.wstring() + L"\\"; }
 };
 
-std::string ContentOf(const std::wstring& path) {
-    std::ifstream file(std::filesystem::path(path), std::ios::binary);
-    return std::string(std::istreambuf_iterator<char>(file), std::istreambuf_iterator<char>());
-}
-
-// Writes the content the way the serial driver writes its output: its own receive file.
-void WriteAsTheDriverDoes(const std::wstring& path, const std::string& content) {
-    Win32ReceiveFile file(path);
-    ASSERT_EQ(static_cast<uint32_t>(ERROR_SUCCESS), file.Create());
-    ASSERT_EQ(static_cast<uint32_t>(ERROR_SUCCESS),
-              file.Write(reinterpret_cast<const uint8_t*>(content.data()), content.size()));
-    ASSERT_EQ(static_cast<uint32_t>(ERROR_SUCCESS), file.Close());
-}
-
-}  // namespace
-
 // Each target owns a name no other has, however many are prepared and from how many threads.
-TEST(DownloadTarget, TargetsPreparedAtOnceGetNamesOfTheirOwn) {
-    ScratchFolder folder;
+TEST_F(DownloadTargets, TargetsPreparedAtOnceGetNamesOfTheirOwn) {
     constexpr int kRounds = 20;
     std::vector<DownloadTarget> targets(2 * kRounds);
     for (int round = 0; round < kRounds; ++round) {
@@ -75,7 +35,7 @@ TEST(DownloadTarget, TargetsPreparedAtOnceGetNamesOfTheirOwn) {
         for (int side = 0; side < 2; ++side) {
             threads[side] = std::thread([&, side] {
                 ::WaitForSingleObject(start.get(), INFINITE);
-                results[side] = DownloadTarget::Create(folder.Path(), targets[2 * round + side]);
+                results[side] = DownloadTarget::Create(Folder(), targets[2 * round + side]);
             });
         }
         ::SetEvent(start.get());
@@ -87,24 +47,23 @@ TEST(DownloadTarget, TargetsPreparedAtOnceGetNamesOfTheirOwn) {
     std::set<std::wstring> paths;
     for (const DownloadTarget& target : targets) {
         EXPECT_TRUE(paths.insert(target.Path()).second) << "shared: " << target.Path();
-        EXPECT_EQ(0u, target.Path().rfind(folder.Path() + L"QRV", 0)) << target.Path();
+        EXPECT_EQ(0u, target.Path().rfind(Folder() + L"QRV", 0)) << target.Path();
         EXPECT_EQ(target.Path(), target.Reservation().substr(0, target.Path().size()));
         EXPECT_TRUE(FileExists(target.Path()));
         EXPECT_TRUE(FileExists(target.Reservation()));
     }
     targets.clear();
-    EXPECT_TRUE(folder.Names().empty()) << "files and reservations go with their targets";
+    EXPECT_TRUE(FilesIn(records_).empty()) << "files and reservations go with their targets";
 }
 
 // Held, the file can be written by the download but not deleted, renamed or replaced by anyone;
 // once the stream has read it, it and its reservation are gone, and nothing else is.
-TEST(DownloadTarget, TheHeldFileIsWrittenAndReadButNeitherDeletedNorRenamed) {
-    ScratchFolder folder;
+TEST_F(DownloadTargets, TheHeldFileIsWrittenAndReadButNeitherDeletedNorRenamed) {
     DownloadTarget target;
-    ASSERT_EQ(S_OK, DownloadTarget::Create(folder.Path(), target));
+    ASSERT_EQ(S_OK, DownloadTarget::Create(Folder(), target));
     const std::wstring path = target.Path();
     const std::wstring reservation = target.Reservation();
-    const std::wstring elsewhere = folder.Path() + L"moved";
+    const std::wstring elsewhere = Folder() + L"moved";
 
     EXPECT_FALSE(::DeleteFileW(path.c_str()));
     EXPECT_EQ(static_cast<DWORD>(ERROR_SHARING_VIOLATION), ::GetLastError());
@@ -125,15 +84,14 @@ TEST(DownloadTarget, TheHeldFileIsWrittenAndReadButNeitherDeletedNorRenamed) {
     EXPECT_EQ(kContent, ReadToEnd(stream.Get()));
     EXPECT_FALSE(FileExists(path));
     EXPECT_FALSE(FileExists(reservation));
-    EXPECT_TRUE(folder.Names().empty());
+    EXPECT_TRUE(FilesIn(records_).empty());
 }
 
 // A file that is already under the reserved name, however it came there, is not ours: it is
 // neither emptied nor deleted, and the next name is taken.
-TEST(DownloadTarget, AFileAlreadyUnderTheNameIsNeverOverwritten) {
-    ScratchFolder folder;
-    const std::wstring reservation = folder.Path() + L"QRVBEEF.tmp";
-    const std::wstring theirs = folder.Path() + L"QRVBEEF";
+TEST_F(DownloadTargets, AFileAlreadyUnderTheNameIsNeverOverwritten) {
+    const std::wstring reservation = Folder() + L"QRVBEEF.tmp";
+    const std::wstring theirs = Folder() + L"QRVBEEF";
     std::ofstream(std::filesystem::path(reservation)).close();
     std::ofstream(std::filesystem::path(theirs), std::ios::binary) << "their survey";
     {
@@ -148,8 +106,8 @@ TEST(DownloadTarget, AFileAlreadyUnderTheNameIsNeverOverwritten) {
     // Through the folder: names already taken by files of others next to a fresh one (the system
     // hands out numbers in order) are stepped over, and their files left as they were.
     DownloadTarget first;
-    ASSERT_EQ(S_OK, DownloadTarget::Create(folder.Path(), first));
-    const std::wstring stem = first.Path().substr(folder.Path().size() + 3);
+    ASSERT_EQ(S_OK, DownloadTarget::Create(Folder(), first));
+    const std::wstring stem = first.Path().substr(Folder().size() + 3);
     const unsigned number = static_cast<unsigned>(wcstoul(stem.c_str(), nullptr, 16));
     const bool upper = stem.find_first_of(L"ABCDEF") != std::wstring::npos;
     std::set<std::wstring> planted;
@@ -157,31 +115,30 @@ TEST(DownloadTarget, AFileAlreadyUnderTheNameIsNeverOverwritten) {
         wchar_t name[16];
         swprintf(name, 16, upper ? L"QRV%X" : L"QRV%x", next & 0xFFFF);
         planted.insert(name);
-        std::ofstream(std::filesystem::path(folder.Path() + name), std::ios::binary)
+        std::ofstream(std::filesystem::path(Folder() + name), std::ios::binary)
             << std::string(name, name + wcslen(name));
     }
     DownloadTarget second;
-    ASSERT_EQ(S_OK, DownloadTarget::Create(folder.Path(), second));
-    const std::wstring secondName = second.Path().substr(folder.Path().size());
+    ASSERT_EQ(S_OK, DownloadTarget::Create(Folder(), second));
+    const std::wstring secondName = second.Path().substr(Folder().size());
     EXPECT_EQ(0u, planted.count(secondName)) << "took " << secondName;
     second.Remove();
     first.Remove();
-    const std::vector<std::wstring> names = folder.Names();
+    const std::vector<std::wstring> names = FilesIn(records_);
     std::set<std::wstring> left(names.begin(), names.end());
     left.erase(L"QRVBEEF");
     EXPECT_EQ(planted, left) << "only the files of others are left, no reservation";
     for (const std::wstring& name : planted)
-        EXPECT_EQ(std::string(name.begin(), name.end()), ContentOf(folder.Path() + name));
+        EXPECT_EQ(std::string(name.begin(), name.end()), ContentOf(Folder() + name));
 }
 
 // GetTempFileNameW takes a folder of at most MAX_PATH - 14 characters; a longer one is refused
 // with that reason before anything is made in it.
-TEST(DownloadTarget, AFolderTooLongForTheSystemsTemporaryNamesIsRefusedWithItsReason) {
-    ScratchFolder folder;
+TEST_F(DownloadTargets, AFolderTooLongForTheSystemsTemporaryNamesIsRefusedWithItsReason) {
     const std::wstring longest =
-        folder.Path() + std::wstring(MAX_PATH - 14 - folder.Path().size() - 1, L'd') + L"\\";
+        Folder() + std::wstring(MAX_PATH - 14 - Folder().size() - 1, L'd') + L"\\";
     const std::wstring tooLong =
-        folder.Path() + std::wstring(MAX_PATH - 14 - folder.Path().size(), L'e') + L"\\";
+        Folder() + std::wstring(MAX_PATH - 14 - Folder().size(), L'e') + L"\\";
     ASSERT_EQ(static_cast<size_t>(MAX_PATH - 14), longest.size());
     ASSERT_TRUE(::CreateDirectoryW(longest.c_str(), nullptr));
     ASSERT_TRUE(::CreateDirectoryW(tooLong.c_str(), nullptr));

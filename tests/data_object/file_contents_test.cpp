@@ -10,7 +10,6 @@
 
 #include "download/halvek_download_progress_dialog.h"
 #include "download/progress_dialog_base.h"
-#include "download/win32_serial_port.h"
 #include "support/module_instance.h"
 #include "support/registered_messages.h"
 #include "tests/data_object/data_object_fixture.h"
@@ -50,21 +49,10 @@ private:
         // The external library writes under the given name with ".txt" added.
         const bool external = dynamic_cast<CHalvekDownloadProgressDialog*>(dialog_) != nullptr;
         writtenPath = dialog_->OutputPath() + (external ? L".txt" : L"");
-        if (external) {
-            UniqueFileHandle file(::CreateFileW(writtenPath.c_str(), GENERIC_WRITE, 0, nullptr,
-                                                CREATE_ALWAYS, 0, nullptr));
-            DWORD written = 0;
-            EXPECT_TRUE(::WriteFile(file.get(), content_.data(),
-                                    static_cast<DWORD>(content_.size()), &written, nullptr));
-        } else {
-            // The serial driver's own output file, into the target that the data object holds.
-            Win32ReceiveFile file(writtenPath);
-            EXPECT_EQ(static_cast<uint32_t>(ERROR_SUCCESS), file.Create());
-            EXPECT_EQ(
-                static_cast<uint32_t>(ERROR_SUCCESS),
-                file.Write(reinterpret_cast<const uint8_t*>(content_.data()), content_.size()));
-            EXPECT_EQ(static_cast<uint32_t>(ERROR_SUCCESS), file.Close());
-        }
+        if (external)
+            WriteAsTheLibraryDoes(writtenPath, content_);
+        else  // the serial driver's own output file, into the target that the data object holds
+            WriteAsTheDriverDoes(writtenPath, content_);
         if (!completes_) {
             ::PostMessageW(window, WM_COMMAND, IDOK, 0);
             ::PostMessageW(window, WM_COMMAND, IDCANCEL, 0);
@@ -86,34 +74,45 @@ class FileContents : public DataObject {};
 
 }  // namespace
 
+// The external library's word is not taken for a file either: one that is empty when the library
+// reports success fails the copy with a failure result, after the surveyor was told.
 TEST_F(FileContents, OnlyACompletedTransferGivesAStreamAndNoOutcomeLeavesADownloadBehind) {
     struct Case {
         const wchar_t* item;
         bool completes;            // or a stray IDOK, then Cancel
         const wchar_t* extension;  // of the file the transfer writes
+        HRESULT expected;
+        INT_PTR ended;  // how the dialog ends
+        std::string content = kContent;
+        const wchar_t* told = nullptr;  // the start of the one message box shown, if any
     } const cases[] = {
-        {kNorthFile, true, L""},
-        {L"Quorvel Digital Level\\South\\file1.hvr", true, L".txt"},
-        {kNorthFile, false, L""},
-        {L"Quorvel Digital Level\\South\\file1.hvr", false, L".txt"},
+        {kNorthFile, true, L"", S_OK, IDOK},
+        {kSouthFile, true, L".txt", S_OK, IDOK},
+        {kNorthFile, false, L"", S_FALSE, IDCANCEL},
+        {kSouthFile, false, L".txt", S_FALSE, IDCANCEL},
+        {kSouthFile, true, L".txt", HRESULT_FROM_WIN32(ERROR_INVALID_DATA), IDCANCEL, "",
+         L"The downloaded file is not complete"},
     };
     const std::vector<std::wstring> before = TemporaryDownloads();
     for (const Case& test : cases) {
-        SCOPED_TRACE(testing::Message()
-                     << test.item << (test.completes ? " completed" : " cancelled"));
-        PlayedDialogs dialogs(test.completes);
+        SCOPED_TRACE(testing::Message() << test.item << (test.completes ? " completed" : " cancelled")
+                                        << " with " << test.content.size() << " bytes");
+        PlayedDialogs dialogs(test.completes, test.content);
         ScopedUserInterface scope(dialogs);
         UniqueStgMedium medium;
-        ASSERT_EQ(test.completes ? S_OK : S_FALSE, DownloadFile(test.item, medium));
-        EXPECT_EQ(test.completes ? IDOK : IDCANCEL, dialogs.result)
-            << "a stray IDOK must not end the download";
+        ASSERT_EQ(test.expected, DownloadFile(test.item, medium));
+        EXPECT_EQ(test.ended, dialogs.result) << "a stray IDOK must not end the download";
+        ASSERT_EQ(test.told ? 1u : 0u, dialogs.messages.size());
+        if (test.told) {
+            EXPECT_EQ(0u, dialogs.messages[0].find(test.told)) << dialogs.messages[0];
+        }
 
         // A unique "QRV" name in the temporary folder without an extension of its own.
         const std::wstring name = dialogs.writtenPath.substr(dialogs.writtenPath.rfind(L'\\') + 1);
         EXPECT_EQ(0u, name.find(L"QRV")) << name;
         const size_t dot = name.find(L'.');
         EXPECT_EQ(test.extension, dot == std::wstring::npos ? L"" : name.substr(dot));
-        if (test.completes) {
+        if (test.expected == S_OK) {
             ASSERT_EQ(static_cast<DWORD>(TYMED_ISTREAM), medium.get().tymed);
             EXPECT_EQ(nullptr, medium.get().pUnkForRelease);
             EXPECT_EQ(kContent, ReadToEnd(medium.get().pstm));
@@ -175,7 +174,7 @@ TEST_F(FileContents, ALongTemporaryFolderTakesTheWholeDownload) {
     ASSERT_EQ(140u, folder.size());
     {
         TemporaryFolderOverride temporary(folder);
-        for (const wchar_t* item : {kNorthFile, L"Quorvel Digital Level\\South\\file1.hvr"}) {
+        for (const wchar_t* item : {kNorthFile, kSouthFile}) {
             SCOPED_TRACE(testing::Message() << item);
             PlayedDialogs dialogs(true);
             ScopedUserInterface scope(dialogs);
@@ -227,22 +226,4 @@ TEST_F(FileContents, TemporaryFolderFailuresAreFailureResultsNamedWithTheirReaso
         }
     }
     std::filesystem::remove(tooLong);
-}
-
-// The external library's word is not taken for a file: one that is empty when the library
-// reports success fails the copy with a failure result, after the surveyor was told.
-TEST_F(FileContents, AnEmptyFileFromTheLibraryIsAFailedDownload) {
-    const std::vector<std::wstring> before = TemporaryDownloads();
-    PlayedDialogs dialogs(true, std::string());
-    ScopedUserInterface scope(dialogs);
-    UniqueStgMedium medium;
-    EXPECT_EQ(HRESULT_FROM_WIN32(ERROR_INVALID_DATA),
-              DownloadFile(L"Quorvel Digital Level\\South\\file1.hvr", medium));
-    EXPECT_EQ(static_cast<DWORD>(TYMED_NULL), medium.get().tymed);
-    EXPECT_EQ(IDCANCEL, dialogs.result);
-    ASSERT_EQ(1u, dialogs.messages.size());
-    EXPECT_EQ(0u, dialogs.messages[0].find(L"The downloaded file is not complete"))
-        << dialogs.messages[0];
-    EXPECT_FALSE(FileExists(dialogs.writtenPath));
-    EXPECT_EQ(before, TemporaryDownloads());
 }

@@ -31,44 +31,6 @@ std::wstring WriteTemporaryFile(size_t size) {
 
 }  // namespace
 
-TEST(Stream2, ExactMultipleNeedsAThirdReadBeforeTheFileIsGone) {
-    const std::wstring path = WriteTemporaryFile(8192);
-    {
-        auto stream = MakeComObject<CStream2>();
-        ASSERT_EQ(S_OK, stream->Bind(path, true));
-        // Two full reads do not yet show the end; the third gives nothing and deletes the file,
-        // and a finished stream gives nothing more.
-        const std::pair<ULONG, bool> reads[] = {{4096, true}, {4096, true}, {0, false}, {0, false}};
-        std::vector<char> buffer(4096);
-        for (const auto& [expected, exists] : reads) {
-            ULONG got = 1;
-            ASSERT_EQ(S_OK, stream->Read(buffer.data(), 4096, &got));
-            EXPECT_EQ(expected, got);
-            EXPECT_EQ(exists, FileExists(path));
-        }
-        STATSTG statistics{};
-        EXPECT_EQ(S_OK, stream->Stat(&statistics, STATFLAG_NONAME));
-        EXPECT_EQ(8192u, statistics.cbSize.QuadPart) << "the size taken at binding";
-    }
-    EXPECT_EQ(0, ModuleLockCount());
-}
-
-TEST(Stream2, ReaderThatStopsEarlyTakesTheFileWithItUnlessTheStreamMayNotDeleteIt) {
-    for (const bool mayDelete : {true, false}) {
-        const std::wstring path = WriteTemporaryFile(100);
-        {
-            auto stream = MakeComObject<CStream2>();
-            ASSERT_EQ(S_OK, stream->Bind(path, mayDelete));
-            char buffer[10];
-            ULONG got = 0;
-            ASSERT_EQ(S_OK, stream->Read(buffer, 10, &got));
-            EXPECT_TRUE(FileExists(path));
-        }
-        EXPECT_EQ(!mayDelete, FileExists(path)) << "a download nobody will finish reading goes";
-        ::DeleteFileW(path.c_str());
-    }
-}
-
 TEST(Stream2, StatFillsTheWholeRecordAndNamesTheFileOnlyWhenAsked) {
     const std::wstring path = WriteTemporaryFile(300);
     auto stream = MakeComObject<CStream2>();
@@ -127,14 +89,39 @@ StreamStep Read(ULONG wanted, uint64_t got, uint64_t from, bool file = true) {
 struct StreamScenario {
     const char* what;
     std::vector<StreamStep> steps;
+    bool mayDelete = true;  // what the stream is bound with
 };
+
+// After the end a file that comes under the same name (the next download may be given it) is not
+// the stream's: nothing of it is read, and it is not deleted a second time when the stream goes.
+// Before the end, letting the stream go takes the file with it, unless it may not delete it.
+void LetGo(Microsoft::WRL::ComPtr<CStream2>& stream, const std::wstring& path, bool mayDelete) {
+    const bool ended = !FileExists(path);
+    if (ended) {
+        std::ofstream(std::filesystem::path(path)) << "the next download";
+        char byte;
+        ULONG got = 1;
+        EXPECT_EQ(S_OK, stream->Read(&byte, 1, &got));
+        EXPECT_EQ(0u, got);
+    }
+    stream.Reset();
+    EXPECT_EQ(ended || !mayDelete, FileExists(path))
+        << (ended ? "deleted a second time" : "a download nobody will finish reading stays");
+    EXPECT_EQ(0, ModuleLockCount());
+    ::DeleteFileW(path.c_str());
+}
 
 }  // namespace
 
 // Every origin of Seek before, during and after the read, as a copy engine uses them: sizing the
 // stream by seeking to its end and back, reading from the middle, and seeking after the end.
-TEST(Stream2, SeekMovesWithinTheFileAndFailsWhereItCannotBeHonoured) {
+TEST(Stream2, ReadAndSeekMoveWithinTheFileAndFailWhereTheyCannotBeHonoured) {
     const StreamScenario scenarios[] = {
+        // Full reads do not yet show the end; the next gives nothing and deletes the file, and a
+        // finished stream gives nothing more.
+        {"an exact multiple of the reads",
+         {Read(500, 500, 0), Read(500, 500, 500), Read(500, 0, 0, false), Read(500, 0, 0, false)}},
+        {"let go half way by a stream that may not delete", {Read(10, 10, 0)}, false},
         {"sized by seeking to the end and back, then read whole",
          {Seek(0, STREAM_SEEK_END, S_OK, kStreamSize), Seek(0, STREAM_SEEK_SET, S_OK, 0),
           Read(600, 600, 0), Read(600, 400, 600, false)}},
@@ -160,7 +147,7 @@ TEST(Stream2, SeekMovesWithinTheFileAndFailsWhereItCannotBeHonoured) {
         SCOPED_TRACE(scenario.what);
         const std::wstring path = WriteTemporaryFile(kStreamSize);
         auto stream = MakeComObject<CStream2>();
-        ASSERT_EQ(S_OK, stream->Bind(path, true));
+        ASSERT_EQ(S_OK, stream->Bind(path, scenario.mayDelete));
         for (size_t index = 0; index < scenario.steps.size(); ++index) {
             const StreamStep& step = scenario.steps[index];
             SCOPED_TRACE(index);
@@ -186,8 +173,7 @@ TEST(Stream2, SeekMovesWithinTheFileAndFailsWhereItCannotBeHonoured) {
         STATSTG statistics{};
         EXPECT_EQ(S_OK, stream->Stat(&statistics, STATFLAG_NONAME));
         EXPECT_EQ(kStreamSize, statistics.cbSize.QuadPart) << "the size outlives the file";
-        stream.Reset();
-        ::DeleteFileW(path.c_str());
+        LetGo(stream, path, scenario.mayDelete);
     }
 }
 
@@ -240,40 +226,7 @@ TEST(Stream2, CopyToCopiesFromThePositionAndEndsTheStreamAtTheLastByte) {
         const auto* bytes = static_cast<const char*>(lock.data());
         for (uint64_t i = 0; i < total; ++i)
             ASSERT_EQ(static_cast<char>('A' + (test.startAt + i) % 26), bytes[i]) << i;
-        stream.Reset();
-        ::DeleteFileW(path.c_str());
-    }
-}
-
-// The temporary file goes once: a file that appears at the same path after the stream ended
-// (the next download may be given the same name) is not the stream's to delete.
-TEST(Stream2, TheFileIsDeletedExactlyOnce) {
-    for (const bool byCopy : {false, true}) {
-        SCOPED_TRACE(byCopy ? "CopyTo" : "Read");
-        const std::wstring path = WriteTemporaryFile(kStreamSize);
-        {
-            auto stream = MakeComObject<CStream2>();
-            ASSERT_EQ(S_OK, stream->Bind(path, true));
-            if (byCopy) {
-                Microsoft::WRL::ComPtr<IStream> target;
-                ASSERT_EQ(S_OK, ::CreateStreamOnHGlobal(nullptr, TRUE, &target));
-                ULARGE_INTEGER all;
-                all.QuadPart = UINT64_MAX;
-                ASSERT_EQ(S_OK, stream->CopyTo(target.Get(), all, nullptr, nullptr));
-            } else {
-                std::vector<char> buffer(2 * kStreamSize);
-                ULONG got = 0;
-                ASSERT_EQ(S_OK, stream->Read(buffer.data(), 2 * kStreamSize, &got));
-            }
-            ASSERT_FALSE(FileExists(path));
-            std::ofstream(std::filesystem::path(path)) << "the next download";
-            ULONG got = 0;
-            char byte;
-            EXPECT_EQ(S_OK, stream->Read(&byte, 1, &got));
-            EXPECT_EQ(0u, got);
-        }
-        EXPECT_TRUE(FileExists(path)) << "deleted a second time";
-        ::DeleteFileW(path.c_str());
+        LetGo(stream, path, true);
     }
 }
 
@@ -303,13 +256,8 @@ TEST(Stream2, ABoundDownloadGoesWithItsReservationOnceHoweverTheStreamEnds) {
         const std::wstring reservation = target.Reservation();
         const std::wstring written = path + (test.writtenBeside ? test.writtenBeside : L"");
         ASSERT_EQ(S_OK, target.AddWrittenFile(written));
-        if (test.ending != Ending::kNothingWritten) {
-            // Shared with readers, as the driver writes: the target holds its file for reading.
-            UniqueFileHandle file(::CreateFileW(written.c_str(), GENERIC_WRITE, FILE_SHARE_READ,
-                                                nullptr, OPEN_ALWAYS, 0, nullptr));
-            DWORD count = 0;
-            ASSERT_TRUE(::WriteFile(file.get(), kContent, sizeof kContent - 1, &count, nullptr));
-        }
+        if (test.ending != Ending::kNothingWritten)
+            WriteAsTheLibraryDoes(written, kContent);
         const bool finished =
             test.ending == Ending::kReadToEnd || test.ending == Ending::kCopiedOut;
         {

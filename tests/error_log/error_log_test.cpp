@@ -29,6 +29,7 @@ using Lines = std::vector<std::wstring>;
 namespace {
 
 constexpr HRESULT kOwnResult = static_cast<HRESULT>(0xA0041234);  // customer bit: no system text
+constexpr DWORD kLimit = 600;  // a small log's: three entries of about 180 bytes
 const std::wstring kAccessDenied = L"System description: " + SystemMessageText(ERROR_ACCESS_DENIED);
 
 int g_macroLine = 0;
@@ -48,13 +49,30 @@ ComPtr<IErrorInfo> SetThreadErrorInfo(const wchar_t* description) {
     return info;
 }
 
-// A log's entries, each without its time stamp line; the file must start with a byte-order mark.
-std::vector<Lines> ReadEntries(const fs::path& path) {
+std::string BytesOf(const fs::path& path) {
     std::ifstream file(path, std::ios::binary);
-    const std::string bytes{std::istreambuf_iterator<char>(file), {}};
-    EXPECT_EQ(0, bytes.compare(0, 2, "\xFF\xFE")) << "a UTF-16 LE byte-order mark";
+    return {std::istreambuf_iterator<char>(file), {}};
+}
+
+std::wstring Utf16Of(const std::string& bytes) {
     std::wstring text(bytes.size() / 2, L'\0');
     memcpy(text.data(), bytes.data(), text.size() * 2);
+    return text;
+}
+
+// Where the log of the prefix's user is, when no folder override is read.
+std::wstring UsersLogPath() {
+    PWSTR localAppData = nullptr;
+    EXPECT_EQ(S_OK, ::SHGetKnownFolderPath(FOLDERID_LocalAppData, 0, nullptr, &localAppData));
+    const UniqueCoTaskMem owner(localAppData);
+    return std::wstring(localAppData) + L"\\Quorvel\\Digital Levels\\LVShellExt.log";
+}
+
+// A log's entries, each without its time stamp line; the file must start with a byte-order mark.
+std::vector<Lines> ReadEntries(const fs::path& path) {
+    const std::string bytes = BytesOf(path);
+    EXPECT_EQ(0, bytes.compare(0, 2, "\xFF\xFE")) << "a UTF-16 LE byte-order mark";
+    const std::wstring text = Utf16Of(bytes);
     const std::wregex stamp(
         L"\\d{4}-\\d\\d-\\d\\d \\d\\d:\\d\\d:\\d\\d\\.\\d{3}, process \\d+, thread \\d+");
     std::vector<Lines> entries;
@@ -85,6 +103,8 @@ protected:
     const fs::path log_ = folder_ / L"LVShellExt.log";
 };
 
+// The entry is written without disturbing the caller: its thread's error object and last error
+// are as they were.
 TEST_F(ErrorLog, EntryHoldsTheFirstLineAndEachDescriptionPresent) {
     ASSERT_NE(L"System description: ", kAccessDenied);
     const std::wstring denied = L"SourceParser - 0x80070005 (TSourceParser::Parse, 120)";
@@ -104,23 +124,17 @@ TEST_F(ErrorLog, EntryHoldsTheFirstLineAndEachDescriptionPresent) {
         {kOwnResult, nullptr, L"two\r\nlines", {own, L"Internal description: two  lines"}},
     };
     for (const auto& test : cases) {
+        SCOPED_TRACE(testing::Message() << test.expected.back());
         fs::remove_all(folder_);
-        if (test.errorInfo)
-            SetThreadErrorInfo(test.errorInfo);
+        const ComPtr<IErrorInfo> info = test.errorInfo ? SetThreadErrorInfo(test.errorInfo) : nullptr;
+        ::SetLastError(ERROR_BAD_UNIT);
         ReportError(L"SourceParser", test.result, L"TSourceParser::Parse", 120, test.internal);
-        ::SetErrorInfo(0, nullptr);
-        EXPECT_EQ(std::vector<Lines>{test.expected}, ReadEntries(log_)) << test.expected.back();
+        EXPECT_EQ(static_cast<DWORD>(ERROR_BAD_UNIT), ::GetLastError());
+        ComPtr<IErrorInfo> left;  // taken, which leaves none for the next case
+        EXPECT_EQ(info ? S_OK : S_FALSE, ::GetErrorInfo(0, &left));
+        EXPECT_EQ(info.Get(), left.Get());
+        EXPECT_EQ(std::vector<Lines>{test.expected}, ReadEntries(log_));
     }
-}
-
-TEST_F(ErrorLog, ReportLeavesTheThreadsErrorInfoAndLastError) {
-    const ComPtr<IErrorInfo> info = SetThreadErrorInfo(L"for the caller");
-    ::SetLastError(ERROR_BAD_UNIT);
-    ReportError(L"Source", E_FAIL, L"Function", 1);
-    EXPECT_EQ(static_cast<DWORD>(ERROR_BAD_UNIT), ::GetLastError());
-    ComPtr<IErrorInfo> left;
-    EXPECT_EQ(S_OK, ::GetErrorInfo(0, &left));
-    EXPECT_EQ(info.Get(), left.Get());
 }
 
 TEST_F(ErrorLog, ResultMacroNamesTheFileWithoutItsFolders) {
@@ -133,7 +147,6 @@ TEST_F(ErrorLog, ResultMacroNamesTheFileWithoutItsFolders) {
 }
 
 TEST_F(ErrorLog, FullLogIsMovedAsideAndANewOneStarted) {
-    constexpr DWORD kLimit = 600;  // three entries of about 180 bytes
     SetErrorLogSizeLimit(kLimit);
     for (int number = 10; number < 30; ++number)
         ReportError(L"Source", kOwnResult, L"Function", number);
@@ -171,11 +184,7 @@ TEST_F(ErrorLog, ConcurrentReportsLeaveOnlyWholeEntries) {
 TEST_F(ErrorLog, PathIsInTheLocalApplicationDataFolderUnlessOverridden) {
     EXPECT_EQ(log_, fs::path(ErrorLogPath()));
     ::SetEnvironmentVariableW(L"LVSHELLEXT_LOG_DIR", nullptr);
-    PWSTR localAppData = nullptr;
-    ASSERT_EQ(S_OK, ::SHGetKnownFolderPath(FOLDERID_LocalAppData, 0, nullptr, &localAppData));
-    const UniqueCoTaskMem owner(localAppData);
-    EXPECT_EQ(std::wstring(localAppData) + L"\\Quorvel\\Digital Levels\\LVShellExt.log",
-              ErrorLogPath());
+    EXPECT_EQ(UsersLogPath(), ErrorLogPath());
 }
 
 // A program of its own beside this one (tests/error_log/error_log_helper.cpp), started with the
@@ -219,9 +228,9 @@ private:
 class MutexHolder {
 public:
     MutexHolder()
-        : ready_(::CreateEventW(nullptr, TRUE, FALSE, ReadyName().c_str())),
-          release_(::CreateEventW(nullptr, TRUE, FALSE, ReleaseName().c_str())),
-          helper_(L"hold " + ReadyName() + L" " + ReleaseName()) {
+        : ready_(::CreateEventW(nullptr, TRUE, FALSE, EventName(L"ready").c_str())),
+          release_(::CreateEventW(nullptr, TRUE, FALSE, EventName(L"release").c_str())),
+          helper_(L"hold " + EventName(L"ready") + L" " + EventName(L"release")) {
         const HANDLE either[] = {ready_.get(), helper_.process()};
         holding_ = ::WaitForMultipleObjects(2, either, FALSE, 20000) == WAIT_OBJECT_0;
     }
@@ -239,11 +248,9 @@ public:
     }
 
 private:
-    static std::wstring ReadyName() {
-        return L"Local\\lv-error-log-test-ready-" + std::to_wstring(::GetCurrentProcessId());
-    }
-    static std::wstring ReleaseName() {
-        return L"Local\\lv-error-log-test-release-" + std::to_wstring(::GetCurrentProcessId());
+    static std::wstring EventName(const wchar_t* what) {
+        return L"Local\\lv-error-log-test-" + std::wstring(what) + L"-" +
+               std::to_wstring(::GetCurrentProcessId());
     }
 
     UniqueHandle ready_, release_;
@@ -288,7 +295,6 @@ TEST_F(ErrorLog, AMutexAbandonedByADeadProcessIsTakenOver) {
 }
 
 TEST_F(ErrorLog, AFullLogThatCannotBeMovedStopsGrowingAtTwiceTheLimit) {
-    constexpr DWORD kLimit = 600;  // three entries of about 180 bytes
     SetErrorLogSizeLimit(kLimit);
     ReportError(L"Source", kOwnResult, L"Function", 0);
     // A reader that does not share delete: the file cannot be moved aside while it is open.
@@ -315,8 +321,7 @@ TEST_F(ErrorLog, AFullLogThatCannotBeMovedStopsGrowingAtTwiceTheLimit) {
 
 // The UTF-16 text of the variable's name, as a module holds it when it reads the variable.
 bool HoldsTheOverrideName(const fs::path& module) {
-    std::ifstream file(module, std::ios::binary);
-    const std::string bytes{std::istreambuf_iterator<char>(file), {}};
+    const std::string bytes = BytesOf(module);
     std::string name;
     for (char c : std::string("LVSHELLEXT_LOG_DIR"))
         name += {c, '\0'};
@@ -331,14 +336,7 @@ TEST_F(ErrorLog, OnlyTestProgramsReadTheFolderOverride) {
     const fs::path answer = folder_ / L"path.txt";
     Helper helper(L"path \"" + answer.wstring() + L"\"");
     ASSERT_EQ(0, helper.ExitCode());
-    std::ifstream file(answer, std::ios::binary);
-    const std::string bytes{std::istreambuf_iterator<char>(file), {}};
-    std::wstring path(bytes.size() / 2, L'\0');
-    memcpy(path.data(), bytes.data(), path.size() * 2);
-    PWSTR localAppData = nullptr;
-    ASSERT_EQ(S_OK, ::SHGetKnownFolderPath(FOLDERID_LocalAppData, 0, nullptr, &localAppData));
-    const UniqueCoTaskMem owner(localAppData);
-    EXPECT_EQ(std::wstring(localAppData) + L"\\Quorvel\\Digital Levels\\LVShellExt.log", path);
+    EXPECT_EQ(UsersLogPath(), Utf16Of(BytesOf(answer)));
 
     // The shipped DLL has no trace of the variable; this test program, which reads it, has.
     const std::string host = LV_EXTENSION_DLL_PATH;
