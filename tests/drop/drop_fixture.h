@@ -111,6 +111,27 @@ inline Bytes DropFilesBlock(const std::vector<std::wstring>& paths) {
     return block;
 }
 
+// A data object holding only a drag source's file list of these paths.
+inline ComPtr<BlockDataObject> FileListObject(const std::vector<std::wstring>& paths) {
+    auto data = MakeComObject<BlockDataObject>();
+    data->blocks[CF_HDROP] = DropFilesBlock(paths);
+    return data;
+}
+
+// A UTF-16 file's text (the error log's), empty when it cannot be opened.
+inline std::wstring ReadWideFile(const std::wstring& path) {
+    UniqueFileHandle file(::CreateFileW(path.c_str(), GENERIC_READ,
+                                        FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr, OPEN_EXISTING,
+                                        0, nullptr));
+    if (!file)
+        return {};
+    std::wstring text(::GetFileSize(file.get(), nullptr) / sizeof(wchar_t), L'\0');
+    DWORD read = 0;
+    ::ReadFile(file.get(), text.data(), static_cast<DWORD>(text.size() * sizeof(wchar_t)), &read,
+               nullptr);
+    return text;
+}
+
 // A "Shell IDList Array" of a parent folder and its children, from their absolute lists.
 inline Bytes IdListArrayBlock(PCIDLIST_ABSOLUTE parent, const std::vector<PCUITEMID_CHILD>& items) {
     std::vector<UINT> offsets;

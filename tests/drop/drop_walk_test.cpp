@@ -4,8 +4,6 @@
 #include "tests/drop/drop_fixture.h"
 
 #include <algorithm>
-#include <functional>
-#include <thread>
 
 #include "namespace/pidl_manager.h"
 #include "stations/station_store.h"
@@ -76,21 +74,9 @@ protected:
         ::OleUninitialize();
     }
 
-    // The parser's entries in the error log so far, and the log's text.
-    static std::wstring LogText() {
-        UniqueFileHandle file(::CreateFileW(ErrorLogPath().c_str(), GENERIC_READ,
-                                            FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr,
-                                            OPEN_EXISTING, 0, nullptr));
-        if (!file)
-            return {};
-        std::wstring text(::GetFileSize(file.get(), nullptr) / sizeof(wchar_t), L'\0');
-        DWORD read = 0;
-        ::ReadFile(file.get(), text.data(), static_cast<DWORD>(text.size() * sizeof(wchar_t)),
-                   &read, nullptr);
-        return text;
-    }
+    // The parser's entries in the error log so far.
     static size_t LogEntries() {
-        const std::wstring text = LogText();
+        const std::wstring text = ReadWideFile(ErrorLogPath());
         size_t count = 0;
         for (size_t at = text.find(L"SourceParser - 0x"); at != std::wstring::npos;
              at = text.find(L"SourceParser - 0x", at + 1))
@@ -98,28 +84,10 @@ protected:
         return count;
     }
 
-    // Runs a drop on a thread of its own, a single-threaded apartment as a view's thread is. A
-    // drop that never returns ends the run as a failure instead of hanging it.
-    static void RunWithWatchdog(const std::function<void()>& drop) {
-        UniqueHandle finished(::CreateEventW(nullptr, TRUE, FALSE, nullptr));
-        std::thread worker([&] {
-            if (SUCCEEDED(::OleInitialize(nullptr))) {
-                drop();
-                ::OleUninitialize();
-            }
-            ::SetEvent(finished.get());
-        });
-        constexpr DWORD kWatchdogMilliseconds = 120000;
-        if (::WaitForSingleObject(finished.get(), kWatchdogMilliseconds) != WAIT_OBJECT_0) {
-            ADD_FAILURE() << "the drop did not return within two minutes";
-            std::fflush(nullptr);
-            ::TerminateProcess(::GetCurrentProcess(), 1);
-        }
-        worker.join();
-    }
-
     // Drops the paths as a drag source's file list on a station and on a station folder's list,
-    // and returns what each target handed on, with the targets' results.
+    // and returns what each target handed on, with the targets' results. The test's thread is a
+    // single-threaded apartment, as a view's thread is; a drop that never returns is ended by the
+    // test programs' watchdog, which names the case.
     struct Dropped {
         HRESULT station = E_FAIL;
         HRESULT list = E_FAIL;
@@ -127,40 +95,31 @@ protected:
     };
     Dropped DropOnBothTargets(const std::vector<std::wstring>& paths) {
         Dropped dropped;
-        RunWithWatchdog([&] {
-            CPidlMgr manager;
-            const UniqueRelativePidl station =
-                manager.CreatePidlFromPath(L"Quorvel Digital Level\\North");
-            const DroppedSourcesReceiver receiver =
-                [&](const std::wstring&, const std::shared_ptr<TSourceList>& sources) {
-                    dropped.received.push_back(*sources);
-                };
-            auto data = MakeComObject<BlockDataObject>();
-            data->blocks[CF_HDROP] = DropFilesBlock(paths);
-            DWORD effect = DROPEFFECT_COPY;
+        CPidlMgr manager;
+        const UniqueRelativePidl station =
+            manager.CreatePidlFromPath(L"Quorvel Digital Level\\North");
+        const DroppedSourcesReceiver receiver = [&](const std::wstring&,
+                                                    const std::shared_ptr<TSourceList>& sources) {
+            dropped.received.push_back(*sources);
+        };
+        const auto data = FileListObject(paths);
+        DWORD effect = DROPEFFECT_COPY;
 
-            auto onStation = MakeComObject<CLVDropTarget>();
-            EXPECT_EQ(S_OK, onStation->SetItem(station.get()));
-            EXPECT_EQ(S_OK, onStation->SetReceiver(receiver));
-            EXPECT_EQ(S_OK, onStation->DragEnter(data.Get(), 0, {}, &effect));
-            dropped.station = onStation->Drop(data.Get(), 0, {}, &effect);
+        auto onStation = MakeComObject<CLVDropTarget>();
+        EXPECT_EQ(S_OK, onStation->SetItem(station.get()));
+        EXPECT_EQ(S_OK, onStation->SetReceiver(receiver));
+        EXPECT_EQ(S_OK, onStation->DragEnter(data.Get(), 0, {}, &effect));
+        dropped.station = onStation->Drop(data.Get(), 0, {}, &effect);
 
-            UniqueWindow list(::CreateWindowExW(0, L"STATIC", L"", 0, 0, 0, 0, 0, HWND_MESSAGE,
-                                                nullptr, nullptr, nullptr));
-            auto onList = MakeComObject<CLVDropTargetOnListView>();
-            EXPECT_EQ(S_OK,
-                      onList->SetUp(list.get(), MakeComObject<NoShellView>().Get(), station.get()));
-            EXPECT_EQ(S_OK, onList->SetReceiver(receiver));
-            dropped.list = onList->Drop(data.Get(), 0, {}, &effect);
-            EXPECT_EQ(static_cast<DWORD>(DROPEFFECT_COPY), effect);
-        });
+        UniqueWindow list(::CreateWindowExW(0, L"STATIC", L"", 0, 0, 0, 0, 0, HWND_MESSAGE, nullptr,
+                                            nullptr, nullptr));
+        auto onList = MakeComObject<CLVDropTargetOnListView>();
+        EXPECT_EQ(S_OK,
+                  onList->SetUp(list.get(), MakeComObject<NoShellView>().Get(), station.get()));
+        EXPECT_EQ(S_OK, onList->SetReceiver(receiver));
+        dropped.list = onList->Drop(data.Get(), 0, {}, &effect);
+        EXPECT_EQ(static_cast<DWORD>(DROPEFFECT_COPY), effect);
         return dropped;
-    }
-
-    void AddStationNorth() {
-        Station north = DefaultStation();
-        north.Name = L"North";
-        ASSERT_EQ(S_OK, AddStation(north));
     }
 
     RegistryOverride registry_;
@@ -169,7 +128,9 @@ protected:
 };
 
 TEST_F(DropWalkTest, AFolderWithLinksBackToItselfIsWalkedOnceOnBothTargets) {
-    AddStationNorth();
+    Station north = DefaultStation();
+    north.Name = L"North";
+    ASSERT_EQ(S_OK, AddStation(north));
     const std::wstring loop = scratch_.Folder(L"loop");
     const std::wstring sub = scratch_.Folder(L"loop\\sub");
     const TSourceList expected{{loop, scratch_.File(L"loop\\a.lv"), 0},
@@ -211,10 +172,9 @@ TEST_F(DropWalkTest, ALinkInsideAFolderIsNotFollowedButARealSubfolderAndAShortcu
         {"one folder by two paths", {link, shortcut}, {{link, link + L"\\o.lv", 0}}},
     };
     for (const auto& c : cases) {
-        auto data = MakeComObject<BlockDataObject>();
-        data->blocks[CF_HDROP] = DropFilesBlock(c.dropped);
         TSourceParser parser(true);
-        EXPECT_EQ(S_OK, parser.ParseDataObject(data.Get(), L"", true)) << c.what;
+        EXPECT_EQ(S_OK, parser.ParseDataObject(FileListObject(c.dropped).Get(), L"", true))
+            << c.what;
         EXPECT_EQ(c.expected, Sorted(*parser.Sources())) << c.what;
     }
 }
@@ -246,8 +206,7 @@ TEST_F(DropWalkTest, EitherLimitStopsTheWholeDropWithOneLogEntry) {
     for (const auto& c : cases) {
         const WalkLimitsOverride limits(c.entryLimit, c.timeLimit);
         const size_t logBefore = LogEntries();
-        auto data = MakeComObject<BlockDataObject>();
-        data->blocks[CF_HDROP] = DropFilesBlock({first, second});
+        const auto data = FileListObject({first, second});
         TSourceParser parser(true);
         EXPECT_EQ(S_OK, parser.ParseDataObject(data.Get(), L"", true)) << c.what;
         EXPECT_TRUE(parser.WalkStopped()) << c.what;
@@ -258,8 +217,7 @@ TEST_F(DropWalkTest, EitherLimitStopsTheWholeDropWithOneLogEntry) {
             return source.rootPath == first;
         })) << c.what;
         EXPECT_EQ(logBefore + 1, LogEntries()) << c.what;
-        const std::wstring log = LogText();
-        EXPECT_NE(std::wstring::npos, log.find(c.logged)) << c.what;
+        EXPECT_NE(std::wstring::npos, ReadWideFile(ErrorLogPath()).find(c.logged)) << c.what;
 
         // The next drop starts afresh.
         EXPECT_EQ(S_OK, parser.ParseDataObject(data.Get(), L"", true)) << c.what;
@@ -273,16 +231,14 @@ TEST_F(DropWalkTest, ManyFailingSourcesInOneDropWriteAFewEntriesAndOneCount) {
     for (int file = 0; file < kMissing; ++file)
         missing.push_back(scratch_.Path() + L"\\gone" + std::to_wstring(file) + L".lv");
     const size_t logBefore = LogEntries();
-    auto data = MakeComObject<BlockDataObject>();
-    data->blocks[CF_HDROP] = DropFilesBlock(missing);
     TSourceParser parser(true);
     EXPECT_EQ(HRESULT_FROM_WIN32(ERROR_FILE_NOT_FOUND),
-              parser.ParseDataObject(data.Get(), L"", true));
+              parser.ParseDataObject(FileListObject(missing).Get(), L"", true));
     EXPECT_TRUE(parser.Sources()->empty());
     EXPECT_EQ(logBefore + kMaximumReportsPerDrop + 1, LogEntries());
     const std::wstring count =
         std::to_wstring(kMissing - kMaximumReportsPerDrop) + L" further failures of this drop";
-    EXPECT_NE(std::wstring::npos, LogText().find(count));
+    EXPECT_NE(std::wstring::npos, ReadWideFile(ErrorLogPath()).find(count));
 }
 
 }  // namespace

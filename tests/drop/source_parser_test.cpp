@@ -6,6 +6,7 @@
 #include <thread>
 
 #include "support/error_log.h"
+#include "tests/portable/file_group_block.h"
 #include "view/lv_drop_target.h"
 
 namespace {
@@ -25,32 +26,10 @@ protected:
     ScratchFolder scratch_;
 };
 
-// A file group descriptor of the given names and attributes, wide or ANSI.
-Bytes FileGroupBlock(const std::vector<std::pair<std::wstring, DWORD>>& entries, bool wide) {
-    const size_t recordSize = wide ? sizeof(FILEDESCRIPTORW) : sizeof(FILEDESCRIPTORA);
-    Bytes block(sizeof(UINT) + recordSize * entries.size());
-    *reinterpret_cast<UINT*>(block.data()) = static_cast<UINT>(entries.size());
-    for (size_t index = 0; index < entries.size(); ++index) {
-        uint8_t* record = block.data() + sizeof(UINT) + recordSize * index;
-        if (wide) {
-            auto* descriptor = reinterpret_cast<FILEDESCRIPTORW*>(record);
-            descriptor->dwFileAttributes = entries[index].second;
-            wcsncpy(descriptor->cFileName, entries[index].first.c_str(), MAX_PATH - 1);
-        } else {
-            auto* descriptor = reinterpret_cast<FILEDESCRIPTORA*>(record);
-            descriptor->dwFileAttributes = entries[index].second;
-            for (size_t c = 0; c < entries[index].first.size(); ++c)
-                descriptor->cFileName[c] = static_cast<char>(entries[index].first[c]);
-        }
-    }
-    return block;
-}
-
 TEST_F(SourceParserTest, DroppedFilesAreEachTheirOwnRoot) {
     const std::wstring first = scratch_.File(L"a.lv");
     const std::wstring second = scratch_.File(L"b.txt");
-    auto data = MakeComObject<BlockDataObject>();
-    data->blocks[CF_HDROP] = DropFilesBlock({first, second});
+    const auto data = FileListObject({first, second});
     EXPECT_EQ(S_OK, AcceptDropSource(data.Get()));
     EXPECT_EQ((std::vector<TSourceDescriptor>{{first, first, 0}, {second, second, 0}}),
               Parse(data.Get()));
@@ -67,11 +46,9 @@ TEST_F(SourceParserTest, AShortcutToAFolderWalksItWithTheFolderAsRoot) {
     // A shortcut whose target is gone is dropped as the file it is.
     const std::wstring gone = scratch_.Shortcut(L"gone.lnk", scratch_.File(L"temporary.lv"));
     ::DeleteFileW((scratch_.Path() + L"\\temporary.lv").c_str());
-    auto data = MakeComObject<BlockDataObject>();
-    data->blocks[CF_HDROP] = DropFilesBlock({link, gone});
     TSourceParser parser(true);
-    EXPECT_EQ(S_OK, parser.ParseDataObject(data.Get(), L"", true));
-    std::vector<TSourceDescriptor> sources = *parser.Sources();
+    EXPECT_EQ(S_OK, parser.ParseDataObject(FileListObject({link, gone}).Get(), L"", true));
+    const std::vector<TSourceDescriptor> sources = *parser.Sources();
     ASSERT_GE(sources.size(), 3u);
     EXPECT_EQ((TSourceDescriptor{target, inner, 0}), sources[0]);
     EXPECT_EQ((TSourceDescriptor{target, nested, 0}), sources[1]);
@@ -97,10 +74,9 @@ TEST_F(SourceParserTest, AVeryDeepFolderIsWalkedDownToTheDepthLimitOnly) {
             shallow = scratch_.File(relative + L"\\near.lv");
     }
     tooDeep = scratch_.File(relative + L"\\far.lv");
-    auto data = MakeComObject<BlockDataObject>();
     const std::wstring top = scratch_.Path() + L"\\deep";
-    data->blocks[CF_HDROP] = DropFilesBlock({top});
-    EXPECT_EQ((std::vector<TSourceDescriptor>{{top, shallow, 0}}), Parse(data.Get()))
+    EXPECT_EQ((std::vector<TSourceDescriptor>{{top, shallow, 0}}),
+              Parse(FileListObject({top}).Get()))
         << "beyond the limit: " << tooDeep.size();
 }
 
@@ -109,8 +85,9 @@ TEST_F(SourceParserTest, FileGroupsSkipDirectoriesAndKeepTheIndexes) {
         auto data = MakeComObject<BlockDataObject>();
         data->blocks[wide ? RegisteredFormat(ClipboardFormat::FileGroupDescriptor)
                           : RegisteredFormat(ClipboardFormat::AnsiFileGroupDescriptor)] =
-            FileGroupBlock({{L"one.lv", 0}, {L"folder", FILE_ATTRIBUTE_DIRECTORY}, {L"two.lv", 0}},
-                           wide);
+            FileGroup(
+                wide,
+                {{0, 0, L"one.lv"}, {1, FILE_ATTRIBUTE_DIRECTORY, L"folder"}, {2, 0, L"two.lv"}});
         EXPECT_EQ((std::vector<TSourceDescriptor>{{L"", L"one.lv", 0}, {L"", L"two.lv", 2}}),
                   Parse(data.Get()))
             << wide;
@@ -118,6 +95,7 @@ TEST_F(SourceParserTest, FileGroupsSkipDirectoriesAndKeepTheIndexes) {
 }
 
 TEST_F(SourceParserTest, DropSourcesAreAcceptedByTheirFormats) {
+    const CLIPFORMAT group = RegisteredFormat(ClipboardFormat::FileGroupDescriptor);
     const struct {
         const char* what;
         std::vector<CLIPFORMAT> formats;
@@ -126,14 +104,8 @@ TEST_F(SourceParserTest, DropSourcesAreAcceptedByTheirFormats) {
     } cases[] = {
         {"files", {CF_HDROP}, false, S_OK},
         {"shell items", {RegisteredFormat(ClipboardFormat::ShellIdList)}, false, S_OK},
-        {"virtual files with contents",
-         {RegisteredFormat(ClipboardFormat::FileGroupDescriptor)},
-         true,
-         S_OK},
-        {"virtual files without contents",
-         {RegisteredFormat(ClipboardFormat::FileGroupDescriptor)},
-         false,
-         E_INVALIDARG},
+        {"virtual files with contents", {group}, true, S_OK},
+        {"virtual files without contents", {group}, false, E_INVALIDARG},
         {"text", {CF_UNICODETEXT}, false, E_INVALIDARG},
     };
     for (const auto& c : cases) {
@@ -163,8 +135,7 @@ TEST_F(SourceParserTest, ShellItemsUnderARealFolderAreParsedAsTheirFiles) {
 }
 
 TEST_F(SourceParserTest, TheDataObjectCanBeFetchedOnceOnAnotherThread) {
-    auto data = MakeComObject<BlockDataObject>();
-    data->blocks[CF_HDROP] = DropFilesBlock({scratch_.File(L"z.lv")});
+    const auto data = FileListObject({scratch_.File(L"z.lv")});
     TSourceParser parser(true);
     ComPtr<IDataObject> none;
     EXPECT_EQ(S_FALSE, parser.GetDataObject(&none));
@@ -206,7 +177,7 @@ TEST_F(SourceParserTest, BlocksThatLieAreReadOnlyWithinThemselves) {
     reinterpret_cast<DROPFILES*>(pastTheEnd.data())->pFiles = 4096;
     Bytes unterminated = dropFiles;
     unterminated.resize(unterminated.size() - 6);  // the last path loses its end
-    Bytes group = FileGroupBlock({{L"a.lv", 0}}, true);
+    Bytes group = FileGroup(true, {{0, 0, L"a.lv"}});
     *reinterpret_cast<UINT*>(group.data()) = 100000;  // far more records than the block holds
     const struct {
         const char* what;
@@ -252,16 +223,9 @@ TEST_F(SourceParserTest, RefusedCallsAreWrittenToTheErrorLogWhereTheyAreRefused)
     const HRESULT marshalling = parser.ParseDataObject(refusing.Get(), L"", true);
     EXPECT_TRUE(FAILED(marshalling));
     EXPECT_EQ(E_INVALIDARG, parser.GetDataObject(nullptr));
-    const std::wstring log = ErrorLogPath();
+    const std::wstring text = ReadWideFile(ErrorLogPath());
     ::SetEnvironmentVariableW(L"LVSHELLEXT_LOG_DIR", nullptr);
-
-    UniqueFileHandle file(::CreateFileW(log.c_str(), GENERIC_READ, FILE_SHARE_READ, nullptr,
-                                        OPEN_EXISTING, 0, nullptr));
-    ASSERT_TRUE(file);
-    std::wstring text(::GetFileSize(file.get(), nullptr) / sizeof(wchar_t), L'\0');
-    DWORD read = 0;
-    ::ReadFile(file.get(), text.data(), static_cast<DWORD>(text.size() * sizeof(wchar_t)), &read,
-               nullptr);
+    ASSERT_FALSE(text.empty()) << "no error log";
     // Each entry names the file, the function and the line of its own check: three checks,
     // three lines, the marshalling after the null check as in the source.
     const int nullSource = LoggedLine(text, L"ParseDataObject", E_INVALIDARG);

@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "support/portable/byte_io.h"
+#include "tests/portable/file_group_block.h"
 #include "view/portable/drop_blocks.h"
 
 #ifdef _WIN32
@@ -56,20 +57,6 @@ Bytes IdListArrayOf(const std::vector<Bytes>& lists) {
     for (size_t i = 0; i < lists.size(); ++i) {
         WriteU32(block.data() + 4 + 4 * i, static_cast<uint32_t>(block.size()));
         block.insert(block.end(), lists[i].begin(), lists[i].end());
-    }
-    return block;
-}
-
-// Records of {attributes, name}; a name of 260 characters leaves no room for the terminator.
-Bytes FileGroup(bool wide, const std::vector<FileGroupEntry>& records) {
-    const size_t size = wide ? sizeof(FileDescriptorWide) : sizeof(FileDescriptorAnsi);
-    Bytes block(4 + size * records.size(), 0);
-    WriteU32(block.data(), static_cast<uint32_t>(records.size()));
-    for (size_t i = 0; i < records.size(); ++i) {
-        uint8_t* record = block.data() + 4 + size * i;
-        WriteU32(record + 36, records[i].attributes);
-        for (size_t c = 0; c < records[i].name.size(); ++c)  // the zeroed block ends the name
-            record[72 + (wide ? 2 * c : c)] = static_cast<uint8_t>(records[i].name[c]);
     }
     return block;
 }

@@ -39,6 +39,10 @@ TEST(SerialPortList, PortsComeInTheKeysOrderUpToTheFirstValueThatEndsTheList) {
     odd.push_back('8');
     std::vector<uint8_t> withNul = Terminated(WIDE_TEXT("COM2"));
     withNul.insert(withNul.end(), {'X', 0});
+    using enum RegistryValueType;
+    const WideString a = WIDE_TEXT("a"), c = WIDE_TEXT("c");
+    const WideString com3 = WIDE_TEXT("COM3"), com4 = WIDE_TEXT("COM4");
+    const WideString units64(64, WIDE_TEXT('C'));
     const struct {
         const char* what;
         std::vector<StoredValue> values;
@@ -46,46 +50,26 @@ TEST(SerialPortList, PortsComeInTheKeysOrderUpToTheFirstValueThatEndsTheList) {
     } cases[] = {
         {"no values", {}, {}},
         {"unsorted and duplicated, as listed",
-         {Port(WIDE_TEXT("\\Device\\Serial1"), WIDE_TEXT("COM4")),
-          Port(WIDE_TEXT("\\Device\\Serial0"), WIDE_TEXT("COM3")),
-          Port(WIDE_TEXT("\\Device\\Serial2"), WIDE_TEXT("COM4"))},
-         {WIDE_TEXT("COM4"), WIDE_TEXT("COM3"), WIDE_TEXT("COM4")}},
+         {Port(WIDE_TEXT("\\Device\\Serial1"), com4), Port(WIDE_TEXT("\\Device\\Serial0"), com3),
+          Port(WIDE_TEXT("\\Device\\Serial2"), com4)},
+         {com4, com3, com4}},
         {"a number ends the list",
-         {Port(WIDE_TEXT("a"), WIDE_TEXT("COM3")),
-          {WIDE_TEXT("b"), RegistryValueType::kNumber, {5, 0, 0, 0}},
-          Port(WIDE_TEXT("c"), WIDE_TEXT("COM9"))},
-         {WIDE_TEXT("COM3")}},
-        {"only REG_SZ counts as text",
-         {{WIDE_TEXT("a"), RegistryValueType::kExpandText, Terminated(WIDE_TEXT("COM3"))}},
-         {}},
-        {"binary bytes that spell a port",
-         {{WIDE_TEXT("a"), RegistryValueType::kBinary, Terminated(WIDE_TEXT("COM3"))}},
-         {}},
-        {"an unknown type", {{WIDE_TEXT("a"), static_cast<RegistryValueType>(0x80000001), {}}}, {}},
+         {Port(a, com3), {WIDE_TEXT("b"), kNumber, {5, 0, 0, 0}}, Port(c, WIDE_TEXT("COM9"))},
+         {com3}},
+        {"only REG_SZ counts as text", {{a, kExpandText, Terminated(com3)}}, {}},
+        {"binary bytes that spell a port", {{a, kBinary, Terminated(com3)}}, {}},
+        {"an unknown type", {{a, RegistryValueType(0x80000001), {}}}, {}},
         {"a name of 63 characters fits", {Port(name63, WIDE_TEXT("COM5"))}, {WIDE_TEXT("COM5")}},
         {"a name of 64 does not",
-         {Port(WIDE_TEXT("a"), WIDE_TEXT("COM3")), Port(name64, WIDE_TEXT("COM5")),
-          Port(WIDE_TEXT("c"), WIDE_TEXT("COM6"))},
-         {WIDE_TEXT("COM3")}},
-        {"128 bytes without terminator fill the buffer",
-         {{WIDE_TEXT("a"), RegistryValueType::kText, Units(WideString(64, WIDE_TEXT('C')))}},
-         {WideString(64, WIDE_TEXT('C'))}},
-        {"64 characters and a terminator do not fit",
-         {{WIDE_TEXT("a"), RegistryValueType::kText, Terminated(WideString(64, WIDE_TEXT('C')))}},
-         {}},
-        {"129 bytes",
-         {{WIDE_TEXT("a"), RegistryValueType::kText, std::vector<uint8_t>(129, 'C')}},
-         {}},
-        {"an odd byte count",
-         {{WIDE_TEXT("a"), RegistryValueType::kText, odd}},
-         {WIDE_TEXT("COM8")}},
-        {"a NUL inside",
-         {{WIDE_TEXT("a"), RegistryValueType::kText, withNul}},
-         {WIDE_TEXT("COM2")}},
+         {Port(a, com3), Port(name64, WIDE_TEXT("COM5")), Port(c, WIDE_TEXT("COM6"))},
+         {com3}},
+        {"128 bytes without terminator fill the buffer", {{a, kText, Units(units64)}}, {units64}},
+        {"64 characters and a terminator do not fit", {{a, kText, Terminated(units64)}}, {}},
+        {"129 bytes", {{a, kText, std::vector<uint8_t>(129, 'C')}}, {}},
+        {"an odd byte count", {{a, kText, odd}}, {WIDE_TEXT("COM8")}},
+        {"a NUL inside", {{a, kText, withNul}}, {WIDE_TEXT("COM2")}},
         {"empty data is an empty port",
-         {{WIDE_TEXT("a"), RegistryValueType::kText, {}},
-          {WIDE_TEXT("b"), RegistryValueType::kText, {'C'}},
-          Port(WIDE_TEXT("c"), WIDE_TEXT("COM1"))},
+         {{a, kText, {}}, {WIDE_TEXT("b"), kText, {'C'}}, Port(c, WIDE_TEXT("COM1"))},
          {WideString(), WideString(), WIDE_TEXT("COM1")}},
     };
     for (const auto& test : cases)

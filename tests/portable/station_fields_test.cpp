@@ -30,16 +30,23 @@ std::vector<FieldCase> Cases() {
     }
     for (uint32_t rate : {0u, 299u, 110u, 9601u, 28800u, 56000u, 128000u, 230400u, 0xFFFFFFFFu})
         cases.push_back({"another rate", [rate](Station& s) { s.BaudRate = rate; }, F::kBaudRate});
+    const auto codes = [](uint32_t parity, uint32_t stopBits, uint32_t dataBits, uint32_t protocol,
+                          uint32_t flow, uint32_t checkSum) {
+        return [=](Station& s) {
+            s.Parity = parity, s.StopBits = stopBits, s.DataBits = dataBits;
+            s.Protocol = protocol, s.Flow = flow, s.CheckSum = checkSum;
+        };
+    };
     const FieldCase others[] = {
         {"a port this computer lacks", [](Station& s) { s.Port = WIDE_TEXT("COM99"); }, {}},
         {"no port", [](Station& s) { s.Port.clear(); }, {}},
         {"the longest text", [](Station& s) { s.Software = WideString(259, 'x'); }, {}},
-        {"the highest codes",
-         [](Station& s) {
-             s.Parity = 2, s.StopBits = 2, s.DataBits = 8, s.Protocol = 3, s.Flow = 2;
-             s.CheckSum = 1;
-         },
-         {}},
+        // With the defaults' codes, these take every code each field allows.
+        {"the lowest codes", codes(0, 0, 5, 0, 0, 0), {}},
+        {"the middle codes", codes(1, 1, 6, 2, 1, 1), {}},
+        {"the highest codes", codes(2, 2, 8, 3, 2, 1), {}},
+        {"the second model", [](Station& s) { s.Model = WIDE_TEXT("Quorvel LV-20"); }, {}},
+        {"the third model", [](Station& s) { s.Model = WIDE_TEXT("Quorvel LV-30"); }, {}},
         {"no name", [](Station& s) { s.Name.clear(); }, F::kName},
         {"a star in the name", [](Station& s) { s.Name = WIDE_TEXT("A*"); }, F::kName},
         {"a name too long", [](Station& s) { s.Name = WideString(260, 'n'); }, F::kName},
@@ -54,8 +61,7 @@ std::vector<FieldCase> Cases() {
         {"flow 3", [](Station& s) { s.Flow = 3; }, F::kFlow},
         {"checksum 2", [](Station& s) { s.CheckSum = 2; }, F::kCheckSum},
         // Several wrong: the first in the store's order is named.
-        {"a wrong rate and parity", [](Station& s) { s.Parity = 9, s.BaudRate = 1; },
-         F::kBaudRate},
+        {"a wrong rate and parity", [](Station& s) { s.Parity = 9, s.BaudRate = 1; }, F::kBaudRate},
     };
     cases.insert(cases.end(), std::begin(others), std::end(others));
     return cases;
@@ -68,10 +74,11 @@ TEST(StationFields, OneRuleForEveryFieldAndTheStationFileKeepsToIt) {
     for (const FieldCase& test : Cases()) {
         Station station = Defaults(WIDE_TEXT("Level"));
         test.change(station);
-        const std::string trace = std::string(test.what) + ", rate " +
-                                  std::to_string(station.BaudRate);
+        const std::string trace =
+            std::string(test.what) + ", rate " + std::to_string(station.BaudRate);
         SCOPED_TRACE(trace);
-        const std::optional<StationFieldRefusal> refusal = RefusedStation(station, rules.modelTexts);
+        const std::optional<StationFieldRefusal> refusal =
+            RefusedStation(station, rules.modelTexts);
         ASSERT_EQ(test.refused.has_value(), refusal.has_value());
         if (refusal) {
             EXPECT_EQ(*test.refused, refusal->field);

@@ -130,15 +130,7 @@ TEST(StationFileRefusals, WrongNumbers) {
         OfKey("far beyond 64 bits", "Flow = 184467440737095516160", kNumberTooLarge),
         OfKey("2^32 - 1", "CheckSum = 4294967295", kRefusedValue),
         OfKey("a baud rate that is not standard", "BaudRate = 28800", kRefusedValue),
-        OfKey("beyond the standard rates", "BaudRate = 230400", kRefusedValue),
-        OfKey("baud rate 0", "BaudRate = 0", kRefusedValue),
-        OfKey("parity 3", "Parity = 3", kRefusedValue),
-        OfKey("stop bits 3", "StopBits = 3", kRefusedValue),
-        OfKey("data bits 4", "DataBits = 4", kRefusedValue),
         OfKey("data bits 9", "DataBits = 9", kRefusedValue),
-        OfKey("protocol 4", "Protocol = 4", kRefusedValue),
-        OfKey("flow 3", "Flow = 3", kRefusedValue),
-        OfKey("checksum 2", "CheckSum = 2", kRefusedValue),
     };
     for (const Refusal& test : cases)
         ExpectRefused(test);
@@ -160,7 +152,6 @@ TEST(StationFileRefusals, WrongTexts) {
          kRefusedValue, 3, WIDE_TEXT("Software")},
         OfKey("a NUL in a text", "Manufacturer = \"a\\u0000b\"", kRefusedValue),
         OfKey("an unknown model", "Model = Quorvel LV-40", kRefusedValue),
-        OfKey("a model in other letter case", "Model = quorvel lv-10", kRefusedValue),
         {"a model cut short", kGood + "Model = Quorvel LV-", kRefusedValue, 3, WIDE_TEXT("Model")},
         OfKey("an unclosed quote", "Software = \"abc", kBadText),
         OfKey("a lone quote", "Software = \"", kBadText),

@@ -54,33 +54,29 @@ TEST(StationNames, PastedNameGetsThePrefixUntilFree) {
               MakePastedName(WIDE_TEXT("North"), WIDE_TEXT(""), TakenAmong({WIDE_TEXT("North")})));
 }
 
-TEST(StationNames, NamesMustBeNonEmptyWithoutPathOrWildcardCharacters) {
-    EXPECT_TRUE(IsValidStationName(WIDE_TEXT("Level 3 (north)")));
-    for (const WideChar* bad : {WIDE_TEXT(""), WIDE_TEXT("a\\b"), WIDE_TEXT("a/b"),
-                                WIDE_TEXT("\"a\""), WIDE_TEXT("a*")}) {
-        EXPECT_FALSE(IsValidStationName(bad));
-    }
-}
-
+// A valid name has no path or wildcard character; the store also bounds its length, and the
+// folder lists what it can open again by that name.
 TEST(StationNames, TheStoreKeepsOnlyNamesItReadsBackAndTheFolderListsAsThemselves) {
     using enum StationNameProblem;
     const struct {
         WideString name;
+        bool valid;
         StationNameProblem problem;
         bool listable;  // when another program stored it
     } cases[] = {
-        {WIDE_TEXT("Site"), kNone, true},
-        {WideString(259, WIDE_TEXT('L')), kNone, true},
-        {WideString(260, WIDE_TEXT('L')), kTooLong, false},
-        {WIDE_TEXT(""), kEmpty, false},
-        {WIDE_TEXT("Site\\North"), kForbiddenCharacter, false},
-        {WIDE_TEXT("\\"), kForbiddenCharacter, false},
-        {WIDE_TEXT("a/b"), kForbiddenCharacter, true},
-        {WIDE_TEXT("say \"x\""), kForbiddenCharacter, true},
-        {WIDE_TEXT("st*r"), kForbiddenCharacter, true},
-        {WIDE_TEXT("tab\tand line\r\n"), kNone, true},
+        {WIDE_TEXT("Level 3 (north)"), true, kNone, true},
+        {WideString(259, WIDE_TEXT('L')), true, kNone, true},
+        {WideString(260, WIDE_TEXT('L')), true, kTooLong, false},
+        {WIDE_TEXT(""), false, kEmpty, false},
+        {WIDE_TEXT("Site\\North"), false, kForbiddenCharacter, false},
+        {WIDE_TEXT("\\"), false, kForbiddenCharacter, false},
+        {WIDE_TEXT("a/b"), false, kForbiddenCharacter, true},
+        {WIDE_TEXT("say \"x\""), false, kForbiddenCharacter, true},
+        {WIDE_TEXT("st*r"), false, kForbiddenCharacter, true},
+        {WIDE_TEXT("tab\tand line\r\n"), true, kNone, true},
     };
     for (const auto& test : cases) {
+        EXPECT_EQ(test.valid, IsValidStationName(test.name)) << test.name.size();
         EXPECT_EQ(test.problem, CheckStationName(test.name)) << test.name.size();
         EXPECT_EQ(test.listable, IsListableStationName(test.name)) << test.name.size();
     }
@@ -103,30 +99,24 @@ const WideString kCopyOf = WIDE_TEXT("Copy of ");
 }  // namespace
 
 TEST(PastedStations, NamesAreChosenAgainstTheStoreAndTheNamesChosenBefore) {
-    const WideString copyOfA = kCopyOf + WIDE_TEXT("A");
+    const WideString A = WIDE_TEXT("A"), B = WIDE_TEXT("B");
+    const WideString copyOfA = kCopyOf + A;
     const struct {
         const char* what;
         std::set<WideString> stored;
         std::vector<Station> pasted;
         std::vector<WideString> names;
     } cases[] = {
-        {"free names stay", {WIDE_TEXT("B")}, NamedStations({WIDE_TEXT("A")}), {WIDE_TEXT("A")}},
-        {"a stored name gets the prefix until free",
-         {WIDE_TEXT("A"), copyOfA},
-         NamedStations({WIDE_TEXT("A")}),
+        // clang-format off
+        {"free names stay", {B}, NamedStations({A}), {A}},
+        {"a stored name gets the prefix until free", {A, copyOfA}, NamedStations({A}),
          {kCopyOf + copyOfA}},
-        {"the same name twice in the block",
-         {WIDE_TEXT("A")},
-         NamedStations({WIDE_TEXT("A"), WIDE_TEXT("A"), WIDE_TEXT("B")}),
-         {copyOfA, kCopyOf + copyOfA, WIDE_TEXT("B")}},
-        {"a name the block brings before its copy",
-         {},
-         NamedStations({copyOfA, WIDE_TEXT("A"), WIDE_TEXT("A")}),
-         {copyOfA, WIDE_TEXT("A"), kCopyOf + copyOfA}},
-        {"names differing in case are different",
-         {WIDE_TEXT("a")},
-         NamedStations({WIDE_TEXT("A")}),
-         {WIDE_TEXT("A")}},
+        {"the same name twice in the block", {A}, NamedStations({A, A, B}),
+         {copyOfA, kCopyOf + copyOfA, B}},
+        {"a name the block brings before its copy", {}, NamedStations({copyOfA, A, A}),
+         {copyOfA, A, kCopyOf + copyOfA}},
+        {"names differing in case are different", {WIDE_TEXT("a")}, NamedStations({A}), {A}},
+        // clang-format on
     };
     for (const auto& test : cases) {
         const PastedNames chosen =
@@ -146,10 +136,12 @@ TEST(PastedStations, NamesAreChosenAgainstTheStoreAndTheNamesChosenBefore) {
 
 TEST(PastedStations, TheFirstStationTheStoreCannotKeepRefusesTheWholeBlock) {
     using enum PasteRefusal;
+    using enum StationNameProblem;
     const WideString long251(251, WIDE_TEXT('L'));
     const WideString long252(252, WIDE_TEXT('L'));
     const WideString long255(255, WIDE_TEXT('L'));
-    std::vector<Station> longPort = NamedStations({WIDE_TEXT("A"), WIDE_TEXT("B")});
+    const WideString a = WIDE_TEXT("A");
+    std::vector<Station> longPort = NamedStations({a, WIDE_TEXT("B")});
     longPort[1].Port = WideString(260, WIDE_TEXT('P'));
     const struct {
         const char* what;
@@ -159,55 +151,23 @@ TEST(PastedStations, TheFirstStationTheStoreCannotKeepRefusesTheWholeBlock) {
         size_t station;
         StationNameProblem problem;
     } cases[] = {
-        {"empty name",
-         {},
-         NamedStations({WIDE_TEXT("A"), WIDE_TEXT(""), WIDE_TEXT("a\\b")}),
-         kUnreadable,
-         1,
-         StationNameProblem::kEmpty},
-        {"backslash",
-         {},
-         NamedStations({WIDE_TEXT("Site\\North"), WIDE_TEXT("")}),
-         kUnreadable,
-         0,
-         StationNameProblem::kForbiddenCharacter},
-        {"slash after a good one",
-         {},
-         NamedStations({WIDE_TEXT("A"), WIDE_TEXT("c/d")}),
-         kUnreadable,
-         1,
-         StationNameProblem::kForbiddenCharacter},
-        {"260 characters",
-         {},
-         NamedStations({WideString(260, WIDE_TEXT('L'))}),
-         kUnreadable,
-         0,
-         StationNameProblem::kTooLong},
-        {"a port of 260 characters", {}, longPort, kUnreadable, 1, StationNameProblem::kNone},
-        {"251 characters as a copy fit",
-         {long251},
-         NamedStations({long251}),
-         std::nullopt,
-         0,
-         StationNameProblem::kNone},
-        {"252 characters as a copy do not",
-         {long252},
-         NamedStations({long252}),
-         kCopyTooLong,
-         0,
-         StationNameProblem::kNone},
-        {"255 characters pasted over themselves",
-         {long255},
-         NamedStations({long255}),
-         kCopyTooLong,
-         0,
-         StationNameProblem::kNone},
-        {"the second copy in one block is too long",
-         {},
-         NamedStations({long251, long251, long251}),
-         kCopyTooLong,
-         2,
-         StationNameProblem::kNone},
+        // clang-format off
+        {"empty name", {}, NamedStations({a, WIDE_TEXT(""), WIDE_TEXT("a\\b")}), kUnreadable, 1,
+         kEmpty},
+        {"backslash", {}, NamedStations({WIDE_TEXT("Site\\North"), WIDE_TEXT("")}), kUnreadable, 0,
+         kForbiddenCharacter},
+        {"slash after a good one", {}, NamedStations({a, WIDE_TEXT("c/d")}), kUnreadable, 1,
+         kForbiddenCharacter},
+        {"260 characters", {}, NamedStations({WideString(260, 'L')}), kUnreadable, 0, kTooLong},
+        {"a port of 260 characters", {}, longPort, kUnreadable, 1, kNone},
+        {"251 characters as a copy fit", {long251}, NamedStations({long251}), {}, 0, kNone},
+        {"252 characters as a copy do not", {long252}, NamedStations({long252}), kCopyTooLong, 0,
+         kNone},
+        {"255 characters pasted over themselves", {long255}, NamedStations({long255}), kCopyTooLong,
+         0, kNone},
+        {"the second copy in one block is too long", {}, NamedStations({long251, long251, long251}),
+         kCopyTooLong, 2, kNone},
+        // clang-format on
     };
     for (const auto& test : cases) {
         const PastedNames chosen =

@@ -31,20 +31,11 @@ std::string Narrow(WideStringView text) {
 
 // A record whose every value differs from the defaults.
 Station Written() {
-    Station station;
-    station.Name = WIDE_TEXT("North");
-    station.Port = WIDE_TEXT("COM4");
-    station.Manufacturer = WIDE_TEXT("Maker");
-    station.Model = kLv30;
-    station.Software = WIDE_TEXT("2.1");
-    station.BaudRate = 4800;
-    station.StopBits = 2;
-    station.Parity = 1;
-    station.DataBits = 8;
-    station.Protocol = 3;
-    station.Flow = 2;
-    station.CheckSum = 0;
-    return station;
+    // clang-format off
+    return {.Name = WIDE_TEXT("North"), .Port = WIDE_TEXT("COM4"), .Manufacturer = WIDE_TEXT("M"),
+            .Model = kLv30, .Software = WIDE_TEXT("2.1"), .BaudRate = 4800, .StopBits = 2,
+            .Parity = 1, .Protocol = 3, .DataBits = 8, .Flow = 2, .CheckSum = 0};
+    // clang-format on
 }
 
 // Copies the field stored under this value name from one record to the other.
@@ -71,20 +62,12 @@ StationValueTable WrittenKey() {
 
 // A record in which every field differs from both the written key and the defaults.
 Station Prior() {
-    Station station;
-    station.Name = WIDE_TEXT("prior");
-    station.Port = WIDE_TEXT("prior port");
-    station.Manufacturer = WIDE_TEXT("prior maker");
-    station.Model = WIDE_TEXT("prior model");
-    station.Software = WIDE_TEXT("prior software");
-    station.BaudRate = 11;
-    station.StopBits = 12;
-    station.Parity = 13;
-    station.Protocol = 14;
-    station.DataBits = 15;
-    station.Flow = 16;
-    station.CheckSum = 17;
-    return station;
+    // clang-format off
+    return {.Name = WIDE_TEXT("prior"), .Port = WIDE_TEXT("prior port"),
+            .Manufacturer = WIDE_TEXT("prior maker"), .Model = WIDE_TEXT("prior model"),
+            .Software = WIDE_TEXT("prior software"), .BaudRate = 11, .StopBits = 12, .Parity = 13,
+            .Protocol = 14, .DataBits = 15, .Flow = 16, .CheckSum = 17};
+    // clang-format on
 }
 
 struct Reading {
@@ -159,7 +142,10 @@ TEST(StationValues, AMissingValueStopsTheReadThereAndLaterFieldsKeepTheirValues)
 }
 
 TEST(StationValues, ValuesOfTheWrongTypeOrSizeStopTheReadWithoutTouchingTheirField) {
+    using enum RegistryValueType;
+    using enum ValueReadStatus;
     const std::vector<uint8_t> eight = {1, 2, 3, 4, 5, 6, 7, 8};
+    const auto textList = RegistryValueType(7), unknown = RegistryValueType(0xFFFFFFFF);
     const struct {
         const char* what;
         const WideChar* name;
@@ -167,41 +153,17 @@ TEST(StationValues, ValuesOfTheWrongTypeOrSizeStopTheReadWithoutTouchingTheirFie
         std::vector<uint8_t> data;
         ValueReadStatus status;
     } cases[] = {
-        {"a name stored as a number",
-         WIDE_TEXT("Name"),
-         RegistryValueType::kNumber,
-         {0x41, 0, 0x41, 0},
-         ValueReadStatus::kWrongType},
-        {"a name stored as binary", WIDE_TEXT("Name"), RegistryValueType::kBinary,
-         Units(WIDE_TEXT("North")), ValueReadStatus::kWrongType},
-        {"a model as a list of texts", WIDE_TEXT("Model"), static_cast<RegistryValueType>(7),
-         Units(kLv20), ValueReadStatus::kWrongType},
-        {"a port of an unknown type", WIDE_TEXT("Port"), static_cast<RegistryValueType>(0xFFFFFFFF),
-         Units(WIDE_TEXT("COM4")), ValueReadStatus::kWrongType},
-        {"a baud rate as text",
-         WIDE_TEXT("BaudRate"),
-         RegistryValueType::kText,
-         {'9', 0, '6', 0},
-         ValueReadStatus::kWrongType},
-        {"a baud rate of eight bytes", WIDE_TEXT("BaudRate"), RegistryValueType::kBinary, eight,
-         ValueReadStatus::kTooLong},
-        {"a number of eight bytes", WIDE_TEXT("StopBits"), RegistryValueType::kNumber, eight,
-         ValueReadStatus::kTooLong},
-        {"a number of three bytes",
-         WIDE_TEXT("DataBits"),
-         RegistryValueType::kNumber,
-         {8, 0, 0},
-         ValueReadStatus::kWrongType},
-        {"an empty number",
-         WIDE_TEXT("Parity"),
-         RegistryValueType::kNumber,
-         {},
-         ValueReadStatus::kWrongType},
-        {"four binary bytes",
-         WIDE_TEXT("CheckSum"),
-         RegistryValueType::kBinary,
-         {0, 0, 0, 0},
-         ValueReadStatus::kWrongType},
+        {"a name stored as a number", WIDE_TEXT("Name"), kNumber, {0x41, 0, 0x41, 0}, kWrongType},
+        {"a name stored as binary", WIDE_TEXT("Name"), kBinary, Units(WIDE_TEXT("N")), kWrongType},
+        {"a model as a list of texts", WIDE_TEXT("Model"), textList, Units(kLv20), kWrongType},
+        {"a port of an unknown type", WIDE_TEXT("Port"), unknown, Units(WIDE_TEXT("COM4")),
+         kWrongType},
+        {"a baud rate as text", WIDE_TEXT("BaudRate"), kText, {'9', 0, '6', 0}, kWrongType},
+        {"a baud rate of eight bytes", WIDE_TEXT("BaudRate"), kBinary, eight, kTooLong},
+        {"a number of eight bytes", WIDE_TEXT("StopBits"), kNumber, eight, kTooLong},
+        {"a number of three bytes", WIDE_TEXT("DataBits"), kNumber, {8, 0, 0}, kWrongType},
+        {"an empty number", WIDE_TEXT("Parity"), kNumber, {}, kWrongType},
+        {"four binary bytes", WIDE_TEXT("CheckSum"), kBinary, {0, 0, 0, 0}, kWrongType},
     };
     for (const auto& test : cases) {
         SCOPED_TRACE(test.what);
@@ -220,13 +182,14 @@ TEST(StationValues, ValuesOfTheWrongTypeOrSizeStopTheReadWithoutTouchingTheirFie
 }
 
 TEST(StationValues, TextsAreReadOnlyInsideTheirBytesAndUpTo520OfThem) {
+    using enum RegistryValueType;
+    using enum ValueReadStatus;
     std::vector<uint8_t> withNul = Units(WIDE_TEXT("Pre"));
     withNul.insert(withNul.end(), {0, 0, 'x', 0, 'y', 0});
     std::vector<uint8_t> odd = Units(WIDE_TEXT("Odd"));
     odd.push_back('!');
     const WideString units259(259, WIDE_TEXT('L'));
     const WideString units260(260, WIDE_TEXT('U'));
-    const RegistryValueType text = RegistryValueType::kText;
     const struct {
         const char* what;
         RegistryValueType type;
@@ -234,21 +197,17 @@ TEST(StationValues, TextsAreReadOnlyInsideTheirBytesAndUpTo520OfThem) {
         ValueReadStatus status;
         WideString name;  // when read
     } cases[] = {
-        {"without terminator", text, Units(WIDE_TEXT("Raw")), ValueReadStatus::kRead,
-         WIDE_TEXT("Raw")},
-        {"an odd byte count", text, odd, ValueReadStatus::kRead, WIDE_TEXT("Odd")},
-        {"one byte", text, {'A'}, ValueReadStatus::kRead, WideString()},
-        {"no bytes", text, {}, ValueReadStatus::kRead, WideString()},
-        {"a NUL inside", text, withNul, ValueReadStatus::kRead, WIDE_TEXT("Pre")},
-        {"unexpanded", RegistryValueType::kExpandText, Units(WIDE_TEXT("%TEMP%")),
-         ValueReadStatus::kRead, WIDE_TEXT("%TEMP%")},
-        {"259 units and terminator", text, Terminated(units259), ValueReadStatus::kRead, units259},
-        {"260 units filling the buffer without terminator", text, Units(units260),
-         ValueReadStatus::kRead, units260},
-        {"260 units and terminator", text, Terminated(units260), ValueReadStatus::kTooLong,
-         WideString()},
-        {"521 bytes", text, std::vector<uint8_t>(521, 'z'), ValueReadStatus::kTooLong,
-         WideString()},
+        {"without terminator", kText, Units(WIDE_TEXT("Raw")), kRead, WIDE_TEXT("Raw")},
+        {"an odd byte count", kText, odd, kRead, WIDE_TEXT("Odd")},
+        {"one byte", kText, {'A'}, kRead, WideString()},
+        {"no bytes", kText, {}, kRead, WideString()},
+        {"a NUL inside", kText, withNul, kRead, WIDE_TEXT("Pre")},
+        {"unexpanded", kExpandText, Units(WIDE_TEXT("%TEMP%")), kRead, WIDE_TEXT("%TEMP%")},
+        {"259 units and terminator", kText, Terminated(units259), kRead, units259},
+        {"260 units filling the buffer without terminator", kText, Units(units260), kRead,
+         units260},
+        {"260 units and terminator", kText, Terminated(units260), kTooLong, WideString()},
+        {"521 bytes", kText, std::vector<uint8_t>(521, 'z'), kTooLong, WideString()},
     };
     for (const auto& test : cases) {
         SCOPED_TRACE(test.what);
@@ -256,8 +215,7 @@ TEST(StationValues, TextsAreReadOnlyInsideTheirBytesAndUpTo520OfThem) {
         key.Set(WIDE_TEXT("Name"), test.type, test.data);
         const Reading reading = Read(key);
         EXPECT_EQ(test.status, reading.status);
-        EXPECT_EQ(test.status == ValueReadStatus::kRead ? test.name : WIDE_TEXT("prior"),
-                  reading.station.Name);
+        EXPECT_EQ(test.status == kRead ? test.name : WIDE_TEXT("prior"), reading.station.Name);
     }
 }
 

@@ -67,16 +67,13 @@ TEST(InstallerRegistry, TextIsEscapedForXmlAndForTheInstallersFormattedStrings) 
         {"say \"hi\"", "say &quot;hi&quot;"},
     };
     for (const auto& c : cases) {
-        InstallerRegistryValue value;
-        value.key = WIDE_TEXT("Key");
-        value.text = Widen(c.text);
-        const std::vector<std::string> lines = Elements({value});
+        const std::vector<std::string> lines =
+            Elements({{.key = WIDE_TEXT("Key"), .text = Widen(c.text)}});
         ASSERT_EQ(1u, lines.size());
         EXPECT_NE(std::string::npos, lines[0].find("Value=\"" + c.written + "\"")) << lines[0];
     }
-    InstallerRegistryValue german;
-    german.key = WIDE_TEXT("Key");
-    german.text = WIDE_TEXT("Gr\u00FC\u00DFe");
+    const InstallerRegistryValue german{.key = WIDE_TEXT("Key"),
+                                        .text = WIDE_TEXT("Gr\u00FC\u00DFe")};
     EXPECT_NE(std::string::npos, Elements({german})[0].find("Value=\"Gr\xC3\xBC\xC3\x9F" "e\""));
 }
 
@@ -93,14 +90,12 @@ TEST(InstallerRegistry, BinaryValuesAreMarkedForThePackagerAndWrittenInHex) {
 
 TEST(InstallerRegistry, WhatAPackageCannotWriteIsRefused) {
     std::string include, error;
-    InstallerRegistryValue config;
-    config.root = RegistryRoot::CurrentConfig;
-    config.key = WIDE_TEXT("Key");
-    config.text = WIDE_TEXT("x");
+    // A root the package has no name for, and an empty text (which a package cannot write).
+    const InstallerRegistryValue config{
+        .root = RegistryRoot::CurrentConfig, .key = WIDE_TEXT("Key"), .text = WIDE_TEXT("x")};
     EXPECT_FALSE(WriteWixRegistryInclude({config}, kPlaceholder, "", "m", "", include, error));
-    InstallerRegistryValue empty;
-    empty.key = WIDE_TEXT("Key");
-    EXPECT_FALSE(WriteWixRegistryInclude({empty}, kPlaceholder, "", "m", "", include, error));
+    EXPECT_FALSE(WriteWixRegistryInclude({{.key = WIDE_TEXT("Key")}}, kPlaceholder, "", "m", "",
+                                         include, error));
 }
 
 TEST(InstallerRegistry, OnlyKeysThatUnregistrationDeletesMustHoldAValue) {
