@@ -211,19 +211,28 @@ HRESULT CLVDataObject::GetFileContents(LONG index, STGMEDIUM* medium) noexcept {
         // Whatever the download wrote goes with the target: a partial file when the download did
         // not complete (the target's end deletes it), the file the stream reads when it did.
         RETURN_IF_FAILED(target.AddWrittenFile(file));
+        // A success with no readable file behind it is no download: its row and the copy both
+        // say why, rather than the row saying "ok" over a copy that fails.
+        HRESULT outcome = downloaded;
+        if (outcome == S_OK) {
+            UniqueFileHandle reader;
+            uint64_t size = 0;
+            outcome = target.OpenForReading(reader, size);
+        }
         // Kept (when complete) and journaled before the shell can lose it; this never fails it.
-        attempt.Finish(downloaded, &target, shownFailure);
-        if (downloaded != S_OK) {
+        attempt.Finish(outcome, &target, shownFailure);
+        if (outcome != S_OK) {
             // A failure fails the copy with its reason, so that the caller reports a failure rather
             // than a cancel.
-            if (FAILED(downloaded))
-                LV_LOG_AND_RETURN(downloaded);
+            if (FAILED(outcome))
+                LV_LOG_AND_RETURN(outcome);
             return S_FALSE;
         }
 
         // The stream takes the target over and reads the file from here on, so that nobody writes,
         // renames or replaces it between the download and the last read. A file that cannot be
-        // opened now is no download: no stream over nothing (its release removes the target).
+        // opened now (taken since the check above) is no download: no stream over nothing (its
+        // release removes the target).
         auto stream = MakeComObject<CStream2>();
         RETURN_IF_FAILED(stream->Bind(std::move(target)));
         medium->tymed = TYMED_ISTREAM;

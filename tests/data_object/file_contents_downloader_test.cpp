@@ -147,7 +147,7 @@ TEST_F(FileContentsDownloader, EachEndOfADownloadGivesItsStreamOrNoneAndItsJourn
         HRESULT download;                    // what the downloader answers
         std::optional<std::string> written;  // what it left in the file
         HRESULT expected;                    // what GetData answers
-        const char* result;                  // the journal's word for it; nullptr: not checked
+        const char* result;                  // the journal's word for it
         bool reason;                         // whether the row gives one
         bool refusesAtOnce = false;          // it answers before it asks for its target
         std::wstring shown = {};             // the failure the user was shown, the row's reason
@@ -162,10 +162,9 @@ TEST_F(FileContentsDownloader, EachEndOfADownloadGivesItsStreamOrNoneAndItsJourn
         {"unable to run", E_FAIL, std::nullopt, E_FAIL, "failed", true},
         {"refused before its target", HRESULT_FROM_WIN32(ERROR_BUSY), std::nullopt,
          HRESULT_FROM_WIN32(ERROR_BUSY), "failed", true, true},
-        // A success with no file behind it is no download: nothing to open, no stream. The row's
-        // result is the downloader's word, whatever it is; its reason says nothing was kept.
+        // A success with no file behind it is no download: nothing to open, no stream, a failed row.
         {"complete without a file", S_OK, std::nullopt, HRESULT_FROM_WIN32(ERROR_FILE_NOT_FOUND),
-         nullptr, true},
+         "failed", true},
         {"a port that is not there", S_FALSE, "", S_FALSE, "failed", true, false,
          L"COM9 is not on this PC now. Ports present: COM3, COM7."},
         {"a time-out after part of the file", S_FALSE, "A,01", S_FALSE, "failed", true, false,
@@ -203,9 +202,7 @@ TEST_F(FileContentsDownloader, EachEndOfADownloadGivesItsStreamOrNoneAndItsJourn
         const auto journal = Journal();
         ASSERT_EQ(++rows, journal.size()) << "one header, one row each";
         const std::vector<std::string>& row = journal.back();
-        if (test.result) {
-            EXPECT_EQ(test.result, row[kResult]);
-        }
+        EXPECT_EQ(test.result, row[kResult]);
         if (!test.shown.empty()) {
             EXPECT_EQ(std::string(test.shown.begin(), test.shown.end()), row[kMessage]);
         } else {
