@@ -22,6 +22,9 @@ std::string Huge() {
 
 }  // namespace
 
+// Every problem with its line and field is the station-file tests'; here a few of each class go
+// through the command (a file is read only up to one byte past the limit), each refusal's own
+// words in the printed line.
 TEST_F(StationFileCommands, EveryBadFileWritesNothingAndNamesWhereItIsBad) {
     const struct {
         const char* what;
@@ -29,23 +32,14 @@ TEST_F(StationFileCommands, EveryBadFileWritesNothingAndNamesWhereItIsBad) {
         std::vector<std::wstring> named;  // in the error line
     } cases[] = {
         {"more than 1 MiB", Huge(), {L"the file is larger than 1048576 bytes"}},
-        {"UTF-16 with its mark", std::string("\xFF\xFE[\0G\0]\0", 8), {L"the file is UTF-16"}},
         {"invalid UTF-8", kGood + "[Gr\xFC\xDF]\n", {L"line 5", L"not UTF-8"}},
-        {"a half section at the end", kGood + "[Cut", {L"line 5, Name"}},
         {"a section cut after its name", kGood + "[Cut]\n", {L"line 5, Name", L"no values"}},
-        // Every refused name character is refused alike (the parser's own tests list them).
-        {"a backslash in a name", kGood + "[A\\B]\nPort = COM1\n", {L"line 5, Name"}},
         {"the same section twice",
          kGood + "[Good one]\nPort = COM1\n",
          {L"line 5, Name", L"line 1"}},
-        {"a number out of range", kGood + "DataBits = 9\n", {L"line 5, DataBits"}},
-        {"a baud rate that is not standard",
-         kGood + "BaudRate = 28800\n",
-         {L"line 5, BaudRate", L"28800"}},
         {"not a number", kGood + "Parity = even\n", {L"line 5, Parity", L"not a number"}},
         {"beyond 32 bits", kGood + "Flow = 4294967296\n", {L"line 5, Flow", L"32 bits"}},
         {"an unknown key", kGood + "Speed = 9600\n", {L"line 5, Speed", L"not a value"}},
-        {"an unknown model", kGood + "Model = LV-99\n", {L"line 5, Model"}},
     };
     Station existing = Named(L"Good one");
     existing.BaudRate = 300;  // a taken name: not even --replace may touch it

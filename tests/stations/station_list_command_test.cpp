@@ -40,47 +40,19 @@ TEST_F(StationListCommand, ThreeThousandStationsAreListedInTheStoresOrder) {
     EXPECT_EQ(L"    COM3, 9600 baud, 7 data bits, parity Odd, Quorvel LV-10", *(first + 1));
 }
 
+// Which units are escaped, and how, is the printable-text tests'; here the name and the port
+// another program wrote go through them. A port read back as the computer's first port would hide
+// it, so this runs on a computer without a port list.
 TEST_F(StationListCommand, TextsThatWouldForgeLinesOrTerminalSequencesArePrintedEscaped) {
-    const struct {
-        std::wstring name;
-        std::wstring printed;
-    } cases[] = {
-        {L"Forged\r\nFake station", L"Forged\\x0D\\x0AFake station"},
-        {L"\x1B[2J\x1B]0;title\a", L"\\x1B[2J\\x1B]0;title\\x07"},
-        {L"csi\x9B"
-         L"31m",
-         L"csi\\x9B31m"},
-        {L"right\x202E"
-         L"txt.exe",
-         L"right\\u202Etxt.exe"},
-        {L"Plain ÄÖÜ", L"Plain ÄÖÜ"},
-    };
-    int key = 0;
-    for (const auto& test : cases) {
-        UniqueRegKey station = StationKey(L"Station " + std::to_wstring(key++));
-        ASSERT_EQ(S_OK, SaveStationValues(Named(test.name), station.get()));
-    }
-    // The other texts are printed the same way; a port read back as the computer's first port
-    // would hide it, so this one is on a computer without a port list.
     ASSERT_EQ(ERROR_SUCCESS,
               DeleteKeyRecursive(HKEY_LOCAL_MACHINE, L"HARDWARE\\DEVICEMAP\\SERIALCOMM"));
-    UniqueRegKey last = StationKey(L"Station " + std::to_wstring(key));
-    Station port = Named(L"Port");
-    port.Port = L"COM1\r\nInjected\x1B[0m";
-    ASSERT_EQ(S_OK, SaveStationValues(port, last.get()));
-
-    const std::vector<std::wstring> lines = List();
-    ASSERT_EQ(2 * (std::size(cases) + 1), lines.size());
-    for (size_t index = 0; index < std::size(cases); ++index)
-        EXPECT_EQ(cases[index].printed, lines[2 * index]);
-    EXPECT_EQ(
-        L"    COM1\\x0D\\x0AInjected\\x1B[0m, 9600 baud, 7 data bits, parity Even, "
-        L"Quorvel LV-10",
-        lines.back());
-    for (const std::wstring& line : lines) {
-        for (wchar_t unit : line)
-            EXPECT_FALSE(unit < 0x20 || (unit >= 0x7F && unit <= 0x9F)) << line;
-    }
+    Station forged = Named(L"Forged\r\nFake station");
+    forged.Port = L"COM1\r\nInjected\x1B[0m";
+    ASSERT_EQ(S_OK, SaveStationValues(forged, StationKey(L"Station 0").get()));
+    EXPECT_EQ((std::vector<std::wstring>{L"Forged\\x0D\\x0AFake station",
+                                         L"    COM1\\x0D\\x0AInjected\\x1B[0m, 9600 baud, 7 data "
+                                         L"bits, parity Even, Quorvel LV-10"}),
+              List());
 }
 
 }  // namespace
