@@ -3,29 +3,25 @@
 
 #include <algorithm>
 
+#include "stations/portable/registry_data.h"
 #include "stations/portable/station_values.h"
+#include "stations/registry_station_values.h"
 #include "support/error_log.h"
 #include "support/portable/wide_text.h"
 
 LONG ReadStationName(HKEY key, std::wstring& name) noexcept try {
-    // The buffer LoadStationValues reads texts with: names of up to 259 characters.
-    wchar_t buffer[kStationTextValueBytes / sizeof(wchar_t)];
-    DWORD type = 0;
-    DWORD size = sizeof buffer;
-    const LONG status =
-        ::RegQueryValueExW(key, L"Name", nullptr, &type, reinterpret_cast<BYTE*>(buffer), &size);
-    if (status != ERROR_SUCCESS)
-        return status;
-    if (type != REG_SZ && type != REG_EXPAND_SZ)
-        return ERROR_UNSUPPORTED_TYPE;
-    const size_t units = std::min<size_t>(size, sizeof buffer) / sizeof(wchar_t);
-    const size_t length = BoundedLength(buffer, units);
-    if (std::any_of(buffer + length, buffer + units, [](wchar_t unit) { return unit != 0; }))
-        return ERROR_INVALID_DATA;
-    name.assign(buffer, length);
-    return ERROR_SUCCESS;
+    // Read as LoadStationValues reads every text, with one more refusal.
+    RegistryStationValues values(key);
+    RegistryValueType type = RegistryValueType::kNone;
+    std::vector<uint8_t> data;
+    ValueReadStatus status = values.ReadValue(L"Name", kStationTextValueBytes, type, data);
+    if (status == ValueReadStatus::kRead)
+        status = DecodeTextValue(type, data, kStationTextValueBytes, name);
+    if (status != ValueReadStatus::kRead)
+        return values.CodeOf(status);
+    return HasTextAfterItsEnd(data) ? ERROR_INVALID_DATA : ERROR_SUCCESS;
 } catch (...) {
-    return ERROR_NOT_ENOUGH_MEMORY;  // the name's copy is all that allocates
+    return ERROR_NOT_ENOUGH_MEMORY;  // the buffer and the name's copy are all that allocate
 }
 
 void LogLeftOutStations(const LeftOutStations& leftOut, const wchar_t* function) noexcept {

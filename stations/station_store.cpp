@@ -11,6 +11,7 @@
 #include "res/resource.h"
 #include "stations/portable/station_names.h"
 #include "stations/portable/station_values.h"
+#include "stations/registry_station_values.h"
 #include "stations/serial_ports.h"
 #include "stations/station_keys.h"
 #include "stations/station_models.h"
@@ -247,68 +248,16 @@ HRESULT DeleteStation(const Station& station) noexcept try {
 }
 CATCH_RETURN()
 
-namespace {
-
-// An open station key as the portable reader's source of values. It keeps the registry's own
-// code of its last read, the one LoadStationValues passes on when that read was refused.
-class RegistryStationValues final : public StationValueSource {
-public:
-    explicit RegistryStationValues(HKEY key) noexcept : key_(key) {}
-
-    ValueReadStatus ReadValue(const wchar_t* name, size_t capacity, RegistryValueType& type,
-                              std::vector<uint8_t>& data) override {
-        // Never a null buffer: given none, the registry answers with the value's size instead.
-        data.assign(std::max<size_t>(capacity, 1), 0);
-        DWORD valueType = REG_NONE;
-        DWORD size = static_cast<DWORD>(capacity);  // the reader's own small constants
-        lastError_ = ::RegQueryValueExW(key_, name, nullptr, &valueType, data.data(), &size);
-        if (lastError_ != ERROR_SUCCESS) {
-            data.clear();
-            switch (lastError_) {
-                case ERROR_FILE_NOT_FOUND:
-                    return ValueReadStatus::kMissing;
-                case ERROR_MORE_DATA:
-                    return ValueReadStatus::kTooLong;
-                default:
-                    return ValueReadStatus::kFailed;
-            }
-        }
-        data.resize(std::min<size_t>(size, capacity));
-        type = static_cast<RegistryValueType>(valueType);
-        return ValueReadStatus::kRead;
-    }
-
-    [[nodiscard]] LONG LastError() const noexcept { return lastError_; }
-
-private:
-    HKEY key_;
-    LONG lastError_ = ERROR_SUCCESS;
-};
-
-}  // namespace
-
 HRESULT LoadStationValues(Station& station, HKEY stationKey) noexcept try {
     RegistryStationValues values(stationKey);
     const StationReadRules rules{[] { return ListSerialPorts(); }, FirstModelText(),
                                  LoadUiText(IDS_MODEL_LV20), LoadUiText(IDS_MODEL_LV30)};
-    // What the data holds is an answer (a half-written station loads up to its gap), returned
-    // without a log line, as every listing would write it again.
-    switch (ReadStationValues(station, values, rules)) {
-        case ValueReadStatus::kRead:
-            return S_OK;
-        case ValueReadStatus::kMissing:
-            return HRESULT_FROM_WIN32(ERROR_FILE_NOT_FOUND);
-        case ValueReadStatus::kTooLong:
-            return HRESULT_FROM_WIN32(ERROR_MORE_DATA);
-        case ValueReadStatus::kWrongType:
-            return HRESULT_FROM_WIN32(ERROR_UNSUPPORTED_TYPE);
-        case ValueReadStatus::kFailed:
-            break;
-    }
-    // The read that failed is always the last one made: a refusal is the registry's own code.
-    RETURN_IF_WIN32_ERROR(values.LastError() != ERROR_SUCCESS ? values.LastError()
-                                                              : ERROR_GEN_FAILURE);
-    return S_OK;
+    const ValueReadStatus status = ReadStationValues(station, values, rules);
+    // The registry's refusal is logged; what the data holds is an answer (a half-written station
+    // loads up to its gap), returned without a log line, as every listing would write it again.
+    if (status == ValueReadStatus::kFailed)
+        RETURN_IF_WIN32_ERROR(values.CodeOf(status));
+    return HRESULT_FROM_WIN32(values.CodeOf(status));
 }
 CATCH_RETURN()
 

@@ -14,6 +14,18 @@ WideString TextInValueData(std::span<const uint8_t> data) {
     return text;
 }
 
+bool HasTextAfterItsEnd(std::span<const uint8_t> data) noexcept {
+    bool ended = false;
+    for (size_t offset = 0; offset + 1 < data.size(); offset += 2) {
+        const uint16_t unit = ReadU16(data.data() + offset);
+        if (unit == 0)
+            ended = true;
+        else if (ended)
+            return true;
+    }
+    return false;
+}
+
 ValueReadStatus DecodeTextValue(RegistryValueType type, std::span<const uint8_t> data,
                                 size_t maxBytes, WideString& text) {
     if (data.size() > maxBytes)

@@ -36,6 +36,10 @@ enum class ValueReadStatus : uint8_t {
 // The UTF-16LE units up to the first NUL or the last whole unit of data.
 WideString TextInValueData(std::span<const uint8_t> data);
 
+// Whether a unit other than NUL follows the first NUL among data's whole units: "Site", NUL,
+// "North" reads as "Site", and a listing that took it so would show another station's name.
+[[nodiscard]] bool HasTextAfterItsEnd(std::span<const uint8_t> data) noexcept;
+
 // A REG_DWORD of exactly four bytes; nothing is written to value unless it is kRead.
 [[nodiscard]] ValueReadStatus DecodeNumberValue(RegistryValueType type,
                                                 std::span<const uint8_t> data,

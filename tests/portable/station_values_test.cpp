@@ -5,6 +5,7 @@
 #include <string>
 #include <vector>
 
+#include "stations/portable/registry_data.h"
 #include "stations/portable/station_fields.h"
 #include "stations/portable/station_values.h"
 #include "tests/portable/registry_bytes.h"
@@ -181,11 +182,14 @@ TEST(StationValues, ValuesOfTheWrongTypeOrSizeStopTheReadWithoutTouchingTheirFie
     EXPECT_EQ(WIDE_TEXT("prior port"), Read(key).station.Port);
 }
 
+// The listing also refuses a name with text after its first NUL, which would show as another.
 TEST(StationValues, TextsAreReadOnlyInsideTheirBytesAndUpTo520OfThem) {
     using enum RegistryValueType;
     using enum ValueReadStatus;
     std::vector<uint8_t> withNul = Units(WIDE_TEXT("Pre"));
     withNul.insert(withNul.end(), {0, 0, 'x', 0, 'y', 0});
+    std::vector<uint8_t> padded = Terminated(WIDE_TEXT("Pad"));
+    padded.insert(padded.end(), {0, 0, 0, 0, 'h'});  // NULs, then half a unit
     std::vector<uint8_t> odd = Units(WIDE_TEXT("Odd"));
     odd.push_back('!');
     const WideString units259(259, WIDE_TEXT('L'));
@@ -196,12 +200,14 @@ TEST(StationValues, TextsAreReadOnlyInsideTheirBytesAndUpTo520OfThem) {
         std::vector<uint8_t> data;
         ValueReadStatus status;
         WideString name;  // when read
+        bool textAfterEnd = false;
     } cases[] = {
         {"without terminator", kText, Units(WIDE_TEXT("Raw")), kRead, WIDE_TEXT("Raw")},
         {"an odd byte count", kText, odd, kRead, WIDE_TEXT("Odd")},
         {"one byte", kText, {'A'}, kRead, WideString()},
         {"no bytes", kText, {}, kRead, WideString()},
-        {"a NUL inside", kText, withNul, kRead, WIDE_TEXT("Pre")},
+        {"a NUL inside", kText, withNul, kRead, WIDE_TEXT("Pre"), true},
+        {"NULs after the terminator", kText, padded, kRead, WIDE_TEXT("Pad")},
         {"unexpanded", kExpandText, Units(WIDE_TEXT("%TEMP%")), kRead, WIDE_TEXT("%TEMP%")},
         {"259 units and terminator", kText, Terminated(units259), kRead, units259},
         {"260 units filling the buffer without terminator", kText, Units(units260), kRead,
@@ -216,6 +222,7 @@ TEST(StationValues, TextsAreReadOnlyInsideTheirBytesAndUpTo520OfThem) {
         const Reading reading = Read(key);
         EXPECT_EQ(test.status, reading.status);
         EXPECT_EQ(test.status == kRead ? test.name : WIDE_TEXT("prior"), reading.station.Name);
+        EXPECT_EQ(test.textAfterEnd, HasTextAfterItsEnd(test.data));
     }
 }
 
