@@ -41,8 +41,7 @@ std::wstring SystemText(HRESULT result) {
     try {
         UniqueFileHandle file;
         uint64_t size = 0;
-        const HRESULT opened = OpenReadOnlyFile(path, file, size);
-        if (FAILED(opened))
+        if (const HRESULT opened = OpenReadOnlyFile(path, file, size); FAILED(opened))
             return opened;
         bytes.resize(static_cast<size_t>(std::min<uint64_t>(size, kMaximumStationFileSize + 1)));
         size_t done = 0;
