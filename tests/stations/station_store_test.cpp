@@ -215,7 +215,7 @@ TEST_F(StationStore, AnAbsentPortReadsAsTheOnlyPortTheMachineLists) {
     EXPECT_EQ(L"COM4", station.Port);
 }
 
-TEST_F(StationStore, LoadPassesAMissingValueAndATooLongOneOnAsTheRegistrysErrors) {
+TEST_F(StationStore, LoadPassesAMissingValueAndOneTooLongOrOfAnotherTypeOnAsErrors) {
     AddStationOfModel(L"Half");
     UniqueRegKey half = StationKey(L"Station 0");
     ASSERT_EQ(ERROR_SUCCESS, ::RegDeleteValueW(half.get(), L"BaudRate"));
@@ -233,6 +233,10 @@ TEST_F(StationStore, LoadPassesAMissingValueAndATooLongOneOnAsTheRegistrysErrors
     station = Station{};
     EXPECT_EQ(HRESULT_FROM_WIN32(ERROR_MORE_DATA), LoadStationValues(station, typed.get()));
     EXPECT_EQ(9600u, station.BaudRate);
+    // One of the right size but another type is no number.
+    ASSERT_EQ(ERROR_SUCCESS,
+              ::RegSetValueExW(typed.get(), L"BaudRate", 0, REG_BINARY, eightBytes, 4));
+    EXPECT_EQ(HRESULT_FROM_WIN32(ERROR_UNSUPPORTED_TYPE), LoadStationValues(station, typed.get()));
 }
 
 TEST_F(StationStore, SerialPortListStopsAtTheFirstNonTextValue) {
