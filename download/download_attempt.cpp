@@ -4,6 +4,7 @@
 #include "download/download_journal.h"
 #include "download/download_records_folder.h"
 #include "download/kept_downloads.h"
+#include "stations/station_models.h"
 #include "support/error_handling.h"
 #include "support/module_instance.h"
 
@@ -20,8 +21,13 @@ LocalDateTime LocalJournalTime(const FILETIME& utc) noexcept {
     ULARGE_INTEGER utcValue{{utc.dwLowDateTime, utc.dwHighDateTime}};
     ULARGE_INTEGER localValue{{local.dwLowDateTime, local.dwHighDateTime}};
     const LONGLONG offset = static_cast<LONGLONG>(localValue.QuadPart - utcValue.QuadPart);
-    return {parts.wYear,   parts.wMonth,  parts.wDay, parts.wHour,
-            parts.wMinute, parts.wSecond, static_cast<int>(offset / kFileTimeUnitsPerMinute)};
+    return {parts.wYear,
+            parts.wMonth,
+            parts.wDay,
+            parts.wHour,
+            parts.wMinute,
+            parts.wSecond,
+            static_cast<int>(offset / kFileTimeUnitsPerMinute)};
 }
 
 JournalResult ResultOf(HRESULT result) noexcept {
@@ -63,9 +69,11 @@ void DownloadAttempt::Finish(HRESULT result, const DownloadTarget* target,
         row.Baud = station_.BaudRate;
         row.Parity = station_.Parity;
         row.Model = station_.Model;
-        row.Procedure = station_.Protocol;
+        row.Procedure = IsExternalLibraryModel(station_.Model) ? JournalProcedure::Library
+                                                               : JournalProcedure::Line;
         row.Bytes = WrittenBytes(target);
-        row.Seconds = static_cast<double>(::GetTickCount64() - startTicks_) / kMillisecondsPerSecond;
+        row.Seconds =
+            static_cast<double>(::GetTickCount64() - startTicks_) / kMillisecondsPerSecond;
         row.Result = ResultOf(result);
         if (result != S_OK && !shownFailure.empty()) {
             row.Result = JournalResult::Failed;

@@ -3,9 +3,6 @@
 
 #include <cstdio>
 #include <cstdlib>
-#include <optional>
-
-#include "download/portable/protocol_vocabulary.h"
 
 namespace {
 
@@ -31,44 +28,31 @@ void AppendUtf8(std::string& out, char32_t code) {
 
 const char* ResultName(JournalResult result) noexcept {
     switch (result) {
-    case JournalResult::Ok:
-        return "ok";
-    case JournalResult::Cancelled:
-        return "cancelled";
-    case JournalResult::Failed:
-        break;
+        case JournalResult::Ok:
+            return "ok";
+        case JournalResult::Cancelled:
+            return "cancelled";
+        case JournalResult::Failed:
+            break;
     }
     return "failed";
 }
 
 std::string ParityName(uint32_t parity) {
     switch (parity) {
-    case 0:
-        return "none";
-    case 1:
-        return "odd";
-    case 2:
-        return "even";
-    default:
-        return std::to_string(parity);  // a stored value the sheet does not offer, as it is
+        case 0:
+            return "none";
+        case 1:
+            return "odd";
+        case 2:
+            return "even";
+        default:
+            return std::to_string(parity);  // a stored value the sheet does not offer, as it is
     }
 }
 
-std::string ProcedureName(uint32_t stored) {
-    const std::optional<ReceiveProcedure> procedure = ProcedureOfStoredSelector(stored);
-    if (!procedure)
-        return std::to_string(stored);
-    switch (*procedure) {
-    case ReceiveProcedure::RawStream:
-        return "raw";
-    case ReceiveProcedure::BccBlocks:
-        return "blocks";
-    case ReceiveProcedure::YModem:
-        return "y-modem";
-    case ReceiveProcedure::RawStreamWithoutFlowControl:
-        return "raw without flow control";
-    }
-    return std::to_string(stored);
+const char* ProcedureName(JournalProcedure procedure) noexcept {
+    return procedure == JournalProcedure::Library ? "library" : "line";
 }
 
 }  // namespace
@@ -122,12 +106,18 @@ std::string FormatJournalRow(const JournalRow& row) {
     char seconds[32];
     std::snprintf(seconds, sizeof seconds, "%.1f", row.Seconds < 0 ? 0.0 : row.Seconds);
     const std::string fields[] = {
-        FormatJournalTime(row.Start), CsvField(Utf8FromWide(row.Station)),
-        CsvField(Utf8FromWide(row.Port)), std::to_string(row.Baud),
-        ParityName(row.Parity), CsvField(Utf8FromWide(row.Model)),
-        CsvField(ProcedureName(row.Procedure)), std::to_string(row.Bytes),
-        seconds, ResultName(row.Result),
-        CsvField(Utf8FromWide(row.Message)), CsvField(Utf8FromWide(row.KeptFile)),
+        FormatJournalTime(row.Start),
+        CsvField(Utf8FromWide(row.Station)),
+        CsvField(Utf8FromWide(row.Port)),
+        std::to_string(row.Baud),
+        ParityName(row.Parity),
+        CsvField(Utf8FromWide(row.Model)),
+        CsvField(ProcedureName(row.Procedure)),
+        std::to_string(row.Bytes),
+        seconds,
+        ResultName(row.Result),
+        CsvField(Utf8FromWide(row.Message)),
+        CsvField(Utf8FromWide(row.KeptFile)),
     };
     std::string line;
     for (const std::string& field : fields) {

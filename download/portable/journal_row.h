@@ -9,14 +9,18 @@
 
 enum class JournalResult { Ok, Cancelled, Failed };
 
+// How the data came: the built-in driver always receives with the line protocol, whatever
+// selector the station stores; the LV-20 and LV-30 go through the maker's library.
+enum class JournalProcedure { Line, Library };
+
 struct JournalRow {
     LocalDateTime Start;
     WideString Station;
     WideString Port;
     uint32_t Baud = 0;
-    uint32_t Parity = 0;     // the station's stored code: 0 none, 1 odd, 2 even
+    uint32_t Parity = 0;  // the station's stored code: 0 none, 1 odd, 2 even
     WideString Model;
-    uint32_t Procedure = 0;  // the station's stored selector
+    JournalProcedure Procedure = JournalProcedure::Line;
     uint64_t Bytes = 0;
     double Seconds = 0;
     JournalResult Result = JournalResult::Failed;

@@ -198,6 +198,7 @@ TEST_F(FileContentsDownloader, EachEndOfADownloadGivesItsStreamOrNoneAndItsJourn
         ASSERT_EQ(++rows, journal.size()) << "one header, one row each";
         const std::vector<std::string>& row = journal.back();
         EXPECT_EQ(test.result, row[kResult]);
+        EXPECT_EQ("line", row[kProcedure]) << "the built-in driver's, whatever the station stores";
         if (!test.shown.empty()) {
             EXPECT_EQ(std::string(test.shown.begin(), test.shown.end()), row[kMessage]);
         } else {

@@ -41,9 +41,8 @@ std::vector<std::string> ReadRecord(const std::string& line) {
 
 TEST(JournalRow, FieldsReadBackAsWrittenWhateverTheyHold) {
     const WideString texts[] = {
-        W("plain"),        W("a,b"),         W("say \"hi\""), W("two\r\nlines"),
-        W("line\nfeed"),   W("\"\""),        W(""),           W(",\","),
-        W("Gr\u00FC\u00DFe"),
+        W("plain"), W("a,b"), W("say \"hi\""), W("two\r\nlines"),    W("line\nfeed"),
+        W("\"\""),  W(""),    W(",\","),       W("Gr\u00FC\u00DFe"),
     };
     for (const WideString& text : texts) {
         SCOPED_TRACE(Utf8FromWide(text));
@@ -68,22 +67,21 @@ TEST(JournalRow, ColumnsInOrder) {
     row.Baud = 9600;
     row.Parity = 2;
     row.Model = W("Quorvel LV-10");
-    row.Procedure = 1;
     row.Bytes = 6144;
     row.Seconds = 12.34;
     row.Result = JournalResult::Cancelled;
     row.Message = W("stopped");
     row.KeptFile = W("C:\\k\\a.lv");
     EXPECT_EQ(
-        "2026-11-26T04:05:06+01:00,North,COM7,9600,even,Quorvel LV-10,blocks,6144,12.3,"
+        "2026-11-26T04:05:06+01:00,North,COM7,9600,even,Quorvel LV-10,line,6144,12.3,"
         "cancelled,stopped,C:\\k\\a.lv\r\n",
         FormatJournalRow(row));
     row.Result = JournalResult::Ok;
-    row.Parity = 7;      // stored but never offered: shown as stored
-    row.Procedure = 99;  // no procedure: shown as stored
+    row.Parity = 7;  // stored but never offered: shown as stored
+    row.Procedure = JournalProcedure::Library;
     const std::vector<std::string> fields = ReadRecord(FormatJournalRow(row));
     EXPECT_EQ("7", fields[4]);
-    EXPECT_EQ("99", fields[6]);
+    EXPECT_EQ("library", fields[6]);
     EXPECT_EQ("ok", fields[9]);
     row.Result = JournalResult::Failed;
     EXPECT_EQ("failed", ReadRecord(FormatJournalRow(row))[9]);
@@ -108,7 +106,10 @@ TEST(Utf8FromWide, EncodesEveryPlaneAndReplacesLoneSurrogates) {
     EXPECT_EQ("\xF0\x9F\x93\x8F", Utf8FromWide(WideStringView(pair, 2)));
     EXPECT_EQ("a\xC3\xA9\xE2\x82\xAC", Utf8FromWide(W("a\u00E9\u20AC")));
     const WideChar lone[] = {W('a'), 0xD83D, W('b'), 0xDCCF};
-    EXPECT_EQ("a\xEF\xBF\xBD" "b\xEF\xBF\xBD", Utf8FromWide(WideStringView(lone, 4)));
+    EXPECT_EQ(
+        "a\xEF\xBF\xBD"
+        "b\xEF\xBF\xBD",
+        Utf8FromWide(WideStringView(lone, 4)));
 }
 
 }  // namespace
