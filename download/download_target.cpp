@@ -4,7 +4,7 @@
 #include <new>
 #include <utility>
 
-#include "download/portable/driver_text.h"
+#include "support/portable/text_format.h"
 #include "res/resource.h"
 #include "support/error_handling.h"
 #include "support/module_instance.h"
@@ -192,8 +192,8 @@ HRESULT PrepareDownloadTarget(HWND owner, DownloadTarget& target) noexcept {
         if (folder.size() > 1 && folder.back() == L'\\')
             folder.pop_back();
         ShowMessageBox(owner,
-                       FormatDriverText(LoadUiText(IDS_TEMPORARY_FOLDER_UNUSABLE),
-                                        {folder, SystemResultText(result)}),
+                       FormatText(LoadUiText(IDS_TEMPORARY_FOLDER_UNUSABLE),
+                                  {folder, SystemResultText(result)}),
                        LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONSTOP);
         return result;
     }

@@ -4,7 +4,7 @@
 #include <atomic>
 #include <utility>
 
-#include "download/portable/driver_text.h"
+#include "support/portable/text_format.h"
 #include "res/resource.h"
 #include "support/module_instance.h"
 #include "support/registered_messages.h"
@@ -140,7 +140,7 @@ void CHalvekDownloadProgressDialog::OnLibraryResult(int32_t code) {
     const HRESULT check = CheckReceivedFile(OutputPath() + L".txt");
     if (FAILED(check)) {
         SetDownloadResult(check);
-        FailWith(FormatDriverText(LoadUiText(IDS_DOWNLOAD_INCOMPLETE), {SystemResultText(check)}));
+        FailWith(FormatText(LoadUiText(IDS_DOWNLOAD_INCOMPLETE), {SystemResultText(check)}));
         return;
     }
     FinishTransfer();

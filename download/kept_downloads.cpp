@@ -6,7 +6,7 @@
 #include <vector>
 
 #include "download/download_records_folder.h"
-#include "download/portable/driver_text.h"
+#include "support/portable/text_format.h"
 #include "res/resource.h"
 #include "stations/station_models.h"
 #include "support/error_handling.h"
@@ -219,8 +219,8 @@ HRESULT OpenKeptDownloadsFolder(HWND owner, int showCommand) noexcept {
             const std::wstring shown =
                 folder.empty() ? L"%LOCALAPPDATA%\\Quorvel\\Digital Levels\\Downloads" : folder;
             ShowMessageBox(owner,
-                           FormatDriverText(LoadUiText(IDS_KEPT_DOWNLOADS_UNAVAILABLE),
-                                            {shown, SystemResultText(made)}),
+                           FormatText(LoadUiText(IDS_KEPT_DOWNLOADS_UNAVAILABLE),
+                                      {shown, SystemResultText(made)}),
                            LoadUiText(IDS_DIGITAL_LEVELS), MB_ICONSTOP);
             return made;
         }

@@ -11,6 +11,7 @@
 #include "stations/serial_ports.h"
 #include "stations/station_store.h"
 #include "stations/store_failure_text.h"
+#include "support/portable/text_format.h"
 #include "support/text_lookup.h"
 #include "support/user_interface.h"
 
@@ -28,17 +29,6 @@ std::vector<std::wstring> BaudRateEntries(uint32_t own) {
     for (uint32_t rate : rates)
         entries.push_back(std::to_wstring(rate));
     return entries;
-}
-
-// Replaces the first "%s" of text by what, the second by more.
-std::wstring Filled(std::wstring text, const std::wstring& what, const std::wstring& more = {}) {
-    for (const std::wstring* value : {&what, &more}) {
-        const size_t insert = text.find(L"%s");
-        if (insert == std::wstring::npos)
-            break;
-        text.replace(insert, 2, *value);
-    }
-    return text;
 }
 
 // A refusal's reason in the user interface's language: its format is the translation's key.
@@ -105,14 +95,14 @@ std::wstring CStationGeneralPage::AbsentPortText() const {
     const std::vector<std::wstring> ports = ListSerialPorts();
     if (std::find(ports.begin(), ports.end(), storedPort_) != ports.end())
         return {};
-    return Filled(LoadUiText(IDS_PORT_NOT_PRESENT), storedPort_);
+    return FormatText(LoadUiText(IDS_PORT_NOT_PRESENT), {storedPort_});
 }
 
 void CStationGeneralPage::FillPortList() {
     std::vector<std::wstring> entries = ListSerialPorts();
     const bool absent = !storedPort_.empty() &&
                         std::find(entries.begin(), entries.end(), storedPort_) == entries.end();
-    const std::wstring marked = Filled(LoadUiText(IDS_PORT_NOT_PRESENT), storedPort_);
+    const std::wstring marked = FormatText(LoadUiText(IDS_PORT_NOT_PRESENT), {storedPort_});
     if (absent)
         entries.push_back(marked);
     // Kept by its meaning: the stored port, plugged in meanwhile, loses its mark.
@@ -147,7 +137,7 @@ void CStationGeneralPage::ExchangeIntoRecord() {
     UpdateFields();
     station_.Name = name_;
     // The mark is display only: the record keeps the port's own name.
-    const std::wstring marked = Filled(LoadUiText(IDS_PORT_NOT_PRESENT), storedPort_);
+    const std::wstring marked = FormatText(LoadUiText(IDS_PORT_NOT_PRESENT), {storedPort_});
     station_.Port = !storedPort_.empty() && port_ == marked ? storedPort_ : port_;
     station_.BaudRate = BaudRateFromText(baudRate_);
     if (parity_ == LoadUiText(IDS_PARITY_NONE))
@@ -191,7 +181,7 @@ bool CStationDialog::AcceptName(const std::wstring& name) const {
         existing.Name = name;
         if (FindStation(existing) == S_OK) {
             refusal = IDS_STATION_EXISTS;
-            text = Filled(LoadUiText(IDS_STATION_EXISTS), name);
+            text = FormatText(LoadUiText(IDS_STATION_EXISTS), {name});
         }
     }
     if (refusal == 0)
@@ -207,10 +197,11 @@ bool CStationDialog::AcceptValues() const {
     const std::optional<StationFieldRefusal> refusal = RefusedStation(station_, ModelTexts());
     if (!refusal)
         return true;
-    ShowMessageBox(Window(),
-                   Filled(LoadUiText(IDS_STATION_VALUE_REFUSED),
-                          StationFieldOf(refusal->field).valueName, ReasonText(refusal->reason)),
-                   Caption(), MB_ICONERROR);
+    ShowMessageBox(
+        Window(),
+        FormatText(LoadUiText(IDS_STATION_VALUE_REFUSED),
+                   {StationFieldOf(refusal->field).valueName, ReasonText(refusal->reason)}),
+        Caption(), MB_ICONERROR);
     return false;
 }
 

@@ -76,15 +76,14 @@ std::wstring PasteRefusalText(const PasteRefused& refused) {
     switch (refused.reason) {
         case PasteRefusal::kTooManyStations:
         case PasteRefusal::kBlockTooLarge:
-            return FormatDriverText(
+            return FormatText(
                 LoadUiText(IDS_PASTE_TOO_MANY),
                 {DecimalText(kMaximumPastedStations), DecimalText(kMaximumPastedBlockSize / 1024)});
         case PasteRefusal::kUnreadable:
-            return FormatDriverText(
-                LoadUiText(IDS_PASTE_UNREADABLE),
-                {DecimalText(static_cast<long long>(refused.station) + 1), name});
+            return FormatText(LoadUiText(IDS_PASTE_UNREADABLE),
+                              {DecimalText(static_cast<long long>(refused.station) + 1), name});
         case PasteRefusal::kCopyTooLong:
-            return FormatDriverText(LoadUiText(IDS_PASTE_COPY_TOO_LONG), {name});
+            return FormatText(LoadUiText(IDS_PASTE_COPY_TOO_LONG), {name});
     }
     return std::wstring();
 }

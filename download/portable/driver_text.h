@@ -2,8 +2,8 @@
 #pragma once
 
 #include <cstdint>
-#include <initializer_list>
 
+#include "support/portable/text_format.h"
 #include "support/portable/wide_text.h"
 
 enum class DriverText {
@@ -24,10 +24,6 @@ public:
     // The system's own text for one of its error codes (a failed write of the output file).
     virtual WideString SystemErrorText(uint32_t code) const = 0;
 };
-
-// Replaces each %s or %d of format by the next argument, in order, and %% by %. A conversion
-// without an argument left is dropped, so a mistranslated text cannot read past the list.
-WideString FormatDriverText(WideStringView format, std::initializer_list<WideStringView> arguments);
 
 // Decimal text of a signed number, for the %d arguments.
 WideString DecimalText(long long value);

@@ -3,7 +3,7 @@
 
 #include <algorithm>
 
-#include "download/portable/driver_text.h"
+#include "support/portable/text_format.h"
 
 namespace {
 
@@ -40,14 +40,14 @@ WideString PortOpenProblemText(const PortOpenProblem& problem, const PortProblem
         case PortOpenFailure::NotPresent: {
             const WideStringView port = PortDisplayName(problem.port);
             if (problem.present.empty())
-                return FormatDriverText(texts.noPortsPresent, {port});
+                return FormatText(texts.noPortsPresent, {port});
             WideString list;
             for (const WideString& present : problem.present) {
                 if (!list.empty())
                     list.append(WIDE_TEXT(", "));
                 list.append(present);
             }
-            return FormatDriverText(texts.notPresent, {port, list});
+            return FormatText(texts.notPresent, {port, list});
         }
         case PortOpenFailure::InUse:
             break;

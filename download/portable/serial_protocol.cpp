@@ -238,9 +238,9 @@ bool SerialProtocol::CheckInputFile(const uint8_t* bytes, size_t size) {
             return true;
         case BccFileCheck::Outcome::BccMismatch:
             Report(MessageCode::Error,
-                   FormatDriverText(texts_.Text(DriverText::InputFileBccMismatch),
-                                    {DecimalText(check.Block), DecimalText(check.ValueInBlock),
-                                     DecimalText(check.Computed)}));
+                   FormatText(texts_.Text(DriverText::InputFileBccMismatch),
+                              {DecimalText(check.Block), DecimalText(check.ValueInBlock),
+                               DecimalText(check.Computed)}));
             return false;
     }
     return false;

@@ -41,8 +41,7 @@ size_t SerialProtocol::ReadBurst(std::optional<uint8_t> firstByte) {
 void SerialProtocol::EndAtSizeLimit() {
     receiveEnded_ = true;
     const WideString mebibytes = DecimalText(static_cast<long long>(receiveCap_ >> kMebibyteShift));
-    Report(MessageCode::Error,
-           FormatDriverText(texts_.Text(DriverText::SizeLimitReached), {mebibytes}));
+    Report(MessageCode::Error, FormatText(texts_.Text(DriverText::SizeLimitReached), {mebibytes}));
 }
 
 bool SerialProtocol::AcceptWithinCap(size_t count) {
@@ -230,8 +229,8 @@ TransferResult SerialProtocol::ReceiveYModem() {
     WideString sizeText = WidenBytes(header.SizeText.data(), header.SizeText.size());
     sizeText += WIDE_TEXT(" byte");
     Report(MessageCode::Information,
-           FormatDriverText(texts_.Text(DriverText::YModemFileInfo),
-                            {WidenBytes(header.Name.data(), header.Name.size()), sizeText}));
+           FormatText(texts_.Text(DriverText::YModemFileInfo),
+                      {WidenBytes(header.Name.data(), header.Name.size()), sizeText}));
     // A file announced larger than the cap could never be received: its header is not accepted.
     if (header.Size > receiveCap_) {
         EndAtSizeLimit();

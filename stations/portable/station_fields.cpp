@@ -6,6 +6,7 @@
 
 #include "stations/portable/station_file_text.h"
 #include "stations/portable/station_names.h"
+#include "support/portable/text_format.h"
 
 namespace {
 
@@ -118,16 +119,8 @@ std::span<const uint32_t> SheetBaudRates() noexcept {
 }
 
 WideString RefusalReason::Text() const {
-    WideString text = format;
-    size_t from = 0;
-    for (const WideString& argument : arguments) {
-        const size_t at = text.find(WIDE_TEXT("%s"), from);
-        if (at == WideString::npos)
-            break;
-        text.replace(at, 2, argument);
-        from = at + argument.size();  // an argument's own "%s" stays as it is
-    }
-    return text;
+    const std::vector<WideStringView> views(arguments.begin(), arguments.end());
+    return FormatText(format, views);
 }
 
 std::optional<RefusalReason> RefusedNumberReason(StationField field, uint32_t value) {

@@ -135,12 +135,11 @@ TEST(PortSetup, LineTimeoutsWaitAboutTwoCharacterTimesAfterTheLastByte) {
     EXPECT_EQ(MakeLineTimeouts(0, 10).ReadInterval, 50u) << "no rate: the block time-outs";
 }
 
-TEST(DriverTextFormat, ArgumentsFillConversionsInOrderAndMissingOnesAreDropped) {
-    EXPECT_EQ(FormatDriverText(WIDE_TEXT("block %d: %d!=%d, 100%%"),
-                               {WIDE_TEXT("2"), WIDE_TEXT("17"), WIDE_TEXT("18")}),
+TEST(TextFormat, ArgumentsFillConversionsInOrderAndMissingOnesAreDropped) {
+    EXPECT_EQ(FormatText(WIDE_TEXT("block %d: %d!=%d, 100%%"),
+                         {WIDE_TEXT("2"), WIDE_TEXT("17"), WIDE_TEXT("18")}),
               WIDE_TEXT("block 2: 17!=18, 100%"));
-    EXPECT_EQ(FormatDriverText(WIDE_TEXT("%s and %s %"), {WIDE_TEXT("one")}),
-              WIDE_TEXT("one and  %"));
+    EXPECT_EQ(FormatText(WIDE_TEXT("%s and %s %"), {WIDE_TEXT("one")}), WIDE_TEXT("one and  %"));
 }
 
 }  // namespace
