@@ -4,10 +4,10 @@
 #include <new>
 #include <utility>
 
-#include "support/portable/text_format.h"
 #include "res/resource.h"
 #include "support/error_handling.h"
 #include "support/module_instance.h"
+#include "support/portable/text_format.h"
 #include "support/read_only_file.h"
 #include "support/text_lookup.h"
 #include "support/user_interface.h"

@@ -4,9 +4,9 @@
 #include <atomic>
 #include <utility>
 
-#include "support/portable/text_format.h"
 #include "res/resource.h"
 #include "support/module_instance.h"
+#include "support/portable/text_format.h"
 #include "support/registered_messages.h"
 #include "support/text_lookup.h"
 #include "support/user_interface.h"

@@ -6,11 +6,11 @@
 #include <vector>
 
 #include "download/download_records_folder.h"
-#include "support/portable/text_format.h"
 #include "res/resource.h"
 #include "stations/station_models.h"
 #include "support/error_handling.h"
 #include "support/module_instance.h"
+#include "support/portable/text_format.h"
 #include "support/registry_value.h"
 #include "support/text_lookup.h"
 #include "support/unique_resource.h"
